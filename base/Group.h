@@ -1,0 +1,63 @@
+// Counts things under way, and waits for all of them.
+#pragma once
+
+#include <condition_variable>
+#include <cstdint>
+#include <mutex>
+#include <utility>
+
+#include "base/Clock.h"
+
+namespace appsync {
+
+/// All operations may be called on any thread. The group may be destroyed as soon as a wait has returned true, although
+/// the `leave` that ended it may still be returning on another thread.
+class Group {
+ public:
+  /// `clock` must outlive the group.
+  explicit Group(Clock& clock) : clock_(clock) {}
+  Group(const Group&) = delete;
+  Group& operator=(const Group&) = delete;
+
+  void enter();
+
+  /// Throws std::logic_error, and changes nothing, if there is no enter left to take back.
+  void leave();
+
+  /// Returns once the group is empty, or has been since the call.
+  void wait();
+
+  /// The same until the clock reads `deadline`; false if the group was not empty until then.
+  bool wait(TimePoint deadline);
+
+  /// How many enters have not been taken back.
+  std::int64_t count() const;
+
+ private:
+  Clock& clock_;
+  mutable std::mutex mutex_;
+  std::condition_variable emptied_;
+  std::int64_t count_ = 0;
+  /// How often the group has become empty: a waiter returns even if it is entered anew before the waiter wakes.
+  std::uint64_t timesEmptied_ = 0;
+};
+
+/// Enters a group now and leaves it when destroyed. Moving hands the duty to leave on.
+class [[nodiscard]] GroupEntry {
+ public:
+  /// `group` must outlive the entry.
+  explicit GroupEntry(Group& group) : group_(&group) { group.enter(); }
+  GroupEntry(GroupEntry&& other) noexcept : group_(std::exchange(other.group_, nullptr)) {}
+  GroupEntry& operator=(GroupEntry other) noexcept {
+    std::swap(group_, other.group_);
+    return *this;
+  }
+  ~GroupEntry() {
+    if (group_ != nullptr) group_->leave();
+  }
+
+ private:
+  Group* group_;
+};
+
+}  // namespace appsync

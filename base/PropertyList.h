@@ -1,0 +1,67 @@
+// Property lists: the value, and its three file forms.
+#pragma once
+
+#include <optional>
+#include <string>
+#include <string_view>
+
+#include "base/Bytes.h"
+#include "base/Error.h"
+#include "base/PropertyListValue.h"
+
+namespace appsync::domains {
+inline constexpr std::string_view kPropertyList = "PropertyList";
+}
+
+namespace appsync::plist {
+
+/// The codes of errors in the domain kPropertyList.
+enum class Failure : long {
+  truncated = 1,     ///< the document ends too early
+  malformed,         ///< it breaks its form's rules
+  outOfRange,        ///< a number, date, offset or length lies outside what is allowed
+  badText,           ///< bytes that are not text in their encoding, or text its form cannot hold
+  tooDeep,           ///< containers nested deeper than kMaximumDepth
+  tooLarge,          ///< a small document that would unfold into too many values, or a container inside itself
+  unsupported,       ///< a form or element that is understood but refused
+  notRepresentable,  ///< a value that the form to be written cannot hold; every null is one
+};
+
+/// Documents nested deeper than this are neither read nor written.
+inline constexpr int kMaximumDepth = 512;
+
+// Reading. Input may be hostile: nothing in it is trusted, time and memory stay in proportion to its size, and a
+// failure names the byte at which it was found. Of equal keys in one dictionary the last one counts.
+
+/// Reads whichever of the three forms the bytes are in, told by their content.
+[[nodiscard]] Result<Value> read(ByteView document);
+/// "bplist00". Sets are refused.
+[[nodiscard]] Result<Value> readBinary(ByteView document);
+/// UTF-8 or, with a byte-order mark, UTF-16. Entity declarations are refused, other document types skipped.
+[[nodiscard]] Result<Value> readXML(ByteView document);
+/// The old text form: `{ key = value; }`, `( a, b )`, `<0f a0>`, "quoted" and bare words, comments; also the
+/// `key = value;` lines of a strings file. Every scalar in it is a string or data.
+[[nodiscard]] Result<Value> readText(ByteView document);
+
+// Writing. Equal values give equal bytes. A null anywhere makes both fail.
+
+/// "bplist00", with equal scalars stored once.
+[[nodiscard]] Result<Bytes> writeBinary(const Value& root);
+/// UTF-8, without a document type declaration. Fails on a uid and on text with characters that XML cannot hold;
+/// dates lose their fractions of a second.
+[[nodiscard]] Result<Bytes> writeXML(const Value& root);
+
+/// The value under `key` when `value` is a dictionary that has it, else null. `value` may be null.
+[[nodiscard]] inline const Value* find(const Value* value, std::string_view key) noexcept {
+  return value == nullptr ? nullptr : value->find(key);
+}
+
+/// What gives a boolean: booleans, numbers (not zero) and strings: true for those that start with Y, y, T, t or a
+/// number that is not zero, false for all others. Nothing else does.
+[[nodiscard]] std::optional<bool> truth(const Value& value) noexcept;
+
+/// Appends `value` on one line in the style of the old text form, for logs. Dictionaries keep their order,
+/// long data is cut short and followed by its length, deep nesting is cut to "…".
+void appendDescription(std::string& out, const Value& value);
+
+}  // namespace appsync::plist

@@ -1,0 +1,128 @@
+// Reads the binary form: numbered objects, a table of where each lies, and a trailer that says how to read the table.
+#pragma once
+
+#include <array>
+#include <cstdint>
+#include <memory>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <unordered_map>
+#include <vector>
+
+#include "base/PropertyListBigEndian.h"
+#include "base/PropertyListFailure.h"
+#include "base/PropertyListStorage.h"
+
+namespace appsync::plist {
+
+/// Every so many bytes of text or data count like another value: see `spend`.
+inline constexpr std::uint64_t kBytesPerUnit = 16;
+
+/// How many values one byte of input may unfold to when objects are referred to again and again, and how much more
+/// even a tiny document may.
+inline constexpr std::uint64_t kUnitsPerByte = 64;
+inline constexpr std::uint64_t kFreeUnits = 65536;
+
+/// Reads one document.
+class BinaryReader {
+ public:
+  explicit BinaryReader(ByteView document) noexcept : begin_(document.data()), size_(document.size()) {}
+
+  Result<Value> read() {
+    readTrailer();
+    Value root;
+    if (!failure_) readObject(top_, 0, root);
+    if (failure_) return *std::move(failure_);
+    return root;
+  }
+
+ private:
+  /// Where an object's content lies and how many bytes or elements it has.
+  struct Extent {
+    std::size_t start;
+    std::uint64_t count;
+  };
+
+  /// Long or nested content that was met a second time and is shared from then on.
+  struct Shared {
+    Value value;
+    std::uint64_t units;
+  };
+
+  /// The keys of a dictionary met before, told by the bytes of its references to them.
+  struct KnownKeys {
+    const std::byte* references = nullptr;
+    std::size_t size = 0;
+    std::uint64_t units = 0;
+    ShapeHolder shape;
+    /// For each key as written, its place in the shape. Null when they are in order.
+    std::shared_ptr<const std::vector<std::uint32_t>> places;
+  };
+
+  Value fail(Failure kind, std::string_view what, std::size_t at);
+  void failMissing(std::uint64_t number);
+
+  void readTrailer();
+  // Each reads an object into `place`, which holds a null; a null that stays means failure.
+  void readObject(std::uint64_t number, int depth, Value& place);
+  void readOther(std::uint64_t number, std::size_t at, int depth, Value& place);
+  bool readShortASCII(std::size_t start, std::size_t size, Value& place);
+  bool readShortUTF16(std::size_t start, std::size_t count, Value& place);
+  void readLong(std::uint64_t number, std::size_t at, unsigned marker, int depth, Value& place);
+  void readContent(std::size_t at, unsigned marker, int depth, Value& place);
+  void readArray(std::size_t at, Extent extent, int depth, Value& place);
+  void readDictionary(std::size_t at, Extent extent, int depth, Value& place);
+  void readRepeatingDictionary(Extent extent, int depth, Value& place);
+  Value readInteger(std::size_t at, unsigned exponent);
+  Value readReal(std::size_t at, unsigned exponent);
+  Value readDate(std::size_t at, unsigned low);
+  Value readUid(std::size_t at, unsigned size);
+  Value readASCII(std::size_t at, Extent extent);
+  Value readUTF16(std::size_t at, Extent extent);
+  KnownKeys* keysOf(Extent extent, int depth);
+  bool learnKeys(KnownKeys& known, Extent extent, int depth);
+
+  bool readExtent(std::size_t at, unsigned low, Extent& extent) {
+    extent = {at + 1, low};
+    return low != 0xF || readLongExtent(at, extent);
+  }
+  bool readLongExtent(std::size_t at, Extent& extent);
+  bool fits(std::size_t at, const Extent& extent, std::uint64_t bytesEach) {
+    // A count of no more than the document's bytes cannot overflow.
+    if (extent.start <= table_ && extent.count <= table_ && extent.count * bytesEach <= table_ - extent.start)
+      return true;
+    fail(Failure::outOfRange, "An object longer than the document", at);
+    return false;
+  }
+  bool spend(std::uint64_t units, std::size_t at) {
+    units_ += units;
+    if (units_ <= kUnitsPerByte * size_ + kFreeUnits) return true;
+    fail(Failure::tooLarge, "Far more values than the document's size accounts for, met", at);
+    return false;
+  }
+  [[nodiscard]] std::uint64_t reference(std::size_t at) const noexcept {
+    return loadBigEndian(begin_ + at, referenceSize_);
+  }
+  [[nodiscard]] bool wasSeen(std::uint64_t number) noexcept;
+
+  const std::byte* begin_;
+  std::size_t size_;
+  unsigned offsetSize_ = 0;
+  unsigned referenceSize_ = 0;
+  std::uint64_t objectCount_ = 0;
+  std::uint64_t top_ = 0;
+  /// The end of the objects and start of the table.
+  std::size_t table_ = 0;
+
+  std::uint64_t units_ = 1;
+  /// Which long or nested objects were met, a bit for each.
+  std::vector<std::uint64_t> seen_;
+  std::unordered_map<std::uint64_t, Shared> shared_;
+  std::array<KnownKeys, 32> knownKeys_;
+  /// Text that had to be converted.
+  std::string text_;
+  std::optional<Error> failure_;
+};
+
+}  // namespace appsync::plist

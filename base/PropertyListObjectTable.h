@@ -1,0 +1,128 @@
+// The numbered objects of a binary document that is being written.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <cstring>
+#include <span>
+#include <vector>
+
+#include "base/PropertyListStorage.h"
+
+namespace appsync::plist {
+
+/// Where each object of a document begins, and which scalars are among them already, so that equal ones are stored
+/// once. Reals and dates are equal when their bits are. The values must stay where they are as long as the table is
+/// used.
+class ObjectTable {
+ public:
+  /// Takes over what the thread's last table left: memory that need not be asked for and mapped again.
+  /// Empty until `clear` prepares it.
+  ObjectTable();
+  ~ObjectTable();
+  ObjectTable(const ObjectTable&) = delete;
+  ObjectTable& operator=(const ObjectTable&) = delete;
+
+  /// Forgets all objects, and prepares for about as many.
+  void clear(std::size_t expected);
+
+  /// The next number, for an object at `offset`.
+  std::uint32_t add(std::size_t offset) {
+    if (count_ == memory_.offsets.size()) makeRoom(count_ + 1);
+    memory_.offsets[count_] = static_cast<std::uint32_t>(offset);
+    return count_++;
+  }
+  /// The number of an equal scalar that was added before; else the next one, and the scalar counts as added at
+  /// `offset`.
+  std::uint32_t findOrAdd(const Value& scalar, std::size_t offset) {
+    const std::uint32_t tag = tagOf(scalar);
+    for (std::size_t at = tag & mask_;; at = (at + 1) & mask_) {
+      const Slot slot = slots_[at];
+      if (slot.next == 0) return addAt(at, tag, scalar, offset);
+      if (slot.tag == tag && isSame(*memory_.scalars[slot.next - 1], scalar)) return slot.next - 1;
+    }
+  }
+  [[nodiscard]] std::size_t size() const noexcept { return count_; }
+  [[nodiscard]] std::span<const std::uint32_t> offsets() const noexcept {
+    return std::span(memory_.offsets).first(count_);
+  }
+
+ private:
+  struct Slot {
+    /// The object's number and one; 0 in an empty slot.
+    std::uint32_t next;
+    std::uint32_t tag;
+  };
+  struct Memory {
+    /// Of the objects; longer than they are many.
+    std::vector<std::uint32_t> offsets;
+    /// As long; unset for containers.
+    std::vector<const Value*> scalars;
+    /// Hash tables of growing size one after another; the last one that was begun counts.
+    std::vector<Slot> slots;
+  };
+
+  [[nodiscard]] std::uint32_t tagOf(const Value& scalar) const noexcept;
+  [[nodiscard]] static bool isSame(const Value& one, const Value& other) noexcept;
+  [[nodiscard]] static bool isSameLong(const Value& one, const Value& other) noexcept;
+  std::uint32_t addAt(std::size_t at, std::uint32_t tag, const Value& scalar, std::size_t offset);
+  void makeRoom(std::size_t count);
+  void beginTable(std::size_t start, std::size_t count);
+  void grow();
+
+  Memory memory_;
+  std::uint32_t count_ = 0;
+  Slot* slots_ = nullptr;
+  std::size_t mask_ = 0;
+  std::size_t used_ = 0;
+  std::uint64_t seed_ = 0;
+  static thread_local Memory spare;
+};
+
+namespace detail {
+
+inline constexpr std::uint64_t kFactors[] = {0xA0761D6478BD642FU, 0xE7037ED1A0B428DBU, 0x8EBC6AF09C88C6E3U,
+                                             0x589965CC75374CC3U};
+
+// NOLINTNEXTLINE(modernize-use-using): only a typedef can be marked as an extension.
+__extension__ typedef unsigned __int128 Wide;
+
+/// Multiplies and folds the product: every bit of both factors reaches the result.
+[[nodiscard]] inline std::uint64_t mix(std::uint64_t one, std::uint64_t other) noexcept {
+  const Wide product = static_cast<Wide>(one) * other;
+  return static_cast<std::uint64_t>(product) ^ static_cast<std::uint64_t>(product >> 64);
+}
+
+[[nodiscard]] inline std::uint64_t hashWords(const Internals::Words& words, std::uint64_t seed) noexcept {
+  return mix(words[0] ^ kFactors[0] ^ seed, words[1] ^ kFactors[1]) ^
+         mix(words[2] ^ kFactors[2] ^ seed, words[3] ^ kFactors[3]);
+}
+
+/// Of a string or data that is not held inline.
+[[nodiscard]] std::uint64_t hashLong(const Value& value, std::uint64_t seed) noexcept;
+
+}  // namespace detail
+
+inline std::uint32_t ObjectTable::tagOf(const Value& scalar) const noexcept {
+  const std::uint64_t hash = Internals::isInline(scalar) ? detail::hashWords(Internals::words(scalar), seed_)
+                                                         : detail::hashLong(scalar, seed_);
+  return static_cast<std::uint32_t>(hash >> 32);
+}
+
+inline bool ObjectTable::isSame(const Value& one, const Value& other) noexcept {
+  const auto left = Internals::words(one);
+  const auto right = Internals::words(other);
+  const std::uint64_t difference =
+      (left[0] ^ right[0]) | (left[1] ^ right[1]) | (left[2] ^ right[2]) | (left[3] ^ right[3]);
+  return difference == 0 || (!Internals::isInline(one) && isSameLong(one, other));
+}
+
+inline std::uint32_t ObjectTable::addAt(std::size_t at, std::uint32_t tag, const Value& scalar, std::size_t offset) {
+  const std::uint32_t number = add(offset);
+  memory_.scalars[number] = &scalar;
+  slots_[at] = {number + 1, tag};
+  if (++used_ * 2 > mask_) grow();
+  return number;
+}
+
+}  // namespace appsync::plist

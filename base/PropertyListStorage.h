@@ -1,0 +1,174 @@
+// What property-list values share behind the scenes. Only base/PropertyList*.cpp include this.
+#pragma once
+
+#include <array>
+#include <atomic>
+#include <cstddef>
+#include <cstdint>
+#include <memory>
+#include <span>
+#include <string_view>
+#include <utility>
+#include <vector>
+
+#include "base/PropertyListValue.h"
+
+namespace appsync::plist {
+
+/// Counted content; the last owner frees it. Content with more than one owner never changes.
+struct Payload {
+  std::atomic<std::uint32_t> owners{1};
+
+  void retain(std::uint32_t times = 1) noexcept { owners.fetch_add(times, std::memory_order_relaxed); }
+  /// True for the last owner.
+  [[nodiscard]] bool release(std::uint32_t times = 1) noexcept {
+    // Most payloads never had a second owner, and no other thread can become one meanwhile.
+    return owners.load(std::memory_order_acquire) == times ||
+           owners.fetch_sub(times, std::memory_order_acq_rel) == times;
+  }
+  [[nodiscard]] bool isShared() const noexcept { return owners.load(std::memory_order_acquire) != 1; }
+};
+
+/// A long string; its bytes follow it in memory.
+struct TextPayload : Payload {
+  std::size_t size = 0;
+
+  [[nodiscard]] char* bytes() noexcept { return reinterpret_cast<char*>(this + 1); }
+  [[nodiscard]] static TextPayload* make(std::size_t size);
+  static void destroy(TextPayload* text) noexcept;
+};
+
+struct DataPayload : Payload {
+  explicit DataPayload(Bytes content) noexcept : bytes(std::move(content)) {}
+  Bytes bytes;
+};
+
+/// Content that holds values. Freed through `bury`, so that deep nesting does not take deep recursion.
+struct Container : Payload {
+  enum class Kind : std::uint8_t { array, dictionary };
+  explicit Container(Kind which) noexcept : kind(which) {}
+
+  Kind kind;
+  Container* nextToBury = nullptr;
+
+  /// Gives up one ownership.
+  static void drop(Container* container) noexcept {
+    if (container->release()) bury(container);
+  }
+
+ private:
+  static void bury(Container* container) noexcept;
+  static void destroy(Container* container) noexcept;
+};
+
+struct ArrayPayload : Container {
+  explicit ArrayPayload(Array content) noexcept : Container(Kind::array), elements(std::move(content)) {}
+  Array elements;
+};
+
+/// The keys of one or many dictionaries, as strings in order. Documents hold thousands of dictionaries with the same
+/// keys: they share one of these, so that each costs its values alone and a writer can recognise it.
+struct Shape : Payload {
+  std::vector<Value> keys;
+
+  static void drop(Shape* shape, std::uint32_t times = 1) noexcept {
+    if (shape->release(times)) delete shape;
+  }
+};
+
+/// Ownership of a shape, or none. Keeps a stock of further ownerships to hand out, since each takes an atomic step.
+class ShapeHolder {
+ public:
+  ShapeHolder() noexcept = default;
+  explicit ShapeHolder(Shape& shape) noexcept : shape_(&shape) { shape.retain(); }
+  ShapeHolder(ShapeHolder&& other) noexcept
+      : shape_(std::exchange(other.shape_, nullptr)), stock_(std::exchange(other.stock_, 0)) {}
+  ShapeHolder& operator=(ShapeHolder&& other) noexcept {
+    std::swap(shape_, other.shape_);
+    std::swap(stock_, other.stock_);
+    return *this;
+  }
+  ~ShapeHolder() {
+    if (shape_ != nullptr) Shape::drop(shape_, stock_ + 1);
+  }
+  /// Gives the caller one ownership of the shape.
+  void share() noexcept {
+    if (stock_ == 0) shape_->retain(stock_ = kStock);
+    --stock_;
+  }
+  [[nodiscard]] Shape& operator*() const noexcept { return *shape_; }
+  [[nodiscard]] Shape* operator->() const noexcept { return shape_; }
+
+ private:
+  static constexpr std::uint32_t kStock = 256;
+
+  Shape* shape_ = nullptr;
+  std::uint32_t stock_ = 0;
+};
+
+/// The values of a dictionary, parallel to the keys of its shape; they follow it in memory.
+struct DictionaryPayload : Container {
+  DictionaryPayload(Shape* keys, std::uint32_t room) noexcept
+      : Container(Kind::dictionary), capacity(room), shape(keys) {}
+
+  std::uint32_t capacity;
+  std::uint32_t count = 0;
+  Shape* shape;
+
+  [[nodiscard]] Value* values() noexcept { return std::launder(reinterpret_cast<Value*>(this + 1)); }
+  /// Room for `capacity` values, none made yet. Takes over one ownership of `shape`.
+  [[nodiscard]] static DictionaryPayload* make(Shape* shape, std::size_t capacity);
+  static void destroy(DictionaryPayload* dictionary) noexcept;
+};
+
+/// The way into values for readers and writers.
+struct Internals {
+  using Words = std::array<std::uint64_t, sizeof(Value) / sizeof(std::uint64_t)>;
+
+  [[nodiscard]] static DictionaryPayload* payload(const Dictionary& dictionary) noexcept { return dictionary.payload_; }
+  /// Takes over one ownership of `payload`, whose values must be complete.
+  [[nodiscard]] static Dictionary adopt(DictionaryPayload* payload) noexcept {
+    Dictionary dictionary;
+    dictionary.payload_ = payload;
+    return dictionary;
+  }
+  /// A string's or data's bytes.
+  [[nodiscard]] static std::string_view text(const Value& value) noexcept { return value.text(); }
+  [[nodiscard]] static bool isInline(const Value& value) noexcept { return value.bits_.length != Value::kShared; }
+  /// How many bytes a string or data takes that is held inline.
+  [[nodiscard]] static std::size_t inlineSize(const Value& value) noexcept { return value.bits_.length; }
+  [[nodiscard]] static bool isContainer(const Value& value) noexcept { return value.bits_.type >= Type::array; }
+  /// Puts a string that fits into the value itself, its unused bytes zero, in place of a null.
+  static void setShortString(Value& null, const Words& words, std::size_t size) noexcept {
+    std::memcpy(static_cast<void*>(&null.bits_), words.data(), sizeof null.bits_);
+    null.bits_.length = static_cast<std::uint8_t>(size);
+    null.bits_.type = Type::string;
+  }
+  static constexpr std::size_t kInlineCapacity = Value::kInlineCapacity;
+  [[nodiscard]] static const void* bits(const Value& value) noexcept { return &value.bits_; }
+  /// A value as numbers; one by one, because a copy of the whole would go through memory.
+  [[nodiscard]] static Words words(const Value& value) noexcept {
+    const auto word = [&value](std::size_t i) {
+      std::uint64_t number;
+      std::memcpy(&number, reinterpret_cast<const std::byte*>(&value.bits_) + i * sizeof number, sizeof number);
+      return number;
+    };
+    return {word(0), word(1), word(2), word(3)};
+  }
+  [[nodiscard]] static Payload* shared(const Value& value) noexcept { return value.load<Payload*>(); }
+};
+
+/// Makes a dictionary of keys and values in any order; of equal keys the last one counts. The values are moved away.
+[[nodiscard]] Dictionary makeDictionary(std::span<const Value> keys, std::span<Value> values);
+
+/// Makes a dictionary of nulls, which are then to be replaced in its payload.
+[[nodiscard]] Dictionary makeDictionary(ShapeHolder& shape);
+
+/// Makes a dictionary of values in the order that `places` was made for.
+[[nodiscard]] Dictionary makeDictionary(ShapeHolder& shape, std::span<const std::uint32_t> places,
+                                        std::span<Value> values);
+
+/// For each key its place in the shape. Empty when they are all in order.
+[[nodiscard]] std::vector<std::uint32_t> placesOf(std::span<const Value> keys, const Shape& shape);
+
+}  // namespace appsync::plist

@@ -1,0 +1,16 @@
+// The clock of the machine.
+#pragma once
+
+#include "base/Clock.h"
+
+namespace appsync {
+
+/// Steady time: not moved by changes of the time of day.
+class SystemClock final : public Clock {
+ public:
+  TimePoint now() const override;
+  bool wait(std::condition_variable& condition, std::unique_lock<std::mutex>& lock, TimePoint deadline,
+            const std::function<bool()>& ready) override;
+};
+
+}  // namespace appsync
