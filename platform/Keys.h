@@ -1,0 +1,37 @@
+// The platform's own key texts: what stands in info dictionaries, install options and registry records.
+#pragma once
+
+#include <string_view>
+
+namespace appsync::platform {
+
+/// Keys of an app's info dictionary ("Info.plist").
+inline constexpr std::string_view BundleIdentifierKey = "BundleIdentifier";
+inline constexpr std::string_view BundleVersionKey = "BundleVersion";
+inline constexpr std::string_view BundleDisplayNameKey = "BundleDisplayName";
+inline constexpr std::string_view BundleExecutableKey = "BundleExecutable";
+inline constexpr std::string_view BundleIconFileKey = "BundleIconFile";
+
+/// Install options: what kind of package `AppRegistry::installApplication` is given.
+inline constexpr std::string_view PackageTypeKey = "PackageType";
+inline constexpr std::string_view PackageTypeCustomer = "Customer";
+inline constexpr std::string_view PackageTypePlaceholder = "Placeholder";
+
+/// Install option: the `TSInstallType` that the app's record is to carry, a number.
+inline constexpr std::string_view InstallTypeKey = "TSInstallType";
+
+/// Install options of restored apps: store metadata and licence data, each as bytes.
+inline constexpr std::string_view StoreMetadataKey = "StoreMetadata";
+inline constexpr std::string_view LicenceDataKey = "LicenceData";
+
+/// Uninstall option: a boolean; when true only a placeholder is removed, never an installed app.
+inline constexpr std::string_view UninstallPlaceholdersOnlyKey = "UninstallPlaceholdersOnly";
+
+/// `AppRecord::applicationType` of apps that users and the system install.
+inline constexpr std::string_view ApplicationTypeUser = "User";
+inline constexpr std::string_view ApplicationTypeSystem = "System";
+
+/// Error domain of `AppRegistry::installApplication` and `uninstallApplication`.
+inline constexpr std::string_view InstallerErrorDomain = "InstallerError";
+
+}  // namespace appsync::platform

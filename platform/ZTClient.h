@@ -1,0 +1,51 @@
+// What the sync daemon asks of a client that syncs one dataclass.
+#pragma once
+
+#include <functional>
+#include <memory>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "base/Error.h"
+#include "base/PropertyList.h"
+#include "platform/ZTAsset.h"
+
+namespace appsync::platform {
+
+using Assets = std::vector<std::shared_ptr<ZTAsset>>;
+using ProgressCallback = std::function<void(double fraction)>;
+
+/// The daemon drives a client with these calls, one sync at a time and in this order: `prepareForSyncWithHostAnchor`,
+/// `installedAssets`, `reconcileSync`, `outstandingAssetTransfers`, the transfers' reports,
+/// `assetTransferEndedWithSuccess`, `syncEndedWithSuccess`. `clearSyncData` and the questions may come at any time
+/// between syncs.
+///
+/// Threads: calls come from the daemon's threads, not two at once, but for the reports on different assets' transfers
+/// of which several may run side by side. They run synchronously; `assetTransferEndedWithSuccess` blocks until all
+/// installs are done, so none may be made from work of the client's own. Errors: slots may be null; only a false result
+/// makes what is in one an answer.
+class ZTClient {
+ public:
+  virtual ~ZTClient() = default;
+
+  [[nodiscard]] virtual std::vector<std::string> supportedDataclasses() = 0;
+  [[nodiscard]] virtual std::string currentSyncAnchor() = 0;
+  virtual bool prepareForSyncWithHostAnchor(std::string_view hostAnchor, const ProgressCallback& progressCallback,
+                                            ErrorSlot error) = 0;
+  /// The host's view of what the device holds; see `AppsClient` for the keys.
+  [[nodiscard]] virtual plist::Dictionary installedAssets() = 0;
+  virtual bool reconcileSync(const Assets& assets, std::string_view newAnchor, const ProgressCallback& progressCallback,
+                             ErrorSlot error) = 0;
+  /// The packages that the host is to send, in the order in which they are wanted.
+  [[nodiscard]] virtual Assets outstandingAssetTransfers() = 0;
+  virtual void assetTransferUpdatedProgress(const std::shared_ptr<ZTAsset>& asset, double fraction) = 0;
+  virtual void assetTransferSucceeded(const std::shared_ptr<ZTAsset>& asset, bool succeeded,
+                                      const std::optional<Error>& error) = 0;
+  virtual void assetTransferEndedWithSuccess(bool success) = 0;
+  virtual void syncEndedWithSuccess(bool success) = 0;
+  virtual void clearSyncData() = 0;
+};
+
+}  // namespace appsync::platform
