@@ -1,0 +1,103 @@
+#include "core/AppsClient.h"
+#include "core/PropertyListAccess.h"
+#include "core/SyncFiles.h"
+#include "core/TodoList.h"
+
+namespace appsync {
+
+namespace {
+
+using platform::IntermediateDirectories;
+
+enum class Takeover { taken, nothingStaged, failed };
+
+/// Makes the host's staging folder the work area, in place of the last sync's.
+Takeover takeOverStagingFolder(platform::FileSystem& files, const PlugInLog& log, ErrorSlot error) {
+  if (files.fileExists(kWorkArea)) files.removeItem(kWorkArea).ignore();
+
+  if (const Status created = files.createDirectory(kSyncFolder, IntermediateDirectories::create, {}); !created) {
+    setError(error, created.error());
+    log.message("%s|can't create work area");
+    return Takeover::failed;
+  }
+  if (!files.fileExists(kStagingFolder)) {
+    log.message("%s|Nothing to do");
+    return Takeover::nothingStaged;
+  }
+  if (const Status moved = files.moveItem(kStagingFolder, kWorkArea); !moved) {
+    setError(error, moved.error());
+    log.message("%s|Can't move staging area");
+    return Takeover::failed;
+  }
+  return Takeover::taken;
+}
+
+std::vector<std::string> identifiersToRemove(const plist::Array& todoList, const PlugInLog& log) {
+  std::vector<std::string> identifiers;
+  identifiers.reserve(8);
+  for (const plist::Value& entry : todoList) {
+    const plist::Value* identifier = entry.find(todo::kIdentifier);
+    if (!isValidBundleIdentifier(identifier) || !entryHas(entry, todo::kOperation, todo::kRemove)) continue;
+    log.message("%s|%{public}@ targeted for termination", *identifier);
+    identifiers.emplace_back(*identifier->string());
+  }
+  return identifiers;
+}
+
+void uninstall(platform::Platform& platform, const std::string& identifier, const PlugInLog& log) {
+  constexpr std::string_view kScenario = "Harvo Sync";
+  const Status uninstalled = platform.defaultRegistry().uninstallApplication(identifier);
+  if (!uninstalled) log.error("%s|Uninstall of %{public}@ failed.", identifier);
+  platform.transactionLog().logScenario(kScenario, 0, uninstalled.ok(), identifier,
+                                        uninstalled ? "Uninstall succeeded" : "Uninstall failed");
+}
+
+void sendIconLayout(platform::Platform& platform, const PlugInLog& log) {
+  const auto layout = platform.fileSystem().readFile(kIconLayoutPath);
+  if (!layout || layout->empty()) return;
+  log.message("%s|Sending iconlayout to SV");
+  platform::HomeScreenService& homeScreen = platform.homeScreen();
+  homeScreen.setIconState(homeScreen.blockableServerPort(), *layout);
+}
+
+/// Kept for whoever has to find out what the host asked for.
+void writeDebugCopy(platform::FileSystem& files, plist::Array todoList) {
+  const auto bytes = plist::writeBinary(std::move(todoList));
+  if (bytes) files.writeFileAtomically(kTodoListDebugPath, *bytes).ignore();
+}
+
+}  // namespace
+
+bool AppsClient::reconcileSync(const platform::Assets&, std::string_view newAnchor, const platform::ProgressCallback&,
+                               ErrorSlot error) {
+  _log.message("%s|starting to reconcile sync with new anchor %{public}@", newAnchor);
+  const Takeover takeover = takeOverStagingFolder(_platform.fileSystem(), _log, error);
+  if (takeover == Takeover::taken) {
+    const bool removalAllowed = _appRemovalAllowed();
+    auto todoList = _loadPlist(_platform, kTodoListPath, error);
+    if (todoList) {
+      _removeApps(*todoList, removalAllowed);
+    } else {
+      _log.message("%s|Nothing to do from Harvo");
+    }
+    _notifySolvary(_platform, true);
+    sendIconLayout(_platform, _log);
+    if (todoList) writeDebugCopy(_platform.fileSystem(), std::move(*todoList));
+  }
+  _log.message("%s|finished reconcile sync");
+  return takeover != Takeover::failed;
+}
+
+void AppsClient::_removeApps(const plist::Array& todoList, bool removalAllowed) {
+  if (!removalAllowed) {
+    _log.message("%s|Not processing deletes because app removal is restricted");
+    return;
+  }
+  const auto identifiers = identifiersToRemove(todoList, _log);
+  if (identifiers.empty()) return;
+  _log.message("%s|performing %llu deletions", identifiers.size());
+  for (const std::string& identifier : identifiers)
+    uninstall(_platform, identifier, _log);
+}
+
+}  // namespace appsync

@@ -1,0 +1,30 @@
+#include "core/TodoList.h"
+
+#include <algorithm>
+
+#include "core/PropertyListAccess.h"
+#include "core/SyncFiles.h"
+
+namespace appsync {
+
+const plist::Value* firstEntry(const plist::Array& list, std::string_view identifier) {
+  const auto found = std::find_if(list.begin(), list.end(), [identifier](const plist::Value& entry) {
+    return entryHas(entry, todo::kIdentifier, identifier);
+  });
+  return found == list.end() ? nullptr : &*found;
+}
+
+TodoIndex::TodoIndex(const std::optional<plist::Array>& list) {
+  if (!list) return;
+  first_.reserve(list->size());
+  for (const plist::Value& entry : *list) {
+    if (const auto identifier = stringIn(entry.find(todo::kIdentifier))) first_.emplace(*identifier, &entry);
+  }
+}
+
+const plist::Value* TodoIndex::firstEntry(std::string_view identifier) const {
+  const auto found = first_.find(identifier);
+  return found == first_.end() ? nullptr : found->second;
+}
+
+}  // namespace appsync

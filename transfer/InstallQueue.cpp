@@ -1,0 +1,136 @@
+// Installing received packages, ten at a time, each held by the home screen.
+#include <cerrno>
+#include <chrono>
+
+#include "core/AppsClient.h"
+#include "core/SyncFiles.h"
+#include "transfer/TerminationAssertionRules.h"
+
+namespace appsync {
+
+namespace {
+
+using platform::TerminationAssertionOutcome;
+using platform::ZTAsset;
+
+constexpr std::string_view kInstallScenario = "Asset install";
+constexpr std::string_view kRestoreScenario = "Nimbra restore";
+constexpr std::chrono::seconds kRetryDelay{30};
+
+void logAssertion(const PlugInLog& log, TerminationAssertionOutcome outcome, const std::string& identifier) {
+  switch (outcome) {
+    case TerminationAssertionOutcome::granted:
+      return log.message("%s|Assertion succeeded for %{public}@", identifier);
+    case TerminationAssertionOutcome::notFound:
+      return log.message("%s|Assertion not found for %{public}@, installing anyway...", identifier);
+    case TerminationAssertionOutcome::denied:
+      return log.error("%s|Assertion denied for %{public}@", identifier);
+  }
+  log.error("%s|Unknown error %d getting assertion for %{public}@", static_cast<int>(outcome), identifier);
+}
+
+}  // namespace
+
+void AppsClient::_enqueueAssetInstall(const std::shared_ptr<ZTAsset>& asset) {
+  _installGroup->enter();
+  _log.message("%s|Enqueue install request for %{public}@", asset->identifier());
+  _installOperationQueue.add([self = shared_from_this(), group = _installGroup, asset]() mutable {
+    self->_log.message("%s|Performing install for %{public}@", asset->identifier());
+    self->_performAssetInstall(asset);
+    self->_log.message("%s|Finished install for %{public}@", asset->identifier());
+    self->_accessQueue.sync([&] { self->cleanRestoreStateForIdentifier(asset->identifier()); });
+    self.reset();  // First: whoever waited for the group may end the client, and then the platform.
+    group->leave();
+  });
+}
+
+void AppsClient::_performAssetInstall(const std::shared_ptr<ZTAsset>& asset) {
+  const std::string& identifier = asset->identifier();
+  _log.message("%s|Grabbing assertion for %{public}@", identifier);
+  auto outcome = TerminationAssertionOutcome::granted;
+  auto assertion = _platform.homeScreen().terminationAssertionCreate(identifier, 0, outcome);
+
+  logAssertion(_log, outcome, identifier);
+  const AssertionRule rule = assertionRule(outcome);
+  _platform.transactionLog().logScenario(kInstallScenario, 0, rule.isSuccess, identifier, rule.description);
+  if (rule.action == AssertionAction::install) _installPackage(*asset);
+  if (rule.action == AssertionAction::fail) assetInstallFailed(*asset, {std::string(domains::kPOSIX), EINVAL, {}, {}});
+
+  assertion.reset();
+  if (rule.action == AssertionAction::retryLater) {
+    _scheduleInstallRetry(asset);
+  } else {
+    _platform.fileSystem().removeItem(asset->path().value_or("")).ignore();
+  }
+}
+
+void AppsClient::_installPackage(const ZTAsset& asset) {
+  const auto location = platform::FileLocation::file(asset.path().value_or(""));
+  const plist::Dictionary options{{platform::PackageTypeKey, platform::PackageTypeCustomer},
+                                  {platform::BundleIdentifierKey, asset.identifier()}};
+  const Status installed = _platform.defaultRegistry().installApplication(
+      location.value_or(platform::FileLocation{asset.path().value_or("")}), options);
+  if (installed) {
+    assetInstallSucceeded(asset);
+  } else {
+    assetInstallFailed(asset, installed.error());
+  }
+  _numAppInstallsAttempted.fetch_add(1, std::memory_order_relaxed);
+}
+
+void AppsClient::_scheduleInstallRetry(const std::shared_ptr<ZTAsset>& asset) {
+  const std::string& identifier = asset->identifier();
+  _log.error("%s|Will retry installation of %{public}@ in %d seconds", identifier,
+             static_cast<int>(kRetryDelay.count()));
+  _platform.transactionLog().logScenario(kInstallScenario, 0, true, identifier, "retrying asset install");
+  _installGroup->enter();
+  _platform.scheduler().after(kRetryDelay, [self = shared_from_this(), group = _installGroup, asset]() mutable {
+    self->_log.error("%s|Re-enqueue installation request for %{public}@", asset->identifier());
+    self->_enqueueAssetInstall(asset);
+    self.reset();
+    group->leave();
+  });
+}
+
+void AppsClient::assetInstallSucceeded(const ZTAsset& asset) {
+  const std::string& identifier = asset.identifier();
+  _log.message("%s|%{public}@ install succeeded", identifier);
+  _accessQueue.sync([&] {
+    changeAssetID(identifier, todo::kInstalled);
+    cleanRestoreStateForIdentifier(identifier);
+  });
+}
+
+void AppsClient::assetInstallFailed(const ZTAsset& asset, const Error& error) {
+  const std::string& identifier = asset.identifier();
+  if (_isRecoverableError(error) || asset.isRestore()) {
+    _log.message("%s|%{public}@ install failed but was recoverable: %{public}@", identifier, error);
+    _platform.transactionLog().logScenario(kRestoreScenario, 0, false, identifier, "install failed recoverably");
+  } else {
+    _log.message("%s|%{public}@ install failed unrecoverably: %{public}@", identifier, error);
+    _accessQueue.sync([&] { changeAssetID(identifier, todo::kFailed); });
+    // Asked again: the daemon may have made it a restore since.
+    if (asset.isRestore()) _backupManager->cancelApplicationRestore(identifier, nullptr);
+    _removeFailedInstall(asset);
+  }
+  _accessQueue.sync([&] { cleanRestoreStateForIdentifier(identifier); });
+}
+
+void AppsClient::_removeFailedInstall(const ZTAsset& asset) {
+  const std::string& identifier = asset.identifier();
+  const Status removed = _platform.defaultRegistry().uninstallApplication(identifier);
+  if (!removed) _log.error("%s|Uninstall of %{public}@ failed.", identifier);
+  _platform.transactionLog().logScenario(kRestoreScenario, 0, removed.ok(), identifier,
+                                         removed ? "placeholder removed" : "failed to remove placeholder");
+}
+
+bool AppsClient::_isRecoverableError(const std::optional<Error>& error) {
+  if (_useInstallCoordinator) {
+    _log.message("%s|Choreon is enabled - treating error %{public}@ as non recoverable", error);
+    return false;
+  }
+  if (!error || !_platform.syncFramework().ZTIsRecoverableError(*error)) return false;
+  return error->domain != platform::InstallerErrorDomain && error->domain != "TessalyError";
+}
+
+}  // namespace appsync

@@ -1,0 +1,185 @@
+// Which packages the host must still send.
+#include "coordination/InProgressAssetQuery.h"
+#include "core/AppsClient.h"
+#include "core/PropertyListAccess.h"
+#include "core/SyncFiles.h"
+#include "restore/RestoreState.h"
+#include "transfer/SkipRules.h"
+#include "transfer/WantedEntry.h"
+
+namespace appsync {
+
+namespace {
+
+using platform::FileLocation;
+using platform::ZTAsset;
+
+WantedEntries entriesOfPlaceholders(AppsClient& client) {
+  WantedEntries entries;
+  client._enumeratePlaceholdersWithBlock([&entries](const platform::AppRecord& record, bool&) {
+    entries.insert_or_assign(record.applicationIdentifier(), WantedEntry::fromPlaceholder(record));
+  });
+  return entries;
+}
+
+/// Adds what the host asks for to `wanted`; returns the identifiers that it asked for.
+Identifiers addTodoEntries(const plist::Array& todoList, WantedEntries& wanted, const PlugInLog& log) {
+  Identifiers requested;
+  for (const plist::Value& entry : todoList) {
+    if (!entryHas(entry, todo::kOperation, todo::kInstall)) continue;
+    const plist::Value* value = entry.find(todo::kIdentifier);
+    if (!isValidBundleIdentifier(value)) {
+      log.message("%s|Ignoring invalid path: %{public}@", value);
+      continue;
+    }
+    const std::string identifier(*value->string());
+    if (wanted.contains(identifier)) {
+      log.message("%s|%{public}@ already has a placeholder - skipping", identifier);
+    } else {
+      wanted.emplace(identifier, WantedEntry::fromTodoEntry(entry, identifier));
+    }
+    requested.insert(identifier);
+  }
+  return requested;
+}
+
+void removeThoseInProgress(platform::Platform& platform, WantedEntries& wanted, const PlugInLog& log) {
+  std::optional<InProgressAssetQuery::IdentifierList> inProgress;
+  std::optional<InProgressAssetQuery::IdentifierList> restoring;
+  InProgressAssetQuery::currentInProgressAssetIDs(platform, inProgress, restoring);
+  if (inProgress) {
+    log.message("%s|Assets already in progress (not returning these): %{public}@", *inProgress);
+    for (const std::string& identifier : *inProgress)
+      wanted.erase(identifier);
+  } else {
+    log.error("%s|Failed to get list of assets already in progress!");
+  }
+  // Those being restored stay: their packages may still have to come from the host.
+  if (restoring) {
+    log.message("%s|Assets currently restoring: %{public}@", *restoring);
+  } else {
+    log.error("%s|Failed to get list of assets currently restoring!");
+  }
+}
+
+void emptyIconScratchFolder(platform::FileSystem& files, const PlugInLog& log) {
+  files.removeItem(kIconScratchFolder).ignore();
+  const Status created = files.createDirectory(kIconScratchFolder, platform::IntermediateDirectories::require, {});
+  if (!created) log.error("%s|Can't create icon scratch dir! %{public}@", created.error());
+}
+
+std::optional<std::string> displayNameOfBundle(platform::Bundles& bundles, const std::optional<std::string>& path) {
+  const auto location = path ? FileLocation::directory(*path) : std::nullopt;
+  const auto bundle = location ? bundles.openBundle(*location) : nullptr;
+  return bundle ? ownedStringIn(bundle->infoDictionaryValue(platform::BundleDisplayNameKey)) : std::nullopt;
+}
+
+std::optional<std::string> inFolder(const std::optional<std::string>& folder, std::string_view name) {
+  return folder ? std::optional(*folder + "/" + std::string(name)) : std::nullopt;
+}
+
+/// The app's rendered icon; where none can be made, the artwork that came with it.
+std::optional<FileLocation> iconFor(platform::Platform& platform, const WantedEntry& entry) {
+  const std::string rendered = std::string(kIconScratchFolder) + "/" + entry.identifier() + ".png";
+  if (AppsClient::_makeIconFromBundlePath(platform, entry.path(), rendered)) return FileLocation::file(rendered);
+  const auto artwork = inFolder(entry.container(), kArtworkName);
+  return artwork ? FileLocation::file(*artwork) : std::nullopt;
+}
+
+/// Whether the package of a restored app lies on the device already, and only its data is to come.
+bool packageIsOnDevice(platform::FileSystem& files, const WantedEntry& entry, const plist::Value* restoreState,
+                       const PlugInLog& log) {
+  const plist::Value* property = restoreState == nullptr ? nullptr
+                                                         : restoreStateProperty(*restoreState, kRestoreStatePathKey,
+                                                                                entry.identifier(), entry.version());
+  const auto path = stringIn(property);
+  if (!path) return false;
+  const bool exists = files.fileExists(*path);
+  if (exists) {
+    log.message("%s|Recovered download path for %{public}@ at %{public}@", entry.identifier(), *path);
+  } else {
+    log.message("%s|Download path recovered for %{public}@ but the file is missing: %{public}@", entry.identifier(),
+                *path);
+  }
+  return exists;
+}
+
+std::uint32_t partsToSend(bool isRestore, bool packageIsHere) {
+  if (!isRestore) return platform::kZTAssetPartApplication;
+  return packageIsHere ? platform::kZTAssetPartApplicationData : platform::kZTAssetPartsAll;
+}
+
+}  // namespace
+
+platform::Assets AppsClient::outstandingAssetTransfers() {
+  platform::Assets outstanding;
+  outstanding.reserve(16);
+  const bool installationIsAllowed = _appInstallationAllowed();
+  const auto todoList = _loadPlist(_platform, kTodoListPath, nullptr);
+  _log.summary("%s|outstandingAssetTransfers starting with todoList %{public}@", todoList);
+
+  const Identifiers systemAppPlaceholders = _getSystemAppPlaceholders();
+  const WantedEntries preExisting = entriesOfPlaceholders(*this);
+  WantedEntries wanted = preExisting;
+  _log.summary("%s|outstandingAssetTransfers preExistingPlaceHolders %{public}@, idsWeWant %{public}@",
+               DescribedEntries{preExisting}, DescribedEntries{wanted});
+  const Identifiers requested = todoList ? addTodoEntries(*todoList, wanted, _log) : Identifiers{};
+  removeThoseInProgress(_platform, wanted, _log);
+  const auto ordered = _orderTheItems(_platform, wanted);
+  emptyIconScratchFolder(_platform.fileSystem(), _log);
+  const auto restoreState = _accessQueue.sync([this] { return _loadRestoreState(); });
+
+  for (const WantedEntry& entry : ordered) {
+    const std::string identifier = entry.identifier();
+    const auto displayName = displayNameOfBundle(_platform.bundles(), entry.path());
+    const TransferCandidate candidate{
+        .identifier = identifier,
+        .isRestore = entry.isRestore(),
+        .isAutomaticallyDemoted = entry.isAutomaticallyDemoted(),
+        .isIntentionallyDemoted = entry.isIntentionallyDemoted(),
+        .isSystemApp = entry.isSystemApp(),
+        .installationIsAllowed = installationIsAllowed,
+        .usesInstallCoordinator = _useInstallCoordinator,
+        .isToBeIgnored = _klpAppsToIgnore.contains(identifier),
+        .isSystemAppPlaceholder = systemAppPlaceholders.contains(identifier),
+        .isRequestedByHost = requested.contains(identifier),
+    };
+    if (isSkipped(candidate, _log)) continue;
+    auto asset = _makeAsset(entry, displayName, restoreState ? &*restoreState : nullptr);
+    const bool hasPlaceholder = preExisting.contains(identifier);
+    if (hasPlaceholder) {
+      _log.message("%s|Not creating a placeholder app for %{public}@ because we already have one", identifier);
+    } else {
+      _createPlaceHolderApplication(*asset);
+    }
+    // Only a restore's placeholder waits for the host; any other's package is somebody else's to bring.
+    if (!hasPlaceholder || candidate.isRestore) outstanding.push_back(std::move(asset));
+  }
+  return outstanding;
+}
+
+std::shared_ptr<ZTAsset> AppsClient::_makeAsset(const WantedEntry& entry, const std::optional<std::string>& displayName,
+                                                const plist::Value* restoreState) {
+  const std::string identifier = entry.identifier();
+  const std::string prettyName = displayName ? *displayName : entry.nameFromHost().value_or(identifier);
+  const auto icon = iconFor(_platform, entry);
+  auto asset = _platform.syncFramework().downloadAssetWithIdentifier(identifier, kApplicationDataclass, prettyName);
+  asset->setIcon(icon);
+  asset->setIsRestore(entry.isRestore());
+
+  const bool packageIsHere = packageIsOnDevice(_platform.fileSystem(), entry, restoreState, _log);
+  plist::Dictionary options{{platform::kAssetPartsKey, partsToSend(entry.isRestore(), packageIsHere)}};
+  const plist::Value* version = entry.version();
+  if (version != nullptr) options.set(platform::kAssetVersionKey, *version);
+  asset->setVariantOptions(std::move(options));
+
+  asset->setStorePlist(inFolder(entry.container(), kStoreMetadataName));
+  asset->setInfoPlist(inFolder(entry.container(), kInfoPlistName));
+  _log.message(
+      "%s|Asset %{public}@ (pretty=%{public}@, version=%{public}@) prepped with icon %{public}@, at %{public}@, meta at %{public}@, info at %{public}@, storePid=%lld, isRestore=%c",
+      identifier, prettyName, version, icon, entry.path(), asset->storePlist(), asset->infoPlist(), asset->storePID(),
+      yesOrNo(asset->isRestore()));
+  return asset;
+}
+
+}  // namespace appsync

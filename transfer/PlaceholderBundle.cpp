@@ -1,0 +1,121 @@
+// Placeholder apps: bundles on disk with a name, a version and an icon, but no code.
+#include "core/AppsClient.h"
+#include "core/PropertyListAccess.h"
+#include "core/SyncFiles.h"
+#include "transfer/PlaceholderInfo.h"
+
+namespace appsync {
+
+namespace {
+
+using platform::FileLocation;
+using platform::TSInstallType;
+
+const platform::OwnerAttributes kMobileOwner{"mobile", "mobile"};
+
+/// The dictionary in that file; null when there is none.
+plist::Value readDictionary(platform::FileSystem& files, const std::optional<std::string>& path) {
+  const auto bytes = files.readFile(path.value_or(""));
+  auto root = bytes ? plist::read(*bytes) : plist::Value();
+  return root && root->dictionary() != nullptr ? std::move(root).value() : plist::Value();
+}
+
+PlaceholderInfo describePlaceholder(const platform::ZTAsset& asset, const plist::Value& hostInfo) {
+  const plist::Value* isPeriodical = hostInfo.find(kPeriodicalKey);
+  return {.bundleIdentifier = asset.identifier(),
+          .version = asset.variantOptions().find(platform::kAssetVersionKey),
+          .displayName = asset.prettyName().value_or(""),
+          .isPeriodical = isPeriodical == nullptr ? plist::Value(false) : *isPeriodical,
+          .isLaunchProhibited = booleanIn(hostInfo.find(kLaunchProhibitedKey))};
+}
+
+Status writeInfo(platform::FileSystem& files, const std::string& path, const plist::Value& info) {
+  const auto bytes = plist::writeXML(info);
+  return bytes ? files.writeFileAtomically(path, *bytes) : Status(bytes.error());
+}
+
+}  // namespace
+
+std::string AppsClient::placeholderAppPathForBundleIdentifier(std::string_view bundleIdentifier) {
+  return _platform.fileSystem().temporaryDirectory() + "/com.corvel.zeph.Apps/" + std::string(bundleIdentifier) +
+         ".app";
+}
+
+bool AppsClient::createPlaceHolderPath(std::string_view path, std::string_view bundleIdentifier,
+                                       const platform::OwnerAttributes& attributes) {
+  const Status created =
+      _platform.fileSystem().createDirectory(path, platform::IntermediateDirectories::create, attributes);
+  if (!created) {
+    // The scenario names a restore whoever asks: readers of the log look for it there.
+    _platform.transactionLog().logScenario("Harvo App Restore", 0, false, bundleIdentifier,
+                                           "Failed to create app directory");
+  }
+  _log.message("%s|Created app directory for '%{public}@' at %{public}@ with err=%{public}@", bundleIdentifier, path,
+               created.failure());
+  return created.ok();
+}
+
+bool AppsClient::writeIconData(const std::optional<ByteView>& icon, std::string_view path, std::uint64_t* fileSize,
+                               std::string_view bundleIdentifier, const platform::OwnerAttributes& attributes) {
+  if (!icon) {
+    _log.error("%s|no icon data for '%{public}@'", bundleIdentifier);
+    return false;
+  }
+  platform::FileSystem& files = _platform.fileSystem();
+  const bool created = files.createFile(path, *icon, attributes).ok();
+  std::uint64_t size = 0;
+  if (created) {
+    if (const auto written = files.attributesOfItem(path)) {
+      size = written->size;
+      if (fileSize != nullptr) *fileSize = size;
+    }
+  }
+  _log.message("%s|icon data for '%{public}@' was writen to %{public}@ with status:%d fileSize:%llu", bundleIdentifier,
+               path, created, size);
+  return created;
+}
+
+void AppsClient::_createPlaceHolderApplication(const platform::ZTAsset& asset) {
+  const std::string& identifier = asset.identifier();
+  platform::FileSystem& files = _platform.fileSystem();
+  _log.message("%s|plist %{public}@", asset.infoPlist());
+  const PlaceholderInfo placeholder = describePlaceholder(asset, readDictionary(files, asset.infoPlist()));
+  if (placeholder.displayName.empty() || identifier.empty()) return;
+
+  const std::string folder = placeholderAppPathForBundleIdentifier(identifier);
+  if (!createPlaceHolderPath(folder, identifier, kMobileOwner)) return;
+  if (asset.icon()) {
+    const std::string icon = folder + "/" + std::string(kPlaceholderIconName);
+    const Status copied = files.copyItem(asset.icon()->path, icon);
+    if (!copied) {
+      _log.error("%s|Copying icon from %{public}@ to %{public}@ failed: %{public}@", asset.icon()->path, icon,
+                 copied.error());
+    }
+  }
+  const plist::Value info = placeholder.dictionary();
+  if (!writeInfo(files, folder + "/" + std::string(kInfoPlistName), info)) return;
+  _log.message("%s|creating placeholder for '%{public}@'. info.plist=%{public}@", identifier, info);
+  _installPlaceholder(folder, placeholder);
+}
+
+void AppsClient::_installPlaceholder(const std::string& folder, const PlaceholderInfo& placeholder) {
+  constexpr std::string_view kScenario = "Install placeholder";
+  const std::string& identifier = placeholder.bundleIdentifier;
+  const Status installed = _platform.defaultRegistry().installApplication(
+      FileLocation{folder, true}, {{platform::PackageTypeKey, platform::PackageTypePlaceholder},
+                                   {platform::BundleIdentifierKey, identifier},
+                                   {platform::InstallTypeKey, static_cast<std::uint64_t>(TSInstallType::Sync)}});
+  if (installed) {
+    _log.message(
+        "%s|Installed Placeholder app from path %{public}@: %{public}@ [%{public}@ %{public}@] [isPeriodix: %{public}@]",
+        folder, placeholder.displayName, identifier, placeholder.version, placeholder.isPeriodical);
+  } else {
+    _log.error(
+        "%s|Placeholder app install failed from path %{public}@: %{public}@ [%{public}@ %{public}@] [isPeriodix: %{public}@]",
+        folder, placeholder.displayName, identifier, placeholder.version, placeholder.isPeriodical);
+  }
+  _platform.transactionLog().logScenario(kScenario, 0, installed.ok(), identifier,
+                                         installed ? "Installed placeholder" : "Failed to install placeholder");
+}
+
+}  // namespace appsync

@@ -1,0 +1,153 @@
+// What becomes of a package while the host sends it and once it has come, or failed to.
+#include <algorithm>
+#include <cmath>
+#include <limits>
+
+#include "core/AppsClient.h"
+#include "core/PropertyListAccess.h"
+#include "core/SyncFiles.h"
+#include "restore/RestoreState.h"
+
+namespace appsync {
+
+namespace {
+
+using platform::InstallProgress;
+using platform::TSInstallPhase;
+using platform::TSInstallState;
+using platform::ZTAsset;
+
+/// A transfer's progress is always shown out of this many units.
+constexpr std::int64_t kTransferUnits = 1000;
+
+std::int64_t completedUnits(double fraction) {
+  const double units = fraction * static_cast<double>(kTransferUnits);
+  const auto largest = static_cast<double>(std::numeric_limits<std::int32_t>::max());
+  return std::isnan(units) ? 0 : static_cast<std::int64_t>(std::clamp(units, -largest, largest));
+}
+
+void showTransfer(InstallProgress& progress, double fraction) {
+  progress.setInstallState(TSInstallState::Active);
+  if (progress.totalUnitCount() != kTransferUnits) progress.setTotalUnitCount(kTransferUnits);
+  progress.setCompletedUnitCount(completedUnits(fraction));
+}
+
+const plist::Value* versionOf(const ZTAsset& asset) {
+  return asset.variantOptions().find(platform::kAssetVersionKey);
+}
+
+}  // namespace
+
+std::shared_ptr<InstallProgress> AppsClient::_progressForAssetIdentifier(std::string_view identifier) {
+  if (_useInstallCoordinator) {
+    _log.message("%s|Not returning a progress object for %{public}@ because install coordination is enabled",
+                 identifier);
+    return nullptr;
+  }
+  platform::AppRegistry& registry = _platform.defaultRegistry();
+  const auto record = registry.recordForIdentifier(identifier, platform::PlaceholderLookup::on);
+  auto progress = record ? registry.installProgressForApplication(*record, TSInstallPhase::Loading) : nullptr;
+  _log.error("%s|Returning %{public}@ progress for %{public}@", progress, identifier);
+  return progress;
+}
+
+void AppsClient::assetTransferUpdatedProgress(const std::shared_ptr<ZTAsset>& asset, double fraction) {
+  const std::string& identifier = asset->identifier();
+  _log.message("%s|finished transferring %lf for %{public}@", fraction, identifier);
+  if (const auto progress = _progressForAssetIdentifier(identifier)) showTransfer(*progress, fraction);
+  _outstandingDCXTransfers.insert(identifier);
+}
+
+void AppsClient::assetTransferSucceeded(const std::shared_ptr<ZTAsset>& asset, bool succeeded,
+                                        const std::optional<Error>& error) {
+  const std::string& identifier = asset->identifier();
+  const bool isExistingApp = _accessQueue.sync([&] {
+    _userCancelledApps.erase(identifier);
+    return _updatingApps.erase(identifier) > 0;
+  });
+  _outstandingDCXTransfers.erase(identifier);
+  _log.message("%s|transfer for asset %{public}@ ended with success %c error %{public}@ existingApp:%d", identifier,
+               yesOrNo(succeeded), error, isExistingApp);
+  const auto progress = _progressForAssetIdentifier(identifier);
+  if (succeeded) {
+    _handleReceivedAsset(asset, progress.get());
+  } else {
+    _handleFailedTransfer(*asset, error, progress.get());
+  }
+}
+
+void AppsClient::_handleReceivedAsset(const std::shared_ptr<ZTAsset>& asset, InstallProgress* progress) {
+  const std::string& identifier = asset->identifier();
+  _log.message("%s|asset transfer succeeded for %{public}@", asset->shortDescription());
+  if (progress != nullptr) _platform.defaultRegistry().installPhaseFinishedForProgress(*progress);
+
+  const auto path = _receivedPath(*asset);
+  if (const auto text = stringIn(path ? &*path : nullptr)) asset->setPath(std::string(*text));
+  if (!isValidBundleIdentifier(path ? &*path : nullptr)) {
+    _log.message("%s|Ignoring invalid path: %{public}@", path);
+    return;
+  }
+  if (!asset->isDownload()) {
+    _accessQueue.sync([&] { changeAssetID(identifier, todo::kSent); });
+    return;
+  }
+  _log.message("%s|Received file at %{public}@", asset->path());
+  _accessQueue.sync([&] { changeAssetID(identifier, todo::kDownloaded); });
+  if (asset->isRestore()) {
+    _handleReceivedRestoreAsset(asset, progress);
+  } else {
+    _log.message("%s|Installing synced asset %{public}@", identifier);
+    _enqueueAssetInstall(asset);
+  }
+}
+
+/// Where the package lies: the asset's own path made absolute, or the one that an earlier transfer of it left.
+std::optional<plist::Value> AppsClient::_receivedPath(const ZTAsset& asset) {
+  if (asset.path().value_or("").empty()) {
+    return _accessQueue.sync(
+        [&] { return _restoreStatePropertyForKey(kRestoreStatePathKey, asset.identifier(), versionOf(asset)); });
+  }
+  if (asset.path()->starts_with('/')) return *asset.path();
+  return std::string(kPublicStaging) + "/" + *asset.path();
+}
+
+void AppsClient::_handleReceivedRestoreAsset(const std::shared_ptr<ZTAsset>& asset, InstallProgress* progress) {
+  const std::string& identifier = asset->identifier();
+  if (asset->completedAssetParts() == platform::kZTAssetPartApplicationData) {
+    _enqueueAssetInstall(asset);  // The package has waited for its data; it lies where the restore state says.
+    return;
+  }
+  if (!_backupManager->restoreDataExists(identifier, nullptr)) {
+    _log.message("%s|No restore data exists for %{public}@", identifier);
+    _enqueueAssetInstall(asset);
+    return;
+  }
+  _log.message("%s|Restore data exists for %{public}@", identifier);
+  if (progress != nullptr) progress->setInstallPhase(TSInstallPhase::RestoringData);
+  _accessQueue.sync(
+      [&] { _setRestoreStatePropertyValue(*asset->path(), kRestoreStatePathKey, identifier, versionOf(*asset)); });
+}
+
+void AppsClient::_handleFailedTransfer(const ZTAsset& asset, const std::optional<Error>& error,
+                                       InstallProgress* progress) {
+  const std::string& identifier = asset.identifier();
+  const bool isRecoverable = _isRecoverableError(error);
+  _log.message("%s|failed to transfer asset %{public}@. err=%{public}@, recoverable=%d", asset.shortDescription(),
+               error, isRecoverable);
+  if (isRecoverable) {
+    if (progress != nullptr) progress->setInstallState(TSInstallState::Failed);
+    return;
+  }
+  platform::AppRegistry& registry = _platform.defaultRegistry();
+  if (!registry.applicationIsInstalled(identifier) || asset.isRestore()) return;
+
+  if (progress != nullptr && progress->installState() < TSInstallState::Canceled) progress->cancel();
+  _log.message("%s|Uninstalling placeholder %{public}@", identifier);
+  // Asked again: the daemon may have made it a restore since.
+  if (asset.isRestore()) _backupManager->cancelApplicationRestore(identifier, nullptr);
+  const Status uninstalled =
+      registry.uninstallApplication(identifier, {{platform::UninstallPlaceholdersOnlyKey, true}});
+  _log.message("%s|Uninstalling app using TS %{public}@ %s", identifier, uninstalled ? "secceeded" : "failed");
+}
+
+}  // namespace appsync
