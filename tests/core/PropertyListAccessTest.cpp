@@ -1,0 +1,52 @@
+// Small questions to property lists that come from outside.
+#include <optional>
+#include <string>
+#include <vector>
+
+#include <gtest/gtest.h>
+
+#include "core/PropertyListAccess.h"
+
+namespace appsync::test {
+
+TEST(PropertyListAccess, OnlyAStringGivesText) {
+  const plist::Value text("com.a");
+  EXPECT_EQ(stringIn(&text), "com.a");
+  EXPECT_EQ(ownedStringIn(&text), "com.a");
+  EXPECT_EQ(stringIn(nullptr), std::nullopt);
+  EXPECT_EQ(ownedStringIn(nullptr), std::nullopt);
+  for (const plist::Value& other : {plist::Value(), plist::Value(7), plist::Value(plist::Array{"com.a"})}) {
+    EXPECT_EQ(stringIn(&other), std::nullopt);
+    EXPECT_EQ(ownedStringIn(&other), std::nullopt);
+  }
+}
+
+TEST(PropertyListAccess, BooleansNumbersAndTrueWordsAreTrue) {
+  for (const plist::Value& value : {plist::Value(true), plist::Value(1), plist::Value(-0.5), plist::Value("yes"),
+                                    plist::Value("True"), plist::Value("12")})
+    EXPECT_TRUE(booleanIn(&value));
+}
+
+TEST(PropertyListAccess, EverythingElseIsFalse) {
+  EXPECT_FALSE(booleanIn(nullptr));
+  for (const plist::Value& value :
+       {plist::Value(), plist::Value(false), plist::Value(0), plist::Value("no"), plist::Value(""),
+        plist::Value(plist::Array{true}), plist::Value(plist::Date{1}), plist::Value::data(bytesOf("yes"))})
+    EXPECT_FALSE(booleanIn(&value));
+}
+
+TEST(PropertyListAccess, AnEntryHasExactlyTheTextItHas) {
+  const plist::Value entry(plist::Dictionary{{"operation", "remove"}, {"number", 7}});
+  EXPECT_TRUE(entryHas(entry, "operation", "remove"));
+  EXPECT_FALSE(entryHas(entry, "operation", "Remove"));
+  EXPECT_FALSE(entryHas(entry, "number", "7"));
+  EXPECT_FALSE(entryHas(entry, "absent", ""));
+  EXPECT_FALSE(entryHas("operation", "operation", "remove"));
+}
+
+TEST(PropertyListAccess, KeysComeInTheirOrder) {
+  EXPECT_EQ(keysOf({{"b", 1}, {"a", 2}, {"", 3}}), (std::vector<std::string>{"", "a", "b"}));
+  EXPECT_TRUE(keysOf({}).empty());
+}
+
+}  // namespace appsync::test

@@ -1,0 +1,69 @@
+// A log that keeps every line.
+#pragma once
+
+#include <map>
+#include <memory>
+#include <mutex>
+#include <ostream>
+#include <set>
+#include <string>
+#include <string_view>
+#include <utility>
+#include <vector>
+
+#include <gtest/gtest.h>
+
+#include "base/Log.h"
+
+namespace appsync::test {
+
+struct LogLine {
+  int category = 8;
+  LogLevel level = LogLevel::standard;
+  std::string text;
+  bool operator==(const LogLine&) const = default;
+};
+std::ostream& operator<<(std::ostream& out, const LogLine& line);
+
+using LogLines = std::vector<LogLine>;
+
+/// Lines of the plug-in as tests expect them: the text without the plug-in's identifier and bar.
+[[nodiscard]] LogLine logged(std::string_view text);                  ///< category 8, default level
+[[nodiscard]] LogLine loggedError(std::string_view text);             ///< category 8, error level
+[[nodiscard]] LogLine loggedIn(int category, std::string_view text);  ///< default level
+
+/// The categories of a sync framework's log; everything is enabled at first. Threads: any, also while lines are
+/// written.
+class RecordingLog {
+ public:
+  /// Made on first use; lives as long as the log.
+  [[nodiscard]] LogCategory& category(int number);
+
+  void enable(int category, LogLevel level);
+  void disable(int category, LogLevel level);
+
+  /// All lines, or those of a category, in order.
+  [[nodiscard]] LogLines lines() const;
+  [[nodiscard]] LogLines lines(int category) const;
+  /// The same as texts without the plug-in's identifier and bar.
+  [[nodiscard]] std::vector<std::string> messages() const;
+  [[nodiscard]] std::vector<std::string> messages(int category) const;
+  [[nodiscard]] bool contains(const LogLine& line) const;
+  void clear();
+
+ private:
+  class Category;
+
+  void write(int category, LogLevel level, std::string_view text);
+  [[nodiscard]] bool isEnabled(int category, LogLevel level) const;
+
+  mutable std::mutex mutex_;
+  std::map<int, std::unique_ptr<LogCategory>> categories_;
+  std::set<std::pair<int, LogLevel>> disabled_;
+  LogLines lines_;
+};
+
+/// Succeeds when both are equal, else shows what is missing and what is too much.
+[[nodiscard]] testing::AssertionResult sameLines(const LogLines& expected, const LogLines& actual);
+
+}  // namespace appsync::test

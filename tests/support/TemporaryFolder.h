@@ -1,0 +1,33 @@
+// A folder of this machine that lasts as long as a test needs it.
+#pragma once
+
+#include <filesystem>
+#include <string>
+#include <string_view>
+
+#include <stdlib.h>
+
+namespace appsync::test {
+
+/// Empty at first; removed with all that is in it.
+class TemporaryFolder {
+ public:
+  TemporaryFolder() : path_((std::filesystem::temp_directory_path() / "appsync-test.XXXXXX").string()) {
+    if (mkdtemp(path_.data()) == nullptr) path_.clear();
+  }
+  ~TemporaryFolder() {
+    std::error_code ignored;
+    if (!path_.empty()) std::filesystem::remove_all(path_, ignored);
+  }
+  TemporaryFolder(const TemporaryFolder&) = delete;
+  TemporaryFolder& operator=(const TemporaryFolder&) = delete;
+
+  [[nodiscard]] const std::string& path() const { return path_; }
+  /// The path of `name` in it.
+  [[nodiscard]] std::string path(std::string_view name) const { return path_ + "/" + std::string(name); }
+
+ private:
+  std::string path_;
+};
+
+}  // namespace appsync::test
