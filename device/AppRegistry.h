@@ -1,0 +1,77 @@
+// The device's register of apps.
+#pragma once
+
+#include <functional>
+#include <map>
+#include <memory>
+#include <mutex>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "device/Access.h"
+#include "device/AppRecord.h"
+#include "device/Installer.h"
+#include "device/RegistryObservers.h"
+#include "device/RunningInstalls.h"
+#include "platform/AppRegistry.h"
+
+namespace appsync::device {
+
+/// Walks are in the order in which apps came to the device; an update keeps an app's place.
+class AppRegistry final : public platform::AppRegistry {
+ public:
+  static constexpr const char* kSchema = app_table::kSchema;
+
+  /// Both must outlive the registry. With `Access::readOnly` progress is what another process stored last.
+  AppRegistry(Database& database, DeviceFileSystem& files, Access access);
+
+  void addObserver(platform::AppRegistryObserver& observer) override;
+  void removeObserver(platform::AppRegistryObserver& observer) override;
+  /// A registry that cannot be read knows no app.
+  [[nodiscard]] bool applicationIsInstalled(std::string_view bundleIdentifier) override;
+  [[nodiscard]] std::shared_ptr<const platform::AppRecord> recordForIdentifier(
+      std::string_view bundleIdentifier, platform::PlaceholderLookup placeholders) override;
+  void enumerateBundlesOfType(
+      platform::BundleKind kind,
+      const std::function<void(const platform::BundleRecord& bundle, bool& stop)>& visit) override;
+  [[nodiscard]] Status installApplication(const platform::FileLocation& location,
+                                          const plist::Dictionary& options) override;
+  [[nodiscard]] Status uninstallApplication(std::string_view bundleIdentifier,
+                                            const plist::Dictionary& options = {}) override;
+  [[nodiscard]] std::shared_ptr<platform::InstallProgress> installProgressForApplication(
+      const platform::AppRecord& record, platform::TSInstallPhase phase) override;
+  void installPhaseFinishedForProgress(platform::InstallProgress& progress) override;
+
+  /// `installApplication` for an app, or its placeholder, that is part of the system.
+  [[nodiscard]] Status installSystemApplication(const platform::FileLocation& location,
+                                                const plist::Dictionary& options);
+
+  /// A running install of the app comes before all others.
+  void prioritizeInstall(std::string_view bundleIdentifier) { running_->prioritize(bundleIdentifier); }
+
+  /// Why the app's latest `installApplication` in this process failed; none when it succeeded or there was none.
+  [[nodiscard]] std::optional<Error> lastInstallFailure(std::string_view bundleIdentifier);
+
+  /// Every app, in the order of walks.
+  [[nodiscard]] Result<std::vector<std::shared_ptr<const AppRecord>>> apps();
+
+  /// The licence data that the app, or its placeholder, was installed with.
+  [[nodiscard]] Result<std::optional<Bytes>> licenceData(std::string_view bundleIdentifier);
+
+ private:
+  [[nodiscard]] std::optional<AppRow> find(std::string_view bundleIdentifier);
+  [[nodiscard]] std::shared_ptr<const AppRecord> recordOf(AppRow row);
+
+  Database& database_;
+  const Access access_;
+  const std::shared_ptr<RunningInstalls> running_;
+  Installer installer_;
+  std::mutex failuresMutex_;
+  std::map<std::string, Error, std::less<>> failures_;
+  /// Destroyed first: until then its thread asks `running_`.
+  RegistryObservers observers_;
+};
+
+}  // namespace appsync::device

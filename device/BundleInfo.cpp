@@ -1,0 +1,69 @@
+#include "device/BundleInfo.h"
+
+#include "device/BundleIdentifier.h"
+#include "device/InstallerError.h"
+
+namespace appsync::device {
+
+namespace {
+
+constexpr std::string_view kAppExtension = ".app";
+
+std::optional<std::string> textUnder(const plist::Dictionary& dictionary, std::string_view key) {
+  const plist::Value* value = dictionary.find(key);
+  const auto text = value == nullptr ? std::nullopt : value->string();
+  if (!text) return std::nullopt;
+  return std::string(*text);
+}
+
+}  // namespace
+
+bool isAppFolder(std::string_view folder) {
+  return folder.size() > kAppExtension.size() && folder.ends_with(kAppExtension);
+}
+
+std::string_view appFolderStem(std::string_view folder) {
+  return folder.substr(0, folder.size() - kAppExtension.size());
+}
+
+bool isInfoFile(std::string_view path, std::string_view appFolder) {
+  return path.size() == appFolder.size() + 1 + kInfoFile.size() && path.starts_with(appFolder) &&
+         path[appFolder.size()] == '/' && path.ends_with(kInfoFile);
+}
+
+Error missingInfo(const std::string& appFolder) {
+  if (appFolder.empty()) {
+    return installerError(InstallerFailure::noApp, "the package holds no app; pack a folder \"Name.app\"");
+  }
+  return installerError(InstallerFailure::noApp, "the package's \"" + appFolder +
+                                                     "\" holds no Info.plist and is no app; add one and pack it again");
+}
+
+Result<BundleInfo> readBundleInfo(ByteView document) {
+  const Result<plist::Value> root = plist::read(document);
+  if (!root) {
+    Error error = installerError(InstallerFailure::badInfo,
+                                 "the app's Info.plist cannot be read: " + root.error().text + "; write it again");
+    error.underlying = std::make_shared<const Error>(root.error());
+    return error;
+  }
+  const plist::Dictionary* dictionary = root->dictionary();
+  if (dictionary == nullptr) {
+    return installerError(InstallerFailure::badInfo, "the app's Info.plist is no dictionary; write it again");
+  }
+  std::optional<std::string> identifier = textUnder(*dictionary, platform::BundleIdentifierKey);
+  if (!identifier) {
+    return installerError(InstallerFailure::badInfo,
+                          "the app's Info.plist names no " + std::string(platform::BundleIdentifierKey) + "; add one");
+  }
+  if (!isBundleIdentifier(*identifier)) {
+    return installerError(
+        InstallerFailure::badIdentifier,
+        "the app's bundle identifier \"" + *identifier +
+            "\" may have only letters, digits, '-', '.' and '_', at most 200 and no dot first; choose another");
+  }
+  return BundleInfo{*std::move(identifier), textUnder(*dictionary, platform::BundleVersionKey),
+                    textUnder(*dictionary, platform::BundleDisplayNameKey), *dictionary};
+}
+
+}  // namespace appsync::device

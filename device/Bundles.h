@@ -1,0 +1,35 @@
+// App bundles on the device's file system.
+#pragma once
+
+#include <memory>
+#include <optional>
+#include <string>
+
+#include "platform/Bundle.h"
+#include "platform/FileSystem.h"
+
+namespace appsync::device {
+
+/// Threads: any.
+class Bundles final : public platform::Bundles {
+ public:
+  /// The bundle of the daemon's own process.
+  static constexpr std::string_view kDaemonIdentifier = "com.corvel.zeph";
+
+  /// `fileSystem` must outlive this. `mainBundleIdentifier` is whose process this is; a tool that plays the daemon
+  /// leaves it as it is.
+  explicit Bundles(platform::FileSystem& fileSystem,
+                   std::optional<std::string> mainBundleIdentifier = std::string(kDaemonIdentifier))
+      : fileSystem_(fileSystem), mainBundleIdentifier_(std::move(mainBundleIdentifier)) {}
+
+  /// An "Info.plist" of more than `kMaximumMetadataBytes` counts as unusable.
+  [[nodiscard]] std::unique_ptr<platform::Bundle> openBundle(const platform::FileLocation& location) override;
+
+  [[nodiscard]] std::optional<std::string> mainBundleIdentifier() override { return mainBundleIdentifier_; }
+
+ private:
+  platform::FileSystem& fileSystem_;
+  const std::optional<std::string> mainBundleIdentifier_;
+};
+
+}  // namespace appsync::device

@@ -1,0 +1,159 @@
+#include "device/Device.h"
+
+#include <cerrno>
+#include <cstdint>
+#include <utility>
+
+#include <fcntl.h>
+#include <sys/stat.h>
+
+#include "device/DeviceFolder.h"
+#include "device/Recovery.h"
+#include "device/Step.h"
+#include "device/SystemCalls.h"
+
+namespace appsync::device {
+
+namespace {
+
+/// Marks the database file as a device's: "ASDV".
+constexpr std::int64_t kApplicationId = 0x41534456;
+/// Of the tables and of what lies in the root. Grows with each change that an older program could not cope with.
+constexpr std::int64_t kLayoutVersion = 1;
+
+Result<std::int64_t> readNumber(Database& database, std::string_view pragma) {
+  Database::Session session(database);
+  Statement query = session.prepare(pragma);
+  if (query.next()) return query.integer(0);
+  return query.status() ? std::int64_t{0} : Result<std::int64_t>(query.status().error());
+}
+
+/// Makes the database under its working name and then gives it its own, at which moment the folder is a device.
+Status makeDatabase(const std::string& path, int folder) {
+  for (const std::string_view ending : {"", "-journal", "-wal", "-shm"}) {
+    const int number = sys::removeFile(folder, (kNewDatabaseFile + std::string(ending)).c_str());
+    if (number != 0 && number != ENOENT) return Error::fromErrno(number, kNewDatabaseFile);
+  }
+  {
+    const Result<std::unique_ptr<Database>> database = Database::open(path + '/' + kNewDatabaseFile, Access::exclusive);
+    if (!database) return database.error();
+    {
+      Database::Transaction transaction(**database);
+      for (const char* schema : Services::kSchemas)
+        transaction.runScript(schema).ignore();
+      transaction.runScript(("pragma application_id = " + std::to_string(kApplicationId)).c_str()).ignore();
+      transaction.runScript(("pragma user_version = " + std::to_string(kLayoutVersion)).c_str()).ignore();
+      if (Status committed = transaction.commit(); !committed) return committed;
+    }
+    // Into one file, so that there is one thing to rename.
+    Database::Session session(**database);
+    if (Status joined = session.runScript("pragma journal_mode = delete"); !joined) return joined;
+  }
+  const int number = sys::rename(folder, kNewDatabaseFile, folder, kDatabaseFile, sys::Replace::no);
+  if (number != 0) return Error::fromErrno(number, kDatabaseFile);
+  return {};
+}
+
+Status checkDatabase(const std::string& path, Database& database) {
+  const Result<std::int64_t> application = readNumber(database, "pragma application_id");
+  if (!application) return application.error();
+  if (*application != kApplicationId) {
+    return deviceError(DeviceFailure::notADevice,
+                       path + " is not a device: its device.db is something else's; name a device's folder");
+  }
+  const Result<std::int64_t> version = readNumber(database, "pragma user_version");
+  if (!version) return version.error();
+  if (*version != kLayoutVersion) {
+    return deviceError(DeviceFailure::otherVersion,
+                       path + " was made by " + (*version > kLayoutVersion ? "a newer" : "an older") +
+                           " version of appsync (layout " + std::to_string(*version) + ", this one has " +
+                           std::to_string(kLayoutVersion) + "); use that version");
+  }
+  Database::Session session(database);
+  Statement check = session.prepare("pragma quick_check(1)");
+  if (check.next() && check.text(0) == "ok") return {};
+  if (!check.status()) return check.status();
+  return deviceError(DeviceFailure::damaged,
+                     path + ": the device is damaged (" + std::string(check.text(0)) +
+                         "); put a copy of it in its place, or make a new one with \"appsync init\"");
+}
+
+Status checkIsDevice(const std::string& path, int folder) {
+  struct stat status {};
+  if (fstatat(folder, kDatabaseFile, &status, 0) == 0) return {};
+  if (errno != ENOENT) return Error::fromErrno(errno, kDatabaseFile);
+  return deviceError(
+      DeviceFailure::notADevice,
+      path + " is not a device: it has no device.db; name a device's folder, or make one with \"appsync init\"");
+}
+
+Result<FileDescriptor> openFolder(const std::string& path) {
+  FileDescriptor folder(::open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+  if (!folder.valid()) return Error::fromErrno(errno, path);
+  return folder;
+}
+
+Result<FileDescriptor> makeDevice(const std::string& path) {
+  const int made = sys::makeFolder(AT_FDCWD, path.c_str());
+  if (made != 0 && made != EEXIST) return Error::fromErrno(made, path);
+  const Result<FileDescriptor> folder = openFolder(path);
+  if (!folder) return folder.error();
+  if (Status free = checkFolderIsFree(path, folder->get()); !free) return free.error();
+  Result<FileDescriptor> lock = lockDevice(path, folder->get());
+  if (!lock) return lock.error();
+  if (Status folders = makeDeviceFolders(folder->get()); !folders) return folders.error();
+  if (Status database = makeDatabase(path, folder->get()); !database) return database.error();
+  return lock;
+}
+
+}  // namespace
+
+Device::Device(std::string path, FileDescriptor lock, std::unique_ptr<Database> database, DeviceFileSystem files,
+               Access access)
+    : path_(std::move(path)),
+      lock_(std::move(lock)),
+      database_(std::move(database)),
+      files_(std::move(files)),
+      services_(*database_, files_, access) {}
+
+Result<std::unique_ptr<Device>> Device::create(const std::string& path) {
+  installKillHookFromEnvironment();
+  Result<FileDescriptor> lock = makeDevice(path);
+  if (!lock) return deviceError(path, Access::exclusive, lock.error());
+  return open(path, Access::exclusive, std::move(lock).value());
+}
+
+Result<std::unique_ptr<Device>> Device::open(const std::string& path, Access access) {
+  installKillHookFromEnvironment();
+  const auto locked = [&]() -> Result<FileDescriptor> {
+    const Result<FileDescriptor> folder = openFolder(path);
+    if (!folder) return folder.error();
+    if (Status device = checkIsDevice(path, folder->get()); !device) return device.error();
+    return access == Access::readOnly ? FileDescriptor() : lockDevice(path, folder->get());
+  };
+  Result<FileDescriptor> lock = locked();
+  if (!lock) return deviceError(path, access, lock.error());
+  return open(path, access, std::move(lock).value());
+}
+
+Result<std::unique_ptr<Device>> Device::open(const std::string& path, Access access, FileDescriptor lock) {
+  Result<std::unique_ptr<Database>> database = Database::open(path + '/' + kDatabaseFile, access);
+  if (!database) return deviceError(path, access, database.error());
+  if (Status checked = checkDatabase(path, **database); !checked) return deviceError(path, access, checked.error());
+  const auto prepared = [&]() -> Result<DeviceFileSystem> {
+    const Result<FileDescriptor> folder = openFolder(path);
+    if (!folder) return folder.error();
+    if (access == Access::readOnly) return openFileSystem(path, folder->get(), access);
+    if (Status made = makeDeviceFolders(folder->get()); !made) return made.error();
+    Result<DeviceFileSystem> files = openFileSystem(path, folder->get(), access);
+    if (!files) return files;
+    if (Status recovered = recover(**database, *files); !recovered) return recovered.error();
+    return files;
+  };
+  Result<DeviceFileSystem> files = prepared();
+  if (!files) return deviceError(path, access, files.error());
+  return std::unique_ptr<Device>(
+      new Device(path, std::move(lock), std::move(database).value(), std::move(files).value(), access));
+}
+
+}  // namespace appsync::device

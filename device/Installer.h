@@ -1,0 +1,50 @@
+// Installs and removes apps.
+#pragma once
+
+#include <string>
+#include <string_view>
+
+#include "base/Error.h"
+#include "base/PropertyList.h"
+#include "device/Containers.h"
+#include "device/Database.h"
+#include "device/DeviceFileSystem.h"
+#include "device/InstallRequest.h"
+#include "device/RunningInstalls.h"
+#include "platform/FileLocation.h"
+
+namespace appsync::device {
+
+/// Threads: any number of installs and removals at once, also of one app: the last one to be recorded counts.
+class Installer {
+ public:
+  /// All must outlive the installer.
+  Installer(Database& database, DeviceFileSystem& files, RunningInstalls& running)
+      : database_(database), files_(files), running_(running) {}
+
+  /// As `platform::AppRegistry::installApplication`; an app that is new to the device becomes one of `applicationType`.
+  [[nodiscard]] Status install(const platform::FileLocation& location, const plist::Dictionary& options,
+                               std::string_view applicationType);
+
+  /// As `platform::AppRegistry::uninstallApplication`.
+  [[nodiscard]] Status uninstall(std::string_view bundleIdentifier, const plist::Dictionary& options);
+
+ private:
+  [[nodiscard]] Status installPackage(const platform::FileLocation& location, const InstallRequest& request,
+                                      std::string_view applicationType);
+  [[nodiscard]] Status installPlaceholder(const platform::FileLocation& location, const InstallRequest& request,
+                                          std::string_view applicationType);
+  [[nodiscard]] Status unpackAndRecord(const platform::FileLocation& location, const InstallRequest& request,
+                                       std::string_view applicationType, InstallProgress& progress);
+  /// Makes a filled container the app's bundle in its role, and removes those that it takes the place of.
+  [[nodiscard]] Status record(NewContainer& container, const InstallRequest& request, std::string_view applicationType,
+                              StoredBundle bundle);
+  /// The app's row, or one of an app that is new.
+  [[nodiscard]] AppRow known(std::string_view identifier);
+
+  Database& database_;
+  DeviceFileSystem& files_;
+  RunningInstalls& running_;
+};
+
+}  // namespace appsync::device

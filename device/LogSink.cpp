@@ -1,0 +1,67 @@
+#include "device/LogSink.h"
+
+#include <cerrno>
+
+#include <fcntl.h>
+#include <unistd.h>
+
+#include "device/TimeText.h"
+
+namespace appsync::device {
+
+namespace {
+
+void appendEscaped(std::string& line, char letter) {
+  constexpr std::string_view kDigits = "0123456789abcdef";
+  const auto code = static_cast<unsigned char>(letter);
+  if (letter == '\n') {
+    line += "\\n";
+  } else if (letter == '\\') {
+    line += "\\\\";
+  } else {
+    line += {'\\', 'x', kDigits[code >> 4U], kDigits[code & 15U]};
+  }
+}
+
+bool needsEscape(char letter) {
+  const auto code = static_cast<unsigned char>(letter);
+  return code < 0x20 || code == 0x7F || letter == '\\';
+}
+
+void appendMessage(std::string& line, std::string_view message) {
+  for (const char letter : message) {
+    if (needsEscape(letter)) {
+      appendEscaped(line, letter);
+    } else {
+      line += letter;
+    }
+  }
+}
+
+}  // namespace
+
+Result<std::unique_ptr<FileLogSink>> FileLogSink::open(const std::string& hostPath) {
+  FileDescriptor file(::open(hostPath.c_str(), O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC, 0644));
+  if (!file.valid()) return Error::fromErrno(errno, "cannot open log file \"" + hostPath + "\"");
+  return std::unique_ptr<FileLogSink>(new FileLogSink(std::move(file)));
+}
+
+void FileLogSink::write(std::chrono::system_clock::time_point time, int category, LogLevel level,
+                        std::string_view message) {
+  std::string line;
+  line.reserve(message.size() + 48);
+  appendTime(line, std::chrono::floor<std::chrono::microseconds>(time));
+  line += ' ';
+  line += std::to_string(category);
+  line += level == LogLevel::error ? " error " : " default ";
+  appendMessage(line, message);
+  line += '\n';
+  for (std::string_view rest = line; !rest.empty();) {
+    const ssize_t written = ::write(file_.get(), rest.data(), rest.size());
+    if (written < 0 && errno == EINTR) continue;
+    if (written <= 0) return;
+    rest.remove_prefix(static_cast<std::size_t>(written));
+  }
+}
+
+}  // namespace appsync::device

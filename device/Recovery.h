@@ -1,0 +1,18 @@
+// Puts a device in order after a process that held it was cut off.
+#pragma once
+
+#include "base/Error.h"
+#include "device/Database.h"
+#include "device/DeviceFileSystem.h"
+
+namespace appsync::device {
+
+/// Nobody else may hold the device, and none of its services may run yet. Afterwards
+/// - nothing half done is left: the work folder, the temporary directory and every container without a record are gone;
+/// - no record names a container that is not there;
+/// - placeholders of a sync (install type 4) are gone, so that their apps are offered again; an app under one stays;
+/// - the installs of other placeholders wait to be taken up again.
+/// Doing it again changes nothing, and being cut off does not matter.
+[[nodiscard]] Status recover(Database& database, DeviceFileSystem& files);
+
+}  // namespace appsync::device

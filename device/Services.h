@@ -1,0 +1,99 @@
+// All services of one device.
+#pragma once
+
+#include <memory>
+
+#include "base/SystemClock.h"
+#include "base/ThreadScheduler.h"
+#include "device/AppRegistry.h"
+#include "device/BackupManager.h"
+#include "device/Bundles.h"
+#include "device/Database.h"
+#include "device/DeviceFileSystem.h"
+#include "device/HomeScreen.h"
+#include "device/IconRenderer.h"
+#include "device/InstallCoordination.h"
+#include "device/PNGEncoders.h"
+#include "device/Restrictions.h"
+#include "device/Settings.h"
+#include "device/SoftwareLibrary.h"
+#include "device/SyncFramework.h"
+#include "device/SystemNotify.h"
+#include "device/TransactionLog.h"
+#include "device/UninstalledApps.h"
+#include "platform/Platform.h"
+
+namespace appsync::device {
+
+/// The platform that the plug-in is given, each service as what it is here.
+class Services final : public platform::Platform {
+ public:
+  /// What makes all tables that the services keep.
+  static constexpr const char* kSchemas[] = {
+      AppRegistry::kSchema,   UninstalledApps::kSchema, Settings::kSchema,       HomeScreen::kSchema,
+      BackupManager::kSchema, SoftwareLibrary::kSchema, TransactionLog::kSchema, SystemNotify::kSchema};
+
+  /// `database` and `files` must outlive the services.
+  Services(Database& database, DeviceFileSystem& files, Access access)
+      : database_(database),
+        files_(files),
+        registry_(database, files, access),
+        uninstalledApps_(database),
+        settings_(database),
+        homeScreen_(database, registry_, settings_),
+        restrictions_(settings_),
+        transactionLog_(database),
+        systemNotify_(database),
+        bundles_(files),
+        iconRenderer_(files),
+        scheduler_(clock_) {}
+
+  [[nodiscard]] SyncFramework& syncFramework() override { return syncFramework_; }
+  [[nodiscard]] AppRegistry& defaultRegistry() override { return registry_; }
+  [[nodiscard]] UninstalledApps& uninstalledApps() override { return uninstalledApps_; }
+  [[nodiscard]] InstallCoordination& installCoordination() override { return installCoordination_; }
+  [[nodiscard]] HomeScreen& homeScreen() override { return homeScreen_; }
+  [[nodiscard]] Restrictions& sharedConnection() override { return restrictions_; }
+  [[nodiscard]] TransactionLog& transactionLog() override { return transactionLog_; }
+  [[nodiscard]] SystemLog& systemLog() override { return systemLog_; }
+  [[nodiscard]] SystemNotify& systemNotify() override { return systemNotify_; }
+  [[nodiscard]] Bundles& bundles() override { return bundles_; }
+  [[nodiscard]] IconRenderer& iconRenderer() override { return iconRenderer_; }
+  [[nodiscard]] PNGEncoders& pngEncoders() override { return pngEncoders_; }
+  [[nodiscard]] DeviceFileSystem& fileSystem() override { return files_; }
+  [[nodiscard]] Clock& clock() override { return clock_; }
+  [[nodiscard]] Scheduler& scheduler() override { return scheduler_; }
+
+  [[nodiscard]] std::unique_ptr<platform::BackupManager> makeBackupManager() override {
+    return std::make_unique<BackupManager>(database_);
+  }
+  [[nodiscard]] std::unique_ptr<platform::SoftwareLibrary> makeSoftwareLibrary() override {
+    return std::make_unique<SoftwareLibrary>(database_, registry_);
+  }
+
+  // What only tools need.
+
+  [[nodiscard]] Settings& settings() noexcept { return settings_; }
+  [[nodiscard]] Database& database() noexcept { return database_; }
+
+ private:
+  Database& database_;
+  DeviceFileSystem& files_;
+  AppRegistry registry_;
+  UninstalledApps uninstalledApps_;
+  Settings settings_;
+  HomeScreen homeScreen_;
+  Restrictions restrictions_;
+  TransactionLog transactionLog_;
+  SystemLog systemLog_;
+  SystemNotify systemNotify_;
+  Bundles bundles_;
+  IconRenderer iconRenderer_;
+  PNGEncoders pngEncoders_;
+  SyncFramework syncFramework_;
+  InstallCoordination installCoordination_;
+  SystemClock clock_;
+  ThreadScheduler scheduler_;
+};
+
+}  // namespace appsync::device
