@@ -1,0 +1,82 @@
+#!/usr/bin/env bash
+# Shows appsync at work: packs the sample apps, keeps a device in step with them, and draws its home screen.
+#
+# usage: samples/demo.sh [FOLDER]
+#
+# Everything happens in FOLDER, which stays and must be missing or empty; without one in a folder that is removed at the
+# end. The tool is the `appsync` on the PATH, or the one that ./dev build made.
+set -euo pipefail
+
+samples="$(cd "$(dirname "${BASH_SOURCE[0]}")" && pwd)"
+command -v appsync >/dev/null || PATH="$samples/../build/bin:$PATH"
+command -v appsync >/dev/null || {
+  echo "demo: there is no appsync yet; make it with ./dev build" >&2
+  exit 1
+}
+
+if [[ $# -gt 0 ]]; then
+  mkdir -p "$1"
+  folder="$(cd "$1" && pwd)"
+  if [[ -n "$(ls -A "$folder")" ]]; then
+    echo "demo: $1 is not empty; give a new folder" >&2
+    exit 1
+  fi
+else
+  folder="$(mktemp -d)"
+  trap 'rm -rf "$folder"' EXIT
+fi
+cd "$folder"
+
+bold='' plain=''
+if [[ -t 1 ]]; then
+  bold=$'\e[1m' plain=$'\e[0m'
+fi
+
+say() { printf '\n%s# %s%s\n' "$bold" "$*" "$plain"; }
+
+# run COMMAND...: shows the command as one would type it, then what it does.
+run() {
+  local word shown='$'
+  for word in "$@"; do
+    [[ "$word" == *[^a-zA-Z0-9_./=-]* ]] && word="'$word'"
+    shown+=" $word"
+  done
+  printf '%s%s%s\n' "$bold" "$shown" "$plain"
+  "$@"
+}
+
+cp -R "$samples" apps
+rm -f apps/demo.sh apps/draw_icons.py
+mkdir library
+
+say 'Turn the apps into packages'
+for app in apps/*/; do
+  app="${app%/}"
+  run appsync pack "$app" -o "library/${app#apps/}.zip"
+done
+
+say 'Make a device and install everything'
+run appsync init phone
+run appsync sync phone library
+run appsync apps phone
+run appsync screen phone -o screen.png
+
+say 'A second sync finds nothing to do'
+run appsync sync phone library
+
+say 'A new version of one app, and another one removed'
+run sed -i 's/<string>1.0</<string>1.1</' apps/Tides/Tides.app/Info.plist
+run appsync pack apps/Tides -o library/Tides-1.1.zip
+run appsync sync phone library --remove org.example.gambit
+run appsync apps phone
+run appsync screen phone -o screen-2.png
+
+say 'What was removed is not sent again, unless one asks for it'
+run appsync sync phone library
+run appsync sync phone library --only org.example.gambit
+
+if [[ $# -gt 0 ]]; then
+  say "The device and its pictures are in $1: phone, screen.png, screen-2.png"
+else
+  say 'All of it is gone now; "samples/demo.sh FOLDER" keeps it, with pictures of the home screen'
+fi

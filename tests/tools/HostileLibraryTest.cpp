@@ -1,0 +1,157 @@
+// Libraries that mean ill, or are just broken.
+#include <chrono>
+#include <filesystem>
+
+#include <gmock/gmock.h>
+#include <sys/stat.h>
+
+#include "base/PropertyList.h"
+#include "platform/Keys.h"
+#include "tests/tools/ToolFixture.h"
+
+namespace appsync::test {
+
+namespace {
+
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::IsEmpty;
+using testing::Not;
+
+class HostileLibrary : public ToolFixture {
+ protected:
+  /// A package whose "Info.plist" is this.
+  void publishInfo(const std::string& fileName, const plist::Dictionary& info) const {
+    const Result<Bytes> document = plist::writeBinary(info);
+    ASSERT_TRUE(document.ok());
+    write(library() + "/" + fileName,
+          zipArchive({{"Notes.app/Info.plist", std::string(textOf(*document))}, {"Notes.app/Icon.png", "a picture"}}));
+  }
+  void expectOneFailure(const Finished& run) const {
+    EXPECT_EQ(run.status, 1);
+    EXPECT_EQ(endsIn(run.out).size(), 1U);
+    EXPECT_EQ(eventsIn(run.out).back().at("failed").size(), 1U);
+    EXPECT_THAT(apps(), IsEmpty());
+  }
+};
+
+TEST_F(HostileLibrary, AnIdentifierThatLeadsOutIsRefused) {
+  for (const char* identifier : {"../../escape", "/etc/passwd", "..", "a/../../b", ""}) {
+    publishInfo("bad.zip", {{platform::BundleIdentifierKey, identifier}});
+    expectOneFailure(sync({"--json"}));
+  }
+  EXPECT_FALSE(std::filesystem::exists(path("escape")));
+}
+
+TEST_F(HostileLibrary, AHugeIdentifierIsRefused) {
+  publishInfo("bad.zip", {{platform::BundleIdentifierKey, std::string(65536, 'x')}});
+  expectOneFailure(sync({"--json"}));
+}
+
+TEST_F(HostileLibrary, AnIdentifierThatIsNoTextIsRefused) {
+  publishInfo("bad.zip", {{platform::BundleIdentifierKey, 7}});
+  expectOneFailure(sync({"--json"}));
+}
+
+TEST_F(HostileLibrary, AnInfoListInBadUTF8IsRefused) {
+  write(library() + "/bad.zip",
+        zipArchive({{"Notes.app/Info.plist",
+                     "<plist><dict><key>BundleIdentifier</key><string>org.\xff</string></dict></plist>"}}));
+  expectOneFailure(sync({"--json"}));
+}
+
+TEST_F(HostileLibrary, AnEscapeSequenceInANameNeverReachesTheTerminal) {
+  publishInfo("app.zip", {{platform::BundleIdentifierKey, "org.a"},
+                          {platform::BundleVersionKey, "1\x1b[2J"},
+                          {platform::BundleDisplayNameKey, "\x1b]0;owned\x07\n"}});
+  const Finished run = sync();
+  EXPECT_EQ(run.status, 0);
+  EXPECT_THAT(run.out, Not(HasSubstr("\x1b")));
+  EXPECT_THAT(run.out, HasSubstr("\\x1b]0;owned\\x07\\x0a 1\\x1b[2J"));
+  EXPECT_THAT(runTool({"apps", device()}).out, Not(HasSubstr("\x1b")));
+}
+
+TEST_F(HostileLibrary, AFileNameWithAnEscapeSequenceIsShownSafely) {
+  write(library() + "/\x1b[31m\xff.zip", "nothing");
+  const Finished run = sync();
+  EXPECT_EQ(run.status, 1);
+  EXPECT_THAT(run.err, Not(HasSubstr("\x1b")));
+  EXPECT_EQ(eventsIn(sync({"--json"}).out).size(), 2U);
+}
+
+TEST_F(HostileLibrary, AnIconOutsideTheAppStagesNothingElsewhere) {
+  publishInfo("app.zip", {{platform::BundleIdentifierKey, "org.a"},
+                          {platform::BundleVersionKey, "1.0"},
+                          {platform::BundleIconFileKey, "../../../../../Library/ApplicationSync/RestoreState.plist"}});
+  EXPECT_EQ(sync().status, 0);
+  EXPECT_FALSE(std::filesystem::exists(device() + "/root/var/mobile/Library/ApplicationSync/RestoreState.plist"));
+}
+
+TEST_F(HostileLibrary, AnEntryThatLeadsOutIsRefused) {
+  publish("org.a", "1.0", {{"../../../escape", "x"}});
+  expectOneFailure(sync({"--json"}));
+}
+
+TEST_F(HostileLibrary, FoldersHiddenFilesAndOtherFilesArePassedOver) {
+  std::filesystem::create_directory(library() + "/folder.zip");
+  write(library() + "/.hidden.zip", "x");
+  write(library() + "/README", "read me");
+  EXPECT_EQ(sync().out, "Nothing to do.\n");
+}
+
+TEST_F(HostileLibrary, APackageIsKnownByItsContentToo) {
+  write(library() + "/notes-package", appPackage("org.a"));
+  EXPECT_THAT(endsIn(sync({"--json"}).out), ElementsAre("installed org.a"));
+}
+
+TEST_F(HostileLibrary, AnUpperCaseSuffixCounts) {
+  write(library() + "/NOTES.ZIP", appPackage("org.a"));
+  EXPECT_THAT(endsIn(sync({"--json"}).out), ElementsAre("installed org.a"));
+}
+
+TEST_F(HostileLibrary, APipeNamedLikeAPackageDoesNotHang) {
+  ASSERT_EQ(::mkfifo((library() + "/pipe.zip").c_str(), 0600), 0);
+  EXPECT_THAT(endsIn(sync({"--json"}).out), ElementsAre("failed pipe.zip"));
+}
+
+TEST_F(HostileLibrary, ALinkToNowhereFails) {
+  std::filesystem::create_symlink("nowhere", library() + "/link.zip");
+  EXPECT_THAT(endsIn(sync({"--json"}).out), ElementsAre("failed link.zip"));
+}
+
+TEST_F(HostileLibrary, ALinkToAPackageIsOne) {
+  write(path("elsewhere"), appPackage("org.a"));
+  std::filesystem::create_symlink(path("elsewhere"), library() + "/link.zip");
+  EXPECT_THAT(endsIn(sync({"--json"}).out), ElementsAre("installed org.a"));
+}
+
+TEST_F(HostileLibrary, AMissingLibraryIsUnusable) {
+  const Finished run = runTool({"sync", device(), path("nowhere")});
+  EXPECT_EQ(run.status, 3);
+  EXPECT_THAT(run.err, HasSubstr("nowhere"));
+}
+
+TEST_F(HostileLibrary, AFileIsNoLibrary) {
+  write(path("file"), "x");
+  EXPECT_EQ(runTool({"sync", device(), path("file")}).status, 3);
+}
+
+TEST_F(HostileLibrary, ManyPackagesTakeTimeInProportion) {
+  publish("org.a");
+  ASSERT_EQ(sync().status, 0);
+  const auto secondsFor = [&](int count) {
+    for (int number = 0; number < count; ++number) {
+      const std::string name = library() + "/copy-" + std::to_string(number) + ".zip";
+      if (!std::filesystem::exists(name)) std::filesystem::create_hard_link(library() + "/org.a-1.0.zip", name);
+    }
+    const auto start = std::chrono::steady_clock::now();
+    EXPECT_EQ(sync().out, "Nothing to do: 1 up to date.\n");
+    return std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
+  };
+  const double few = secondsFor(1'000);
+  EXPECT_LT(secondsFor(10'000), 40 * few + 1);
+}
+
+}  // namespace
+
+}  // namespace appsync::test

@@ -1,0 +1,141 @@
+// What `appsync pack` and `appsync plist` make of files.
+#include <filesystem>
+#include <fstream>
+#include <iterator>
+
+#include <gmock/gmock.h>
+
+#include "tests/tools/ToolFixture.h"
+
+namespace appsync::test {
+
+namespace {
+
+using testing::ElementsAre;
+using testing::HasSubstr;
+
+class Pack : public ToolFixture {
+ protected:
+  void SetUp() override {
+    ToolFixture::SetUp();
+    makeApp(path("Notes.app"));
+  }
+  void makeApp(const std::string& app, const std::string& info = infoPlist("org.notes", "1.2")) const {
+    std::filesystem::create_directories(app + "/data");
+    write(app + "/Info.plist", info);
+    write(app + "/Icon.png", "a picture");
+    write(app + "/data/text", "text");
+  }
+  [[nodiscard]] static std::string contentOf(const std::string& path) {
+    std::ifstream file(path, std::ios::binary);
+    return {std::istreambuf_iterator<char>(file), {}};
+  }
+  void expectRefused(const std::string& folder, const std::string& reason) const {
+    const Finished run = runTool({"pack", folder, "-o", path("out.zip")});
+    EXPECT_EQ(run.status, 3);
+    EXPECT_THAT(run.err, HasSubstr(reason));
+    EXPECT_FALSE(std::filesystem::exists(path("out.zip")));
+  }
+};
+
+TEST_F(Pack, WhatItMakesCanBeInstalled) {
+  ASSERT_EQ(runTool({"pack", path("Notes.app"), "-o", library() + "/notes.zip"}).status, 0);
+  EXPECT_EQ(sync().status, 0);
+  EXPECT_THAT(apps(), ElementsAre("org.notes 1.2"));
+}
+
+TEST_F(Pack, TheSameAppGivesTheSameBytes) {
+  ASSERT_EQ(runTool({"pack", path("Notes.app"), "-o", path("one.zip")}).status, 0);
+  std::filesystem::create_directory(path("elsewhere"));
+  makeApp(path("elsewhere/Notes.app"));
+  ASSERT_EQ(
+      runTool({"pack", path("elsewhere/Notes.app"), "-o", path("two.zip")},
+              {.environment = {{"TZ", "Pacific/Auckland"}, {"LC_ALL", "C"}}, .output = OutputTo::file, .input = {}})
+          .status,
+      0);
+  EXPECT_EQ(contentOf(path("one.zip")), contentOf(path("two.zip")));
+}
+
+TEST_F(Pack, AFolderThatHoldsTheAppBringsItsMetadataAlong) {
+  makeApp(path("holder/Notes.app"));
+  write(path("holder/HarvoMetadata.plist"), infoPlist("org.notes"));
+  write(path("holder/README"), "not packed");
+  ASSERT_EQ(runTool({"pack", path("holder"), "-o", path("out.zip")}).status, 0);
+  EXPECT_THAT(contentOf(path("out.zip")), HasSubstr("HarvoMetadata.plist"));
+  EXPECT_THAT(contentOf(path("out.zip")), testing::Not(HasSubstr("README")));
+}
+
+TEST_F(Pack, NamesInAnyScriptAreKept) {
+  write(path("Notes.app/größe-潮汐"), "x");
+  ASSERT_EQ(runTool({"pack", path("Notes.app"), "-o", library() + "/notes.zip"},
+                    {.environment = {{"LC_ALL", "C"}}, .output = OutputTo::file, .input = {}})
+                .status,
+            0);
+  EXPECT_EQ(sync().status, 0);
+}
+
+TEST_F(Pack, WithoutAnAppThereIsNothingToPack) {
+  std::filesystem::create_directory(path("empty"));
+  expectRefused(path("empty"), "is no app and holds none");
+}
+
+TEST_F(Pack, OfSeveralAppsOneMustBeGiven) {
+  makeApp(path("several/One.app"));
+  makeApp(path("several/Two.app"));
+  expectRefused(path("several"), "holds several apps");
+}
+
+TEST_F(Pack, AnAppWithoutInfoIsRefused) {
+  std::filesystem::remove(path("Notes.app/Info.plist"));
+  expectRefused(path("Notes.app"), "Info.plist");
+}
+
+TEST_F(Pack, ABadIdentifierIsRefused) {
+  makeApp(path("Notes.app"), infoPlist("../escape"));
+  expectRefused(path("Notes.app"), "Info.plist");
+}
+
+TEST_F(Pack, AnIconThatIsNotThereIsRefused) {
+  std::filesystem::remove(path("Notes.app/Icon.png"));
+  expectRefused(path("Notes.app"), "BundleIconFile");
+}
+
+TEST_F(Pack, ALinkIsRefused) {
+  std::filesystem::create_symlink("/etc/passwd", path("Notes.app/link"));
+  expectRefused(path("Notes.app"), "is a link");
+}
+
+class Plist : public Pack {};
+
+TEST_F(Plist, ConvertsBetweenAllForms) {
+  const std::string xml = infoPlist("org.notes", "1.2");
+  write(path("in"), xml);
+  ASSERT_EQ(runTool({"plist", path("in"), "--to", "binary", "-o", path("binary")}).status, 0);
+  EXPECT_TRUE(contentOf(path("binary")).starts_with("bplist00"));
+  EXPECT_EQ(runTool({"plist", path("binary")}).out, xml);
+  EXPECT_EQ(tools::Json::parse(runTool({"plist", path("binary"), "--to", "json"}).out).at("BundleVersion"), "1.2");
+}
+
+TEST_F(Plist, ReadsStandardInput) {
+  const Finished run = runTool({"plist", "-", "--to", "json"},
+                               {.environment = {}, .output = OutputTo::file, .input = "{ a = (1, 2); }"});
+  EXPECT_EQ(tools::Json::parse(run.out), tools::Json::parse(R"({"a":["1","2"]})"));
+}
+
+TEST_F(Plist, WhatIsNoPropertyListIsUnusable) {
+  write(path("in"), "bplist00");
+  const Finished run = runTool({"plist", path("in")});
+  EXPECT_EQ(run.status, 3);
+  EXPECT_THAT(run.err, HasSubstr("is not a property list that can be read"));
+}
+
+TEST_F(Plist, AFailureLeavesTheOutputAsItWas) {
+  write(path("in"), "<plist>");
+  write(path("out"), "before");
+  EXPECT_EQ(runTool({"plist", path("in"), "-o", path("out")}).status, 3);
+  EXPECT_EQ(contentOf(path("out")), "before");
+}
+
+}  // namespace
+
+}  // namespace appsync::test

@@ -1,0 +1,78 @@
+// A device, a library and the tool between them.
+#pragma once
+
+#include <filesystem>
+#include <fstream>
+#include <string>
+#include <vector>
+
+#include <gtest/gtest.h>
+
+#include "tests/device/ZipArchive.h"
+#include "tests/support/TemporaryFolder.h"
+#include "tests/tools/ToolRun.h"
+#include "tools/Json.h"
+
+namespace appsync::test {
+
+class ToolFixture : public testing::Test {
+ protected:
+  void SetUp() override {
+    std::filesystem::create_directory(library());
+    ASSERT_EQ(runTool({"init", device()}).status, 0);
+  }
+
+  [[nodiscard]] std::string device() const { return folder_.path("device"); }
+  [[nodiscard]] std::string library() const { return folder_.path("library"); }
+  [[nodiscard]] std::string path(const std::string& name) const { return folder_.path(name); }
+
+  void write(const std::string& path, std::string_view content) const {
+    std::ofstream(path, std::ios::binary) << content;
+  }
+  /// Puts a good package into the library.
+  void publish(const std::string& identifier, const std::string& version = "1.0",
+               const std::vector<ZipEntry>& more = {}) const {
+    write(library() + "/" + identifier + "-" + version + ".zip", appPackage(identifier, version, more));
+  }
+  [[nodiscard]] Finished sync(std::vector<std::string> more = {}, const ToolOptions& options = {}) const {
+    more.insert(more.begin(), {"sync", device(), library()});
+    return runTool(more, options);
+  }
+
+  /// Every line of a `--json` sync.
+  [[nodiscard]] static std::vector<tools::Json> eventsIn(const std::string& output) {
+    std::vector<tools::Json> events;
+    for (std::size_t start = 0; start < output.size();) {
+      const std::size_t end = output.find('\n', start);
+      events.push_back(tools::Json::parse(output.substr(start, end - start)));
+      start = end == std::string::npos ? output.size() : end + 1;
+    }
+    return events;
+  }
+  /// "installed org.a, failed b.zip: reason" for the terminal events.
+  [[nodiscard]] static std::vector<std::string> endsIn(const std::string& output) {
+    std::vector<std::string> ends;
+    for (const tools::Json& event : eventsIn(output)) {
+      const std::string kind = event.at("event");
+      if (kind == "progress" || kind == "summary" || kind == "waiting") continue;
+      ends.push_back(kind + " " + std::string(event.at("identifier")));
+    }
+    return ends;
+  }
+  /// Each app on the device as "identifier version", placeholders with a question mark behind.
+  [[nodiscard]] std::vector<std::string> apps() const {
+    const Finished listed = runTool({"apps", device(), "--json"});
+    EXPECT_EQ(listed.status, 0) << listed.err;
+    std::vector<std::string> all;
+    for (const tools::Json& app : tools::Json::parse(listed.out)) {
+      const std::string version = app.at("version").is_null() ? "" : std::string(app.at("version"));
+      all.push_back(std::string(app.at("identifier")) + " " + version + (app.at("placeholder") ? "?" : ""));
+    }
+    return all;
+  }
+
+ private:
+  TemporaryFolder folder_;
+};
+
+}  // namespace appsync::test

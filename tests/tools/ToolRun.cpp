@@ -1,0 +1,106 @@
+#include "tests/tools/ToolRun.h"
+
+#include <csignal>
+#include <filesystem>
+#include <fstream>
+#include <iterator>
+
+#include <fcntl.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+namespace appsync::test {
+
+namespace {
+
+/// Built beside the tests.
+std::string toolPath() {
+  return (std::filesystem::canonical("/proc/self/exe").parent_path() / "appsync").string();
+}
+
+std::string contentOf(const std::string& path) {
+  std::ifstream file(path, std::ios::binary);
+  return {std::istreambuf_iterator<char>(file), {}};
+}
+
+int openOutput(OutputTo kind, const std::string& path) {
+  if (kind == OutputTo::full) return ::open("/dev/full", O_WRONLY | O_CLOEXEC);
+  if (kind == OutputTo::file) return ::open(path.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0600);
+  int ends[2];
+  if (::pipe2(ends, O_CLOEXEC) != 0) return -1;
+  ::close(ends[0]);
+  return ends[1];
+}
+
+/// The environment of this process with `changes`.
+std::vector<std::string> environmentWith(const std::map<std::string, std::string>& changes) {
+  std::vector<std::string> all;
+  for (char** entry = environ; *entry != nullptr; ++entry) {
+    const std::string text = *entry;
+    if (!changes.contains(text.substr(0, text.find('=')))) all.push_back(text);
+  }
+  for (const auto& [name, value] : changes)
+    all.push_back(name + "=" + value);
+  return all;
+}
+
+std::vector<char*> pointersTo(std::vector<std::string>& texts) {
+  std::vector<char*> pointers;
+  for (std::string& text : texts)
+    pointers.push_back(text.data());
+  pointers.push_back(nullptr);
+  return pointers;
+}
+
+}  // namespace
+
+ToolRun::ToolRun(const std::vector<std::string>& words, const ToolOptions& options) {
+  std::vector<std::string> arguments = {"appsync"};
+  arguments.insert(arguments.end(), words.begin(), words.end());
+  std::vector<std::string> environment = environmentWith(options.environment);
+  const auto argumentPointers = pointersTo(arguments);
+  const auto environmentPointers = pointersTo(environment);
+  std::ofstream(folder_.path("in"), std::ios::binary) << options.input;
+  const int input = ::open(folder_.path("in").c_str(), O_RDONLY | O_CLOEXEC);
+  const int output = openOutput(options.output, folder_.path("out"));
+  const int error = openOutput(OutputTo::file, folder_.path("err"));
+  const std::string tool = toolPath();
+  process_ = ::fork();
+  if (process_ == 0) {
+    ::dup2(input, STDIN_FILENO);
+    ::dup2(output, STDOUT_FILENO);
+    ::dup2(error, STDERR_FILENO);
+    ::execve(tool.c_str(), argumentPointers.data(), environmentPointers.data());
+    ::_exit(127);
+  }
+  for (const int file : {input, output, error})
+    ::close(file);
+}
+
+ToolRun::~ToolRun() {
+  if (process_ < 0) return;
+  ::kill(process_, SIGKILL);
+  ::waitpid(process_, nullptr, 0);
+}
+
+void ToolRun::signal(int number) const {
+  ::kill(process_, number);
+}
+
+std::string ToolRun::outputSoFar() const {
+  return contentOf(folder_.path("out"));
+}
+
+Finished ToolRun::wait() {
+  int status = 0;
+  ::waitpid(process_, &status, 0);
+  process_ = -1;
+  const int result = WIFEXITED(status) ? WEXITSTATUS(status) : -WTERMSIG(status);
+  return {result, contentOf(folder_.path("out")), contentOf(folder_.path("err"))};
+}
+
+Finished runTool(const std::vector<std::string>& words, const ToolOptions& options) {
+  return ToolRun(words, options).wait();
+}
+
+}  // namespace appsync::test

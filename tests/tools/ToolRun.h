@@ -1,0 +1,51 @@
+// The tool as a process of its own.
+#pragma once
+
+#include <map>
+#include <string>
+#include <vector>
+
+#include <sys/types.h>
+
+#include "tests/support/TemporaryFolder.h"
+
+namespace appsync::test {
+
+/// What is left of a process: its exit status, or minus the number of the signal that ended it, and what it wrote.
+struct Finished {
+  int status = 0;
+  std::string out;
+  std::string err;
+};
+
+/// Where a process's standard output goes.
+enum class OutputTo { file, closedPipe, full };
+
+struct ToolOptions {
+  std::map<std::string, std::string> environment;
+  OutputTo output = OutputTo::file;
+  std::string input;  ///< what it reads on standard input
+};
+
+/// Runs `appsync` with these words. Killed and waited for at the latest when the object goes.
+class ToolRun {
+ public:
+  explicit ToolRun(const std::vector<std::string>& words, const ToolOptions& options = {});
+  ~ToolRun();
+  ToolRun(const ToolRun&) = delete;
+  ToolRun& operator=(const ToolRun&) = delete;
+
+  void signal(int number) const;
+  /// Everything it has written so far to standard output.
+  [[nodiscard]] std::string outputSoFar() const;
+  [[nodiscard]] Finished wait();
+
+ private:
+  TemporaryFolder folder_;
+  pid_t process_ = -1;
+};
+
+/// Runs it to its end.
+[[nodiscard]] Finished runTool(const std::vector<std::string>& words, const ToolOptions& options = {});
+
+}  // namespace appsync::test

@@ -1,0 +1,91 @@
+// What the tool says to those who use it wrongly, or ask.
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include "tests/tools/ToolRun.h"
+
+namespace appsync::test {
+
+namespace {
+
+using testing::HasSubstr;
+using testing::StartsWith;
+
+TEST(Usage, WithoutACommandIsWrong) {
+  const Finished run = runTool({});
+  EXPECT_EQ(run.status, 2);
+  EXPECT_EQ(run.out, "");
+  EXPECT_EQ(run.err, "appsync: a command is missing; `appsync --help` shows them\n");
+}
+
+TEST(Usage, AnUnknownCommandIsWrong) {
+  const Finished run = runTool({"fly"});
+  EXPECT_EQ(run.status, 2);
+  EXPECT_THAT(run.err, StartsWith("appsync: "));
+  EXPECT_THAT(run.err, HasSubstr("`appsync --help`"));
+}
+
+TEST(Usage, AMissingArgumentNamesItAndTheHelp) {
+  const Finished run = runTool({"sync", "device"});
+  EXPECT_EQ(run.status, 2);
+  EXPECT_THAT(run.err, HasSubstr("LIBRARY"));
+  EXPECT_THAT(run.err, HasSubstr("`appsync sync --help`"));
+}
+
+TEST(Usage, AnUnknownOptionIsWrong) {
+  EXPECT_EQ(runTool({"apps", "device", "--fast"}).status, 2);
+}
+
+TEST(Usage, AnUnknownFormIsWrong) {
+  EXPECT_EQ(runTool({"plist", "file", "--to", "yaml"}).status, 2);
+}
+
+TEST(Usage, AnEmptyIdentifierIsWrong) {
+  EXPECT_EQ(runTool({"sync", "device", "library", "--only", ""}).status, 2);
+}
+
+TEST(Usage, AnIdentifierThatIsNoTextIsWrongAndShownSafely) {
+  const Finished run = runTool({"sync", "device", "library", "--remove", "\xff\x1b[2J"});
+  EXPECT_EQ(run.status, 2);
+  EXPECT_THAT(run.err, HasSubstr("\\xff\\x1b[2J"));
+}
+
+TEST(Usage, OneAppCannotBeBothRemovedAndAskedFor) {
+  const Finished run = runTool({"sync", "device", "library", "--remove", "org.a", "--only", "org.a"});
+  EXPECT_EQ(run.status, 2);
+  EXPECT_THAT(run.err, HasSubstr("both --remove and --only"));
+}
+
+class Help : public testing::TestWithParam<const char*> {};
+
+TEST_P(Help, TeachesWithAnExample) {
+  const Finished run = runTool({GetParam(), "--help"});
+  EXPECT_EQ(run.status, 0);
+  EXPECT_EQ(run.err, "");
+  EXPECT_THAT(run.out, HasSubstr("Example"));
+  EXPECT_THAT(run.out, HasSubstr(std::string("appsync ") + GetParam()));
+}
+
+INSTANTIATE_TEST_SUITE_P(Commands, Help,
+                         testing::Values("init", "pack", "sync", "apps", "screen", "history", "set", "clear", "plist"),
+                         [](const auto& command) { return std::string(command.param); });
+
+TEST(Usage, TheHelpNamesEveryExitStatus) {
+  const Finished run = runTool({"--help"});
+  EXPECT_EQ(run.status, 0);
+  EXPECT_THAT(run.out, HasSubstr("0 done, 1 some app failed, 2 wrong usage, 3 "));
+}
+
+TEST(Usage, HelpForAReaderThatLeftIsNoFailure) {
+  EXPECT_EQ(runTool({"--help"}, {.environment = {}, .output = OutputTo::closedPipe, .input = {}}).status, 0);
+}
+
+TEST(Usage, HelpThatCannotBeWrittenIs) {
+  const Finished run = runTool({"--help"}, {.environment = {}, .output = OutputTo::full, .input = {}});
+  EXPECT_EQ(run.status, 3);
+  EXPECT_EQ(run.err, "appsync: standard output cannot be written: No space left on device\n");
+}
+
+}  // namespace
+
+}  // namespace appsync::test

@@ -1,0 +1,50 @@
+// What came of each app in a sync.
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace appsync::tools {
+
+enum class AppEvent : std::uint8_t {
+  installed,
+  updated,
+  removed,
+  failed,
+  cutOff,     ///< the sync was interrupted before the app was on the device; machines are told "failed"
+  skipped,    ///< something would have been to do, and was not done on purpose
+  unchanged,  ///< nothing was to do; machines are told "skipped"
+};
+
+/// An app as people and machines are told of it. Texts are as they came from outside.
+struct AppName {
+  std::string identifier;  ///< of a package that does not say it: the package's file name
+  std::string name;        ///< empty when it is not known
+  std::string version;     ///< empty when it is not known
+};
+
+struct AppOutcome {
+  AppEvent event = AppEvent::failed;
+  AppName app;
+  std::string reason;  ///< why, of everything but a success
+};
+
+/// Whether the app now is as it was to be.
+[[nodiscard]] constexpr bool isSuccess(AppEvent event) {
+  return event == AppEvent::installed || event == AppEvent::updated || event == AppEvent::removed;
+}
+
+/// Whether the sync did not do for the app what it was to do.
+[[nodiscard]] constexpr bool isFailure(AppEvent event) {
+  return event == AppEvent::failed || event == AppEvent::cutOff;
+}
+
+/// The word for an event in JSON.
+[[nodiscard]] std::string_view wordFor(AppEvent event);
+
+/// Every outcome of a sync, in the order in which they came.
+using AppOutcomes = std::vector<AppOutcome>;
+
+}  // namespace appsync::tools

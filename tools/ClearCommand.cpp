@@ -1,0 +1,38 @@
+#include <memory>
+
+#include "core/AppsClient.h"
+#include "tools/Commands.h"
+#include "tools/HostState.h"
+#include "tools/OpenDevice.h"
+#include "tools/StagingArea.h"
+#include "tools/StandardOutput.h"
+
+namespace appsync::tools {
+namespace {
+
+constexpr const char* kExamples =
+    R"(Removes placeholders, and all that device and host remember of earlier syncs, such as which apps were deleted.
+Installed apps stay.
+
+Example:
+  appsync clear phone)";
+
+ExitStatus run(device::Device& device) {
+  AppsClient::create(device.platform())->clearSyncData();
+  clearStaging(device);
+  const Status forgotten = removeHostState(device.path());
+  return forgotten ? ExitStatus::done : reportUnusable(forgotten.error());
+}
+
+}  // namespace
+
+void addClearCommand(CLI::App& line, Invocation& invocation) {
+  const auto path = std::make_shared<std::string>();
+  CLI::App* command = line.add_subcommand("clear", "Forget everything about earlier syncs.");
+  addDevice(*command, *path);
+  command->footer(kExamples);
+  command->callback(
+      [path, &invocation] { invocation = [path] { return withDevice(*path, device::Access::exclusive, run); }; });
+}
+
+}  // namespace appsync::tools

@@ -1,0 +1,85 @@
+#include "tools/CommandLine.h"
+
+#include <string>
+
+#include <CLI/CLI.hpp>
+
+#include "tools/Commands.h"
+#include "tools/StandardOutput.h"
+
+namespace appsync::tools {
+namespace {
+
+constexpr const char* kPurpose = R"(appsync keeps the apps on a device in step with a folder of app packages.
+
+A device is a directory of this machine. `init` makes one, `pack` turns an app's folder into a package, and `sync` installs
+and updates what the library holds, and removes what you ask it to.)";
+
+constexpr const char* kExamples = R"(Examples:
+  appsync init phone                    make a device
+  appsync pack Tides.app -o lib/tides.zip
+  appsync sync phone lib                install and update everything in lib
+  appsync sync phone lib --remove org.example.tides
+  appsync apps phone                    what is on it now
+  appsync screen phone -o screen.png    what its home screen looks like
+
+Exit status: 0 done, 1 some app failed, 2 wrong usage, 3 the device, library or file cannot be used.
+`appsync COMMAND --help` tells more about a command.)";
+
+void addCommands(CLI::App& line, Invocation& invocation) {
+  addInitCommand(line, invocation);
+  addPackCommand(line, invocation);
+  addSyncCommand(line, invocation);
+  addAppsCommand(line, invocation);
+  addScreenCommand(line, invocation);
+  addHistoryCommand(line, invocation);
+  addSetCommand(line, invocation);
+  addClearCommand(line, invocation);
+  addPlistCommand(line, invocation);
+}
+
+/// The command that was recognised before parsing went wrong, for the hint at its help.
+std::string namedCommand(const CLI::App& line) {
+  const auto named = line.get_subcommands();
+  return named.empty() ? std::string("appsync") : "appsync " + named.front()->get_name();
+}
+
+ExitStatus explain(const CLI::App& line, const CLI::ParseError& error) {
+  std::string reason = error.what();
+  while (!reason.empty() && (reason.back() == '.' || reason.back() == '\n'))
+    reason.pop_back();
+  printError(reason + "; `" + namedCommand(line) + " --help` shows how it is used");
+  return ExitStatus::wrongUsage;
+}
+
+ExitStatus showHelp(const CLI::App& line) {
+  const auto named = line.get_subcommands();
+  StandardOutput output;
+  output.write(named.empty() ? line.help() : named.front()->help());
+  return output.finish(ExitStatus::done);
+}
+
+}  // namespace
+
+ExitStatus runCommandLine(int count, const char* const* words) {
+  CLI::App line(kPurpose, "appsync");
+  line.footer(kExamples);
+  line.require_subcommand(1);
+  line.get_formatter()->column_width(34);
+  Invocation invocation;
+  addCommands(line, invocation);
+  if (count <= 1) {
+    printError("a command is missing; `appsync --help` shows them");
+    return ExitStatus::wrongUsage;
+  }
+  try {
+    line.parse(count, words);
+  } catch (const CLI::CallForHelp&) {
+    return showHelp(line);
+  } catch (const CLI::ParseError& error) {
+    return explain(line, error);
+  }
+  return invocation();
+}
+
+}  // namespace appsync::tools

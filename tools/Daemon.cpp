@@ -1,0 +1,215 @@
+#include "tools/Daemon.h"
+
+#include <algorithm>
+#include <chrono>
+#include <utility>
+
+#include "core/SyncFiles.h"
+#include "device/SyncFramework.h"
+#include "tools/StagingArea.h"
+
+namespace appsync::tools {
+namespace {
+
+using platform::PlaceholderLookup;
+using platform::RestrictionSetting;
+using platform::RestrictionValue;
+using platform::ZTAsset;
+
+constexpr auto kShortestTimeBetweenUpdates = std::chrono::milliseconds(50);
+
+std::map<std::string, DeviceApp, std::less<>> appsByIdentifier(device::Device& device) {
+  std::map<std::string, DeviceApp, std::less<>> apps;
+  for (DeviceApp& app : appsOn(device))
+    apps.emplace(app.app.identifier, std::move(app));
+  return apps;
+}
+
+bool isInstalled(device::Device& device, std::string_view identifier) {
+  const auto record = device.platform().defaultRegistry().recordForIdentifier(identifier, PlaceholderLookup::on);
+  return record && record->isInstalled();
+}
+
+bool isAwaited(device::Device& device, std::string_view identifier) {
+  const auto record = device.platform().defaultRegistry().recordForIdentifier(identifier, PlaceholderLookup::on);
+  return !record || record->isPlaceholder();
+}
+
+bool isForbidden(device::Device& device, RestrictionSetting setting) {
+  return device.platform().sharedConnection().effectiveBoolValueForSetting(setting) == RestrictionValue::no;
+}
+
+IdentifierSet deletedIn(const plist::Dictionary& report) {
+  IdentifierSet identifiers;
+  const plist::Value* deleted = report.find("_Deleted");
+  if (deleted == nullptr || deleted->array() == nullptr) return identifiers;
+  for (const plist::Value& app : *deleted->array()) {
+    const plist::Value* identifier = app.find(platform::BundleIdentifierKey);
+    if (identifier != nullptr && identifier->string()) identifiers.emplace(*identifier->string());
+  }
+  return identifiers;
+}
+
+Error interrupted() {
+  return {std::string(platform::kZTErrorDomain), static_cast<long>(device::TransferFailure::interrupted),
+          "the sync was interrupted; the app is offered again at the next sync", nullptr};
+}
+
+Error hostHasNone() {
+  return {std::string(platform::kZTErrorDomain), static_cast<long>(device::TransferFailure::hostLost),
+          "the library has no package of this app", nullptr};
+}
+
+}  // namespace
+
+Daemon::Daemon(device::Device& device, platform::ZTClient& client, SyncProgress& progress,
+               const Interruption& interruption)
+    : device_(device),
+      client_(client),
+      progress_(progress),
+      interruption_(interruption),
+      sender_(device.services().fileSystem()),
+      state_(loadHostState(device.path())) {}
+
+Status Daemon::sync(const SyncRequest& request) {
+  client_.prepareForSyncWithHostAnchor(client_.currentSyncAnchor(), {}, nullptr);
+  learnDeletedApps();
+  planSync(request);
+  tellWhatIsKnown();
+  if (Status handedOver = handOverInstructions(); !handedOver) {
+    failEverything(handedOver.error());
+    client_.syncEndedWithSuccess(false);
+    return handedOver;
+  }
+  tellRemovals();
+  transferPackages();
+  tellUnfinished();
+  Status remembered = remember();
+  client_.syncEndedWithSuccess(remembered.ok() && !interruption_.requested());
+  clearStaging(device_);
+  return remembered;
+}
+
+void Daemon::learnDeletedApps() {
+  state_.learnDeleted(deletedIn(client_.installedAssets()));
+}
+
+void Daemon::planSync(const SyncRequest& request) {
+  const auto apps = appsByIdentifier(device_);
+  plan_ = makePlan({request.library, apps, state_.declined, request.only, request.remove});
+  for (const std::string& identifier : request.only)
+    state_.declined.erase(identifier);
+  state_.declined.insert(request.remove.begin(), request.remove.end());
+  for (const PlannedApp& app : plan_) {
+    if (app.package == nullptr) continue;
+    state_.offered.insert(app.app.identifier);
+    transfers_.emplace(app.app.identifier, &app);
+  }
+}
+
+/// What the host knows must be safe before the device acts on it: a kill may come at any moment.
+Status Daemon::handOverInstructions() {
+  if (Status staged = stage(device_, plan_); !staged) return staged.error().in("the device cannot be synced");
+  if (Status saved = saveHostState(device_.path(), state_); !saved) return saved;
+  std::optional<Error> error;
+  if (client_.reconcileSync({}, client_.currentSyncAnchor(), {}, &error)) return {};
+  return error.value_or(Error{}).in("the device cannot be synced");
+}
+
+void Daemon::transferPackages() {
+  const platform::Assets assets = client_.outstandingAssetTransfers();
+  InstallWatcher watcher(device_, progress_, interruption_);
+  for (const auto& asset : assets) {
+    const PlannedApp* app = planned(asset->identifier());
+    if (app != nullptr) progress_.expect(app->app, app->package->bytes);
+  }
+  for (const auto& asset : assets)
+    transfer(asset, watcher);
+  client_.assetTransferEndedWithSuccess(!interruption_.requested());
+  watcher.lookAgain();
+}
+
+void Daemon::transfer(const std::shared_ptr<ZTAsset>& asset, InstallWatcher& watcher) {
+  const PlannedApp* app = planned(asset->identifier());
+  if (app == nullptr) return client_.assetTransferSucceeded(asset, false, hostHasNone());
+  watcher.waitForRoom(app->package->bytes);
+  std::chrono::steady_clock::time_point told;
+  const auto goOn = [&](double fraction) {
+    const auto now = std::chrono::steady_clock::now();
+    if (fraction >= 1 || now - told >= kShortestTimeBetweenUpdates) {
+      told = now;
+      asset->setDownloadProgress(fraction);
+      client_.assetTransferUpdatedProgress(asset, fraction);
+      progress_.sending(asset->identifier(), fraction);
+    }
+    return !interruption_.requested();
+  };
+  const Result<std::string> path = interruption_.requested() ? interrupted() : sender_.send(*app->package, goOn);
+  if (!path) {
+    const Error error = interruption_.requested() ? interrupted() : path.error();
+    client_.assetTransferSucceeded(asset, false, error);
+    progress_.finish({interruption_.requested() ? AppEvent::cutOff : AppEvent::failed, app->app, error.text});
+    return;
+  }
+  asset->setPath(*path);
+  asset->setCompletedAssetParts(platform::kZTAssetPartApplication);
+  const AppEvent success = app->work == PlannedWork::update ? AppEvent::updated : AppEvent::installed;
+  watcher.watch({app->app, success, std::string(kPublicStaging) + "/" + *path, app->package->bytes});
+  progress_.installing(asset->identifier(), 0);
+  client_.assetTransferSucceeded(asset, true, std::nullopt);
+}
+
+void Daemon::tellWhatIsKnown() {
+  for (const PlannedApp& app : plan_) {
+    if (app.work == PlannedWork::none) progress_.finish({AppEvent::unchanged, app.app, app.reason});
+    if (app.work == PlannedWork::skip) progress_.finish({AppEvent::skipped, app.app, app.reason});
+    if (app.work == PlannedWork::refuse) progress_.finish({AppEvent::failed, app.app, app.reason});
+  }
+}
+
+void Daemon::tellRemovals() {
+  const bool forbidden = isForbidden(device_, RestrictionSetting::appRemovalAllowed);
+  for (const PlannedApp& app : plan_) {
+    if (app.work != PlannedWork::remove) continue;
+    if (!isInstalled(device_, app.app.identifier)) {
+      progress_.finish({AppEvent::removed, app.app, {}});
+    } else if (forbidden) {
+      progress_.finish({AppEvent::skipped, app.app, "removing apps is not allowed on this device (app-removal=no)"});
+    } else {
+      progress_.finish({AppEvent::failed, app.app, "the device could not remove it; `appsync history` may tell why"});
+    }
+  }
+}
+
+void Daemon::tellUnfinished() {
+  const bool forbidden = isForbidden(device_, RestrictionSetting::appInstallationAllowed);
+  for (const PlannedApp& app : plan_) {
+    if (app.package == nullptr) continue;
+    if (forbidden) {
+      progress_.finish(
+          {AppEvent::skipped, app.app, "installing apps is not allowed on this device (app-installation=no)"});
+    } else if (interruption_.requested()) {
+      progress_.finish({AppEvent::cutOff, app.app, interrupted().text});
+    } else {
+      progress_.finish({AppEvent::failed, app.app, "the device did not ask for its package"});
+    }
+  }
+}
+
+void Daemon::failEverything(const Error& error) {
+  for (const PlannedApp& app : plan_)
+    progress_.finish({AppEvent::failed, app.app, error.text});
+}
+
+const PlannedApp* Daemon::planned(std::string_view identifier) const {
+  const auto found = transfers_.find(identifier);
+  return found == transfers_.end() ? nullptr : found->second;
+}
+
+Status Daemon::remember() {
+  std::erase_if(state_.offered, [&](const std::string& identifier) { return !isAwaited(device_, identifier); });
+  std::erase_if(state_.declined, [&](const std::string& identifier) { return isInstalled(device_, identifier); });
+  return saveHostState(device_.path(), state_);
+}
+
+}  // namespace appsync::tools

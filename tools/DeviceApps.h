@@ -1,0 +1,26 @@
+// The apps of a device, as values.
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+#include "device/Device.h"
+#include "platform/InstallTypes.h"
+#include "tools/AppOutcome.h"
+
+namespace appsync::tools {
+
+struct DeviceApp {
+  AppName app;
+  std::string type;  ///< "User" or "System"
+  bool isInstalled = false;
+  bool isPlaceholder = false;
+  platform::TSInstallType installType = platform::TSInstallType::None;
+  std::uint64_t bytes = 0;
+};
+
+/// Every app and placeholder, in the order in which they came to the device.
+[[nodiscard]] std::vector<DeviceApp> appsOn(device::Device& device);
+
+}  // namespace appsync::tools

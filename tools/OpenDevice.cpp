@@ -1,0 +1,17 @@
+#include "tools/OpenDevice.h"
+
+#include "tools/StandardOutput.h"
+
+namespace appsync::tools {
+
+void addDevice(CLI::App& command, std::string& path) {
+  command.add_option("DEVICE", path, "the device's folder, made by `appsync init`")->required();
+}
+
+ExitStatus withDevice(const std::string& path, device::Access access,
+                      const std::function<ExitStatus(device::Device&)>& work) {
+  const auto device = device::Device::open(path, access);
+  return device ? work(**device) : reportUnusable(device.error());
+}
+
+}  // namespace appsync::tools

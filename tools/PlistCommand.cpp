@@ -1,0 +1,67 @@
+#include <memory>
+#include <string>
+
+#include <CLI/CLI.hpp>
+#include <unistd.h>
+
+#include "base/PropertyList.h"
+#include "tools/Commands.h"
+#include "tools/HostFile.h"
+#include "tools/PropertyListJson.h"
+#include "tools/StandardOutput.h"
+
+namespace appsync::tools {
+namespace {
+
+struct PlistOptions {
+  std::string file;
+  std::string form = "xml";
+  std::string output = kStandardStream;
+};
+
+constexpr const char* kExamples =
+    R"(Reads the binary, the XML and the old text form, told apart by their content. In JSON data is base64 text,
+a date ISO 8601 text, and a uid {"CF$UID": number}.
+
+Examples:
+  appsync plist Info.plist
+  appsync plist Info.plist --to binary -o Info.binary.plist
+  appsync plist ApplicationsSync.plist --to json | jq '.[].identifier')";
+
+Result<Bytes> converted(const plist::Value& value, const std::string& form) {
+  if (form == "xml") return plist::writeXML(value);
+  if (form == "binary") return plist::writeBinary(value);
+  const std::string json = indented(toJson(value)) + "\n";
+  const ByteView bytes = bytesOf(json);
+  return Bytes(bytes.begin(), bytes.end());
+}
+
+ExitStatus run(const PlistOptions& options) {
+  if (options.form == "binary" && options.output == kStandardStream && ::isatty(STDOUT_FILENO) == 1) {
+    printError("a terminal cannot show the binary form; name a file with -o");
+    return ExitStatus::wrongUsage;
+  }
+  const Result<Bytes> document = readHostFile(options.file);
+  if (!document) return reportUnusable(document.error());
+  const Result<plist::Value> value = plist::read(*document);
+  if (!value) return reportUnusable(value.error().in(options.file + " is not a property list that can be read"));
+  const Result<Bytes> output = converted(*value, options.form);
+  if (!output) return reportUnusable(output.error().in(options.file + " has no " + options.form + " form"));
+  const Status written = writeHostFile(options.output, *output);
+  return written ? ExitStatus::done : reportUnusable(written.error());
+}
+
+}  // namespace
+
+void addPlistCommand(CLI::App& line, Invocation& invocation) {
+  const auto options = std::make_shared<PlistOptions>();
+  CLI::App* command = line.add_subcommand("plist", "Convert a property list, or look into it.");
+  command->add_option("FILE", options->file, "the property list; - is standard input")->required();
+  command->add_option("--to", options->form, "the form to write: xml (when not said), binary or json")
+      ->check(CLI::IsMember({"xml", "binary", "json"}));
+  command->add_option("-o,--output", options->output, "write to this file instead of standard output");
+  command->footer(kExamples);
+  command->callback([options, &invocation] { invocation = [options] { return run(*options); }; });
+}
+
+}  // namespace appsync::tools

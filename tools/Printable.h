@@ -1,0 +1,29 @@
+// Text from outside made safe and fit for a terminal.
+#pragma once
+
+#include <cstddef>
+#include <string>
+#include <string_view>
+
+namespace appsync::tools {
+
+/// Columns after which names, identifiers and reasons are cut in messages.
+inline constexpr std::size_t kLongestText = 200;
+
+/// `text` as UTF-8 that only prints: bytes that are no UTF-8, control characters and characters that change the
+/// direction of writing appear as "\x1b" or "\u{202e}". What goes beyond `columns` is cut and ends with "...".
+[[nodiscard]] std::string printable(std::string_view text, std::size_t columns = kLongestText);
+
+/// The columns that printable text takes on a terminal.
+[[nodiscard]] std::size_t displayWidth(std::string_view text);
+
+/// Printable text cut or filled with blanks to exactly that many columns.
+[[nodiscard]] std::string fitted(std::string_view text, std::size_t columns);
+
+/// 1234567 as "1.2 MB".
+[[nodiscard]] std::string byteCount(unsigned long long bytes);
+
+/// Whether all of `text` is UTF-8.
+[[nodiscard]] bool isUTF8(std::string_view text);
+
+}  // namespace appsync::tools

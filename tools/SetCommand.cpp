@@ -1,0 +1,53 @@
+#include <memory>
+#include <vector>
+
+#include "tools/Commands.h"
+#include "tools/OpenDevice.h"
+#include "tools/StandardOutput.h"
+
+namespace appsync::tools {
+namespace {
+
+struct SetOptions {
+  std::string device;
+  std::vector<std::string> assignments;
+};
+
+constexpr const char* kExamples = R"(Keys and their values:
+  app-installation   yes, no or unset: whether apps may be installed
+  app-removal        yes, no or unset: whether apps may be removed
+  assertion          ID:granted, ID:denied, ID:unknown, ID:failing or ID:unset: what the home screen
+                     answers when app ID is about to be replaced
+
+Examples:
+  appsync set phone app-removal=no
+  appsync set phone app-removal=unset app-installation=unset)";
+
+ExitStatus run(const SetOptions& options, device::Device& device) {
+  for (const std::string& assignment : options.assignments) {
+    const Status set = device.services().settings().assign(assignment);
+    if (set) continue;
+    if (set.error().domain != device::kSettingsDomain) return reportUnusable(set.error());
+    printError(set.error().text);
+    return ExitStatus::wrongUsage;
+  }
+  return ExitStatus::done;
+}
+
+}  // namespace
+
+void addSetCommand(CLI::App& line, Invocation& invocation) {
+  const auto options = std::make_shared<SetOptions>();
+  CLI::App* command = line.add_subcommand("set", "Change a device's settings.");
+  addDevice(*command, options->device);
+  command->add_option("KEY=VALUE", options->assignments, "what to set")->required();
+  command->footer(kExamples);
+  command->callback([options, &invocation] {
+    invocation = [options] {
+      return withDevice(options->device, device::Access::exclusive,
+                        [&](device::Device& device) { return run(*options, device); });
+    };
+  });
+}
+
+}  // namespace appsync::tools

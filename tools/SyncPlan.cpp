@@ -1,0 +1,59 @@
+#include "tools/SyncPlan.h"
+
+#include <compare>
+
+#include "tools/VersionOrder.h"
+
+namespace appsync::tools {
+namespace {
+
+PlannedApp planRemoval(const std::string& identifier, const PlanInput& input) {
+  const auto found = input.deviceApps.find(identifier);
+  if (found == input.deviceApps.end()) {
+    return {{identifier, {}, {}}, PlannedWork::skip, nullptr, "it is not on the device"};
+  }
+  return {found->second.app, PlannedWork::remove, nullptr, {}};
+}
+
+/// The app is on the device; whether the library has something newer for it.
+PlannedApp planUpdate(const LibraryPackage& package, const DeviceApp& present) {
+  const auto order = compareVersions(package.app.version, present.app.version);
+  if (std::is_gt(order)) return {package.app, PlannedWork::update, &package, {}};
+  if (std::is_eq(order)) return {present.app, PlannedWork::none, nullptr, "it is up to date"};
+  return {present.app, PlannedWork::skip, nullptr,
+          "the device has the newer version " + present.app.version + ", the library " + package.app.version};
+}
+
+PlannedApp planPackage(const LibraryPackage& package, const PlanInput& input) {
+  const std::string& identifier = package.app.identifier;
+  const auto present = input.deviceApps.find(identifier);
+  if (present != input.deviceApps.end() && present->second.isInstalled) return planUpdate(package, present->second);
+  if (input.declined.contains(identifier) && !input.only.contains(identifier)) {
+    return {package.app, PlannedWork::skip, nullptr,
+            "it was removed from the device; ask for it with --only to have it again"};
+  }
+  return {package.app, PlannedWork::install, &package, {}};
+}
+
+}  // namespace
+
+std::vector<PlannedApp> makePlan(const PlanInput& input) {
+  std::vector<PlannedApp> plan;
+  for (const std::string& identifier : input.remove)
+    plan.push_back(planRemoval(identifier, input));
+  for (const auto& [identifier, package] : input.library.packages) {
+    if (input.remove.contains(identifier) || (!input.only.empty() && !input.only.contains(identifier))) continue;
+    plan.push_back(planPackage(package, input));
+  }
+  for (const std::string& identifier : input.only) {
+    if (input.library.packages.contains(identifier)) continue;
+    plan.push_back({{identifier, {}, {}}, PlannedWork::refuse, nullptr, "the library has no package of this app"});
+  }
+  if (!input.only.empty()) return plan;
+  for (const BrokenPackage& broken : input.library.broken) {
+    plan.push_back({{broken.fileName, {}, {}}, PlannedWork::refuse, nullptr, broken.reason});
+  }
+  return plan;
+}
+
+}  // namespace appsync::tools

@@ -1,0 +1,46 @@
+// What is to be done with each app in a sync.
+#pragma once
+
+#include <cstdint>
+#include <map>
+#include <string>
+#include <vector>
+
+#include "tools/AppOutcome.h"
+#include "tools/DeviceApps.h"
+#include "tools/HostState.h"
+#include "tools/Library.h"
+
+namespace appsync::tools {
+
+enum class PlannedWork : std::uint8_t {
+  install,
+  update,
+  remove,
+  none,    ///< the app is as it should be
+  skip,    ///< left alone on purpose
+  refuse,  ///< cannot be done
+};
+
+struct PlannedApp {
+  AppName app;
+  PlannedWork work = PlannedWork::none;
+  const LibraryPackage* package = nullptr;  ///< of installs and updates
+  std::string reason;                       ///< why nothing is done
+};
+
+struct PlanInput {
+  const Library& library;
+  /// By identifier.
+  const std::map<std::string, DeviceApp, std::less<>>& deviceApps;
+  const IdentifierSet& declined;
+  /// When not empty, the only apps that are installed or updated.
+  const IdentifierSet& only;
+  const IdentifierSet& remove;
+};
+
+/// One entry for each app concerned: first the removals, then the library's apps by identifier, then its broken
+/// packages. The packages stay the library's.
+[[nodiscard]] std::vector<PlannedApp> makePlan(const PlanInput& input);
+
+}  // namespace appsync::tools

@@ -1,0 +1,21 @@
+// appsync: keeps apps on a device in step with a library, as host and sync daemon in one process.
+#include <clocale>
+#include <csignal>
+#include <exception>
+
+#include "tools/CommandLine.h"
+#include "tools/StandardOutput.h"
+
+int main(int count, char** words) {
+  using namespace appsync::tools;
+  // Names in any script have their right width on a terminal, whatever the environment says.
+  if (std::setlocale(LC_CTYPE, "") == nullptr || MB_CUR_MAX == 1) std::setlocale(LC_CTYPE, "C.UTF-8");
+  // A reader that leaves early is an error of a write, not the end of a sync.
+  std::signal(SIGPIPE, SIG_IGN);
+  try {
+    return static_cast<int>(runCommandLine(count, words));
+  } catch (const std::exception& failure) {
+    printError(std::string("gave up: ") + failure.what());
+    return static_cast<int>(ExitStatus::unusable);
+  }
+}
