@@ -10,6 +10,7 @@
 #include "device/Bundles.h"
 #include "device/Database.h"
 #include "device/DeviceFileSystem.h"
+#include "device/DeviceService.h"
 #include "device/HomeScreen.h"
 #include "device/IconRenderer.h"
 #include "device/InstallCoordination.h"
@@ -49,6 +50,7 @@ class Services final : public platform::Platform {
         scheduler_(clock_) {}
 
   [[nodiscard]] SyncFramework& syncFramework() override { return syncFramework_; }
+  [[nodiscard]] DeviceService& sharedDeviceService() override { return deviceService_; }
   [[nodiscard]] AppRegistry& defaultRegistry() override { return registry_; }
   [[nodiscard]] UninstalledApps& uninstalledApps() override { return uninstalledApps_; }
   [[nodiscard]] InstallCoordination& installCoordination() override { return installCoordination_; }
@@ -91,6 +93,7 @@ class Services final : public platform::Platform {
   IconRenderer iconRenderer_;
   PNGEncoders pngEncoders_;
   SyncFramework syncFramework_;
+  DeviceService deviceService_;
   InstallCoordination installCoordination_;
   SystemClock clock_;
   ThreadScheduler scheduler_;

@@ -18,6 +18,7 @@
 #include "platform/SystemNotify.h"
 #include "platform/TransactionLog.h"
 #include "platform/UninstalledAppsList.h"
+#include "platform/ZTDeviceService.h"
 
 namespace appsync::platform {
 
@@ -30,6 +31,8 @@ class Platform {
   virtual ~Platform() = default;
 
   [[nodiscard]] virtual SyncFramework& syncFramework() = 0;
+  /// The daemon's `sharedInstance`.
+  [[nodiscard]] virtual ZTDeviceService& sharedDeviceService() = 0;
   [[nodiscard]] virtual AppRegistry& defaultRegistry() = 0;
   [[nodiscard]] virtual UninstalledAppsList& uninstalledApps() = 0;
   [[nodiscard]] virtual InstallCoordination& installCoordination() = 0;

@@ -36,6 +36,33 @@ class FakeInstallCoordination final : public platform::InstallCoordination {
   [[nodiscard]] std::vector<Connection> connections() const;
 
   [[nodiscard]] bool coordinationIsEnabled() override;
+  [[nodiscard]] std::shared_ptr<platform::InstallCoordinator> coordinatorForApp(platform::CoordinatorKind,
+                                                                                std::string_view,
+                                                                                platform::ClientIdentity,
+                                                                                platform::IfMissing, bool*,
+                                                                                ErrorSlot) override {
+    return nullptr;
+  }
+  [[nodiscard]] std::shared_ptr<platform::Placeholder> initAppPlaceholder(std::string_view, std::string_view,
+                                                                          platform::TSInstallType,
+                                                                          platform::ClientIdentity) override {
+    return nullptr;
+  }
+  [[nodiscard]] std::shared_ptr<platform::PromisedTransferToPath> makePromisedTransferToPath(
+      std::string_view, platform::ClientIdentity, const std::optional<platform::FileLocation>&,
+      std::uint64_t) override {
+    return nullptr;
+  }
+  [[nodiscard]] std::shared_ptr<platform::PromisedOutOfBandTransfer> makePromisedOutOfBandTransfer(
+      std::string_view, platform::ClientIdentity, std::uint64_t) override {
+    return nullptr;
+  }
+  void uninstallApp(std::string_view, platform::UserConfirmation, UninstallCompletion completion) override {
+    completion(std::nullopt);
+  }
+  [[nodiscard]] Error createUserPresentableError(long code, const plist::Dictionary&, const Error&) override {
+    return {std::string(platform::kInstallCoordinationErrorDomain), code, {}, nullptr};
+  }
   [[nodiscard]] std::unique_ptr<platform::InstallObserver> initWithMachServiceName(
       std::string_view serviceName, const std::set<platform::ClientIdentity>& clients,
       platform::InstallObserverDelegate& delegate) override;

@@ -11,6 +11,7 @@
 #include "tests/support/FakeAppRegistry.h"
 #include "tests/support/FakeBackupManager.h"
 #include "tests/support/FakeBundles.h"
+#include "tests/support/FakeDeviceService.h"
 #include "tests/support/FakeFileSystem.h"
 #include "tests/support/FakeHomeScreen.h"
 #include "tests/support/FakeIcons.h"
@@ -40,6 +41,7 @@ class FakePlatform final : public platform::Platform {
   FakeUninstalledAppsList uninstalledList{journal};
   FakeAppRegistry registry{journal, files, uninstalledList};
   FakeSyncFramework framework{journal, log};
+  FakeDeviceService deviceService{journal};
   FakeInstallCoordination coordination{journal};
   FakeHomeScreen screen{journal};
   FakeProfileConnection restrictions{journal};
@@ -56,6 +58,7 @@ class FakePlatform final : public platform::Platform {
 
   // The replacement stays the caller's and must outlive the platform.
   void use(platform::SyncFramework& service) { syncFramework_ = &service; }
+  void use(platform::ZTDeviceService& service) { sharedDeviceService_ = &service; }
   void use(platform::AppRegistry& service) { defaultRegistry_ = &service; }
   void use(platform::UninstalledAppsList& service) { uninstalledApps_ = &service; }
   void use(platform::InstallCoordination& service) { installCoordination_ = &service; }
@@ -78,6 +81,7 @@ class FakePlatform final : public platform::Platform {
   }
 
   [[nodiscard]] platform::SyncFramework& syncFramework() override { return *syncFramework_; }
+  [[nodiscard]] platform::ZTDeviceService& sharedDeviceService() override { return *sharedDeviceService_; }
   [[nodiscard]] platform::AppRegistry& defaultRegistry() override { return *defaultRegistry_; }
   [[nodiscard]] platform::UninstalledAppsList& uninstalledApps() override { return *uninstalledApps_; }
   [[nodiscard]] platform::InstallCoordination& installCoordination() override { return *installCoordination_; }
@@ -99,6 +103,7 @@ class FakePlatform final : public platform::Platform {
 
  private:
   platform::SyncFramework* syncFramework_ = &framework;
+  platform::ZTDeviceService* sharedDeviceService_ = &deviceService;
   platform::AppRegistry* defaultRegistry_ = &registry;
   platform::UninstalledAppsList* uninstalledApps_ = &uninstalledList;
   platform::InstallCoordination* installCoordination_ = &coordination;
