@@ -63,12 +63,12 @@ class Draft {
   bool placed_ = false;
 };
 
-int writeDraft(int work, const char* name, ByteView bytes, const platform::OwnerAttributes& owners) {
-  FileDescriptor file;
+int writeDraft(int work, const char* name, ByteView bytes, const platform::OwnerAttributes& owners,
+               FileDescriptor& file) {
   if (const int number = sys::createFile(work, name, sys::kFileMode, file); number != 0) return number;
   if (const int number = sys::writeAt(file.get(), bytes, 0); number != 0) return number;
   keepOwners(file.get(), owners);
-  return sys::writeOut(file.get());
+  return 0;
 }
 
 }  // namespace
@@ -101,19 +101,22 @@ Result<Bytes> DeviceFileSystem::readFile(std::string_view path) {
 }
 
 Status DeviceFileSystem::writeFileAtomically(std::string_view path, ByteView bytes) {
-  return writeNew(path, bytes, {});
+  return writeNew(path, bytes, {}, Survival::powerLoss);
 }
 
 Status DeviceFileSystem::createFile(std::string_view path, ByteView bytes,
                                     const platform::OwnerAttributes& attributes) {
-  return writeNew(path, bytes, attributes);
+  return writeNew(path, bytes, attributes, Survival::kill);
 }
 
-Status DeviceFileSystem::writeNew(std::string_view path, ByteView bytes, const platform::OwnerAttributes& attributes) {
+Status DeviceFileSystem::writeNew(std::string_view path, ByteView bytes, const platform::OwnerAttributes& attributes,
+                                  Survival survival) {
   const Result<RootFolder::Place> place = placeToChange(path);
   if (!place) return place.error();
   Draft draft(work());
-  int number = writeDraft(work(), draft.name(), bytes, attributes);
+  FileDescriptor file;
+  int number = writeDraft(work(), draft.name(), bytes, attributes, file);
+  if (number == 0 && survival == Survival::powerLoss) number = sys::writeOut(file.get());
   if (number == 0) number = draft.place(*place, sys::Replace::yes);
   return outcome(number, path);
 }

@@ -47,7 +47,11 @@ class DeviceFileSystem final : public platform::FileSystem {
  private:
   /// The place of something that is about to change.
   [[nodiscard]] Result<RootFolder::Place> placeToChange(std::string_view path) const;
-  [[nodiscard]] Status writeNew(std::string_view path, ByteView bytes, const platform::OwnerAttributes& attributes);
+  /// What a file whose name is found must have outlived with all its bytes.
+  enum class Survival : std::uint8_t { kill, powerLoss };
+
+  [[nodiscard]] Status writeNew(std::string_view path, ByteView bytes, const platform::OwnerAttributes& attributes,
+                                Survival survival);
 
   RootFolder root_;
   FileDescriptor work_;

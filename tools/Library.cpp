@@ -10,6 +10,7 @@
 
 #include "device/FileDescriptor.h"
 #include "device/Package.h"
+#include "tools/Parallel.h"
 #include "tools/VersionOrder.h"
 
 namespace appsync::tools {
@@ -51,12 +52,16 @@ Result<std::vector<std::string>> packageNames(const std::string& folder) {
   return names;
 }
 
-void addPackage(Library& library, const std::string& path, const device::PackageInfo& info) {
-  LibraryPackage package{path, {info.identifier, info.name, info.version.value_or("")}, info.packageBytes};
-  const auto [place, isFirst] = library.packages.try_emplace(info.identifier, package);
-  if (!isFirst && std::is_gt(compareVersions(package.app.version, place->second.app.version))) {
-    place->second = std::move(package);
-  }
+/// Without the package's pictures and lists: a library may hold many.
+Result<LibraryPackage> summarise(const std::string& path) {
+  const Result<device::PackageInfo> info = device::readPackageInfo(path);
+  if (!info) return info.error();
+  return LibraryPackage{path, {info->identifier, info->name, info->version.value_or("")}, info->packageBytes};
+}
+
+void addPackage(Library& library, const LibraryPackage& package) {
+  const auto [place, isFirst] = library.packages.try_emplace(package.app.identifier, package);
+  if (!isFirst && std::is_gt(compareVersions(package.app.version, place->second.app.version))) place->second = package;
 }
 
 /// The error's text, without the path that it starts with: the package is named beside it anyway.
@@ -70,13 +75,15 @@ std::string reasonOf(const Error& error, const std::string& path) {
 Result<Library> readLibrary(const std::string& path) {
   const Result<std::vector<std::string>> names = packageNames(path);
   if (!names) return names.error();
+  const auto pathOf = [&](std::size_t number) { return (fs::path(path) / (*names)[number]).string(); };
+  std::vector<std::optional<Result<LibraryPackage>>> summaries(names->size());
+  inParallel(names->size(), [&](std::size_t number) { summaries[number] = summarise(pathOf(number)); });
   Library library;
-  for (const std::string& name : *names) {
-    const std::string package = (fs::path(path) / name).string();
-    if (const auto info = device::readPackageInfo(package)) {
-      addPackage(library, package, *info);
+  for (std::size_t number = 0; number < names->size(); ++number) {
+    if (const Result<LibraryPackage>& summary = *summaries[number]; summary.ok()) {
+      addPackage(library, *summary);
     } else {
-      library.broken.push_back({name, reasonOf(info.error(), package)});
+      library.broken.push_back({(*names)[number], reasonOf(summary.error(), pathOf(number))});
     }
   }
   return library;

@@ -58,6 +58,28 @@ int copyWhole(int from, int to, std::uint64_t size, const PackageSender::GoOn& g
   }
 }
 
+int copyInto(int from, int folder, const std::string& name, std::uint64_t size, const PackageSender::GoOn& goOn) {
+  device::FileDescriptor to;
+  int failed = device::sys::createFile(folder, name.c_str(), device::sys::kFileMode, to);
+  if (failed == 0) failed = copyWhole(from, to.get(), size, goOn);
+  if (failed != 0 && to.valid()) static_cast<void>(device::sys::removeFile(folder, name.c_str()));
+  return failed;
+}
+
+/// Gives the library's own file a second name, where both are on one file system: the device only reads a package, and
+/// what it then removes is the name. Copies would have to be written out with every app that is installed meanwhile.
+int lendWhole(int from, int folder, const std::string& name, const PackageSender::GoOn& goOn) {
+  if (!goOn(0)) return ECANCELED;
+  if (const int failed = device::step("send package"); failed != 0) return failed;
+  if (::linkat(from, "", folder, name.c_str(), AT_EMPTY_PATH) != 0) {
+    const std::string path = "/proc/self/fd/" + std::to_string(from);
+    if (::linkat(AT_FDCWD, path.c_str(), folder, name.c_str(), AT_SYMLINK_FOLLOW) != 0) return errno;
+  }
+  if (goOn(1)) return 0;
+  static_cast<void>(device::sys::removeFile(folder, name.c_str()));
+  return ECANCELED;
+}
+
 }  // namespace
 
 Result<std::string> PackageSender::send(const LibraryPackage& package, const GoOn& goOn) {
@@ -69,11 +91,9 @@ Result<std::string> PackageSender::send(const LibraryPackage& package, const GoO
   const std::string name = std::to_string(++sent_) + ".zip";
   const Result<device::RootFolder::Place> place = files_.root().place(folder + "/" + name);
   if (!place) return place.error();
-  device::FileDescriptor to;
-  int failed = device::sys::createFile(place->folder.get(), name.c_str(), device::sys::kFileMode, to);
-  if (failed == 0) failed = copyWhole(from.get(), to.get(), package.bytes, goOn);
+  int failed = lendWhole(from.get(), place->folder.get(), name, goOn);
+  if (failed != 0 && failed != ECANCELED) failed = copyInto(from.get(), place->folder.get(), name, package.bytes, goOn);
   if (failed == 0) return std::string(kPackagesFolder) + "/" + name;
-  if (to.valid()) static_cast<void>(device::sys::removeFile(place->folder.get(), name.c_str()));
   return Error::fromErrno(failed, package.path + " cannot be sent to the device");
 }
 

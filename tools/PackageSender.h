@@ -21,7 +21,9 @@ class PackageSender {
   explicit PackageSender(device::DeviceFileSystem& files) : files_(files) {}
 
   /// Puts the package into the public staging folder under a name of its own, and returns its path relative to that
-  /// folder. A failed or ended transfer leaves nothing behind. Errors: "POSIX"; ECANCELED when `goOn` ended it.
+  /// folder. On the library's own file system it is the library's file under a second name, for which no time is
+  /// needed; elsewhere a copy. A failed or ended transfer leaves nothing behind. Errors: "POSIX"; ECANCELED when `goOn`
+  /// ended it.
   [[nodiscard]] Result<std::string> send(const LibraryPackage& package, const GoOn& goOn);
 
  private:

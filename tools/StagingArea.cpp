@@ -5,6 +5,7 @@
 
 #include "core/SyncFiles.h"
 #include "device/Package.h"
+#include "tools/Parallel.h"
 
 namespace appsync::tools {
 namespace {
@@ -89,15 +90,23 @@ Status stageApp(FileSystem& files, const PlannedApp& planned) {
   return package ? writeFace(files, stagedPath(planned.app.identifier), *std::move(package)) : Status();
 }
 
+/// The first failure, in the plan's order.
+Status stageApps(FileSystem& files, const std::vector<PlannedApp>& plan) {
+  std::vector<Status> staged(plan.size());
+  inParallel(plan.size(), [&](std::size_t number) {
+    if (isTransfer(plan[number])) staged[number] = stageApp(files, plan[number]);
+  });
+  const auto failed = std::ranges::find_if(staged, [](const Status& one) { return !one.ok(); });
+  return failed == staged.end() ? Status() : *failed;
+}
+
 }  // namespace
 
 Status stage(device::Device& device, const std::vector<PlannedApp>& plan) {
   FileSystem& files = device.platform().fileSystem();
   clearStaging(device);
   Status staged = files.createDirectory(kStagingFolder, IntermediateDirectories::create, {});
-  for (const PlannedApp& planned : plan) {
-    if (staged && isTransfer(planned)) staged = stageApp(files, planned);
-  }
+  if (staged) staged = stageApps(files, plan);
   if (staged) staged = writeList(files, stagedFor(kIconLayoutPath), iconLayout(device, plan));
   if (staged) staged = writeList(files, stagedFor(kTodoListPath), todoList(plan));
   if (!staged) clearStaging(device);
