@@ -29,9 +29,10 @@ enum class CoordinatorKind : std::uint8_t {
 /// nothing: a coordinator lives in the service, also across restarts, until its app is installed, the install has
 /// failed, or it is cancelled.
 ///
-/// The service installs the app once the coordinator has its install options and its placeholder promise, its app-asset
-/// promise is complete and, where it has a user-data promise, that is complete too. From then on its app-asset promise
-/// cannot be taken back. When the install has ended the coordinator is gone, and the observers hear of it.
+/// The service installs the app once the coordinator has its install options (one that restores can do without) and its
+/// placeholder promise, its app-asset promise is complete and, where it has a user-data promise, that is complete too.
+/// From then on its app-asset promise cannot be taken back. When the install has ended the coordinator is gone, and the
+/// observers hear of it.
 ///
 /// Each set operation is atomic and fails, changing nothing, when what it sets was set before, when the promise was
 /// cancelled or belongs to another app, or when the coordinator has ended. A promise that could not be set stays the

@@ -55,8 +55,8 @@ class PlaceholderAttributes {
 /// The home screen shows it once it is its coordinator's and its configuration is complete; one whose configuration
 /// never is complete is not shown, and does not keep the app from being installed.
 ///
-/// Threads: one at a time. Every operation fails, and changes nothing, once the placeholder was cancelled or its
-/// configuration is complete. Errors: `kInstallCoordinationErrorDomain`.
+/// Threads: one at a time. Every operation fails, and changes nothing, once the placeholder was cancelled; those that
+/// configure it also once its configuration is complete. Errors: `kInstallCoordinationErrorDomain`.
 class Placeholder {
  public:
   virtual ~Placeholder() = default;

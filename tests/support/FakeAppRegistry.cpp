@@ -3,7 +3,6 @@
 #include <algorithm>
 
 #include "platform/Keys.h"
-#include "tests/support/FakePackages.h"
 #include "tests/support/Misuse.h"
 
 namespace appsync::test {
@@ -194,50 +193,81 @@ Status FakeAppRegistry::installApplication(const platform::FileLocation& locatio
     mostAtOnce_ = std::max(mostAtOnce_, ++running_);
   }
   installGate.pass();
-  Status status = carryOut(install);
+  Status status = this->install(install.location, install.options);
   const std::scoped_lock lock(mutex_);
   --running_;
   return status;
 }
 
-Status FakeAppRegistry::carryOut(const Install& install) {
-  if (auto failure = failures.take(RegistryOperation::installApplication, install.identifier))
-    return *std::move(failure);
-  const Result<FakePackage> package = readPackage(files_, install.location, install.options);
+Status FakeAppRegistry::install(const platform::FileLocation& location, const plist::Dictionary& options) {
+  const std::string identifier = identifierIn(options);
+  if (auto failure = failures.take(RegistryOperation::installApplication, identifier)) return *std::move(failure);
+  const Result<FakePackage> package = readPackage(files_, location, options);
   if (!package) return package.error();
+  apply(identifier, *package, options);
+  return {};
+}
+
+void FakeAppRegistry::showPlaceholder(const std::string& identifier, platform::TSInstallType type) {
+  apply(identifier, {PackageKind::placeholder, std::nullopt},
+        {{platform::InstallTypeKey, static_cast<std::uint64_t>(type)}});
+}
+
+void FakeAppRegistry::apply(const std::string& identifier, const FakePackage& package,
+                            const plist::Dictionary& options) {
   std::shared_ptr<FakeInstallProgress> progress;
   {
     const std::scoped_lock lock(mutex_);
-    FakeApp& app = apps_.try_emplace(install.identifier, install.identifier).first->second;
-    applyPackage(app, *package, install.options);
+    FakeApp& app = apps_.try_emplace(identifier, identifier).first->second;
+    applyPackage(app, package, options);
     progress = app.progress;
   }
-  attach(install.identifier, progress);
-  if (package->kind == PackageKind::app) uninstalledApps_.remove(install.identifier);
-  return {};
+  attach(identifier, progress);
+  if (package.kind == PackageKind::app) uninstalledApps_.remove(identifier);
 }
 
 Status FakeAppRegistry::uninstallApplication(std::string_view bundleIdentifier, const plist::Dictionary& options) {
   const bool placeholdersOnly = isTrue(options, platform::UninstallPlaceholdersOnlyKey);
   const std::string arguments = std::string(bundleIdentifier) + (placeholdersOnly ? " placeholder only" : "");
   if (auto failure = journal_.beforeCall("registry.uninstallApplication", arguments)) return *std::move(failure);
-  const std::scoped_lock lock(mutex_);
-  uninstalls_.push_back({std::string(bundleIdentifier), options});
-  if (auto failure = failures.take(RegistryOperation::uninstallApplication, bundleIdentifier)) {
-    return *std::move(failure);
+  {
+    const std::scoped_lock lock(mutex_);
+    uninstalls_.push_back({std::string(bundleIdentifier), options});
   }
-  const auto found = apps_.find(bundleIdentifier);
-  if (found == apps_.end()) return installerError("no such app: " + std::string(bundleIdentifier));
-  FakeApp& app = found->second;
-  if (app.progress && (app.isPlaceholder || !placeholdersOnly)) app.progress->end(TSInstallState::Canceled);
-  if (placeholdersOnly && app.isInstalled) {
-    app.isPlaceholder = false;
-    app.progress = nullptr;
+  return uninstall(bundleIdentifier, options);
+}
+
+void FakeAppRegistry::removePlaceholder(std::string_view identifier) {
+  const std::scoped_lock lock(mutex_);
+  const auto found = apps_.find(identifier);
+  if (found != apps_.end() && found->second.isPlaceholder) dropPlaceholder(found);
+}
+
+Status FakeAppRegistry::uninstall(std::string_view identifier, const plist::Dictionary& options) {
+  if (auto failure = failures.take(RegistryOperation::uninstallApplication, identifier)) return *std::move(failure);
+  const bool placeholdersOnly = isTrue(options, platform::UninstallPlaceholdersOnlyKey);
+  const std::scoped_lock lock(mutex_);
+  const auto found = apps_.find(identifier);
+  if (found == apps_.end()) return installerError("no such app: " + std::string(identifier));
+  if (placeholdersOnly) {
+    dropPlaceholder(found);
     return {};
   }
-  if (app.isInstalled) uninstalledApps_.add(bundleIdentifier);
+  if (found->second.progress) found->second.progress->end(TSInstallState::Canceled);
+  if (found->second.isInstalled) uninstalledApps_.add(identifier);
   apps_.erase(found);
   return {};
+}
+
+void FakeAppRegistry::dropPlaceholder(Apps::iterator entry) {
+  FakeApp& app = entry->second;
+  if (app.progress && app.isPlaceholder) app.progress->end(TSInstallState::Canceled);
+  if (!app.isInstalled) {
+    apps_.erase(entry);
+    return;
+  }
+  app.isPlaceholder = false;
+  app.progress = nullptr;
 }
 
 // Progress.

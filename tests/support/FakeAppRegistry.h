@@ -17,6 +17,7 @@
 #include "tests/support/FailurePlan.h"
 #include "tests/support/FakeApp.h"
 #include "tests/support/FakeFileSystem.h"
+#include "tests/support/FakePackages.h"
 #include "tests/support/FakeUninstalledAppsList.h"
 #include "tests/support/Gate.h"
 
@@ -60,6 +61,12 @@ class FakeAppRegistry final : public platform::AppRegistry {
   /// Failures of installs and uninstalls, by identifier.
   FailurePlan<RegistryOperation> failures;
 
+  // What other services of the device do, which is no call: as the installer does on a call.
+  [[nodiscard]] Status install(const platform::FileLocation& location, const plist::Dictionary& options);
+  void showPlaceholder(const std::string& identifier, platform::TSInstallType type);
+  void removePlaceholder(std::string_view identifier);
+  [[nodiscard]] Status uninstall(std::string_view identifier, const plist::Dictionary& options = {});
+
   // What was asked.
   [[nodiscard]] std::vector<Install> installs() const;
   [[nodiscard]] std::vector<Uninstall> uninstalls() const;
@@ -95,6 +102,7 @@ class FakeAppRegistry final : public platform::AppRegistry {
  private:
   using Subscription = CallbackThread::Subscription;
   using Report = std::function<void(platform::AppRegistryObserver&)>;
+  using Apps = std::map<std::string, FakeApp, std::less<>>;
   struct OtherBundle {
     std::string identifier;
     platform::BundleKind kind;
@@ -107,13 +115,14 @@ class FakeAppRegistry final : public platform::AppRegistry {
   [[nodiscard]] Report orderReport() const;
   void post(Subscription subscription, platform::AppRegistryObserver& observer, Report report);
   void postToAll(const Report& report);
-  Status carryOut(const Install& install);
+  void dropPlaceholder(Apps::iterator entry);
+  void apply(const std::string& identifier, const FakePackage& package, const plist::Dictionary& options);
 
   CallJournal& journal_;
   FakeFileSystem& files_;
   FakeUninstalledAppsList& uninstalledApps_;
   mutable std::mutex mutex_;
-  std::map<std::string, FakeApp, std::less<>> apps_;
+  Apps apps_;
   std::vector<OtherBundle> otherBundles_;
   std::vector<std::string> prioritized_;
   std::vector<std::string> paused_;

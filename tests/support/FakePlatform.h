@@ -42,7 +42,7 @@ class FakePlatform final : public platform::Platform {
   FakeAppRegistry registry{journal, files, uninstalledList};
   FakeSyncFramework framework{journal, log};
   FakeDeviceService deviceService{journal};
-  FakeInstallCoordination coordination{journal};
+  FakeInstallCoordination coordination{journal, files, registry};
   FakeHomeScreen screen{journal};
   FakeProfileConnection restrictions{journal};
   FakeTransactionLog transactions{journal};
