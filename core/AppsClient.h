@@ -17,6 +17,7 @@
 #include "base/OperationQueue.h"
 #include "base/PropertyList.h"
 #include "base/SerialQueue.h"
+#include "coordination/AppInstallUsingCoordination.h"
 #include "core/IdentifierSet.h"
 #include "core/PlugInLog.h"
 #include "platform/Platform.h"
@@ -27,18 +28,25 @@ namespace appsync {
 class WantedEntry;
 struct PlaceholderInfo;
 
+/// What was known of an app when its transfer ended.
+struct TransferMarks {
+  bool isExistingApp = false;
+  bool isUserCancelled = false;
+};
+
 /// One object, made once by the daemon and kept for the life of the process. Installs, removes and prepares apps as the
 /// host's todo list asks, and writes into that list how far each has come.
 ///
 /// Threads: as `platform::ZTClient` says. Nothing is thrown; failures go to the log, and to error slots where the
-/// daemon gives one. Queued installs and scheduled retries own a share of the object, so its destructor may run on any
-/// thread.
+/// daemon gives one. Queued installs, scheduled retries and callbacks that are under way own a share of the object, so
+/// its destructor may run on any thread.
 ///
 /// Class operations need no object and take the platform instead. Operations and fields that begin with an underscore
 /// are the plug-in's own; they are public because tests and the other rooms' files use them as they stand.
 class AppsClient final : public platform::ZTClient,
                          public platform::AppRegistryObserver,
                          public platform::InstallObserverDelegate,
+                         public AppInstallUsingCoordination,
                          public std::enable_shared_from_this<AppsClient> {
   struct Token {};  // Only create() makes one.
 
@@ -143,8 +151,48 @@ class AppsClient final : public platform::ZTClient,
   // ---- coordination
   // --------------------------------------------------------------------------------------------------
 
+  bool prepareAppForInstallUsingCoordination(const platform::ZTAsset& asset, bool existingApp) override;
+  /// updateTransferProgressForApp:existingApp: false when no coordinator waits for the package.
+  bool updateTransferProgressForApp(const platform::ZTAsset& asset, bool existingApp);
+  /// transferCompleteForApp:withError:isExistingApp: the service installs the package, or hears why it never comes.
+  void transferCompleteForApp(const platform::ZTAsset& asset, const std::optional<Error>& error, bool isExistingApp);
+  /// assetSyncFinishedWithStatus:outstandingItems: after a failed sync nobody waits for these any more.
+  void assetSyncFinishedWithStatus(bool success, const Identifiers& outstandingItems);
+  void uninstallAppUsingCoordination(std::string_view bundleIdentifier) override;
+
+  /// _initiatingOrUpdatingAppInstallCoordinatorForBundleIdentifier:existingApp:createIfNotExisting:error: null when
+  /// there is none that the plug-in may drive; `error` is what the service said, also when it said nothing.
+  [[nodiscard]] std::shared_ptr<platform::InstallCoordinator>
+  _initiatingOrUpdatingAppInstallCoordinatorForBundleIdentifier(std::string_view bundleIdentifier, bool existingApp,
+                                                                bool createIfNotExisting, ErrorSlot error);
+  /// _placeHolderForBundleIdentifier:name:installType: the caller's; null when it cannot be made.
+  [[nodiscard]] std::shared_ptr<platform::Placeholder> _placeHolderForBundleIdentifier(
+      std::string_view bundleIdentifier, std::string_view name, platform::TSInstallType installType);
+  /// _createAppAssetPromiseForBundleIdentifier:atPath:andAddToCoordinatinator: null when it cannot be made or attached.
+  std::shared_ptr<platform::PromisedTransferToPath> _createAppAssetPromiseForBundleIdentifier(
+      std::string_view bundleIdentifier, const std::optional<std::string>& path,
+      const std::shared_ptr<platform::InstallCoordinator>& coordinator);
+  /// _createIconPromiseForBundleIdentifier:transferPath:diskSpaceNeeded:andAddToPlaceHolder:forAppInstall: the same.
+  std::shared_ptr<platform::PromisedTransferToPath> _createIconPromiseForBundleIdentifier(
+      std::string_view bundleIdentifier, std::string_view transferPath, std::uint64_t diskSpaceNeeded,
+      const std::shared_ptr<platform::Placeholder>& placeHolder, bool forAppInstall);
+  /// _userDataPromiseForBundleIdentifier: kept already: there is no data to wait for. Attached to nothing.
+  [[nodiscard]] std::shared_ptr<platform::PromisedOutOfBandTransfer> _userDataPromiseForBundleIdentifier(
+      std::string_view bundleIdentifier);
+
+  // ---- coordination: what the services report, on their threads
+  // ----------------------------------------------------------
+
   /// setupInstallCoordinatorObserver: opens the observer connection unless it is open.
   void setupInstallCoordinatorObserver();
+  void coordinatorDidInstallPlaceholder(platform::InstallCoordinator& coordinator) override;
+  void coordinatorDidCompleteSuccessfully(platform::InstallCoordinator& coordinator) override;
+  void coordinatorShouldPrioritize(platform::InstallCoordinator& coordinator) override;
+  void coordinatorCanceledWithReason(platform::InstallCoordinator& coordinator, const Error& reason,
+                                     platform::ClientIdentity client) override;
+  void promiseDidBeginFulfillmentWithIdentifier(std::uint64_t identifier) override;
+  /// applicationInstallsDidCancel: matters only where installs are not coordinated.
+  void applicationInstallsDidCancel(const platform::AppRecords& records) override;
 
   // ---- restore: state and todo words. These read, change and rewrite whole files without a lock: who is not on a
   // queue submits them to `_accessQueue`.
@@ -176,6 +224,13 @@ class AppsClient final : public platform::ZTClient,
   /// _getSystemAppPlaceholders
   [[nodiscard]] Identifiers _getSystemAppPlaceholders();
 
+  /// dataMigratorSetPlaceHolderPromiseForRestoreAppBundle: that app's placeholder is awaited from now on.
+  void dataMigratorSetPlaceHolderPromiseForRestoreAppBundle(std::string_view bundleIdentifier);
+  /// dataMigratorCancelledCoordinatorForRestoreAppBundle: it is not awaited any more.
+  void dataMigratorCancelledCoordinatorForRestoreAppBundle(std::string_view bundleIdentifier);
+  /// cnDidInstallPlaceHolderForAppBundle: it has come.
+  void cnDidInstallPlaceHolderForAppBundle(std::string_view bundleIdentifier);
+
  private:
   /// The registrations of a new object.
   void init();
@@ -183,17 +238,27 @@ class AppsClient final : public platform::ZTClient,
   // Steps of the operations above.
   void _removeApps(const plist::Array& todoList, bool removalAllowed);
   void _closeOutstandingTransfers(const Identifiers& outstanding, bool success);
+  [[nodiscard]] bool _preparePlaceholder(const platform::ZTAsset& asset, bool hasPlaceholder);
+  [[nodiscard]] bool _prepareCoordinatedInstall(const platform::ZTAsset& asset);
+  [[nodiscard]] std::shared_ptr<platform::InstallCoordinator> _usableCoordinator(std::string_view identifier,
+                                                                                 bool existingApp);
+  void _satisfyAppAssetPromise(const platform::ZTAsset& asset,
+                               const std::shared_ptr<platform::InstallCoordinator>& coordinator);
+  [[nodiscard]] bool _stopAwaitingPlaceholder(std::string_view bundleIdentifier);
   [[nodiscard]] std::shared_ptr<platform::ZTAsset> _makeAsset(const WantedEntry& entry,
                                                               const std::optional<std::string>& displayName,
                                                               const plist::Value* restoreState);
-  void _handleReceivedAsset(const std::shared_ptr<platform::ZTAsset>& asset, platform::InstallProgress* progress);
+  void _handleReceivedAsset(const std::shared_ptr<platform::ZTAsset>& asset, TransferMarks marks,
+                            platform::InstallProgress* progress);
   void _handleReceivedRestoreAsset(const std::shared_ptr<platform::ZTAsset>& asset,
                                    platform::InstallProgress* progress);
-  void _handleFailedTransfer(const platform::ZTAsset& asset, const std::optional<Error>& error,
+  void _handleFailedTransfer(const platform::ZTAsset& asset, const std::optional<Error>& error, TransferMarks marks,
                              platform::InstallProgress* progress);
+  void _cancelRestoreOfFailedTransfer(const std::string& identifier);
   [[nodiscard]] std::optional<plist::Value> _receivedPath(const platform::ZTAsset& asset);
   void _installPackage(const platform::ZTAsset& asset);
   void _scheduleInstallRetry(const std::shared_ptr<platform::ZTAsset>& asset);
+  void _cancelRestoreOfFailedInstall(const std::string& identifier);
   void _removeFailedInstall(const platform::ZTAsset& asset);
   void _installPlaceholder(const std::string& folder, const PlaceholderInfo& placeholder);
 
@@ -206,7 +271,8 @@ class AppsClient final : public platform::ZTClient,
   // Set once, by construction.
   platform::Platform& _platform;
   const PlugInLog _log;
-  bool _useInstallCoordinator = false;
+  /// Atomic: the registry may report a cancellation from the moment of the registration, before this is known.
+  std::atomic<bool> _useInstallCoordinator = false;
   bool _runsInsideDaemon = false;
   std::unique_ptr<platform::BackupManager> _backupManager;
 
@@ -226,9 +292,6 @@ class AppsClient final : public platform::ZTClient,
   Identifiers _placeholdersForRestoringApps;
   bool _finishedWaitingForPlaceHolderInstalls = false;
 
-  // Set by the daemon's start-up notification.
-  std::unique_ptr<platform::InstallObserver> _appInstallObserver;
-
   // Counted by concurrent installs.
   std::atomic<std::uint32_t> _numAppInstallsAttempted = 0;
 
@@ -238,7 +301,10 @@ class AppsClient final : public platform::ZTClient,
   Group _restorePlaceHoldersWaitGroup;         ///< restore placeholders still awaited
   SerialQueue _accessQueue{"com.corvel.qor.Zephtra.AppSync"};
   SerialQueue _restoreQueue{"com.corvel.qor.Zephtra.AppRestore"};
-  OperationQueue _installOperationQueue;  ///< last: it goes first, and its operations use all of the above
+  OperationQueue _installOperationQueue;  ///< its operations use all of the above
+
+  /// Set by the daemon's start-up notification. Last: it goes first, and its callbacks use all of the above.
+  std::unique_ptr<platform::InstallObserver> _appInstallObserver;
 };
 
 /// The daemon's start-up notification: `context` is the AppsClient, or null, and then nothing happens.

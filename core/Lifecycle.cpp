@@ -48,9 +48,11 @@ AppsClient::~AppsClient() {
   if (const std::size_t outstanding = _outstandingDCXTransfers.size(); outstanding > 0) {
     _log.error("%s|%{public}@ getting dealloc'd with %lu outstanding DCX transfers!", *this, outstanding);
   }
-  if (!_placeholdersForRestoringApps.empty()) {
+  // Callbacks may still come until the registrations below have ended.
+  const Identifiers awaited = _restoreQueue.sync([this] { return _placeholdersForRestoringApps; });
+  if (!awaited.empty()) {
     _log.error("%s|%{public}@ getting dealloc'd with %{public}@pending placeholder install complete notifications",
-               *this, _placeholdersForRestoringApps);
+               *this, awaited);
   }
   _platform.defaultRegistry().removeObserver(*this);
   if (_runsInsideDaemon) {  // As it was at the start: what was registered then must go, whatever the answer is now.

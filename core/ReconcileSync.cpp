@@ -96,8 +96,13 @@ void AppsClient::_removeApps(const plist::Array& todoList, bool removalAllowed) 
   const auto identifiers = identifiersToRemove(todoList, _log);
   if (identifiers.empty()) return;
   _log.message("%s|performing %llu deletions", identifiers.size());
-  for (const std::string& identifier : identifiers)
-    uninstall(_platform, identifier, _log);
+  for (const std::string& identifier : identifiers) {
+    if (_useInstallCoordinator) {
+      uninstallAppUsingCoordination(identifier);
+    } else {
+      uninstall(_platform, identifier, _log);
+    }
+  }
 }
 
 }  // namespace appsync

@@ -36,7 +36,11 @@ void AppsClient::assetTransferEndedWithSuccess(bool success) {
 
   const Identifiers outstanding = _outstandingDCXTransfers.identifiers();
   if (outstanding.empty()) return;
-  _closeOutstandingTransfers(outstanding, success);
+  if (_useInstallCoordinator) {
+    assetSyncFinishedWithStatus(success, outstanding);
+  } else {
+    _closeOutstandingTransfers(outstanding, success);
+  }
   if (success) {
     _log.error("%s|Called with success == YES but with %lu outstanding DCX transfers!", outstanding.size());
   }

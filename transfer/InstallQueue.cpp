@@ -110,14 +110,31 @@ void AppsClient::assetInstallFailed(const ZTAsset& asset, const Error& error) {
     _log.message("%s|%{public}@ install failed unrecoverably: %{public}@", identifier, error);
     _accessQueue.sync([&] { changeAssetID(identifier, todo::kFailed); });
     // Asked again: the daemon may have made it a restore since.
-    if (asset.isRestore()) _backupManager->cancelApplicationRestore(identifier, nullptr);
+    if (asset.isRestore()) _cancelRestoreOfFailedInstall(identifier);
     _removeFailedInstall(asset);
   }
   _accessQueue.sync([&] { cleanRestoreStateForIdentifier(identifier); });
 }
 
+void AppsClient::_cancelRestoreOfFailedInstall(const std::string& identifier) {
+  if (_useInstallCoordinator) {
+    _log.message("%s|not asking backup manager to cancel app restore for %{public}@ as install coordination is enabled",
+                 identifier);
+  } else {
+    _backupManager->cancelApplicationRestore(identifier, nullptr);
+  }
+}
+
 void AppsClient::_removeFailedInstall(const ZTAsset& asset) {
   const std::string& identifier = asset.identifier();
+  if (_useInstallCoordinator && asset.isRestore()) {
+    _log.message("%s|not uninstalling restore asset %{public}@ as install coordination is enabled", identifier);
+    return;
+  }
+  if (_useInstallCoordinator) {
+    uninstallAppUsingCoordination(identifier);
+    return;
+  }
   const Status removed = _platform.defaultRegistry().uninstallApplication(identifier);
   if (!removed) _log.error("%s|Uninstall of %{public}@ failed.", identifier);
   _platform.transactionLog().logScenario(kRestoreScenario, 0, removed.ok(), identifier,

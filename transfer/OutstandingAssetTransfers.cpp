@@ -146,16 +146,35 @@ platform::Assets AppsClient::outstandingAssetTransfers() {
     };
     if (isSkipped(candidate, _log)) continue;
     auto asset = _makeAsset(entry, displayName, restoreState ? &*restoreState : nullptr);
-    const bool hasPlaceholder = preExisting.contains(identifier);
-    if (hasPlaceholder) {
-      _log.message("%s|Not creating a placeholder app for %{public}@ because we already have one", identifier);
-    } else {
-      _createPlaceHolderApplication(*asset);
-    }
-    // Only a restore's placeholder waits for the host; any other's package is somebody else's to bring.
-    if (!hasPlaceholder || candidate.isRestore) outstanding.push_back(std::move(asset));
+    const bool isPrepared = _useInstallCoordinator ? _prepareCoordinatedInstall(*asset)
+                                                   : _preparePlaceholder(*asset, preExisting.contains(identifier));
+    if (isPrepared) outstanding.push_back(std::move(asset));
   }
   return outstanding;
+}
+
+bool AppsClient::_preparePlaceholder(const ZTAsset& asset, bool hasPlaceholder) {
+  if (hasPlaceholder) {
+    _log.message("%s|Not creating a placeholder app for %{public}@ because we already have one", asset.identifier());
+    // Only a restore's placeholder waits for the host; any other's package is somebody else's to bring.
+    return asset.isRestore();
+  }
+  _createPlaceHolderApplication(asset);
+  return true;
+}
+
+bool AppsClient::_prepareCoordinatedInstall(const ZTAsset& asset) {
+  const std::string& identifier = asset.identifier();
+  const auto record = _platform.defaultRegistry().recordForIdentifier(identifier, platform::PlaceholderLookup::off);
+  const bool isUpdate = record && record->isInstalled() && !record->isPlaceholder();
+  if (isUpdate) _log.message("%s|App %{public}@ is already installed and will be updated.", identifier);
+  if (!prepareAppForInstallUsingCoordination(asset, isUpdate)) {
+    _log.error("%s|Not requesting app asset for %{public}@", identifier);
+    _accessQueue.sync([&] { changeAssetID(identifier, todo::kFailed); });
+    return false;
+  }
+  if (isUpdate) _accessQueue.sync([&] { _updatingApps.insert(identifier); });
+  return true;
 }
 
 std::shared_ptr<ZTAsset> AppsClient::_makeAsset(const WantedEntry& entry, const std::optional<std::string>& displayName,

@@ -1,6 +1,7 @@
 // Placeholder apps: bundles on disk with a name, a version and an icon, but no code.
 #include "core/AppsClient.h"
 #include "core/PropertyListAccess.h"
+#include "core/PropertyListFile.h"
 #include "core/SyncFiles.h"
 #include "transfer/PlaceholderInfo.h"
 
@@ -10,15 +11,6 @@ namespace {
 
 using platform::FileLocation;
 using platform::TSInstallType;
-
-const platform::OwnerAttributes kMobileOwner{"mobile", "mobile"};
-
-/// The dictionary in that file; null when there is none.
-plist::Value readDictionary(platform::FileSystem& files, const std::optional<std::string>& path) {
-  const auto bytes = files.readFile(path.value_or(""));
-  auto root = bytes ? plist::read(*bytes) : plist::Value();
-  return root && root->dictionary() != nullptr ? std::move(root).value() : plist::Value();
-}
 
 PlaceholderInfo describePlaceholder(const platform::ZTAsset& asset, const plist::Value& hostInfo) {
   const plist::Value* isPeriodical = hostInfo.find(kPeriodicalKey);

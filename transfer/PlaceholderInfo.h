@@ -4,11 +4,15 @@
 #include <string>
 
 #include "base/PropertyList.h"
+#include "platform/FileSystem.h"
 
 namespace appsync {
 
 /// The name of the icon file in a placeholder bundle.
 inline constexpr std::string_view kPlaceholderIconName = "Icon.png";
+
+/// Whose a placeholder bundle is.
+inline const platform::OwnerAttributes kMobileOwner{"mobile", "mobile"};
 
 /// Keys that a host's info dictionary or store metadata hands on to the placeholder.
 inline constexpr std::string_view kPeriodicalKey = "UIPeriodixApp";

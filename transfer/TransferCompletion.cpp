@@ -54,32 +54,42 @@ std::shared_ptr<InstallProgress> AppsClient::_progressForAssetIdentifier(std::st
 void AppsClient::assetTransferUpdatedProgress(const std::shared_ptr<ZTAsset>& asset, double fraction) {
   const std::string& identifier = asset->identifier();
   _log.message("%s|finished transferring %lf for %{public}@", fraction, identifier);
-  if (const auto progress = _progressForAssetIdentifier(identifier)) showTransfer(*progress, fraction);
+  if (_useInstallCoordinator) {
+    const bool isExistingApp = _accessQueue.sync([&] { return _updatingApps.contains(identifier); });
+    updateTransferProgressForApp(*asset, isExistingApp);
+  } else if (const auto progress = _progressForAssetIdentifier(identifier)) {
+    showTransfer(*progress, fraction);
+  }
   _outstandingDCXTransfers.insert(identifier);
 }
 
 void AppsClient::assetTransferSucceeded(const std::shared_ptr<ZTAsset>& asset, bool succeeded,
                                         const std::optional<Error>& error) {
   const std::string& identifier = asset->identifier();
-  const bool isExistingApp = _accessQueue.sync([&] {
-    _userCancelledApps.erase(identifier);
-    return _updatingApps.erase(identifier) > 0;
+  const TransferMarks marks = _accessQueue.sync([&] {
+    return TransferMarks{.isExistingApp = _updatingApps.erase(identifier) > 0,
+                         .isUserCancelled = _userCancelledApps.erase(identifier) > 0};
   });
   _outstandingDCXTransfers.erase(identifier);
   _log.message("%s|transfer for asset %{public}@ ended with success %c error %{public}@ existingApp:%d", identifier,
-               yesOrNo(succeeded), error, isExistingApp);
+               yesOrNo(succeeded), error, marks.isExistingApp);
   const auto progress = _progressForAssetIdentifier(identifier);
   if (succeeded) {
-    _handleReceivedAsset(asset, progress.get());
+    _handleReceivedAsset(asset, marks, progress.get());
   } else {
-    _handleFailedTransfer(*asset, error, progress.get());
+    _handleFailedTransfer(*asset, error, marks, progress.get());
   }
 }
 
-void AppsClient::_handleReceivedAsset(const std::shared_ptr<ZTAsset>& asset, InstallProgress* progress) {
+void AppsClient::_handleReceivedAsset(const std::shared_ptr<ZTAsset>& asset, TransferMarks marks,
+                                      InstallProgress* progress) {
   const std::string& identifier = asset->identifier();
   _log.message("%s|asset transfer succeeded for %{public}@", asset->shortDescription());
-  if (progress != nullptr) _platform.defaultRegistry().installPhaseFinishedForProgress(*progress);
+  if (progress != nullptr && _useInstallCoordinator) {
+    _log.message("%s|not setting install phase finished for %{public}@ as coordination is enabled", identifier);
+  } else if (progress != nullptr) {
+    _platform.defaultRegistry().installPhaseFinishedForProgress(*progress);
+  }
 
   const auto path = _receivedPath(*asset);
   if (const auto text = stringIn(path ? &*path : nullptr)) asset->setPath(std::string(*text));
@@ -97,7 +107,11 @@ void AppsClient::_handleReceivedAsset(const std::shared_ptr<ZTAsset>& asset, Ins
     _handleReceivedRestoreAsset(asset, progress);
   } else {
     _log.message("%s|Installing synced asset %{public}@", identifier);
-    _enqueueAssetInstall(asset);
+    if (_useInstallCoordinator) {
+      transferCompleteForApp(*asset, std::nullopt, marks.isExistingApp);
+    } else {
+      _enqueueAssetInstall(asset);
+    }
   }
 }
 
@@ -113,7 +127,18 @@ std::optional<plist::Value> AppsClient::_receivedPath(const ZTAsset& asset) {
 
 void AppsClient::_handleReceivedRestoreAsset(const std::shared_ptr<ZTAsset>& asset, InstallProgress* progress) {
   const std::string& identifier = asset->identifier();
-  if (asset->completedAssetParts() == platform::kZTAssetPartApplicationData) {
+  const bool hasOnlyItsData = asset->completedAssetParts() == platform::kZTAssetPartApplicationData;
+  if (_useInstallCoordinator) {
+    if (hasOnlyItsData) {
+      _log.message(
+          "%s|Not processing kZTAssetPartApplicationData for restore asset %{public}@ as coordination is enabled",
+          identifier);
+    } else {
+      _log.message("%s|Not processing restore asset %{public}@ as coordination is enabled", identifier);
+    }
+    return;
+  }
+  if (hasOnlyItsData) {
     _enqueueAssetInstall(asset);  // The package has waited for its data; it lies where the restore state says.
     return;
   }
@@ -128,7 +153,7 @@ void AppsClient::_handleReceivedRestoreAsset(const std::shared_ptr<ZTAsset>& ass
       [&] { _setRestoreStatePropertyValue(*asset->path(), kRestoreStatePathKey, identifier, versionOf(*asset)); });
 }
 
-void AppsClient::_handleFailedTransfer(const ZTAsset& asset, const std::optional<Error>& error,
+void AppsClient::_handleFailedTransfer(const ZTAsset& asset, const std::optional<Error>& error, TransferMarks marks,
                                        InstallProgress* progress) {
   const std::string& identifier = asset.identifier();
   const bool isRecoverable = _isRecoverableError(error);
@@ -144,10 +169,24 @@ void AppsClient::_handleFailedTransfer(const ZTAsset& asset, const std::optional
   if (progress != nullptr && progress->installState() < TSInstallState::Canceled) progress->cancel();
   _log.message("%s|Uninstalling placeholder %{public}@", identifier);
   // Asked again: the daemon may have made it a restore since.
-  if (asset.isRestore()) _backupManager->cancelApplicationRestore(identifier, nullptr);
+  if (asset.isRestore()) _cancelRestoreOfFailedTransfer(identifier);
+  if (_useInstallCoordinator) {
+    // A coordinator that the user has cancelled is gone.
+    if (!marks.isUserCancelled) transferCompleteForApp(asset, error, marks.isExistingApp);
+    return;
+  }
   const Status uninstalled =
       registry.uninstallApplication(identifier, {{platform::UninstallPlaceholdersOnlyKey, true}});
   _log.message("%s|Uninstalling app using TS %{public}@ %s", identifier, uninstalled ? "secceeded" : "failed");
+}
+
+void AppsClient::_cancelRestoreOfFailedTransfer(const std::string& identifier) {
+  if (_useInstallCoordinator) {
+    _log.message("%s|Install coordination is enabled - not calling cancelApplicationRestoreWithBundleID for %{public}@",
+                 identifier);
+  } else {
+    _backupManager->cancelApplicationRestore(identifier, nullptr);
+  }
 }
 
 }  // namespace appsync
