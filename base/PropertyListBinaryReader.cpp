@@ -260,8 +260,8 @@ bool BinaryReader::learnKeys(KnownKeys& known, Extent extent, int depth) {
   std::vector<Value> nulls(keys.size());
   const Dictionary sample = makeDictionary(keys, nulls);
   if (sample.size() != keys.size()) return false;
-  known.shape = ShapeHolder(*Internals::payload(sample)->shape);
-  auto places = placesOf(keys, *known.shape);
+  known.maker = DictionaryMaker(*Internals::payload(sample)->shape);
+  auto places = placesOf(keys, *known.maker);
   if (!places.empty()) known.places = std::make_shared<const std::vector<std::uint32_t>>(std::move(places));
   return true;
 }
@@ -283,7 +283,7 @@ void BinaryReader::readDictionary(std::size_t at, Extent extent, int depth, Valu
 
   // Kept here, because the keys of dictionaries within may displace the known ones.
   const auto places = known->places;
-  Dictionary dictionary = makeDictionary(known->shape);
+  Dictionary dictionary = known->maker.make();
   Value* const values = Internals::payload(dictionary)->values();
   const std::size_t first = extent.start + count * referenceSize_;
   for (std::size_t i = 0; i < count; ++i) {

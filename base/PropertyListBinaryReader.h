@@ -55,7 +55,7 @@ class BinaryReader {
     const std::byte* references = nullptr;
     std::size_t size = 0;
     std::uint64_t units = 0;
-    ShapeHolder shape;
+    DictionaryMaker maker;
     /// For each key as written, its place in the shape. Null when they are in order.
     std::shared_ptr<const std::vector<std::uint32_t>> places;
   };

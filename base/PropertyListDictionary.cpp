@@ -8,6 +8,13 @@
 
 namespace appsync::plist {
 
+namespace {
+
+/// No dictionary keeps more than about twice this alive beside itself.
+constexpr std::size_t kLargestSlab = 8192;
+
+}  // namespace
+
 DictionaryPayload* DictionaryPayload::make(Shape* shape, std::size_t capacity) {
   void* place = ::operator new(sizeof(DictionaryPayload) + capacity * sizeof(Value));
   return ::new (place) DictionaryPayload(shape, static_cast<std::uint32_t>(capacity));
@@ -16,8 +23,52 @@ DictionaryPayload* DictionaryPayload::make(Shape* shape, std::size_t capacity) {
 void DictionaryPayload::destroy(DictionaryPayload* dictionary) noexcept {
   std::destroy_n(dictionary->values(), dictionary->count);
   Shape::drop(dictionary->shape);
+  Slab* const slab = dictionary->slab;
   dictionary->~DictionaryPayload();
-  ::operator delete(dictionary);
+  if (slab != nullptr) {
+    Slab::drop(slab);
+  } else {
+    ::operator delete(dictionary);
+  }
+}
+
+Slab* Slab::make(std::size_t bytes, std::uint32_t owners) {
+  Slab* const slab = ::new (::operator new(sizeof(Slab) + bytes)) Slab;
+  slab->owners.store(owners, std::memory_order_relaxed);
+  return slab;
+}
+
+void Slab::drop(Slab* slab, std::uint32_t times) noexcept {
+  if (times == 0 || !slab->release(times)) return;
+  slab->~Slab();
+  ::operator delete(slab);
+}
+
+DictionaryMaker::~DictionaryMaker() {
+  if (shape_ != nullptr) Shape::drop(shape_, left_ + 1);
+  if (slab_ != nullptr) Slab::drop(slab_, left_);
+}
+
+Dictionary DictionaryMaker::make() {
+  const std::size_t count = shape_->keys.size();
+  const std::size_t bytes = sizeof(DictionaryPayload) + count * sizeof(Value);
+  if (left_ == 0) refill(bytes);
+  auto* const payload = ::new (next_) DictionaryPayload(shape_, static_cast<std::uint32_t>(count));
+  payload->slab = slab_;
+  payload->count = payload->capacity;
+  std::uninitialized_value_construct_n(payload->values(), count);
+  next_ += bytes;
+  --left_;
+  return Internals::adopt(payload);
+}
+
+/// The first dictionary may be the only one of its shape; each time there turn out to be more, twice as many follow.
+void DictionaryMaker::refill(std::size_t bytesEach) {
+  slab_ = Slab::make(bytesEach * atOnce_, atOnce_);
+  next_ = slab_->memory();
+  left_ = atOnce_;
+  shape_->retain(atOnce_);
+  if (bytesEach * atOnce_ < kLargestSlab) atOnce_ *= 2;
 }
 
 namespace {
@@ -99,17 +150,8 @@ Dictionary makeDictionary(std::span<const Value> keys, std::span<Value> values) 
   return Internals::adopt(payload);
 }
 
-Dictionary makeDictionary(ShapeHolder& shape) {
-  const std::size_t count = shape->keys.size();
-  DictionaryPayload* payload = DictionaryPayload::make(&*shape, count);
-  shape.share();
-  payload->count = static_cast<std::uint32_t>(count);
-  std::uninitialized_value_construct_n(payload->values(), count);
-  return Internals::adopt(payload);
-}
-
-Dictionary makeDictionary(ShapeHolder& shape, std::span<const std::uint32_t> places, std::span<Value> values) {
-  Dictionary dictionary = makeDictionary(shape);
+Dictionary makeDictionary(DictionaryMaker& maker, std::span<const std::uint32_t> places, std::span<Value> values) {
+  Dictionary dictionary = maker.make();
   Value* const made = Internals::payload(dictionary)->values();
   for (std::size_t i = 0; i < values.size(); ++i)
     made[places.empty() ? i : places[i]] = std::move(values[i]);

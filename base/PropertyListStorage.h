@@ -76,34 +76,12 @@ struct Shape : Payload {
   }
 };
 
-/// Ownership of a shape, or none. Keeps a stock of further ownerships to hand out, since each takes an atomic step.
-class ShapeHolder {
- public:
-  ShapeHolder() noexcept = default;
-  explicit ShapeHolder(Shape& shape) noexcept : shape_(&shape) { shape.retain(); }
-  ShapeHolder(ShapeHolder&& other) noexcept
-      : shape_(std::exchange(other.shape_, nullptr)), stock_(std::exchange(other.stock_, 0)) {}
-  ShapeHolder& operator=(ShapeHolder&& other) noexcept {
-    std::swap(shape_, other.shape_);
-    std::swap(stock_, other.stock_);
-    return *this;
-  }
-  ~ShapeHolder() {
-    if (shape_ != nullptr) Shape::drop(shape_, stock_ + 1);
-  }
-  /// Gives the caller one ownership of the shape.
-  void share() noexcept {
-    if (stock_ == 0) shape_->retain(stock_ = kStock);
-    --stock_;
-  }
-  [[nodiscard]] Shape& operator*() const noexcept { return *shape_; }
-  [[nodiscard]] Shape* operator->() const noexcept { return shape_; }
-
- private:
-  static constexpr std::uint32_t kStock = 256;
-
-  Shape* shape_ = nullptr;
-  std::uint32_t stock_ = 0;
+/// Memory for several dictionaries, which follows it. Goes with the last of them.
+struct alignas(std::max_align_t) Slab : Payload {
+  [[nodiscard]] std::byte* memory() noexcept { return reinterpret_cast<std::byte*>(this + 1); }
+  /// With `owners` owners.
+  [[nodiscard]] static Slab* make(std::size_t bytes, std::uint32_t owners);
+  static void drop(Slab* slab, std::uint32_t times = 1) noexcept;
 };
 
 /// The values of a dictionary, parallel to the keys of its shape; they follow it in memory.
@@ -114,11 +92,45 @@ struct DictionaryPayload : Container {
   std::uint32_t capacity;
   std::uint32_t count = 0;
   Shape* shape;
+  /// What its memory is part of; null when it has its own.
+  Slab* slab = nullptr;
 
   [[nodiscard]] Value* values() noexcept { return std::launder(reinterpret_cast<Value*>(this + 1)); }
   /// Room for `capacity` values, none made yet. Takes over one ownership of `shape`.
   [[nodiscard]] static DictionaryPayload* make(Shape* shape, std::size_t capacity);
   static void destroy(DictionaryPayload* dictionary) noexcept;
+};
+
+/// Makes the dictionaries of one shape, or none. Documents that hold one such dictionary tend to hold thousands: their
+/// memory is asked for, and the ownerships of the shape are taken, several at a time.
+class DictionaryMaker {
+ public:
+  DictionaryMaker() noexcept = default;
+  explicit DictionaryMaker(Shape& shape) noexcept : shape_(&shape) { shape.retain(); }
+  DictionaryMaker(DictionaryMaker&& other) noexcept { *this = std::move(other); }
+  DictionaryMaker& operator=(DictionaryMaker&& other) noexcept {
+    std::swap(shape_, other.shape_);
+    std::swap(slab_, other.slab_);
+    std::swap(next_, other.next_);
+    std::swap(left_, other.left_);
+    std::swap(atOnce_, other.atOnce_);
+    return *this;
+  }
+  ~DictionaryMaker();
+
+  /// A dictionary of nulls, which are then to be replaced in its payload.
+  [[nodiscard]] Dictionary make();
+  [[nodiscard]] Shape& operator*() const noexcept { return *shape_; }
+  [[nodiscard]] Shape* operator->() const noexcept { return shape_; }
+
+ private:
+  void refill(std::size_t bytesEach);
+
+  Shape* shape_ = nullptr;
+  Slab* slab_ = nullptr;
+  std::byte* next_ = nullptr;
+  std::uint32_t left_ = 0;
+  std::uint32_t atOnce_ = 1;
 };
 
 /// The way into values for readers and writers.
@@ -161,11 +173,8 @@ struct Internals {
 /// Makes a dictionary of keys and values in any order; of equal keys the last one counts. The values are moved away.
 [[nodiscard]] Dictionary makeDictionary(std::span<const Value> keys, std::span<Value> values);
 
-/// Makes a dictionary of nulls, which are then to be replaced in its payload.
-[[nodiscard]] Dictionary makeDictionary(ShapeHolder& shape);
-
 /// Makes a dictionary of values in the order that `places` was made for.
-[[nodiscard]] Dictionary makeDictionary(ShapeHolder& shape, std::span<const std::uint32_t> places,
+[[nodiscard]] Dictionary makeDictionary(DictionaryMaker& maker, std::span<const std::uint32_t> places,
                                         std::span<Value> values);
 
 /// For each key its place in the shape. Empty when they are all in order.

@@ -29,7 +29,7 @@ class XMLReader {
  private:
   /// The keys of the latest dictionary at one depth. The next one there most likely has the same.
   struct Level {
-    ShapeHolder shape;
+    DictionaryMaker maker;
     /// As they were written.
     std::vector<Value> keys;
     std::vector<std::uint32_t> places;
@@ -218,14 +218,14 @@ Value XMLReader::finishDictionary(Level& level, std::size_t matched, std::size_t
   if (values.empty()) return Dictionary();
   Dictionary dictionary;
   if (keys_.size() == firstKey && matched == level.keys.size()) {
-    dictionary = makeDictionary(level.shape, level.places, values);
+    dictionary = makeDictionary(level.maker, level.places, values);
   } else {
     spellOut(level, matched, firstKey);
     const std::span<Value> keys = std::span(keys_).subspan(firstKey);
     dictionary = makeDictionary(keys, values);
     if (dictionary.size() == keys.size()) {
-      level.shape = ShapeHolder(*Internals::payload(dictionary)->shape);
-      level.places = placesOf(keys, *level.shape);
+      level.maker = DictionaryMaker(*Internals::payload(dictionary)->shape);
+      level.places = placesOf(keys, *level.maker);
       level.keys.assign(std::make_move_iterator(keys.begin()), std::make_move_iterator(keys.end()));
     }
     keys_.resize(firstKey);

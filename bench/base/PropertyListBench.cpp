@@ -1,14 +1,9 @@
 // How fast property lists are read and written, next to a plain copy of their bytes. bench/figures.txt says how fast
 // they must be. With APPSYNC_BENCH_CORPUS=FOLDER set, the documents are also put there for peers.
-#include <cstdio>
 #include <map>
-#include <utility>
 
 #include <benchmark/benchmark.h>
-#include <fcntl.h>
 #include <sys/mman.h>
-#include <sys/stat.h>
-#include <unistd.h>
 
 #include "base/PropertyList.h"
 #include "bench/base/PropertyListCorpora.h"
@@ -97,75 +92,6 @@ void copy(benchmark::State& state, const std::vector<Bytes>& files) {
   countBytes(state, files);
 }
 
-/// A file in a folder of its own, which goes with it.
-class ScratchFile {
- public:
-  ScratchFile() {
-    std::string folder = (std::filesystem::temp_directory_path() / "plistbench.XXXXXX").string();
-    folder_ = mkdtemp(folder.data());
-    path_ = (folder_ / "todo.plist").string();
-    temporary_ = path_ + ".new";
-  }
-  ScratchFile(const ScratchFile&) = delete;
-  ScratchFile& operator=(const ScratchFile&) = delete;
-  ~ScratchFile() { std::filesystem::remove_all(folder_); }
-
-  [[nodiscard]] Bytes read() const {
-    const int file = open(path_.c_str(), O_RDONLY | O_CLOEXEC);
-    struct stat status {};
-    fstat(file, &status);
-    Bytes bytes(static_cast<std::size_t>(status.st_size));
-    const auto count = ::read(file, bytes.data(), bytes.size());
-    close(file);
-    bytes.resize(count < 0 ? 0 : static_cast<std::size_t>(count));
-    return bytes;
-  }
-  [[nodiscard]] bool write(ByteView bytes) const {
-    const int file = open(temporary_.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0644);
-    const auto count = ::write(file, bytes.data(), bytes.size());
-    close(file);
-    return count == static_cast<ssize_t>(bytes.size()) && std::rename(temporary_.c_str(), path_.c_str()) == 0;
-  }
-
- private:
-  std::filesystem::path folder_;
-  std::string path_;
-  std::string temporary_;
-};
-
-void rewriteFile(benchmark::State& state, const Bytes& todo) {
-  const ScratchFile file;
-  if (!file.write(todo)) return state.SkipWithError("cannot write");
-  for (auto _ : state) {
-    if (!file.write(file.read())) return state.SkipWithError("cannot write");
-  }
-}
-
-bool changeOne(plist::Value& root, std::string_view identifier, std::string_view operation) {
-  for (plist::Value& entry : *root.array()) {
-    const plist::Value* found = std::as_const(entry).find("identifier");
-    if (found == nullptr || found->string() != identifier) continue;
-    entry.dictionary()->set("operation", operation);
-    return true;
-  }
-  return false;
-}
-
-void changeEntry(benchmark::State& state, const Bytes& todo) {
-  const ScratchFile file;
-  if (!file.write(todo)) return state.SkipWithError("cannot write");
-  const auto sample = plist::readBinary(todo);
-  const std::string identifier(*sample->array()->at(7777).find("identifier")->string());
-  bool isSent = false;
-  for (auto _ : state) {
-    auto root = plist::readBinary(file.read());
-    isSent = !isSent;
-    if (!root || !changeOne(*root, identifier, isSent ? "SENT" : "INSTALLED")) return state.SkipWithError("not found");
-    const auto bytes = plist::writeBinary(*root);
-    if (!bytes || !file.write(*bytes)) return state.SkipWithError("cannot write");
-  }
-}
-
 template <class Body>
 void add(const std::string& name, Body body) {
   benchmark::RegisterBenchmark(("PropertyList/" + name).c_str(), std::move(body))->Unit(benchmark::kMicrosecond);
@@ -188,8 +114,6 @@ const bool kAdded = [] {
         exportDocuments(std::filesystem::path(folder) / corpus.name(), form.name, corpus.files(form));
     }
   }
-  add("changeEntry/todo", [](benchmark::State& state) { changeEntry(state, corpora[0].files(kForms[0])[0]); });
-  add("rewriteFile/todo", [](benchmark::State& state) { rewriteFile(state, corpora[0].files(kForms[0])[0]); });
   return true;
 }();
 

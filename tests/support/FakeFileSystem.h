@@ -31,7 +31,7 @@ enum class FileOperation {
 };
 
 /// Begins with "/tmp" alone. Journal lines: "fileSystem.readFile /path", "fileSystem.moveItem /from /to".
-class FakeFileSystem final : public platform::FileSystem {
+class FakeFileSystem : public platform::FileSystem {
  public:
   explicit FakeFileSystem(CallJournal& journal);
 
