@@ -9,7 +9,6 @@ namespace {
 constexpr std::size_t kMaximumConcurrentInstalls = 10;
 
 constexpr std::string_view kDaemonBundleIdentifier = "com.corvel.zeph";
-constexpr std::string_view kStartupCompleteNotification = "com.corvel.zeph.ZTStartupCompleteNotification";
 
 bool isAllowed(platform::Platform& platform, platform::RestrictionSetting setting) {
   return platform.sharedConnection().effectiveBoolValueForSetting(setting) != platform::RestrictionValue::no;
@@ -39,7 +38,7 @@ void AppsClient::init() {
   _runsInsideDaemon = _platform.bundles().mainBundleIdentifier() == kDaemonBundleIdentifier;
   if (_runsInsideDaemon) {
     _finishedWaitingForPlaceHolderInstalls = true;
-    _platform.systemNotify().addObserver(this, &_handleZEPHStartupCompletedNotification, kStartupCompleteNotification,
+    _platform.systemNotify().addObserver(this, &_handleZEPHStartupCompletedNotification, platform::kZTStartupCompleteNotification,
                                          nullptr, platform::SuspensionBehavior::drop);
   }
 }
@@ -56,7 +55,7 @@ AppsClient::~AppsClient() {
   }
   _platform.defaultRegistry().removeObserver(*this);
   if (_runsInsideDaemon) {  // As it was at the start: what was registered then must go, whatever the answer is now.
-    _platform.systemNotify().removeObserver(this, kStartupCompleteNotification);
+    _platform.systemNotify().removeObserver(this, platform::kZTStartupCompleteNotification);
     _appInstallObserver.reset();
   }
 }

@@ -16,11 +16,12 @@
 
 namespace appsync::device {
 
-/// Codes of `platform::kZTErrorDomain` that this device's daemon gives a transfer that came to nothing. Both are
-/// recoverable.
+/// Codes of `platform::kZTErrorDomain` that this device's daemon gives a transfer that came to nothing. All but the
+/// last are recoverable.
 enum class TransferFailure : long {
   interrupted = 100,  ///< the sync was ended before the package was whole
   hostLost = 101,     ///< the host went away, or could not read its package
+  cancelled = 102,    ///< somebody on the device does not want the app
 };
 
 /// Threads: any.

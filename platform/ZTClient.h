@@ -17,6 +17,9 @@ namespace appsync::platform {
 using Assets = std::vector<std::shared_ptr<ZTAsset>>;
 using ProgressCallback = std::function<void(double fraction)>;
 
+/// What the daemon posts, system-wide, once it is up and its clients are made.
+inline constexpr std::string_view kZTStartupCompleteNotification = "com.corvel.zeph.ZTStartupCompleteNotification";
+
 /// The daemon drives a client with these calls, one sync at a time and in this order: `prepareForSyncWithHostAnchor`,
 /// `installedAssets`, `reconcileSync`, `outstandingAssetTransfers`, the transfers' reports,
 /// `assetTransferEndedWithSuccess`, `syncEndedWithSuccess`. `clearSyncData` and the questions may come at any time

@@ -18,6 +18,9 @@ enum class AppEvent : std::uint8_t {
   unchanged,  ///< nothing was to do; machines are told "skipped"
 };
 
+/// Why an app is skipped that somebody on the device did not want.
+inline constexpr std::string_view kCancelledOnDevice = "cancelled on the device";
+
 /// An app as people and machines are told of it. Texts are as they came from outside.
 struct AppName {
   std::string identifier;  ///< of a package that does not say it: the package's file name

@@ -1,5 +1,4 @@
 #include <algorithm>
-#include <memory>
 
 #include "tools/Commands.h"
 #include "tools/DeviceApps.h"
@@ -84,17 +83,9 @@ ExitStatus run(const AppsOptions& options, device::Device& device) {
 }  // namespace
 
 void addAppsCommand(CLI::App& line, Invocation& invocation) {
-  const auto options = std::make_shared<AppsOptions>();
-  CLI::App* command = line.add_subcommand("apps", "List the apps on a device.");
-  addDevice(*command, options->device);
-  command->add_flag("--json", options->json, "write JSON");
-  command->footer(kExamples);
-  command->callback([options, &invocation] {
-    invocation = [options] {
-      return withDevice(options->device, device::Access::readOnly,
-                        [&](device::Device& device) { return run(*options, device); });
-    };
-  });
+  const CommandText text = {"apps", "List the apps on a device.", kExamples};
+  const auto added = addDeviceCommand(line, invocation, text, device::Access::readOnly, run);
+  added.command.add_flag("--json", added.options->json, "write JSON");
 }
 
 }  // namespace appsync::tools

@@ -1,4 +1,4 @@
-#include <memory>
+#include <string>
 
 #include "core/AppsClient.h"
 #include "tools/Commands.h"
@@ -10,6 +10,10 @@
 namespace appsync::tools {
 namespace {
 
+struct ClearOptions {
+  std::string device;
+};
+
 constexpr const char* kExamples =
     R"(Removes placeholders, and all that device and host remember of earlier syncs, such as which apps were deleted.
 Installed apps stay.
@@ -17,7 +21,7 @@ Installed apps stay.
 Example:
   appsync clear phone)";
 
-ExitStatus run(device::Device& device) {
+ExitStatus run(const ClearOptions& /*options*/, device::Device& device) {
   AppsClient::create(device.platform())->clearSyncData();
   clearStaging(device);
   const Status forgotten = removeHostState(device.path());
@@ -27,12 +31,8 @@ ExitStatus run(device::Device& device) {
 }  // namespace
 
 void addClearCommand(CLI::App& line, Invocation& invocation) {
-  const auto path = std::make_shared<std::string>();
-  CLI::App* command = line.add_subcommand("clear", "Forget everything about earlier syncs.");
-  addDevice(*command, *path);
-  command->footer(kExamples);
-  command->callback(
-      [path, &invocation] { invocation = [path] { return withDevice(*path, device::Access::exclusive, run); }; });
+  const CommandText text = {"clear", "Forget everything about earlier syncs.", kExamples};
+  addDeviceCommand(line, invocation, text, device::Access::exclusive, run);
 }
 
 }  // namespace appsync::tools

@@ -55,10 +55,36 @@ Error interrupted() {
           "the sync was interrupted; the app is offered again at the next sync", nullptr};
 }
 
+Error cancelled() {
+  return {std::string(platform::kZTErrorDomain), static_cast<long>(device::TransferFailure::cancelled),
+          std::string(kCancelledOnDevice), nullptr};
+}
+
 Error hostHasNone() {
   return {std::string(platform::kZTErrorDomain), static_cast<long>(device::TransferFailure::hostLost),
           "the library has no package of this app", nullptr};
 }
+
+std::unique_ptr<InstallWatcher> makeWatcher(device::Device& device, SyncProgress& progress,
+                                            const Interruption& interruption) {
+  const bool isCoordinated = device.platform().installCoordination().coordinationIsEnabled();
+  return (isCoordinated ? makeCoordinatedInstallWatcher : makeDirectInstallWatcher)(device, progress, interruption);
+}
+
+/// While it lives the device's services reach the daemon.
+class ServiceConnection {
+ public:
+  ServiceConnection(device::Device& device, platform::ZTDeviceService& daemon)
+      : service_(device.services().sharedDeviceService()) {
+    service_.connect(&daemon);
+  }
+  ~ServiceConnection() { service_.connect(nullptr); }
+  ServiceConnection(const ServiceConnection&) = delete;
+  ServiceConnection& operator=(const ServiceConnection&) = delete;
+
+ private:
+  device::DeviceService& service_;
+};
 
 }  // namespace
 
@@ -72,6 +98,8 @@ Daemon::Daemon(device::Device& device, platform::ZTClient& client, SyncProgress&
       state_(loadHostState(device.path())) {}
 
 Status Daemon::sync(const SyncRequest& request) {
+  const ServiceConnection connection(device_, queue_);
+  device_.platform().systemNotify().post(platform::kZTStartupCompleteNotification);
   client_.prepareForSyncWithHostAnchor(client_.currentSyncAnchor(), {}, nullptr);
   learnDeletedApps();
   planSync(request);
@@ -81,8 +109,11 @@ Status Daemon::sync(const SyncRequest& request) {
     client_.syncEndedWithSuccess(false);
     return handedOver;
   }
-  tellRemovals();
-  transferPackages();
+  {
+    const auto watcher = makeWatcher(device_, progress_, interruption_);
+    tellRemovals(*watcher);
+    transferPackages(*watcher);
+  }
   tellUnfinished();
   Status remembered = remember();
   client_.syncEndedWithSuccess(remembered.ok() && !interruption_.requested());
@@ -116,23 +147,27 @@ Status Daemon::handOverInstructions() {
   return error.value_or(Error{}).in("the device cannot be synced");
 }
 
-void Daemon::transferPackages() {
+void Daemon::transferPackages(InstallWatcher& watcher) {
   const platform::Assets assets = client_.outstandingAssetTransfers();
-  InstallWatcher watcher(device_, progress_, interruption_);
   for (const auto& asset : assets) {
     const PlannedApp* app = planned(asset->identifier());
     if (app != nullptr) progress_.expect(app->app, app->package->bytes);
   }
-  for (const auto& asset : assets)
-    transfer(asset, watcher);
+  queue_.fill(assets);
+  while (const auto next = queue_.front()) {
+    const PlannedApp* app = planned(next->identifier());
+    watcher.waitForRoom(app == nullptr ? 0 : app->package->bytes);
+    // Meanwhile another may have become the first.
+    if (const auto asset = queue_.take()) transfer(asset, watcher);
+  }
   client_.assetTransferEndedWithSuccess(!interruption_.requested());
-  watcher.lookAgain();
+  watcher.waitForInstalls();
 }
 
 void Daemon::transfer(const std::shared_ptr<ZTAsset>& asset, InstallWatcher& watcher) {
   const PlannedApp* app = planned(asset->identifier());
   if (app == nullptr) return client_.assetTransferSucceeded(asset, false, hostHasNone());
-  watcher.waitForRoom(app->package->bytes);
+  const auto mayGoOn = [&] { return !interruption_.requested() && !queue_.wasCancelled(asset->identifier()); };
   std::chrono::steady_clock::time_point told;
   const auto goOn = [&](double fraction) {
     const auto now = std::chrono::steady_clock::now();
@@ -142,21 +177,28 @@ void Daemon::transfer(const std::shared_ptr<ZTAsset>& asset, InstallWatcher& wat
       client_.assetTransferUpdatedProgress(asset, fraction);
       progress_.sending(asset->identifier(), fraction);
     }
-    return !interruption_.requested();
+    return mayGoOn();
   };
-  const Result<std::string> path = interruption_.requested() ? interrupted() : sender_.send(*app->package, goOn);
+  const Result<std::string> path = mayGoOn() ? sender_.send(*app->package, goOn) : interrupted();
   if (!path) {
-    const Error error = interruption_.requested() ? interrupted() : path.error();
-    client_.assetTransferSucceeded(asset, false, error);
-    progress_.finish({interruption_.requested() ? AppEvent::cutOff : AppEvent::failed, app->app, error.text});
+    const NotSent end = endOf(*app, path.error());
+    client_.assetTransferSucceeded(asset, false, end.error);
+    progress_.finish({end.event, app->app, end.error.text});
     return;
   }
   asset->setPath(*path);
   asset->setCompletedAssetParts(platform::kZTAssetPartApplication);
   const AppEvent success = app->work == PlannedWork::update ? AppEvent::updated : AppEvent::installed;
-  watcher.watch({app->app, success, std::string(kPublicStaging) + "/" + *path, app->package->bytes});
+  watcher.watch({app->app, success, std::string(kPublicStaging) + "/" + *path, app->package->bytes,
+                 std::chrono::steady_clock::now()});
   progress_.installing(asset->identifier(), 0);
   client_.assetTransferSucceeded(asset, true, std::nullopt);
+}
+
+Daemon::NotSent Daemon::endOf(const PlannedApp& app, const Error& error) const {
+  if (queue_.wasCancelled(app.app.identifier)) return {AppEvent::skipped, cancelled()};
+  if (interruption_.requested()) return {AppEvent::cutOff, interrupted()};
+  return {AppEvent::failed, error};
 }
 
 void Daemon::tellWhatIsKnown() {
@@ -167,7 +209,8 @@ void Daemon::tellWhatIsKnown() {
   }
 }
 
-void Daemon::tellRemovals() {
+void Daemon::tellRemovals(InstallWatcher& watcher) {
+  watcher.waitForRemovals();
   const bool forbidden = isForbidden(device_, RestrictionSetting::appRemovalAllowed);
   for (const PlannedApp& app : plan_) {
     if (app.work != PlannedWork::remove) continue;
@@ -185,7 +228,9 @@ void Daemon::tellUnfinished() {
   const bool forbidden = isForbidden(device_, RestrictionSetting::appInstallationAllowed);
   for (const PlannedApp& app : plan_) {
     if (app.package == nullptr) continue;
-    if (forbidden) {
+    if (queue_.wasCancelled(app.app.identifier)) {
+      progress_.finish({AppEvent::skipped, app.app, std::string(kCancelledOnDevice)});
+    } else if (forbidden) {
       progress_.finish(
           {AppEvent::skipped, app.app, "installing apps is not allowed on this device (app-installation=no)"});
     } else if (interruption_.requested()) {

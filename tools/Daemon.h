@@ -16,6 +16,7 @@
 #include "tools/PackageSender.h"
 #include "tools/SyncPlan.h"
 #include "tools/SyncProgress.h"
+#include "tools/TransferQueue.h"
 
 namespace appsync::tools {
 
@@ -25,7 +26,8 @@ struct SyncRequest {
   IdentifierSet remove;
 };
 
-/// Makes the fixed sequence of calls with which a daemon drives its client through a sync. One object, one sync.
+/// Makes the fixed sequence of calls with which a daemon drives its client through a sync, and does meanwhile what the
+/// device's services, and other processes, ask of it. One object, one sync.
 class Daemon {
  public:
   /// All must outlive it.
@@ -36,14 +38,21 @@ class Daemon {
   [[nodiscard]] Status sync(const SyncRequest& request);
 
  private:
+  struct NotSent {
+    AppEvent event;
+    Error error;
+  };
+
   void learnDeletedApps();
   void planSync(const SyncRequest& request);
   [[nodiscard]] Status handOverInstructions();
-  void transferPackages();
+  void transferPackages(InstallWatcher& watcher);
   void transfer(const std::shared_ptr<platform::ZTAsset>& asset, InstallWatcher& watcher);
   void tellWhatIsKnown();
-  void tellRemovals();
+  void tellRemovals(InstallWatcher& watcher);
   void tellUnfinished();
+  /// Why a package did not reach the device, which `error` is only one answer to.
+  [[nodiscard]] NotSent endOf(const PlannedApp& app, const Error& error) const;
   void failEverything(const Error& error);
   [[nodiscard]] const PlannedApp* planned(std::string_view identifier) const;
   [[nodiscard]] Status remember();
@@ -53,6 +62,7 @@ class Daemon {
   SyncProgress& progress_;
   const Interruption& interruption_;
   PackageSender sender_;
+  TransferQueue queue_;
   HostState state_;
   std::vector<PlannedApp> plan_;
   std::map<std::string_view, const PlannedApp*> transfers_;  // those in plan_ that have a package, by identifier

@@ -1,5 +1,3 @@
-#include <memory>
-
 #include "device/TimeText.h"
 #include "device/TransactionLog.h"
 #include "tools/Commands.h"
@@ -71,17 +69,9 @@ ExitStatus run(const HistoryOptions& options, device::Device& device) {
 }  // namespace
 
 void addHistoryCommand(CLI::App& line, Invocation& invocation) {
-  const auto options = std::make_shared<HistoryOptions>();
-  CLI::App* command = line.add_subcommand("history", "Show what was installed and removed, and how that went.");
-  addDevice(*command, options->device);
-  command->add_flag("--json", options->json, "write JSON");
-  command->footer(kExamples);
-  command->callback([options, &invocation] {
-    invocation = [options] {
-      return withDevice(options->device, device::Access::readOnly,
-                        [&](device::Device& device) { return run(*options, device); });
-    };
-  });
+  const CommandText text = {"history", "Show what was installed and removed, and how that went.", kExamples};
+  const auto added = addDeviceCommand(line, invocation, text, device::Access::readOnly, run);
+  added.command.add_flag("--json", added.options->json, "write JSON");
 }
 
 }  // namespace appsync::tools

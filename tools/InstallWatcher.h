@@ -1,75 +1,40 @@
-// Watches the installs that the plug-in runs on threads of its own.
+// Watches the installs of packages that were sent: how far each is, and how it ends.
 #pragma once
 
-#include <chrono>
-#include <condition_variable>
 #include <cstdint>
-#include <list>
-#include <mutex>
-#include <string>
-#include <thread>
+#include <memory>
 
 #include "device/Device.h"
-#include "tools/AppOutcome.h"
 #include "tools/Interruption.h"
+#include "tools/SentPackages.h"
 #include "tools/SyncProgress.h"
 
 namespace appsync::tools {
 
-/// A package that was handed over.
-struct SentPackage {
-  AppName app;
-  AppEvent success = AppEvent::installed;  ///< what it is when it is in
-  std::string path;                        ///< device path of the package file
-  std::uint64_t bytes = 0;
-};
-
-/// The plug-in removes each package file once its install is over, well or not: that is how the host sees the end.
-/// Tells `progress` how far each install is, that one waits for the home screen, and of each end. Threads: any.
+/// Tells the progress how far each install is, and of each end, as the device's way of installing lets it know. One
+/// object, one sync; destruction ends the watch. Threads: any.
 class InstallWatcher {
  public:
-  /// All must outlive it.
-  InstallWatcher(device::Device& device, SyncProgress& progress, const Interruption& interruption);
-  /// Ends the watch.
-  ~InstallWatcher();
-  InstallWatcher(const InstallWatcher&) = delete;
-  InstallWatcher& operator=(const InstallWatcher&) = delete;
+  virtual ~InstallWatcher() = default;
 
   /// To be called in front of the package's hand-over.
-  void watch(SentPackage package);
-
+  virtual void watch(SentPackage package) = 0;
   /// Blocks until another package of that size may lie on the device beside those whose install is not over, or the
-  /// user interrupts: sending is faster than installing.
-  void waitForRoom(std::uint64_t bytes);
-
-  /// Looks once more at everything that is being watched. For the moment at which all installs are over.
-  void lookAgain();
-
- private:
-  struct Watched {
-    SentPackage package;
-    std::chrono::steady_clock::time_point since;
-  };
-
-  void run();
-  void look(const std::unique_lock<std::mutex>& lock);
-  [[nodiscard]] bool isOver(const Watched& watched);
-  void showInstall(const Watched& watched);
-
-  device::Device& device_;
-  SyncProgress& progress_;
-  const Interruption& interruption_;
-  std::mutex mutex_;
-  std::condition_variable changed_;
-  // Under mutex_:
-  std::list<Watched> watched_;
-  std::uint64_t bytes_ = 0;
-  bool ends_ = false;
-  unsigned looks_ = 0;
-  std::thread thread_;
+  /// user interrupts.
+  virtual void waitForRoom(std::uint64_t bytes) = 0;
+  /// Blocks until the removals that were begun are over, well or not.
+  virtual void waitForRemovals() = 0;
+  /// To be called once all packages are handed over and the client has ended the transfers: blocks until every install
+  /// has its outcome.
+  virtual void waitForInstalls() = 0;
 };
 
-/// What came of an app that was sent, as the device knows it.
-[[nodiscard]] AppOutcome outcomeOnDevice(device::Device& device, const SentPackage& package);
+/// For a device that installs directly. All must outlive it, as for the next.
+[[nodiscard]] std::unique_ptr<InstallWatcher> makeDirectInstallWatcher(device::Device& device, SyncProgress& progress,
+                                                                       const Interruption& interruption);
+/// For a device that installs through coordinators.
+[[nodiscard]] std::unique_ptr<InstallWatcher> makeCoordinatedInstallWatcher(device::Device& device,
+                                                                            SyncProgress& progress,
+                                                                            const Interruption& interruption);
 
 }  // namespace appsync::tools

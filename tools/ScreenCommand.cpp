@@ -1,5 +1,3 @@
-#include <memory>
-
 #include "device/ScreenPicture.h"
 #include "tools/Commands.h"
 #include "tools/OpenDevice.h"
@@ -33,17 +31,9 @@ ExitStatus run(const ScreenOptions& options, device::Device& device) {
 }  // namespace
 
 void addScreenCommand(CLI::App& line, Invocation& invocation) {
-  const auto options = std::make_shared<ScreenOptions>();
-  CLI::App* command = line.add_subcommand("screen", "Draw the device's home screen.");
-  addDevice(*command, options->device);
-  command->add_option("-o,--output", options->picture, "the PNG file to write")->required();
-  command->footer(kExamples);
-  command->callback([options, &invocation] {
-    invocation = [options] {
-      return withDevice(options->device, device::Access::readOnly,
-                        [&](device::Device& device) { return run(*options, device); });
-    };
-  });
+  const CommandText text = {"screen", "Draw the device's home screen.", kExamples};
+  const auto added = addDeviceCommand(line, invocation, text, device::Access::readOnly, run);
+  added.command.add_option("-o,--output", added.options->picture, "the PNG file to write")->required();
 }
 
 }  // namespace appsync::tools

@@ -1,4 +1,3 @@
-#include <memory>
 #include <vector>
 
 #include "tools/Commands.h"
@@ -37,17 +36,9 @@ ExitStatus run(const SetOptions& options, device::Device& device) {
 }  // namespace
 
 void addSetCommand(CLI::App& line, Invocation& invocation) {
-  const auto options = std::make_shared<SetOptions>();
-  CLI::App* command = line.add_subcommand("set", "Change a device's settings.");
-  addDevice(*command, options->device);
-  command->add_option("KEY=VALUE", options->assignments, "what to set")->required();
-  command->footer(kExamples);
-  command->callback([options, &invocation] {
-    invocation = [options] {
-      return withDevice(options->device, device::Access::exclusive,
-                        [&](device::Device& device) { return run(*options, device); });
-    };
-  });
+  const CommandText text = {"set", "Change a device's settings.", kExamples};
+  const auto added = addDeviceCommand(line, invocation, text, device::Access::exclusive, run);
+  added.command.add_option("KEY=VALUE", added.options->assignments, "what to set")->required();
 }
 
 }  // namespace appsync::tools
