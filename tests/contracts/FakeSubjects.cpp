@@ -1,4 +1,5 @@
 // Holds the fakes to the contracts, so that what passes on them passes on a device.
+#include <atomic>
 #include <utility>
 
 #include "platform/Keys.h"
@@ -17,6 +18,7 @@
 #include "tests/contracts/TimeContract.h"
 #include "tests/contracts/TransactionLogContract.h"
 #include "tests/contracts/UninstalledAppsListContract.h"
+#include "tests/contracts/ZTDeviceServiceContract.h"
 #include "tests/support/FakePackages.h"
 #include "tests/support/FakePlatform.h"
 #include "tests/support/TodoList.h"
@@ -238,6 +240,46 @@ class FakeCoordination final : public InstallCoordinationSubject {
   FakePlatform platform_;
 };
 
+class FakeCoordinatedInstalls final : public CoordinatedInstallSubject {
+ public:
+  FakeCoordinatedInstalls() {
+    platform_.coordination.enable();
+    platform_.coordination.installAutomatically();
+  }
+  platform::InstallCoordination& coordination() override { return platform_.coordination; }
+  platform::AppRegistry& registry() override { return platform_.registry; }
+  platform::UninstalledAppsList& uninstalledApps() override { return platform_.uninstalledList; }
+
+  platform::FileLocation makePackage(std::string_view identifier, std::string_view version) override {
+    return put(textOf(packageOf(identifier, version)));
+  }
+  platform::FileLocation makeDamagedPackage(std::string_view) override { return put(""); }
+  platform::FileLocation makeIcon() override { return put("a picture"); }
+  bool exists(const platform::FileLocation& location) override { return platform_.files.has(location.path); }
+
+  void prioritize(std::string_view identifier) override { platform_.coordination.prioritize(identifier); }
+  void cancelByUser(std::string_view identifier) override { platform_.coordination.cancelByUser(identifier); }
+  void waitUntilIdle() override { platform_.coordination.waitUntilIdle(); }
+
+ private:
+  platform::FileLocation put(std::string_view contents) {
+    const std::string path = std::string(kFolder).append("/").append(std::to_string(++made_));
+    platform_.files.put(path, contents);
+    return {path, false};
+  }
+
+  FakePlatform platform_;
+  std::atomic<int> made_ = 0;
+};
+
+class FakeDaemonsService final : public ZTDeviceServiceSubject {
+ public:
+  platform::ZTDeviceService& service() override { return platform_.deviceService; }
+
+ private:
+  FakePlatform platform_;
+};
+
 class FakeFramework final : public SyncFrameworkSubject {
  public:
   platform::SyncFramework& framework() override { return platform_.framework; }
@@ -304,6 +346,12 @@ INSTANTIATE_TEST_SUITE_P(Fakes, IconsContract, testing::Values(implementation<Ic
                          implementationName);
 INSTANTIATE_TEST_SUITE_P(Fakes, InstallCoordinationContract,
                          testing::Values(implementation<InstallCoordinationSubject, FakeCoordination>("Fake")),
+                         implementationName);
+INSTANTIATE_TEST_SUITE_P(Fakes, CoordinatedInstallContract,
+                         testing::Values(implementation<CoordinatedInstallSubject, FakeCoordinatedInstalls>("Fake")),
+                         implementationName);
+INSTANTIATE_TEST_SUITE_P(Fakes, ZTDeviceServiceContract,
+                         testing::Values(implementation<ZTDeviceServiceSubject, FakeDaemonsService>("Fake")),
                          implementationName);
 INSTANTIATE_TEST_SUITE_P(Fakes, SyncFrameworkContract,
                          testing::Values(implementation<SyncFrameworkSubject, FakeFramework>("Fake")),
