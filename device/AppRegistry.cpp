@@ -75,14 +75,31 @@ Status AppRegistry::installApplication(const platform::FileLocation& location, c
   Status installed = installer_.install(location, options, platform::ApplicationTypeUser);
   const plist::Value* identifier = options.find(platform::BundleIdentifierKey);
   const auto text = identifier == nullptr ? std::nullopt : identifier->string();
-  if (!text) return installed;
+  if (text) noteOutcome(*text, installed);
+  return installed;
+}
+
+Status AppRegistry::installPackage(const platform::FileLocation& location, const InstallRequest& request) {
+  Status installed = installer_.installPackage(location, request, platform::ApplicationTypeUser);
+  noteOutcome(request.identifier, installed);
+  return installed;
+}
+
+void AppRegistry::noteOutcome(std::string_view bundleIdentifier, const Status& installed) {
   const std::lock_guard lock(failuresMutex_);
   if (installed) {
-    failures_.erase(std::string(*text));
+    failures_.erase(std::string(bundleIdentifier));
   } else {
-    failures_.insert_or_assign(std::string(*text), installed.error());
+    failures_.insert_or_assign(std::string(bundleIdentifier), installed.error());
   }
-  return installed;
+}
+
+Status AppRegistry::recordPlaceholder(NewContainer& container, const InstallRequest& request, StoredBundle bundle) {
+  return installer_.recordPlaceholder(container, request, platform::ApplicationTypeUser, std::move(bundle));
+}
+
+Status AppRegistry::removePlaceholder(std::string_view bundleIdentifier, const Alongside& alongside) {
+  return installer_.uninstall(bundleIdentifier, {{platform::UninstallPlaceholdersOnlyKey, true}}, alongside);
 }
 
 std::optional<Error> AppRegistry::lastInstallFailure(std::string_view bundleIdentifier) {

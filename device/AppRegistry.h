@@ -44,6 +44,14 @@ class AppRegistry final : public platform::AppRegistry {
       const platform::AppRecord& record, platform::TSInstallPhase phase) override;
   void installPhaseFinishedForProgress(platform::InstallProgress& progress) override;
 
+  // For install coordination: the same with requests that were checked.
+
+  [[nodiscard]] Status installPackage(const platform::FileLocation& location, const InstallRequest& request);
+  [[nodiscard]] Status recordPlaceholder(NewContainer& container, const InstallRequest& request, StoredBundle bundle);
+  /// Takes a placeholder's mark away; an unknown app fails.
+  [[nodiscard]] Status removePlaceholder(std::string_view bundleIdentifier, const Alongside& alongside);
+  [[nodiscard]] RunningInstalls& runningInstalls() noexcept { return *running_; }
+
   /// `installApplication` for an app, or its placeholder, that is part of the system.
   [[nodiscard]] Status installSystemApplication(const platform::FileLocation& location,
                                                 const plist::Dictionary& options);
@@ -51,7 +59,7 @@ class AppRegistry final : public platform::AppRegistry {
   /// A running install of the app comes before all others.
   void prioritizeInstall(std::string_view bundleIdentifier) { running_->prioritize(bundleIdentifier); }
 
-  /// Why the app's latest `installApplication` in this process failed; none when it succeeded or there was none.
+  /// Why the app's latest install in this process failed; none when it succeeded or there was none.
   [[nodiscard]] std::optional<Error> lastInstallFailure(std::string_view bundleIdentifier);
 
   /// Every app, in the order of walks.
@@ -63,6 +71,7 @@ class AppRegistry final : public platform::AppRegistry {
  private:
   [[nodiscard]] std::optional<AppRow> find(std::string_view bundleIdentifier);
   [[nodiscard]] std::shared_ptr<const AppRecord> recordOf(AppRow row);
+  void noteOutcome(std::string_view bundleIdentifier, const Status& installed);
 
   Database& database_;
   const Access access_;

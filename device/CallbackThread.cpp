@@ -5,9 +5,15 @@
 namespace appsync::device {
 
 CallbackThread::~CallbackThread() {
+  stop();
+}
+
+void CallbackThread::stop() {
+  std::deque<Callback> dropped;
   {
     const std::lock_guard lock(mutex_);
     stopping_ = true;
+    dropped.swap(queued_);
   }
   changed_.notify_all();
   if (thread_.joinable()) thread_.join();
@@ -16,6 +22,7 @@ CallbackThread::~CallbackThread() {
 void CallbackThread::post(const void* receiver, std::function<void()> callback) {
   {
     const std::lock_guard lock(mutex_);
+    if (stopping_) return;
     queued_.push_back({receiver, std::move(callback)});
     if (!thread_.joinable()) thread_ = std::thread([this] { run(); });
   }

@@ -11,8 +11,7 @@ namespace appsync::device {
 
 /// Delivers callbacks one at a time, in the order of `post`, with no lock held. The thread starts with the first one.
 ///
-/// Every operation may be called on any thread, from callbacks too. Destruction drops what is still queued and returns
-/// when the running callback has; it must not happen on the thread itself.
+/// Every operation may be called on any thread, from callbacks too, unless it says otherwise. Destruction stops it.
 class CallbackThread {
  public:
   CallbackThread() = default;
@@ -26,6 +25,10 @@ class CallbackThread {
   /// Drops what is queued for `receiver`. When this returns no callback to it runs on another thread and, until the
   /// next `post` for it, none will begin; on the callback thread itself it does not wait.
   void forget(const void* receiver);
+
+  /// Drops what is queued, and all that is posted from now on, and returns when the running callback has. Not on the
+  /// callback thread itself, unless it has been stopped before.
+  void stop();
 
  private:
   struct Callback {

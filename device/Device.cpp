@@ -28,8 +28,16 @@ Result<std::int64_t> readNumber(Database& database, std::string_view pragma) {
   return query.status() ? std::int64_t{0} : Result<std::int64_t>(query.status().error());
 }
 
+/// Devices made by earlier versions of this layout lack tables that came later.
+Status makeMissingTables(Database& database) {
+  Database::Transaction transaction(database);
+  for (const char* schema : Services::kSchemas)
+    transaction.runScript(schema).ignore();
+  return transaction.commit();
+}
+
 /// Makes the database under its working name and then gives it its own, at which moment the folder is a device.
-Status makeDatabase(const std::string& path, int folder) {
+Status makeDatabase(const std::string& path, int folder, InstallMode mode) {
   for (const std::string_view ending : {"", "-journal", "-wal", "-shm"}) {
     const int number = sys::removeFile(folder, (kNewDatabaseFile + std::string(ending)).c_str());
     if (number != 0 && number != ENOENT) return Error::fromErrno(number, kNewDatabaseFile);
@@ -41,6 +49,9 @@ Status makeDatabase(const std::string& path, int folder) {
       Database::Transaction transaction(**database);
       for (const char* schema : Services::kSchemas)
         transaction.runScript(schema).ignore();
+      if (mode == InstallMode::coordinated) {
+        transaction.run("insert into settings values ('coordination', '', 'on')").ignore();
+      }
       transaction.runScript(("pragma application_id = " + std::to_string(kApplicationId)).c_str()).ignore();
       transaction.runScript(("pragma user_version = " + std::to_string(kLayoutVersion)).c_str()).ignore();
       if (Status committed = transaction.commit(); !committed) return committed;
@@ -93,7 +104,7 @@ Result<FileDescriptor> openFolder(const std::string& path) {
   return folder;
 }
 
-Result<FileDescriptor> makeDevice(const std::string& path) {
+Result<FileDescriptor> makeDevice(const std::string& path, InstallMode mode) {
   const int made = sys::makeFolder(AT_FDCWD, path.c_str());
   if (made != 0 && made != EEXIST) return Error::fromErrno(made, path);
   const Result<FileDescriptor> folder = openFolder(path);
@@ -102,7 +113,7 @@ Result<FileDescriptor> makeDevice(const std::string& path) {
   Result<FileDescriptor> lock = lockDevice(path, folder->get());
   if (!lock) return lock.error();
   if (Status folders = makeDeviceFolders(folder->get()); !folders) return folders.error();
-  if (Status database = makeDatabase(path, folder->get()); !database) return database.error();
+  if (Status database = makeDatabase(path, folder->get(), mode); !database) return database.error();
   return lock;
 }
 
@@ -116,9 +127,9 @@ Device::Device(std::string path, FileDescriptor lock, std::unique_ptr<Database> 
       files_(std::move(files)),
       services_(*database_, files_, access) {}
 
-Result<std::unique_ptr<Device>> Device::create(const std::string& path) {
+Result<std::unique_ptr<Device>> Device::create(const std::string& path, InstallMode mode) {
   installKillHookFromEnvironment();
-  Result<FileDescriptor> lock = makeDevice(path);
+  Result<FileDescriptor> lock = makeDevice(path, mode);
   if (!lock) return deviceError(path, Access::exclusive, lock.error());
   return open(path, Access::exclusive, std::move(lock).value());
 }
@@ -147,7 +158,9 @@ Result<std::unique_ptr<Device>> Device::open(const std::string& path, Access acc
     if (Status made = makeDeviceFolders(folder->get()); !made) return made.error();
     Result<DeviceFileSystem> files = openFileSystem(path, folder->get(), access);
     if (!files) return files;
-    if (Status recovered = recover(**database, *files); !recovered) return recovered.error();
+    Settings settings(**database);
+    if (Status tables = makeMissingTables(**database); !tables) return tables.error();
+    if (Status recovered = recover(**database, *files, settings); !recovered) return recovered.error();
     return files;
   };
   Result<DeviceFileSystem> files = prepared();

@@ -15,6 +15,9 @@
 
 namespace appsync::device {
 
+/// How a device installs what a sync brings: through coordinators, or the sync client does it itself.
+enum class InstallMode { coordinated, direct };
+
 /// DEVICE/root is the device's file-system root, DEVICE/device.db holds everything else, DEVICE/lock names the process
 /// that holds the device, and DEVICE/work is for what is half done; the device is whole without what is in it.
 ///
@@ -22,8 +25,9 @@ namespace appsync::device {
 class Device {
  public:
   /// Makes a device of a missing or empty folder, whose parent must exist. A failure, or a kill, leaves nothing or a
-  /// folder that `create` takes again.
-  [[nodiscard]] static Result<std::unique_ptr<Device>> create(const std::string& path);
+  /// folder that `create` takes again. The mode becomes the setting "coordination", which can be changed.
+  [[nodiscard]] static Result<std::unique_ptr<Device>> create(const std::string& path,
+                                                              InstallMode mode = InstallMode::direct);
 
   /// Opens a device. `exclusive` takes hold of it until the object's end, and puts in order what a crash left half
   /// done: it may be interrupted and tried again at will. `readOnly` sees the device as it is, beside a process that

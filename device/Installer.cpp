@@ -56,6 +56,15 @@ Result<BundleInfo> readInfoOf(int container, const std::string& appFolder) {
   return readBundleInfo(document);
 }
 
+/// Puts the store metadata that was asked for beside the app folder.
+Status keepStoreMetadata(NewContainer& container, const InstallRequest& request) {
+  if (request.storeMetadata) return container.writeFile(kStoreMetadataFile, *request.storeMetadata);
+  const std::string name(kStoreMetadataFile);
+  const bool hasOwn = faccessat(container.folder(), name.c_str(), F_OK, AT_SYMLINK_NOFOLLOW) == 0;
+  if (hasOwn || !request.defaultStoreMetadata) return {};
+  return container.writeFile(name, *request.defaultStoreMetadata);
+}
+
 /// What a new bundle takes the place of: a package that of both earlier ones, a placeholder that of a placeholder.
 std::vector<const StoredBundle*> replacedBy(BundleRole role, const AppRow& app) {
   std::vector<const StoredBundle*> replaced;
@@ -124,9 +133,7 @@ Status Installer::unpackAndRecord(const platform::FileLocation& location, const 
   const Result<UnpackedPackage> unpacked = unpackPackage(*package, container->folder(), goOn);
   if (!unpacked) return unpacked.error();
   if (Status same = checkIdentifier(unpacked->info, request); !same) return same;
-  if (request.storeMetadata) {
-    if (Status kept = container->writeFile(kStoreMetadataFile, *request.storeMetadata); !kept) return kept;
-  }
+  if (Status kept = keepStoreMetadata(*container, request); !kept) return kept;
   if (Status synced = container->sync(); !synced) return synced;
   return record(*container, request, applicationType, describe(unpacked->info, unpacked->appFolder, unpacked->bytes));
 }
@@ -148,14 +155,17 @@ Status Installer::installPlaceholder(const platform::FileLocation& location, con
   const Result<BundleInfo> info = readInfoOf(container->folder(), folder);
   if (!info) return info.error();
   if (Status same = checkIdentifier(*info, request); !same) return same;
-  if (request.storeMetadata) {
-    if (Status kept = container->writeFile(kStoreMetadataFile, *request.storeMetadata); !kept) return kept;
-  }
+  if (Status kept = keepStoreMetadata(*container, request); !kept) return kept;
   // A sync's placeholder does not survive a restart: there is no point in waiting until it is on the disk.
   if (request.installType != TSInstallType::Sync) {
     if (Status synced = container->sync(); !synced) return synced;
   }
-  if (Status done = record(*container, request, applicationType, describe(*info, folder, bytes)); !done) return done;
+  return recordPlaceholder(*container, request, applicationType, describe(*info, folder, bytes));
+}
+
+Status Installer::recordPlaceholder(NewContainer& container, const InstallRequest& request,
+                                    std::string_view applicationType, StoredBundle bundle) {
+  if (Status done = record(container, request, applicationType, std::move(bundle)); !done) return done;
   running_.begin(known(request.identifier), {});
   return {};
 }
@@ -181,6 +191,7 @@ Status Installer::record(NewContainer& container, const InstallRequest& request,
       app_table::remove(transaction, before, BundleRole::placeholder).ignore();
       UninstalledApps::remove(transaction, request.identifier).ignore();
     }
+    if (request.alongside) request.alongside(transaction);
     if (Status committed = transaction.commit(); !committed) return asSystemError(committed.error());
   }
   container.keep();
@@ -189,7 +200,8 @@ Status Installer::record(NewContainer& container, const InstallRequest& request,
   return {};
 }
 
-Status Installer::uninstall(std::string_view bundleIdentifier, const plist::Dictionary& options) {
+Status Installer::uninstall(std::string_view bundleIdentifier, const plist::Dictionary& options,
+                            const Alongside& alongside) {
   const plist::Value* only = options.find(platform::UninstallPlaceholdersOnlyKey);
   // A package takes the place of all that goes with the app, a placeholder of the placeholder alone.
   const BundleRole role =
@@ -210,6 +222,7 @@ Status Installer::uninstall(std::string_view bundleIdentifier, const plist::Dict
       UninstalledApps::add(transaction, bundleIdentifier).ignore();
     }
     app_table::remove(transaction, app, BundleRole::placeholder).ignore();
+    if (alongside) alongside(transaction);
     if (Status committed = transaction.commit(); !committed) return asSystemError(committed.error());
   }
   if (app.placeholder || role == BundleRole::installed) running_.end(bundleIdentifier, TSInstallState::Canceled);

@@ -26,12 +26,19 @@ class Installer {
   [[nodiscard]] Status install(const platform::FileLocation& location, const plist::Dictionary& options,
                                std::string_view applicationType);
 
-  /// As `platform::AppRegistry::uninstallApplication`.
-  [[nodiscard]] Status uninstall(std::string_view bundleIdentifier, const plist::Dictionary& options);
-
- private:
+  /// The same for a package and a request that was checked.
   [[nodiscard]] Status installPackage(const platform::FileLocation& location, const InstallRequest& request,
                                       std::string_view applicationType);
+
+  /// Makes a filled container the app's placeholder, whose install waits from now on.
+  [[nodiscard]] Status recordPlaceholder(NewContainer& container, const InstallRequest& request,
+                                         std::string_view applicationType, StoredBundle bundle);
+
+  /// As `platform::AppRegistry::uninstallApplication`.
+  [[nodiscard]] Status uninstall(std::string_view bundleIdentifier, const plist::Dictionary& options,
+                                 const Alongside& alongside = {});
+
+ private:
   [[nodiscard]] Status installPlaceholder(const platform::FileLocation& location, const InstallRequest& request,
                                           std::string_view applicationType);
   [[nodiscard]] Status unpackAndRecord(const platform::FileLocation& location, const InstallRequest& request,

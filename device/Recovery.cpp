@@ -11,7 +11,10 @@
 
 #include "device/AppRecord.h"
 #include "device/AppTable.h"
+#include "device/BundleInfo.h"
+#include "device/CoordinatorTable.h"
 #include "device/FileTree.h"
+#include "device/SystemCalls.h"
 
 namespace appsync::device {
 
@@ -21,15 +24,55 @@ using platform::TSInstallType;
 
 namespace {
 
+using Identifiers = std::unordered_set<std::string>;
+
+/// Whose placeholders are a coordinator's, and whose were until now.
+struct CoordinatedPlaceholders {
+  Identifiers owned;
+  Identifiers orphaned;
+  /// Where the coordinators' packages are to be.
+  std::unordered_set<std::string> packages;
+};
+
+/// Ends the coordinators that may not stay, and tells what is left.
+Result<CoordinatedPlaceholders> reconcileCoordinators(Database::Session& session, bool coordinationIsOn) {
+  const auto coordinators = coordinator_table::all(session);
+  if (!coordinators) return coordinators.error();
+  CoordinatedPlaceholders placeholders;
+  for (const auto& coordinator : *coordinators) {
+    const bool isOver = !coordinationIsOn && coordinator->creator == platform::ClientIdentity::CXClientSync;
+    if (coordinator->showsPlaceholder()) {
+      (isOver ? placeholders.orphaned : placeholders.owned).insert(coordinator->identifier);
+    }
+    if (isOver) {
+      if (Status removed = coordinator_table::remove(session, *coordinator); !removed) return removed.error();
+    } else if (const auto package = coordinator->ownPackage()) {
+      placeholders.packages.insert(*package);
+    }
+  }
+  return placeholders;
+}
+
 bool containerExists(int containers, const StoredBundle& bundle) {
   struct stat status {};
   return fstatat(containers, bundle.container.c_str(), &status, AT_SYMLINK_NOFOLLOW) == 0 && S_ISDIR(status.st_mode);
 }
 
-/// Whether a record may keep its bundle.
-bool stays(int containers, BundleRole role, const StoredBundle& bundle) {
-  if (role == BundleRole::placeholder && bundle.installType == TSInstallType::Sync) return false;
-  return containerExists(containers, bundle);
+/// A loss of power may leave an empty file of one that was not waited for.
+bool hasInfo(int containers, const StoredBundle& bundle) {
+  const std::string path = bundle.container + '/' + bundle.folder + '/' + std::string(kInfoFile);
+  struct stat status {};
+  return fstatat(containers, path.c_str(), &status, AT_SYMLINK_NOFOLLOW) == 0 && status.st_size > 0;
+}
+
+/// Whether a record may keep its bundle. A coordinator's placeholder that may not is made anew from what is known of
+/// it.
+bool stays(int containers, const AppRow& app, BundleRole role, const CoordinatedPlaceholders& coordinated) {
+  const StoredBundle& bundle = *app.bundle(role);
+  if (!containerExists(containers, bundle)) return false;
+  if (role == BundleRole::installed) return true;
+  if (coordinated.owned.contains(app.identifier)) return hasInfo(containers, bundle);
+  return bundle.installType != TSInstallType::Sync && !coordinated.orphaned.contains(app.identifier);
 }
 
 /// An install that nobody drives any more waits; what was being unpacked must come again, what was parked has not
@@ -43,9 +86,13 @@ std::optional<ProgressValues> resumed(const AppRow& app, bool hasPlaceholder) {
   return values;
 }
 
-/// Takes away what may not stay; `kept` receives the containers of what may.
-Status reconcileRecords(Database& database, int containers, std::unordered_set<std::string>& kept) {
+/// Takes away what may not stay; `kept` receives the containers of what may, `packages` those of coordinators.
+Status reconcileRecords(Database& database, int containers, bool coordinationIsOn,
+                        std::unordered_set<std::string>& kept, std::unordered_set<std::string>& packages) {
   Database::Transaction transaction(database);
+  Result<CoordinatedPlaceholders> coordinated = reconcileCoordinators(transaction, coordinationIsOn);
+  if (!coordinated) return coordinated.error();
+  packages = std::move(coordinated->packages);
   const Result<std::vector<AppRow>> apps = app_table::all(transaction);
   if (!apps) return apps.error();
   for (const AppRow& app : *apps) {
@@ -53,7 +100,7 @@ Status reconcileRecords(Database& database, int containers, std::unordered_set<s
     for (const BundleRole role : {BundleRole::installed, BundleRole::placeholder}) {
       const std::optional<StoredBundle>& bundle = app.bundle(role);
       if (!bundle) continue;
-      if (stays(containers, role, *bundle)) {
+      if (stays(containers, app, role, *coordinated)) {
         kept.insert(bundle->container);
         hasPlaceholder = role == BundleRole::placeholder;
       } else if (Status removed = app_table::remove(transaction, app, role); !removed) {
@@ -79,16 +126,37 @@ int sweepContainers(int containers, const std::unordered_set<std::string>& kept,
   return entries.failure();
 }
 
+/// Removes packages that are of no use any more, but for those whose place has a new one.
+Status sweepPackages(Database& database, DeviceFileSystem& files, const std::unordered_set<std::string>& needed) {
+  Database::Transaction transaction(database);
+  const Result<std::vector<std::string>> spent = coordinator_table::spentPackages(transaction);
+  if (!spent) return spent.error();
+  for (const std::string& path : *spent) {
+    const Result<RootFolder::Place> place = files.root().place(path);
+    if (place && !needed.contains(path)) {
+      static_cast<void>(sys::removeFile(place->folder.get(), place->name.c_str()));
+    }
+    coordinator_table::forgetSpentPackage(transaction, path).ignore();
+  }
+  return transaction.commit();
+}
+
 }  // namespace
 
-Status recover(Database& database, DeviceFileSystem& files) {
+Status recover(Database& database, DeviceFileSystem& files, Settings& settings) {
   const Result<FileDescriptor> containers = files.root().open(kContainersPath, O_RDONLY | O_DIRECTORY);
   if (!containers) return containers.error();
   const Result<FileDescriptor> temporary =
       files.root().open(DeviceFileSystem::kTemporaryDirectory, O_RDONLY | O_DIRECTORY);
   if (!temporary) return temporary.error();
   std::unordered_set<std::string> kept;
-  if (Status reconciled = reconcileRecords(database, containers->get(), kept); !reconciled) return reconciled;
+  std::unordered_set<std::string> packages;
+  const bool coordinationIsOn = settings.coordinationIsOn();
+  if (Status reconciled = reconcileRecords(database, containers->get(), coordinationIsOn, kept, packages);
+      !reconciled) {
+    return reconciled;
+  }
+  if (Status swept = sweepPackages(database, files, packages); !swept) return swept;
   int number = sweepContainers(containers->get(), kept, files.work());
   if (number == 0) number = tree::empty(temporary->get(), files.work());
   if (number == 0) number = tree::empty(files.work(), files.work());

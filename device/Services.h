@@ -31,8 +31,9 @@ class Services final : public platform::Platform {
  public:
   /// What makes all tables that the services keep.
   static constexpr const char* kSchemas[] = {
-      AppRegistry::kSchema,   UninstalledApps::kSchema, Settings::kSchema,       HomeScreen::kSchema,
-      BackupManager::kSchema, SoftwareLibrary::kSchema, TransactionLog::kSchema, SystemNotify::kSchema};
+      AppRegistry::kSchema,    UninstalledApps::kSchema, Settings::kSchema,
+      HomeScreen::kSchema,     BackupManager::kSchema,   SoftwareLibrary::kSchema,
+      TransactionLog::kSchema, SystemNotify::kSchema,    InstallCoordination::kSchema};
 
   /// `database` and `files` must outlive the services.
   Services(Database& database, DeviceFileSystem& files, Access access)
@@ -47,7 +48,8 @@ class Services final : public platform::Platform {
         systemNotify_(database),
         bundles_(files),
         iconRenderer_(files),
-        scheduler_(clock_) {}
+        scheduler_(clock_),
+        installCoordination_(database, files, registry_, settings_, access) {}
 
   [[nodiscard]] SyncFramework& syncFramework() override { return syncFramework_; }
   [[nodiscard]] DeviceService& sharedDeviceService() override { return deviceService_; }
@@ -94,9 +96,10 @@ class Services final : public platform::Platform {
   PNGEncoders pngEncoders_;
   SyncFramework syncFramework_;
   DeviceService deviceService_;
-  InstallCoordination installCoordination_;
   SystemClock clock_;
   ThreadScheduler scheduler_;
+  /// Has threads that use the others.
+  InstallCoordination installCoordination_;
 };
 
 }  // namespace appsync::device

@@ -43,10 +43,8 @@ Result<Row> restrictionRow(std::string_view key, std::string_view value) {
 }
 
 Result<Row> coordinationRow(std::string_view key, std::string_view value) {
-  if (value == "off" || value == kUnset) return Row{"", std::string(value)};
-  if (value != "on") return unknownValue(key, value, "on, off or unset");
-  return refusal(SettingsFailure::notAvailable,
-                 "setting coordination cannot be \"on\": install coordination is not available in this version");
+  if (value == "on" || value == "off" || value == kUnset) return Row{"", std::string(value)};
+  return unknownValue(key, value, "on, off or unset");
 }
 
 Result<Row> storeRow(std::string_view key, std::string_view value) {
@@ -133,6 +131,10 @@ platform::RestrictionValue Settings::restriction(platform::RestrictionSetting se
   const auto value = stored(isInstallation ? kInstallation : kRemoval, "");
   if (value == "yes") return platform::RestrictionValue::yes;
   return value == "no" ? platform::RestrictionValue::no : platform::RestrictionValue::unset;
+}
+
+bool Settings::coordinationIsOn() {
+  return stored(kCoordination, "") == "on";
 }
 
 std::optional<std::string> Settings::storeFolder() {

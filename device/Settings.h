@@ -21,7 +21,6 @@ inline constexpr std::string_view kSettingsDomain = "Settings";
 enum class SettingsFailure : long {
   unknownKey = 1,
   unknownValue,
-  notAvailable,  ///< a value that this version knows and cannot serve
   noAssignment,  ///< a text that is not KEY=VALUE
 };
 
@@ -39,7 +38,7 @@ struct Setting {
 ///
 ///     app-installation   yes, no, unset      may apps be installed
 ///     app-removal        yes, no, unset      may apps be removed
-///     coordination       on, off, unset      install through coordinators; this version has "off" only
+///     coordination       on, off, unset      install through coordinators, from the next opening on; unset is off
 ///     store              a folder, or unset  where packages of restored apps come from; kept as an absolute host path
 ///     assertion          ID:ANSWER           what the home screen answers for app ID, one setting per app: granted,
 ///                                            denied, unknown, failing, or unset for its own judgement
@@ -69,6 +68,7 @@ class Settings {
   // For services. A setting that cannot be read counts as unset.
 
   [[nodiscard]] platform::RestrictionValue restriction(platform::RestrictionSetting setting);
+  [[nodiscard]] bool coordinationIsOn();
   [[nodiscard]] std::optional<std::string> storeFolder();
   [[nodiscard]] std::optional<AssertionAnswer> assertionAnswer(std::string_view bundleIdentifier);
 

@@ -121,10 +121,16 @@ TEST_F(SettingsTest, AnAssertionNamesAnAppAndAnAnswer) {
   }
 }
 
-TEST_F(SettingsTest, CoordinationCannotBeTurnedOn) {
-  EXPECT_EQ(refusalOf("coordination=on"),
-            refusal(SettingsFailure::notAvailable,
-                    "setting coordination cannot be \"on\": install coordination is not available in this version"));
+TEST_F(SettingsTest, CoordinationIsOffUntilItIsTurnedOn) {
+  EXPECT_FALSE(settings.coordinationIsOn());
+  EXPECT_TRUE(settings.assign("coordination=on"));
+  EXPECT_TRUE(settings.coordinationIsOn());
+  EXPECT_EQ(list(), (std::vector<Setting>{{"coordination", "on"}}));
+  EXPECT_TRUE(settings.assign("coordination=off"));
+  EXPECT_FALSE(settings.coordinationIsOn());
+  EXPECT_TRUE(settings.assign("coordination=on"));
+  EXPECT_TRUE(settings.assign("coordination=unset"));
+  EXPECT_FALSE(settings.coordinationIsOn());
 }
 
 TEST_F(SettingsTest, ATextWithoutAnEqualsSignIsNoAssignment) {

@@ -29,7 +29,8 @@ inline void writeHostFile(const std::string& path, std::string_view content) {
 
 class TestDevice {
  public:
-  TestDevice() : device_(made(device::Device::create(path()))) {}
+  explicit TestDevice(device::InstallMode mode = device::InstallMode::direct)
+      : device_(made(device::Device::create(path(), mode))) {}
   /// A copy of a device that nobody holds.
   explicit TestDevice(const std::string& original) {
     std::filesystem::copy(original, path(), std::filesystem::copy_options::recursive);
