@@ -14,7 +14,7 @@ enum class CoordinationFailure : long {
   off = 2,          ///< this device installs directly
   closed,           ///< the service has ended
   badIdentifier,    ///< an identifier that no app can have
-  noCoordinator,    ///< there is none to do it to, or none of that kind can be made
+  noCoordinator,    ///< there is none to do it to
   ended,            ///< the coordinator, placeholder or promise is over
   installing,       ///< too late: the app is being installed
   setBefore,        ///< it can be set once only

@@ -77,8 +77,7 @@ std::shared_ptr<platform::InstallCoordinator> InstallCoordination::coordinatorFo
   bool isNew = false;
   if (ifMissing == platform::IfMissing::findNothing || kind == CoordinatorKind::any) {
     found = coordinators_->find(kind, bundleIdentifier, client);
-    if (!found && ifMissing == platform::IfMissing::findNothing) return nullptr;
-    if (!found) return refuse(coordinationError(CoordinationFailure::noCoordinator, "a new coordinator needs a kind"));
+    if (!found) return nullptr;
   } else {
     Result<std::shared_ptr<CoordinatorState>> made = coordinators_->findOrMake(kind, bundleIdentifier, client, isNew);
     if (!made) return refuse(made.error());

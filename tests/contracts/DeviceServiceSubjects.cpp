@@ -1,4 +1,6 @@
 // Holds the embedded device's services to the contracts.
+#include <atomic>
+#include <chrono>
 #include <fstream>
 #include <memory>
 #include <string>
@@ -160,6 +162,40 @@ class DeviceCoordination final : public InstallCoordinationSubject {
   TestDevice device_;
 };
 
+class DeviceInstalls final : public CoordinatedInstallSubject {
+ public:
+  platform::InstallCoordination& coordination() override { return service(); }
+  platform::AppRegistry& registry() override { return device_.registry(); }
+  platform::UninstalledAppsList& uninstalledApps() override { return device_.services().uninstalledApps(); }
+
+  platform::FileLocation makePackage(std::string_view identifier, std::string_view version) override {
+    return device_.stage(newName(), appPackage(identifier, version));
+  }
+  platform::FileLocation makeDamagedPackage(std::string_view identifier) override {
+    std::string package = appPackage(identifier);
+    package.resize(package.size() / 2);
+    return device_.stage(newName(), package);
+  }
+  platform::FileLocation makeIcon() override { return device_.stage(newName(), textOf(makePNG(60, 60, kGreen))); }
+  bool exists(const platform::FileLocation& location) override { return device_.files().fileExists(location.path); }
+
+  void prioritize(std::string_view identifier) override { EXPECT_TRUE(service().prioritize(identifier)); }
+  void cancelByUser(std::string_view identifier) override { EXPECT_TRUE(service().cancelByUser(identifier).ok()); }
+  void waitUntilIdle() override { EXPECT_TRUE(service().waitUntilIdle(std::chrono::minutes(5))); }
+
+  bool restart() override {
+    device_.reopen();
+    return true;
+  }
+
+ private:
+  device::InstallCoordination& service() { return device_.services().installCoordination(); }
+  std::string newName() { return std::to_string(++made_); }
+
+  TestDevice device_{device::InstallMode::coordinated};
+  std::atomic<int> made_ = 0;
+};
+
 class DeviceFramework final : public SyncFrameworkSubject {
  public:
   DeviceFramework() { device_.services().syncFramework().logTo(device::FileLogSink::open(log_).value()); }
@@ -211,6 +247,9 @@ INSTANTIATE_TEST_SUITE_P(Device, IconsContract, testing::Values(implementation<I
                          implementationName);
 INSTANTIATE_TEST_SUITE_P(Device, InstallCoordinationContract,
                          testing::Values(implementation<InstallCoordinationSubject, DeviceCoordination>("Device")),
+                         implementationName);
+INSTANTIATE_TEST_SUITE_P(Device, CoordinatedInstallContract,
+                         testing::Values(implementation<CoordinatedInstallSubject, DeviceInstalls>("Device")),
                          implementationName);
 INSTANTIATE_TEST_SUITE_P(Device, SyncFrameworkContract,
                          testing::Values(implementation<SyncFrameworkSubject, DeviceFramework>("Device")),

@@ -91,8 +91,7 @@ class CoordinationClient {
     return placeholder;
   }
 
-  [[nodiscard]] static platform::InstallOptions options(
-      platform::TSInstallType type = platform::TSInstallType::Sync) {
+  [[nodiscard]] static platform::InstallOptions options(platform::TSInstallType type = platform::TSInstallType::Sync) {
     platform::InstallOptions options;
     options.setInstallType(type);
     options.setInstallTargetType(1);
@@ -134,7 +133,9 @@ class CoordinationTest : public testing::Test {
   platform::FileLocation stage(std::string_view identifier, std::string_view version = "1.0") {
     return device_.stage(std::string(identifier) + ".zip", appPackage(identifier, version));
   }
-  [[nodiscard]] bool exists(const platform::FileLocation& location) { return device_.files().fileExists(location.path); }
+  [[nodiscard]] bool exists(const platform::FileLocation& location) {
+    return device_.files().fileExists(location.path);
+  }
   /// "1.0", "1.0 placeholder" for an app with a placeholder, "none".
   [[nodiscard]] std::string state(std::string_view identifier) {
     const auto app = device_.record(identifier);
