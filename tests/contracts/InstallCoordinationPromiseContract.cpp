@@ -172,6 +172,23 @@ TEST_P(CoordinatedInstallContract, APromiseOutlivesWhatItBelongedTo) {
   EXPECT_FALSE(coordinator("com.b")->setAppAssetPromise(asset));
 }
 
+TEST_P(CoordinatedInstallContract, APromiseThatNobodyWaitedForEndsWithItsInstall) {
+  const Coordinator made = coordinator("com.a");
+  const UserData resource = makeUserData("resource");
+  EXPECT_TRUE(made->setInstallOptions(options()));
+  EXPECT_TRUE(made->setInitialODRAssetPromises({resource}));
+  EXPECT_TRUE(made->setPlaceholderPromise(makeConfiguredPlaceholder("com.a")));
+  const Asset asset = makeAsset();
+  EXPECT_TRUE(made->setAppAssetPromise(asset));
+  deliver(*asset, subject().makePackage("com.a", "1.0"));
+  subject().waitUntilIdle();
+  EXPECT_EQ(stateOf("com.a"), "installed");
+  resource->setPercentComplete(1);
+  resource->setComplete(true);
+  EXPECT_EQ(resource->percentComplete(), 0);
+  EXPECT_FALSE(resource->isComplete());
+}
+
 TEST_P(CoordinatedInstallContract, APromiseMayBeChangedByManyThreadsAtOnce) {
   const Asset asset = makeAsset();
   EXPECT_TRUE(coordinator("com.a")->setAppAssetPromise(asset));

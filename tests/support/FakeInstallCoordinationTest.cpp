@@ -163,6 +163,21 @@ TEST_F(FakeInstallCoordinationTest, AClosedGateHoldsEverythingBack) {
   EXPECT_TRUE(platform.registry.app("com.a")->isInstalled);
 }
 
+TEST_F(FakeInstallCoordinationTest, AnInstallUnderWayIsNotCancelled) {
+  service.installAutomatically();
+  const auto coordinator = make();
+  const auto asset = prepare(*coordinator);
+  service.waitUntilIdle();
+  service.gate.close();
+  deliver(*asset);
+  service.gate.waitUntilStopped(1);
+  EXPECT_EQ(service.coordinator("com.a")->stage, FakeCoordinatorStage::installing);
+  EXPECT_FALSE(coordinator->cancelForReason(kReason, kSync));
+  EXPECT_FALSE(asset->cancelForReason(kReason, kSync));
+  service.runUntilIdle();
+  EXPECT_TRUE(platform.registry.app("com.a")->isInstalled);
+}
+
 TEST_F(FakeInstallCoordinationTest, ATestTellsWhatHappens) {
   Listener listener;
   const auto connection = service.initWithMachServiceName("name", {kSync}, listener);
