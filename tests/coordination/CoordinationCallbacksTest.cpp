@@ -102,6 +102,14 @@ TEST_F(CoordinationCallbacks, TheTodoListChangesBeforeTheRestoreState) {
                      "fileSystem.removeItem " + std::string(kRestoreStatePath)}));
 }
 
+TEST_F(CoordinationCallbacks, TheAppIsNamedByAnAssetWithoutAPrettyName) {
+  listen();
+  prioritize();
+  cancelByUser();
+  const FakeSyncFramework::Download named{"com.a", "Application", std::nullopt};
+  EXPECT_EQ(platform.framework.downloads(), (std::vector{named, named}));
+}
+
 TEST_F(CoordinationCallbacks, AnAppThatIsWantedFirstIsSentFirst) {
   listen();
   prioritize();

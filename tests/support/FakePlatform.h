@@ -41,8 +41,6 @@ class FakePlatform final : public platform::Platform {
   FakeUninstalledAppsList uninstalledList{journal};
   FakeAppRegistry registry{journal, files, uninstalledList};
   FakeSyncFramework framework{journal, log};
-  FakeDeviceService deviceService{journal};
-  FakeInstallCoordination coordination{journal, files, registry};
   FakeHomeScreen screen{journal};
   FakeProfileConnection restrictions{journal};
   FakeTransactionLog transactions{journal};
@@ -53,6 +51,9 @@ class FakePlatform final : public platform::Platform {
   FakePNGEncoders encoders{journal};
   FakeBackups backups{journal};
   FakeStore store{journal};
+  // What these still have to tell when they go reaches the others.
+  FakeDeviceService deviceService{journal};
+  FakeInstallCoordination coordination{journal, files, registry};
   /// Clock and scheduler. Goes first, with the tasks that are still to come and all that these keep alive.
   VirtualTime time;
 
