@@ -18,8 +18,10 @@
 #include "tests/contracts/SyncFrameworkContract.h"
 #include "tests/contracts/SystemNotifyContract.h"
 #include "tests/contracts/TransactionLogContract.h"
+#include "tests/contracts/ZTDeviceServiceContract.h"
 #include "tests/device/Pictures.h"
 #include "tests/device/TestDevice.h"
+#include "tests/support/FakeDeviceService.h"
 
 namespace appsync::test {
 
@@ -183,6 +185,11 @@ class DeviceInstalls final : public CoordinatedInstallSubject {
   void cancelByUser(std::string_view identifier) override { EXPECT_TRUE(service().cancelByUser(identifier).ok()); }
   void waitUntilIdle() override { EXPECT_TRUE(service().waitUntilIdle(std::chrono::minutes(5))); }
 
+  std::optional<plist::Dictionary> storeMetadataOf(std::string_view identifier) override {
+    const std::string container = device_.record(identifier)->bundleContainerPath().value();
+    const Result<Bytes> kept = device_.files().readFile(container + "/HarvoMetadata.plist");
+    return kept ? *plist::read(*kept).value().dictionary() : plist::Dictionary();
+  }
   bool restart() override {
     device_.reopen();
     return true;
@@ -194,6 +201,21 @@ class DeviceInstalls final : public CoordinatedInstallSubject {
 
   TestDevice device_{device::InstallMode::coordinated};
   std::atomic<int> made_ = 0;
+};
+
+/// With a daemon behind it.
+class DeviceAndDaemon final : public ZTDeviceServiceSubject {
+ public:
+  DeviceAndDaemon() { service_.connect(&daemon_); }
+  ~DeviceAndDaemon() override { service_.connect(nullptr); }
+  DeviceAndDaemon(const DeviceAndDaemon&) = delete;
+  DeviceAndDaemon& operator=(const DeviceAndDaemon&) = delete;
+  platform::ZTDeviceService& service() override { return service_; }
+
+ private:
+  CallJournal journal_;
+  FakeDeviceService daemon_{journal_};
+  device::DeviceService service_;
 };
 
 class DeviceFramework final : public SyncFrameworkSubject {
@@ -250,6 +272,9 @@ INSTANTIATE_TEST_SUITE_P(Device, InstallCoordinationContract,
                          implementationName);
 INSTANTIATE_TEST_SUITE_P(Device, CoordinatedInstallContract,
                          testing::Values(implementation<CoordinatedInstallSubject, DeviceInstalls>("Device")),
+                         implementationName);
+INSTANTIATE_TEST_SUITE_P(Device, ZTDeviceServiceContract,
+                         testing::Values(implementation<ZTDeviceServiceSubject, DeviceAndDaemon>("Device")),
                          implementationName);
 INSTANTIATE_TEST_SUITE_P(Device, SyncFrameworkContract,
                          testing::Values(implementation<SyncFrameworkSubject, DeviceFramework>("Device")),

@@ -260,6 +260,12 @@ class FakeCoordinatedInstalls final : public CoordinatedInstallSubject {
   void prioritize(std::string_view identifier) override { platform_.coordination.prioritize(identifier); }
   void cancelByUser(std::string_view identifier) override { platform_.coordination.cancelByUser(identifier); }
   void waitUntilIdle() override { platform_.coordination.waitUntilIdle(); }
+  std::optional<plist::Dictionary> storeMetadataOf(std::string_view identifier) override {
+    const FakeApp app = *platform_.registry.app(identifier);
+    const plist::Value* kept = app.installOptions.find(platform::StoreMetadataKey);
+    if (kept == nullptr || !kept->data()) return plist::Dictionary();
+    return *plist::read(*kept->data()).value().dictionary();
+  }
 
  private:
   platform::FileLocation put(std::string_view contents) {

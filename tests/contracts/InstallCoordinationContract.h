@@ -52,6 +52,13 @@ class CoordinatedInstallSubject {
   /// Blocks until the service has nothing left to do and to tell.
   virtual void waitUntilIdle() = 0;
 
+  // What a device cannot do is not tested.
+
+  /// The store metadata that is kept with an installed app.
+  [[nodiscard]] virtual std::optional<plist::Dictionary> storeMetadataOf(std::string_view identifier) {
+    static_cast<void>(identifier);
+    return std::nullopt;
+  }
   /// Ends the process of the service and begins another; false where that cannot be. Nothing of the service is held.
   [[nodiscard]] virtual bool restart() { return false; }
 };

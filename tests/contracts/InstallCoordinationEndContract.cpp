@@ -173,6 +173,14 @@ TEST_P(CoordinatedInstallContract, AnUninstallOfAnUnknownAppCompletesOnceToo) {
   EXPECT_EQ(uninstalled.completions.count(), 1U);
 }
 
+TEST_P(CoordinatedInstallContract, AnUninstallCompletesBeforeTheServiceEnds) {
+  auto another = GetParam().make();
+  Uninstalled uninstalled;
+  another->coordination().uninstallApp("com.unknown", UserConfirmation::skip, uninstalled.completion());
+  another.reset();
+  EXPECT_EQ(uninstalled.completions.count(), 1U);
+}
+
 TEST_P(CoordinatedInstallContract, ACompletionMayUseTheService) {
   install("com.a", "1.0");
   install("com.b", "1.0");

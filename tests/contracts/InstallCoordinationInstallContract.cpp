@@ -35,6 +35,23 @@ TEST_P(CoordinatedInstallContract, AnInstallThatHasEndedTakesNothingMore) {
   EXPECT_EQ(made->coordinatorError(), std::nullopt);
 }
 
+TEST_P(CoordinatedInstallContract, StoreMetadataIsKeptWithTheApp) {
+  const Coordinator made = coordinator("com.a");
+  platform::InstallOptions withMetadata = options();
+  withMetadata.setStoreMetadata(platform::StoreMetadata::initWithDictionary({{"itemName", "Kept"}}));
+  EXPECT_TRUE(made->setInstallOptions(withMetadata));
+  EXPECT_TRUE(made->setPlaceholderPromise(makeConfiguredPlaceholder("com.a")));
+  const Asset asset = makeAsset();
+  EXPECT_TRUE(made->setAppAssetPromise(asset));
+  deliver(*asset, subject().makePackage("com.a", "1.0"));
+  subject().waitUntilIdle();
+  ASSERT_EQ(stateOf("com.a"), "installed");
+  const std::optional<plist::Dictionary> kept = subject().storeMetadataOf("com.a");
+  if (!kept) GTEST_SKIP() << "cannot be told";
+  ASSERT_NE(kept->find("itemName"), nullptr);
+  EXPECT_EQ(kept->find("itemName")->string(), "Kept");
+}
+
 // What an install waits for.
 
 TEST_P(CoordinatedInstallContract, AnInstallWaitsForItsPackage) {
