@@ -41,22 +41,21 @@ void Coordinators::begin() {
   for (const Coordinator& coordinator : *left)
     coordinators_[coordinator->identifier].push_back(coordinator);
   for (const Coordinator& coordinator : *left) {
-    takeUp(coordinator);
+    keepShown(*coordinator);
+    // Nobody sends its package just now.
+    const auto progress = registry_.runningInstalls().find(coordinator->identifier);
+    if (progress != nullptr) progress->setInstallState(TSInstallState::Waiting);
     advance(coordinator);
   }
 }
 
-void Coordinators::takeUp(const Coordinator& coordinator) {
-  if (!coordinator->showsPlaceholder()) return;
-  const auto isShown = [&] {
-    const auto app = registry_.recordForIdentifier(coordinator->identifier, platform::PlaceholderLookup::on);
-    return app != nullptr && app->isPlaceholder() && app->installProgress() != nullptr;
-  };
-  if (!isShown()) show(*coordinator->placeholder, [](Database::Session&) {}).ignore();
-  followPromise(*coordinator);
-  // Nobody sends the package just now.
-  const auto progress = registry_.runningInstalls().find(coordinator->identifier);
-  if (progress != nullptr) progress->setInstallState(TSInstallState::Waiting);
+void Coordinators::keepShown(const CoordinatorState& coordinator) {
+  if (!coordinator.showsPlaceholder() || coordinator.stage != CoordinatorStage::waiting) return;
+  const auto app = registry_.recordForIdentifier(coordinator.identifier, platform::PlaceholderLookup::on);
+  const bool isShown = app != nullptr && app->isPlaceholder() && app->installProgress() != nullptr;
+  // A home screen without it does not keep the app from being installed.
+  if (!isShown) show(*coordinator.placeholder, [](Database::Session&) {}).ignore();
+  followPromise(coordinator);
 }
 
 void Coordinators::end() {
@@ -114,6 +113,9 @@ void Coordinators::install(const Coordinator& coordinator) {
     if (erase(*coordinator)) removePackage(*coordinator);
   }
   close(coordinator, installed.failure());
+  // The end of one coordinator's install is the end of the app's placeholder.
+  for (const Coordinator& other : ofApp(coordinator->identifier))
+    keepShown(*other);
   tell(coordinator, &InstallObserverDelegate::coordinatorDidCompleteSuccessfully);
   --installing_;
   changed_.notify_all();

@@ -25,7 +25,7 @@ Error foreign(std::string_view what) {
 
 void Coordinators::setFraction(const std::shared_ptr<PromiseState>& promise, double fraction) {
   const std::lock_guard lock(mutex_);
-  if (!promise->canChange()) return;
+  if (isEnding_ || !promise->canChange()) return;
   promise->fraction = std::isnan(fraction) ? 0 : std::clamp(fraction, 0.0, 1.0);
   if (promise->role != PromiseRole::appAsset) return;
   if (const Coordinator coordinator = promise->coordinator.lock()) followPromise(*coordinator);
@@ -42,14 +42,13 @@ void Coordinators::followPromise(const CoordinatorState& coordinator) {
 
 void Coordinators::setTransferPath(const std::shared_ptr<PromiseState>& promise, const platform::FileLocation& path) {
   const std::lock_guard lock(mutex_);
-  const Coordinator coordinator = promise->coordinator.lock();
-  const bool isInUse = coordinator && coordinator->stage == CoordinatorStage::installing;
-  if (promise->canChange() && !isInUse) promise->transferPath = path;
+  const bool isTheServices = promise->isComplete && promise->role;
+  if (!isEnding_ && promise->canChange() && !isTheServices) promise->transferPath = path;
 }
 
 void Coordinators::fulfil(const std::shared_ptr<PromiseState>& promise) {
   const std::lock_guard lock(mutex_);
-  if (!promise->canChange() || promise->isComplete) return;
+  if (isEnding_ || !promise->canChange() || promise->isComplete) return;
   promise->isComplete = true;
   const Coordinator coordinator = promise->coordinator.lock();
   if (coordinator == nullptr || promise->role == PromiseRole::initialODRAsset) return;
@@ -68,6 +67,7 @@ void Coordinators::fulfil(const std::shared_ptr<PromiseState>& promise) {
 
 Status Coordinators::takeBack(const std::shared_ptr<PromiseState>& promise, ClientIdentity client) {
   const std::lock_guard lock(mutex_);
+  if (Status open = checkOpen(); !open) return open;
   if (!promise->canChange()) return coordinationError(CoordinationFailure::ended, "the promise is over");
   const Coordinator coordinator = promise->coordinator.lock();
   if (promise->role && client != promise->client) return foreign("promise");
@@ -117,7 +117,7 @@ Status Coordinators::configure(const std::shared_ptr<PlaceholderState>& placehol
     copy.icon->role = PromiseRole::icon;
     copy.icon->coordinator = coordinator;
   }
-  *placeholder = std::move(copy);
+  static_cast<PlaceholderConfiguration&>(*placeholder) = std::move(copy);
   if (!coordinator || !placeholder->isConfigured) return {};
   tell(coordinator, &InstallObserverDelegate::coordinatorDidInstallPlaceholder);
   followPromise(*coordinator);

@@ -38,11 +38,8 @@ struct PromiseState {
   [[nodiscard]] bool canChange() const { return !isCancelled && !isOver; }
 };
 
-struct PlaceholderState {
-  std::string bundleName;
-  std::string identifier;
-  platform::TSInstallType installType = platform::TSInstallType::None;
-  platform::ClientIdentity client = platform::ClientIdentity::CXClientSync;
+/// What of a placeholder can be configured.
+struct PlaceholderConfiguration {
   std::shared_ptr<PromiseState> icon;
   platform::PlaceholderAttributes attributes;
   /// The attributes' info dictionary and the store metadata as binary property lists.
@@ -50,6 +47,13 @@ struct PlaceholderState {
   std::optional<Bytes> storeMetadata;
   std::optional<Bytes> licence;
   bool isConfigured = false;
+};
+
+struct PlaceholderState : PlaceholderConfiguration {
+  std::string bundleName;
+  std::string identifier;
+  platform::TSInstallType installType = platform::TSInstallType::None;
+  platform::ClientIdentity client = platform::ClientIdentity::CXClientSync;
   bool isCancelled = false;
   /// Whether a coordinator has or had it; null once that has gone.
   bool isAttached = false;
@@ -63,18 +67,23 @@ struct CoordinatorOptions {
   std::optional<Bytes> storeMetadata;
 };
 
-enum class CoordinatorStage : std::uint8_t { waiting, installing, ended };
-
-struct CoordinatorState {
-  std::int64_t number = 0;  ///< grows from one that is made to the next
-  std::string identifier;
-  platform::CoordinatorKind kind = platform::CoordinatorKind::initiating;
-  platform::ClientIdentity creator = platform::ClientIdentity::CXClientSync;
+/// What of a coordinator is set without the promises that the service waits for.
+struct CoordinatorChoices {
   std::optional<platform::ClientIdentity> responsibleClient;
   std::optional<CoordinatorOptions> options;
   bool hasInitialODRAssets = false;
   /// Those given in this process: which they were is not stored.
   std::vector<std::shared_ptr<PromiseState>> initialODRAssets;
+};
+
+enum class CoordinatorStage : std::uint8_t { waiting, installing, ended };
+
+/// The first four never change.
+struct CoordinatorState : CoordinatorChoices {
+  std::int64_t number = 0;  ///< grows from one that is made to the next
+  std::string identifier;
+  platform::CoordinatorKind kind = platform::CoordinatorKind::initiating;
+  platform::ClientIdentity creator = platform::ClientIdentity::CXClientSync;
   std::shared_ptr<PromiseState> appAsset;
   std::shared_ptr<PromiseState> userData;
   std::shared_ptr<PlaceholderState> placeholder;

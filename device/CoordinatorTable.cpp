@@ -129,19 +129,19 @@ Status insert(Database::Session& session, CoordinatorState& state) {
   return number.status();
 }
 
-Status update(Database::Session& session, const CoordinatorState& state) {
+Status storeChoices(Database::Session& session, std::int64_t coordinator, const CoordinatorChoices& choices) {
   std::optional<platform::TSInstallType> type;
   std::optional<std::uint64_t> target;
   std::optional<ByteView> metadata;
-  if (state.options) {
-    type = state.options->installType;
-    target = state.options->installTargetType;
-    if (state.options->storeMetadata) metadata = *state.options->storeMetadata;
+  if (choices.options) {
+    type = choices.options->installType;
+    target = choices.options->installTargetType;
+    if (choices.options->storeMetadata) metadata = *choices.options->storeMetadata;
   }
   return session.run(
       "update coordinators set responsible_client = ?, has_odr_assets = ?, install_type = ?, install_target = ?, "
       "store_metadata = ? where number = ?",
-      state.responsibleClient, state.hasInitialODRAssets, type, target, metadata, state.number);
+      choices.responsibleClient, choices.hasInitialODRAssets, type, target, metadata, coordinator);
 }
 
 Status storePromise(Database::Session& session, std::int64_t coordinator, PromiseRole role,

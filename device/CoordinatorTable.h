@@ -57,8 +57,7 @@ Status insert(Database::Session& session, CoordinatorState& state);
 
 // Of a coordinator whose row has gone nothing is stored, or the statement fails.
 
-/// What the row itself has: the responsible client, the options, whether there are initial ODR assets.
-Status update(Database::Session& session, const CoordinatorState& state);
+Status storeChoices(Database::Session& session, std::int64_t coordinator, const CoordinatorChoices& choices);
 /// The coordinator's promise in that role, which is not one for initial ODR assets.
 Status storePromise(Database::Session& session, std::int64_t coordinator, PromiseRole role,
                     const PromiseState& promise);

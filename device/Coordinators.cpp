@@ -102,10 +102,12 @@ Status Coordinators::store(const CoordinatorState& coordinator, const Store& sto
   return {};
 }
 
-Status Coordinators::update(const Coordinator& coordinator, CoordinatorState copy) {
-  const auto store = [&](Database::Session& session) { coordinator_table::update(session, copy).ignore(); };
+Status Coordinators::choose(const Coordinator& coordinator, CoordinatorChoices choices) {
+  const auto store = [&](Database::Session& session) {
+    coordinator_table::storeChoices(session, coordinator->number, choices).ignore();
+  };
   if (Status stored = this->store(*coordinator, store); !stored) return stored;
-  *coordinator = std::move(copy);
+  static_cast<CoordinatorChoices&>(*coordinator) = std::move(choices);
   advance(coordinator);
   return {};
 }
@@ -118,9 +120,9 @@ void Coordinators::setObserver(const Coordinator& coordinator, CoordinatorObserv
 Status Coordinators::setOptions(const Coordinator& coordinator, ClientIdentity client, CoordinatorOptions options) {
   const std::lock_guard lock(mutex_);
   if (Status may = mayChange(*coordinator, client, coordinator->options.has_value()); !may) return may;
-  CoordinatorState copy = *coordinator;
-  copy.options = std::move(options);
-  return update(coordinator, std::move(copy));
+  CoordinatorChoices choices = *coordinator;
+  choices.options = std::move(options);
+  return choose(coordinator, std::move(choices));
 }
 
 Status Coordinators::setInitialODRAssets(const Coordinator& coordinator, ClientIdentity client,
@@ -131,10 +133,10 @@ Status Coordinators::setInitialODRAssets(const Coordinator& coordinator, ClientI
     const bool isTwice = std::ranges::count(promises, promise) > 1;
     if (Status usable = checkPromise(isTwice ? nullptr : promise); !usable) return usable;
   }
-  CoordinatorState copy = *coordinator;
-  copy.hasInitialODRAssets = true;
-  copy.initialODRAssets = promises;
-  if (Status updated = update(coordinator, std::move(copy)); !updated) return updated;
+  CoordinatorChoices choices = *coordinator;
+  choices.hasInitialODRAssets = true;
+  choices.initialODRAssets = promises;
+  if (Status chosen = choose(coordinator, std::move(choices)); !chosen) return chosen;
   for (const auto& promise : promises) {
     promise->role = PromiseRole::initialODRAsset;
     promise->coordinator = coordinator;
@@ -146,9 +148,9 @@ Status Coordinators::setResponsibleClient(const Coordinator& coordinator, Client
                                           ClientIdentity responsible) {
   const std::lock_guard lock(mutex_);
   if (Status may = mayChange(*coordinator, client, coordinator->responsibleClient.has_value()); !may) return may;
-  CoordinatorState copy = *coordinator;
-  copy.responsibleClient = responsible;
-  return update(coordinator, std::move(copy));
+  CoordinatorChoices choices = *coordinator;
+  choices.responsibleClient = responsible;
+  return choose(coordinator, std::move(choices));
 }
 
 Status Coordinators::setPromise(const Coordinator& coordinator, ClientIdentity client, PromiseRole role,
@@ -213,11 +215,13 @@ Status Coordinators::show(const PlaceholderState& placeholder, const Store& stor
 
 Status Coordinators::cancel(const Coordinator& coordinator, const Error& reason, ClientIdentity client) {
   const std::lock_guard lock(mutex_);
+  if (Status open = checkOpen(); !open) return open;
   return cancelNow(coordinator, reason, client);
 }
 
 Status Coordinators::cancelAll(std::string_view identifier, const Error& reason, ClientIdentity client) {
   const std::lock_guard lock(mutex_);
+  if (Status open = checkOpen(); !open) return open;
   const CoordinatorList coordinators = ofApp(identifier);
   if (coordinators.empty()) {
     return coordinationError(CoordinationFailure::noCoordinator,

@@ -117,8 +117,7 @@ class Coordinators : public std::enable_shared_from_this<Coordinators> {
   [[nodiscard]] Status mayChange(const CoordinatorState& coordinator, platform::ClientIdentity client,
                                  bool wasSet) const;
   [[nodiscard]] Status store(const CoordinatorState& coordinator, const Store& store);
-  /// Stores a coordinator that is to become `copy`, and makes it so.
-  Status update(const Coordinator& coordinator, CoordinatorState copy);
+  [[nodiscard]] Status choose(const Coordinator& coordinator, CoordinatorChoices choices);
   [[nodiscard]] Status show(const PlaceholderState& placeholder, const Store& store);
   void followPromise(const CoordinatorState& coordinator);
   /// Installs the app if all conditions are met.
@@ -130,7 +129,8 @@ class Coordinators : public std::enable_shared_from_this<Coordinators> {
   void close(const Coordinator& coordinator, std::optional<Error> error);
   [[nodiscard]] CoordinatorList ofApp(std::string_view identifier) const;
   [[nodiscard]] bool isInstalling(std::string_view identifier) const;
-  void takeUp(const Coordinator& coordinator);
+  /// Shows the placeholder again if nothing does.
+  void keepShown(const CoordinatorState& coordinator);
   void tell(const Coordinator& coordinator, Report report);
 
   // Without it.

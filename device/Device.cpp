@@ -21,15 +21,19 @@ constexpr std::int64_t kApplicationId = 0x41534456;
 /// Of the tables and of what lies in the root. Grows with each change that an older program could not cope with.
 constexpr std::int64_t kLayoutVersion = 1;
 
-Result<std::int64_t> readNumber(Database& database, std::string_view pragma) {
+Result<std::int64_t> readNumber(Database& database, std::string_view question) {
   Database::Session session(database);
-  Statement query = session.prepare(pragma);
+  Statement query = session.prepare(question);
   if (query.next()) return query.integer(0);
   return query.status() ? std::int64_t{0} : Result<std::int64_t>(query.status().error());
 }
 
 /// Devices made by earlier versions of this layout lack tables that came later.
 Status makeMissingTables(Database& database) {
+  const Result<std::int64_t> newest =
+      readNumber(database, "select count(*) from sqlite_schema where name = 'coordinators'");
+  if (!newest) return newest.error();
+  if (*newest == 1) return {};
   Database::Transaction transaction(database);
   for (const char* schema : Services::kSchemas)
     transaction.runScript(schema).ignore();

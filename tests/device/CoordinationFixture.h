@@ -98,13 +98,21 @@ class CoordinationClient {
     return options;
   }
 
-  /// A coordinator that lacks its package only.
+  /// A coordinator that lacks its package only; what it has already it keeps.
   [[nodiscard]] Coordinator prepare(std::string_view identifier, Kind kind = Kind::initiating) {
     auto coordinator = make(identifier, kind);
-    EXPECT_TRUE(coordinator->setInstallOptions(options()).ok());
-    EXPECT_TRUE(coordinator->setInitialODRAssetPromises({}).ok());
-    EXPECT_TRUE(coordinator->setAppAssetPromise(promise(std::string(identifier) + "-Asset")).ok());
-    EXPECT_TRUE(coordinator->setPlaceholderPromise(placeholder(identifier)).ok());
+    if (!coordinator->hasInstallOptions()) {
+      EXPECT_TRUE(coordinator->setInstallOptions(options()).ok());
+    }
+    if (!coordinator->hasInitialODRAssetPromises()) {
+      EXPECT_TRUE(coordinator->setInitialODRAssetPromises({}).ok());
+    }
+    if (!coordinator->hasAppAssetPromise()) {
+      EXPECT_TRUE(coordinator->setAppAssetPromise(promise(std::string(identifier) + "-Asset")).ok());
+    }
+    if (!coordinator->hasPlaceholderPromise()) {
+      EXPECT_TRUE(coordinator->setPlaceholderPromise(placeholder(identifier)).ok());
+    }
     return coordinator;
   }
 

@@ -1,16 +1,12 @@
 // What opening a device puts in order, and that a kill at any step of any work leaves what it can put in order.
-#include <csignal>
 #include <filesystem>
-#include <functional>
 #include <string>
 
 #include <gtest/gtest.h>
-#include <sys/wait.h>
 #include <unistd.h>
 
 #include "device/Recovery.h"
-#include "device/Step.h"
-#include "tests/device/TestDevice.h"
+#include "tests/device/KilledDevice.h"
 
 namespace appsync::test {
 
@@ -19,72 +15,7 @@ using platform::TSInstallPhase;
 using platform::TSInstallState;
 using platform::TSInstallType;
 
-namespace {
-
 namespace fs = std::filesystem;
-
-/// Runs `work` in a process of its own that is killed in front of its step number `step`; false when there are fewer.
-bool killedAt(long step, const std::function<void()>& work) {
-  const pid_t child = fork();
-  if (child == 0) {
-    setenv("APPSYNC_KILL_AT", std::to_string(step).c_str(), 1);
-    work();
-    _exit(0);
-  }
-  int status = 0;
-  EXPECT_EQ(waitpid(child, &status, 0), child);
-  if (WIFSIGNALED(status)) {
-    EXPECT_EQ(WTERMSIG(status), SIGKILL);
-    return true;
-  }
-  EXPECT_EQ(WEXITSTATUS(status), 0);
-  return false;
-}
-
-/// How many containers the records name; checks that each record's bundle is there.
-std::ptrdiff_t containersOfRecords(TestDevice& device) {
-  std::ptrdiff_t containers = 0;
-  const auto apps = device.registry().apps();
-  EXPECT_TRUE(apps.ok());
-  for (const auto& app : *apps) {
-    EXPECT_TRUE(device.files().fileExists(*app->bundlePath() + "/Info.plist")) << app->description();
-    containers += (app->isInstalled() ? 1 : 0) + (app->isPlaceholder() ? 1 : 0);
-  }
-  return containers;
-}
-
-std::string versionOf(TestDevice& device, std::string_view identifier) {
-  const auto app = device.record(identifier);
-  return app == nullptr ? "none"
-                        : app->bundleVersion().value_or("no version") + (app->isPlaceholder() ? " placeholder" : "");
-}
-
-/// Kills `work` at each of its steps, each time on a device that `prepare` made, and lets `check` judge what is left.
-void killAtEveryStep(const std::function<void(TestDevice&)>& prepare, const std::function<void(Device&)>& work,
-                     const std::function<void(TestDevice&)>& check) {
-  TestDevice original;
-  prepare(original);
-  original.close();
-  long step = 1;
-  for (bool goOn = true; goOn; ++step) {
-    TestDevice device(original.path());
-    goOn = killedAt(step, [&] {
-      auto opened = Device::open(device.path(), device::Access::exclusive);
-      if (!opened) _exit(1);
-      work(**opened);
-    });
-    device.reopen();
-    EXPECT_TRUE(device.isTidy()) << "step " << step;
-    EXPECT_EQ(containersOfRecords(device), device.containers()) << "step " << step;
-    check(device);
-    if (testing::Test::HasFailure()) {
-      FAIL() << "killed at step " << step;
-    }
-  }
-  EXPECT_GT(step, 10) << "that is too few steps to be all of them";
-}
-
-}  // namespace
 
 // What opening puts in order.
 
@@ -198,7 +129,7 @@ TEST(KilledDevice, CanBeMadeAgainWhileItWasBeingMade) {
 TEST(KilledDevice, HasTheNewAppOrNone) {
   killAtEveryStep(
       [](TestDevice& device) { device.stage("a.zip", appPackage("com.a", "2.0")); },
-      [](Device& device) {
+      [](TestDevice& device) {
         auto& registry = device.services().defaultRegistry();
         if (!registry.installApplication({"/var/mobile/Media/PublicStaging/a.zip"}, TestDevice::customer("com.a")))
           _exit(2);
@@ -218,7 +149,7 @@ TEST(KilledDevice, HasTheOldVersionOrTheNew) {
         device.placeholder("com.a", TSInstallType::Restore);
         device.stage("a.zip", appPackage("com.a", "2.0"));
       },
-      [](Device& device) {
+      [](TestDevice& device) {
         auto& registry = device.services().defaultRegistry();
         if (!registry.installApplication({"/var/mobile/Media/PublicStaging/a.zip"}, TestDevice::customer("com.a")))
           _exit(2);
@@ -232,7 +163,7 @@ TEST(KilledDevice, HasTheOldVersionOrTheNew) {
 
 TEST(KilledDevice, HasThePlaceholderOrNone) {
   killAtEveryStep([](TestDevice&) {},
-                  [](Device& device) {
+                  [](TestDevice& device) {
                     auto& services = device.services();
                     const std::string folder = "/tmp/com.a.app";
                     if (!services.fileSystem().createDirectory(folder, platform::IntermediateDirectories::create, {}))
@@ -251,7 +182,7 @@ TEST(KilledDevice, HasThePlaceholderOrNone) {
 
 TEST(KilledDevice, HasTheAppOrHasItOnTheListOfRemovedApps) {
   killAtEveryStep([](TestDevice& device) { device.install("com.a"); },
-                  [](Device& device) {
+                  [](TestDevice& device) {
                     if (!device.services().defaultRegistry().uninstallApplication("com.a")) _exit(2);
                   },
                   [](TestDevice& device) {
@@ -271,7 +202,7 @@ TEST(KilledDevice, RecoversFromAKillDuringRecovery) {
         fs::create_directories(device.path() + "/work/x/y");
         writeHostFile(device.path() + "/work/x/y/z", "1");
       },
-      [](Device&) {},
+      [](TestDevice&) {},
       [](TestDevice& device) {
         EXPECT_EQ(versionOf(device, "com.a"), "1.0");
         EXPECT_EQ(versionOf(device, "com.b"), "1.0 placeholder");
@@ -281,7 +212,7 @@ TEST(KilledDevice, RecoversFromAKillDuringRecovery) {
 
 TEST(KilledDevice, HasTheOldFileOrTheNew) {
   killAtEveryStep([](TestDevice& device) { writeHostFile(device.host("/var/mobile/file"), "old"); },
-                  [](Device& device) {
+                  [](TestDevice& device) {
                     auto& files = device.services().fileSystem();
                     if (!files.writeFileAtomically("/var/mobile/file", bytesOf("new"))) _exit(2);
                     if (!files.createDirectory("/var/mobile/a/b", platform::IntermediateDirectories::create, {}))
