@@ -110,11 +110,10 @@ void CoordinationState::advance() {
         coordinator->showing == FakeShowing::notBegun) {
       coordinator->showing = FakeShowing::underWay;
       post([this, coordinator] {
-        change([&] {
-          if (coordinator->stage == FakeCoordinatorStage::ended) return Status();
+        update([&] {
+          if (coordinator->stage == FakeCoordinatorStage::ended) return;
           showPlaceholder(coordinator, failures.take(std::string(kShowingPlaceholder), coordinator->identifier));
-          return Status();
-        }).ignore();
+        });
       });
     }
     if (!isFulfilled(*coordinator)) continue;
@@ -143,11 +142,10 @@ void CoordinationState::install(const Coordinator& coordinator) {
   const FakeCoordinator now = read([&] { return coordinator->snapshot(); });
   const Status status = installPackage(now);
   removePackage(now);
-  change([&] {
+  update([&] {
     end(coordinator, status.failure());
     tell(coordinator, &InstallObserverDelegate::coordinatorDidCompleteSuccessfully);
-    return Status();
-  }).ignore();
+  });
 }
 
 Status CoordinationState::installPackage(const FakeCoordinator& coordinator) {

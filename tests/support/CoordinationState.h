@@ -54,20 +54,19 @@ class CoordinationState : public std::enable_shared_from_this<CoordinationState>
 
   /// Makes a change, then whatever follows from it; what is to be told is told on that thread.
   [[nodiscard]] Status change(const Change& change, CallbackOn where = CallbackOn::ownThread);
+  /// A change that cannot be refused.
+  template <class Update>
+  void update(const Update& update, CallbackOn where = CallbackOn::ownThread) {
+    const Change wrapped = [&] {
+      update();
+      return Status();
+    };
+    change(wrapped, where).ignore();
+  }
   template <class Read>
   [[nodiscard]] auto read(const Read& read) const {
     const std::scoped_lock lock(mutex_);
     return read();
-  }
-
-  template <class Thing>
-  void keep(const std::shared_ptr<Thing>& thing) {
-    const std::scoped_lock lock(mutex_);
-    if constexpr (std::is_same_v<Thing, FakePromise>) {
-      promises.push_back(thing);
-    } else {
-      placeholders.push_back(thing);
-    }
   }
 
   // In changes.
@@ -81,6 +80,7 @@ class CoordinationState : public std::enable_shared_from_this<CoordinationState>
   /// Runs `work` on the service's thread.
   void post(std::function<void()> work);
 
+  // Looked at in `read`, changed in changes.
   std::vector<Coordinator> living;
   std::vector<FakeCoordinator> ended;
   std::vector<std::shared_ptr<FakePlaceholder>> placeholders;
@@ -90,6 +90,7 @@ class CoordinationState : public std::enable_shared_from_this<CoordinationState>
   bool isAutomatic = false;
   CallbackOn uninstallCompletion = CallbackOn::ownThread;
 
+  // At any time.
   FailurePlan<std::string> failures;
   Gate gate;
   /// How many things that it handed out are held.

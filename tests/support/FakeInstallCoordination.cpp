@@ -12,18 +12,29 @@ using platform::ClientIdentity;
 using platform::CoordinatorKind;
 using platform::IfMissing;
 
+namespace {
+
+std::shared_ptr<FakePromise> makePromise(FakePromiseKind kind, std::string_view name, ClientIdentity client,
+                                         std::uint64_t diskSpaceNeeded) {
+  auto promise = std::make_shared<FakePromise>();
+  promise->kind = kind;
+  promise->name = name;
+  promise->client = client;
+  promise->diskSpaceNeeded = diskSpaceNeeded;
+  return promise;
+}
+
+}  // namespace
+
 class FakeInstallCoordination::Observer final : public platform::InstallObserver {
  public:
   Observer(std::shared_ptr<CoordinationState> state, std::size_t index) : state_(std::move(state)), index_(index) {}
   ~Observer() override {
     Connection connection;
-    state_
-        ->change([&] {
-          state_->connections[index_].isOpen = false;
-          connection = state_->connections[index_];
-          return Status();
-        })
-        .ignore();
+    state_->update([&] {
+      state_->connections[index_].isOpen = false;
+      connection = state_->connections[index_];
+    });
     state_->thread().unsubscribe(connection.subscription);
     state_->journal().note("installCoordination.close " + connection.serviceName);
   }
@@ -70,17 +81,13 @@ std::shared_ptr<platform::InstallCoordinator> FakeInstallCoordination::coordinat
   }
   CoordinationState::Coordinator found;
   bool isNew = false;
-  state_
-      ->change([&] {
-        found = state_->find(kind, bundleIdentifier, client);
-        isNew = !found && mayCreate && kind != CoordinatorKind::any;
-        if (!isNew) return Status();
-        found =
-            std::make_shared<FakeCoordinator>(FakeCoordinator::of(std::string(bundleIdentifier), kind).madeBy(client));
-        state_->living.push_back(found);
-        return Status();
-      })
-      .ignore();
+  state_->update([&] {
+    found = state_->find(kind, bundleIdentifier, client);
+    isNew = !found && mayCreate && kind != CoordinatorKind::any;
+    if (!isNew) return;
+    found = std::make_shared<FakeCoordinator>(FakeCoordinator::of(std::string(bundleIdentifier), kind).madeBy(client));
+    state_->living.push_back(found);
+  });
   if (!found) return nullptr;
   if (created != nullptr) *created = isNew;
   return std::make_shared<FakeInstallCoordinator>(state_, std::move(found), client);
@@ -98,7 +105,7 @@ std::shared_ptr<platform::Placeholder> FakeInstallCoordination::initAppPlacehold
   placeholder->identifier = bundleIdentifier;
   placeholder->installType = installType;
   placeholder->client = client;
-  state_->keep(placeholder);
+  state_->update([&] { state_->placeholders.push_back(placeholder); });
   return std::make_shared<FakeAppPlaceholder>(state_, std::move(placeholder));
 }
 
@@ -108,26 +115,19 @@ std::shared_ptr<platform::PromisedTransferToPath> FakeInstallCoordination::makeP
   std::string arguments = std::to_string(diskSpaceNeeded);
   if (transferPath) arguments += " " + transferPath->path;
   if (state_->begin("installCoordination.makePromisedTransferToPath", name, arguments)) return nullptr;
-  auto promise = std::make_shared<FakePromise>();
-  promise->name = name;
-  promise->client = client;
-  promise->diskSpaceNeeded = diskSpaceNeeded;
+  const auto promise = makePromise(FakePromiseKind::transferToPath, name, client, diskSpaceNeeded);
   promise->transferPath = transferPath;
-  state_->keep(promise);
-  return std::make_shared<FakePromisedTransferToPath>(state_, std::move(promise));
+  state_->update([&] { state_->promises.push_back(promise); });
+  return std::make_shared<FakePromisedTransferToPath>(state_, promise);
 }
 
 std::shared_ptr<platform::PromisedOutOfBandTransfer> FakeInstallCoordination::makePromisedOutOfBandTransfer(
     std::string_view name, ClientIdentity client, std::uint64_t diskSpaceNeeded) {
   const std::string arguments = std::to_string(diskSpaceNeeded);
   if (state_->begin("installCoordination.makePromisedOutOfBandTransfer", name, arguments)) return nullptr;
-  auto promise = std::make_shared<FakePromise>();
-  promise->kind = FakePromiseKind::outOfBand;
-  promise->name = name;
-  promise->client = client;
-  promise->diskSpaceNeeded = diskSpaceNeeded;
-  state_->keep(promise);
-  return std::make_shared<FakePromisedOutOfBandTransfer>(state_, std::move(promise));
+  const auto promise = makePromise(FakePromiseKind::outOfBand, name, client, diskSpaceNeeded);
+  state_->update([&] { state_->promises.push_back(promise); });
+  return std::make_shared<FakePromisedOutOfBandTransfer>(state_, promise);
 }
 
 void FakeInstallCoordination::uninstallApp(std::string_view bundleIdentifier, platform::UserConfirmation confirmation,
@@ -143,15 +143,12 @@ void FakeInstallCoordination::uninstallApp(std::string_view bundleIdentifier, pl
 Status FakeInstallCoordination::uninstall(const std::string& identifier) {
   const Error reason = coordinationError("the app is uninstalled");
   bool hadCoordinator = false;
-  state_
-      ->change([&] {
-        while (const auto coordinator = state_->find(CoordinatorKind::any, identifier, ClientIdentity::CXClientUser)) {
-          if (!state_->cancel(coordinator, {reason, ClientIdentity::CXClientUser})) break;
-          hadCoordinator = true;
-        }
-        return Status();
-      })
-      .ignore();
+  state_->update([&] {
+    while (const auto coordinator = state_->find(CoordinatorKind::any, identifier, ClientIdentity::CXClientUser)) {
+      if (!state_->cancel(coordinator, {reason, ClientIdentity::CXClientUser})) break;
+      hadCoordinator = true;
+    }
+  });
   if (hadCoordinator && !state_->registry().app(identifier)) return {};
   return state_->registry().uninstall(identifier);
 }
@@ -168,14 +165,11 @@ std::unique_ptr<platform::InstallObserver> FakeInstallCoordination::initWithMach
     platform::InstallObserverDelegate& delegate) {
   static_cast<void>(state_->begin("installCoordination.initWithMachServiceName", serviceName));
   std::size_t index = 0;
-  state_
-      ->change([&] {
-        index = state_->connections.size();
-        const auto subscription = state_->thread().subscribe();
-        state_->connections.push_back({std::string(serviceName), clients, &delegate, true, subscription});
-        return Status();
-      })
-      .ignore();
+  state_->update([&] {
+    index = state_->connections.size();
+    const auto subscription = state_->thread().subscribe();
+    state_->connections.push_back({std::string(serviceName), clients, &delegate, true, subscription});
+  });
   return std::make_unique<Observer>(state_, index);
 }
 

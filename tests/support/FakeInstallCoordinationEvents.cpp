@@ -12,20 +12,15 @@ using platform::CoordinatorKind;
 using platform::InstallObserverDelegate;
 
 void FakeInstallCoordination::enable() {
-  state_->read([this] { state_->isEnabled = true; });
+  state_->update([this] { state_->isEnabled = true; });
 }
 
 void FakeInstallCoordination::installAutomatically() {
-  state_
-      ->change([this] {
-        state_->isAutomatic = true;
-        return Status();
-      })
-      .ignore();
+  state_->update([this] { state_->isAutomatic = true; });
 }
 
 void FakeInstallCoordination::completeUninstalls(CallbackOn where) {
-  state_->read([&] { state_->uninstallCompletion = where; });
+  state_->update([&] { state_->uninstallCompletion = where; });
 }
 
 void FakeInstallCoordination::runUntilIdle() {
@@ -47,15 +42,12 @@ FakePlaceholder copyOf(const FakePlaceholder& placeholder) {
 }  // namespace
 
 void FakeInstallCoordination::add(const FakeCoordinator& coordinator) {
-  state_
-      ->change([&] {
-        const auto added = std::make_shared<FakeCoordinator>(coordinator.snapshot());
-        if (added->placeholder) state_->placeholders.push_back(added->placeholder);
-        std::ranges::copy(added->promises(), std::back_inserter(state_->promises));
-        state_->living.push_back(added);
-        return Status();
-      })
-      .ignore();
+  state_->update([&] {
+    const auto added = std::make_shared<FakeCoordinator>(coordinator.snapshot());
+    if (added->placeholder) state_->placeholders.push_back(added->placeholder);
+    std::ranges::copy(added->promises(), std::back_inserter(state_->promises));
+    state_->living.push_back(added);
+  });
 }
 
 std::optional<FakeCoordinator> FakeInstallCoordination::coordinator(std::string_view identifier) const {

@@ -93,12 +93,7 @@ std::optional<Error> FakeInstallCoordinator::coordinatorError() const {
 
 void FakeInstallCoordinator::setObserver(std::weak_ptr<platform::InstallObserverDelegate> observer) {
   static_cast<void>(begin("setObserver"));
-  state_
-      ->change([&] {
-        coordinator_->observer = std::move(observer);
-        return Status();
-      })
-      .ignore();
+  state_->update([&] { coordinator_->observer = std::move(observer); });
 }
 
 bool FakeInstallCoordinator::hasInstallOptions() const {

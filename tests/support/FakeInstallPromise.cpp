@@ -27,12 +27,9 @@ bool isOver(const FakePromise& promise) {
 template <class Interface>
 template <class Change>
 void FakeInstallPromise<Interface>::change(const Change& change) {
-  state_
-      ->change([&] {
-        if (!isOver(*promise_)) change();
-        return Status();
-      })
-      .ignore();
+  state_->update([&] {
+    if (!isOver(*promise_)) change();
+  });
 }
 
 template <class Interface>
