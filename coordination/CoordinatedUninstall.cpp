@@ -4,9 +4,14 @@
 
 namespace appsync {
 
+namespace {
+
+constexpr std::string_view kDescription = "Uninstall app";
+
+}  // namespace
+
 void AppsClient::uninstallAppUsingCoordination(std::string_view bundleIdentifier) {
   using platform::TransactionStep;
-  constexpr std::string_view kDescription = "Uninstall app";
   platform::TransactionLog& transactions = _platform.transactionLog();
   beginStep(transactions, TransactionStep::uninstallApp, bundleIdentifier, kDescription);
   // The completion may outlive the object: it owns what it needs, but for the services.
