@@ -13,13 +13,13 @@
 #include <gtest/gtest.h>
 
 #include "core/SyncFiles.h"
-#include "tests/faults/DirectSync.h"
+#include "tests/faults/WholeSync.h"
 #include "tests/support/TodoList.h"
 
 namespace appsync::test {
 namespace {
 
-using Transfers = DirectSync::Transfers;
+using Transfers = WholeSync::Transfers;
 
 /// Real time: the end of a test that hangs, never a pace.
 constexpr std::chrono::seconds kPatience(60);
@@ -31,16 +31,17 @@ const Error kInjected{"POSIX", 5, "Input/output error", nullptr};
 enum class Judgement { unrecoverable, recoverable };
 /// Whether one call fails or, as when a service has died, every call from that one on.
 enum class Extent { once, fromThenOn };
-using Fault = std::tuple<Judgement, Extent>;
+using Fault = std::tuple<Mode, Judgement, Extent>;
 
 std::string nameOf(const testing::TestParamInfo<Fault>& info) {
-  const auto& [judgement, extent] = info.param;
-  return std::string(judgement == Judgement::recoverable ? "Recoverable" : "Unrecoverable") +
+  const auto& [mode, judgement, extent] = info.param;
+  return std::string(mode == Mode::coordinated ? "Coordinated" : "Direct") +
+         (judgement == Judgement::recoverable ? "Recoverable" : "Unrecoverable") +
          (extent == Extent::once ? "Once" : "FromThenOn");
 }
 
 /// Whatever failed, this holds after a sync.
-void expectInOrder(DirectSync& sync) {
+void expectInOrder(WholeSync& sync) {
   FakePlatform& platform = sync.platform;
   EXPECT_EQ(platform.time.pendingTasks(), 0U);
   EXPECT_TRUE(platform.screen.held().empty()) << "an app stays held";
@@ -48,6 +49,8 @@ void expectInOrder(DirectSync& sync) {
   EXPECT_EQ(platform.notify.observerCount("com.corvel.zeph.ZTStartupCompleteNotification"), 0U);
   EXPECT_EQ(platform.backups.connections(), 0U);
   EXPECT_EQ(platform.store.connections(), 0U);
+  for (const auto& connection : platform.coordination.connections())
+    EXPECT_FALSE(connection.isOpen);
   for (const std::string& path : platform.files.paths()) {
     if (!path.ends_with(".plist")) continue;
     EXPECT_TRUE(propertyListAt(platform.files, path)) << path << " is half written";
@@ -58,8 +61,8 @@ void expectInOrder(DirectSync& sync) {
 }
 
 /// The state that two undisturbed syncs end in.
-DeviceState undisturbed() {
-  DirectSync sync;
+DeviceState undisturbed(Mode mode) {
+  WholeSync sync(mode);
   sync.run(Transfers::someFail);
   expectInOrder(sync);
   sync.restartDevice();
@@ -71,13 +74,15 @@ DeviceState undisturbed() {
 
 class SyncFault : public testing::TestWithParam<Fault> {
  protected:
-  static void judge(DirectSync& sync) {
+  static Mode mode() { return std::get<Mode>(GetParam()); }
+
+  static void judge(WholeSync& sync) {
     if (std::get<Judgement>(GetParam()) == Judgement::recoverable)
       sync.platform.framework.judgeErrorsBy([](const Error&) { return true; });
   }
 
   static std::size_t callsOfOneSync() {
-    DirectSync sync;
+    WholeSync sync(mode());
     judge(sync);
     sync.run(Transfers::someFail);
     return sync.platform.journal.callCount();
@@ -85,7 +90,7 @@ class SyncFault : public testing::TestWithParam<Fault> {
 
   /// A first sync whose `number`-th call fails, and a second one.
   static void syncWithFault(std::size_t number, const DeviceState& expected) {
-    DirectSync sync;
+    WholeSync sync(mode());
     judge(sync);
     const Extent extent = std::get<Extent>(GetParam());
     std::mutex mutex;
@@ -95,6 +100,8 @@ class SyncFault : public testing::TestWithParam<Fault> {
       const std::scoped_lock lock(mutex);
       ++call;
       if (call == number) failed = std::string(operation) + " " + std::string(arguments);
+      // What kind of device it is no call changes.
+      if (operation == "installCoordination.coordinationIsEnabled") return std::nullopt;
       const bool fails = extent == Extent::once ? call == number : call >= number;
       return fails ? std::optional(kInjected) : std::nullopt;
     });
@@ -108,9 +115,11 @@ class SyncFault : public testing::TestWithParam<Fault> {
     expectInOrder(sync);
     EXPECT_EQ(sync.todoWords(), sync.expectedTodoWords());
     EXPECT_EQ(sync.deviceState(), expected);
-    // An app whose state could not be cleaned at all is done; only its next install would clean up after it.
+    // Who cannot call any more cannot clean up: an app's state stays until its next install, a promise for good.
+    // A parked package that is the store's stays parked.
     if (extent == Extent::once) {
-      EXPECT_FALSE(sync.platform.files.has(kRestoreStatePath));
+      EXPECT_TRUE(sync.platform.coordination.abandoned().empty()) << "something is neither attached nor cancelled";
+      EXPECT_EQ(sync.platform.files.has(kRestoreStatePath), mode() == Mode::coordinated);
     }
   }
 
@@ -124,36 +133,54 @@ class SyncFault : public testing::TestWithParam<Fault> {
 };
 
 TEST_P(SyncFault, WhicheverCallFailsTheNextSyncEndsInTheSameState) {
-  const DeviceState expected = undisturbed();
+  const DeviceState expected = undisturbed(mode());
   const std::size_t calls = callsOfOneSync();
   EXPECT_GT(calls, 300U) << "the sync has lost most of what it did";
   for (std::size_t number = 1; number <= calls; ++number)
     syncWithinPatience(number, expected);
 }
 
-INSTANTIATE_TEST_SUITE_P(Faults, SyncFault,
-                         testing::Combine(testing::Values(Judgement::unrecoverable, Judgement::recoverable),
+INSTANTIATE_TEST_SUITE_P(Direct, SyncFault,
+                         testing::Combine(testing::Values(Mode::direct),
+                                          testing::Values(Judgement::unrecoverable, Judgement::recoverable),
+                                          testing::Values(Extent::once, Extent::fromThenOn)),
+                         nameOf);
+// Under coordination every error is unrecoverable, whatever the framework says.
+INSTANTIATE_TEST_SUITE_P(Coordinated, SyncFault,
+                         testing::Combine(testing::Values(Mode::coordinated), testing::Values(Judgement::unrecoverable),
                                           testing::Values(Extent::once, Extent::fromThenOn)),
                          nameOf);
 
-TEST(DirectSyncTest, TheCallsComeInTheSameOrderInEveryRun) {
-  const auto linesOf = [] {
-    DirectSync sync;
+TEST(WholeSyncTest, TheCallsComeInTheSameOrderInEveryRun) {
+  const auto linesOf = [](Mode mode) {
+    WholeSync sync(mode);
     sync.run(Transfers::someFail);
     return sync.platform.journal.lines();
   };
-  EXPECT_EQ(linesOf(), linesOf());
+  EXPECT_EQ(linesOf(Mode::direct), linesOf(Mode::direct));
+  EXPECT_EQ(linesOf(Mode::coordinated), linesOf(Mode::coordinated));
 }
 
-TEST(DirectSyncTest, UndisturbedItEndsWithEveryAppButTheBadOne) {
-  EXPECT_EQ(undisturbed(), (DeviceState{{"com.broken", "2.0", true, false},
-                                        {"com.denied", "2.0", true, false},
-                                        {"com.flaky", "2.0", true, false},
-                                        {"com.keep", "1.0", true, false},
-                                        {"com.new", "2.0", true, false},
-                                        {"com.parked", "2.0", true, false},
-                                        {"com.restored", "2.0", true, false},
-                                        {"com.update", "2.0", true, false}}));
+TEST(WholeSyncTest, UndisturbedItEndsWithEveryAppButTheBadOne) {
+  EXPECT_EQ(undisturbed(Mode::direct), (DeviceState{{"com.broken", "2.0", true, false},
+                                                    {"com.denied", "2.0", true, false},
+                                                    {"com.flaky", "2.0", true, false},
+                                                    {"com.keep", "1.0", true, false},
+                                                    {"com.new", "2.0", true, false},
+                                                    {"com.parked", "2.0", true, false},
+                                                    {"com.restored", "2.0", true, false},
+                                                    {"com.update", "2.0", true, false}}));
+}
+
+TEST(WholeSyncTest, UnderCoordinationRestoresWaitForTheStore) {
+  EXPECT_EQ(undisturbed(Mode::coordinated), (DeviceState{{"com.broken", "2.0", true, false},
+                                                         {"com.denied", "2.0", true, false},
+                                                         {"com.flaky", "2.0", true, false},
+                                                         {"com.keep", "1.0", true, false},
+                                                         {"com.new", "2.0", true, false},
+                                                         {"com.parked", "2.0", false, true},
+                                                         {"com.restored", "2.0", false, true},
+                                                         {"com.update", "2.0", true, false}}));
 }
 
 }  // namespace

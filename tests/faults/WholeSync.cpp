@@ -1,4 +1,4 @@
-#include "tests/faults/DirectSync.h"
+#include "tests/faults/WholeSync.h"
 
 #include <array>
 #include <chrono>
@@ -33,6 +33,10 @@ const std::map<std::string, std::string> kLibrary{
 };
 constexpr std::string_view kToRemove = "com.gone";
 
+bool isRestored(std::string_view identifier) {
+  return identifier == "com.parked" || identifier == "com.restored";
+}
+
 const Error kLostForGood{"ZTError", 7, "the host has lost the package", nullptr};
 const Error kLostForNow{"ZTError", 8, "the host went away", nullptr};
 
@@ -46,7 +50,12 @@ std::ostream& operator<<(std::ostream& out, const AppState& state) {
              << (state.isPlaceholder ? " placeholder" : "");
 }
 
-DirectSync::DirectSync() {
+WholeSync::WholeSync(Mode mode) : mode_(mode) {
+  if (mode == Mode::coordinated) {
+    platform.coordination.enable();
+    platform.coordination.installAutomatically();
+    platform.coordination.gate.close();
+  }
   for (const char* identifier : {"com.gone", "com.keep", "com.update"})
     platform.registry.add(FakeApp::installed(identifier));
   for (const char* identifier : {"com.parked", "com.restored"}) {
@@ -65,7 +74,7 @@ DirectSync::DirectSync() {
   platform.framework.judgeErrorsBy([](const Error& error) { return error == kLostForNow; });
 }
 
-void DirectSync::run(Transfers transfers) {
+void WholeSync::run(Transfers transfers) {
   stage();
   client_ = AppsClient::create(platform);
   platform.notify.deliver(kStartupCompleteNotification);
@@ -73,9 +82,13 @@ void DirectSync::run(Transfers transfers) {
   static_cast<void>(client_->installedAssets());
   std::optional<Error> error;
   if (client_->reconcileSync({}, "anchor", {}, &error)) {
-    for (const Asset& asset : client_->outstandingAssetTransfers())
+    waitForInstalls();
+    const auto outstanding = client_->outstandingAssetTransfers();
+    waitForInstalls();
+    for (const Asset& asset : outstanding)
       transfer(asset, transfers);
     client_->assetTransferEndedWithSuccess(true);
+    waitForInstalls();
     client_->syncEndedWithSuccess(true);
   } else {
     EXPECT_TRUE(error) << "a refused sync must say why";
@@ -85,7 +98,10 @@ void DirectSync::run(Transfers transfers) {
   client_.reset();
 }
 
-void DirectSync::restartDevice() {
+void WholeSync::restartDevice() {
+  for (const FakeCoordinator& coordinator : platform.coordination.coordinators()) {
+    platform.coordination.cancel(coordinator.identifier, {kLostForNow, platform::ClientIdentity::CXClientSync});
+  }
   for (const std::string& identifier : platform.registry.identifiers()) {
     const auto app = platform.registry.app(identifier);
     if (!app->isPlaceholder || app->installType != TSInstallType::Sync) continue;
@@ -94,7 +110,7 @@ void DirectSync::restartDevice() {
   }
 }
 
-DeviceState DirectSync::deviceState() const {
+DeviceState WholeSync::deviceState() const {
   DeviceState state;
   for (const std::string& identifier : platform.registry.identifiers()) {
     const auto app = platform.registry.app(identifier);
@@ -103,14 +119,14 @@ DeviceState DirectSync::deviceState() const {
   return state;
 }
 
-std::map<std::string, std::string> DirectSync::todoWords() {
+std::map<std::string, std::string> WholeSync::todoWords() {
   std::map<std::string, std::string> words;
   for (const auto& [identifier, word] : asked_)
     words[identifier] = operationWord(platform.files, identifier).value_or("none");
   return words;
 }
 
-std::map<std::string, std::string> DirectSync::expectedTodoWords() const {
+std::map<std::string, std::string> WholeSync::expectedTodoWords() const {
   std::map<std::string, std::string> words = asked_;
   for (auto& [identifier, word] : words) {
     if (word == "install") word = identifier == "com.bad" ? "FAILED" : "INSTALLED";
@@ -119,7 +135,7 @@ std::map<std::string, std::string> DirectSync::expectedTodoWords() const {
 }
 
 /// The host's part before the sync. None of it passes through the platform's calls.
-void DirectSync::stage() {
+void WholeSync::stage() {
   platform.files.erase(kStagingFolder);
   asked_.clear();
   plist::Array todoList;
@@ -138,18 +154,20 @@ void DirectSync::stage() {
                   plist::Array{plist::Array{"com.update", "com.denied"}});
 }
 
-bool DirectSync::isWanted(const std::string& identifier, const std::string& version) const {
+bool WholeSync::isWanted(const std::string& identifier, const std::string& version) const {
+  if (mode_ == Mode::coordinated && isRestored(identifier)) return false;
   const auto app = platform.registry.app(identifier);
   return !app || !app->isInstalled || app->version != version;
 }
 
-void DirectSync::transfer(const Asset& asset, Transfers transfers) {
+void WholeSync::transfer(const Asset& asset, Transfers transfers) {
   const std::string& identifier = asset->identifier();
   const plist::Value* parts = asset->variantOptions().find(platform::kAssetPartsKey);
   ASSERT_NE(parts, nullptr);
   client_->assetTransferUpdatedProgress(asset, 0.5);
   if (transfers == Transfers::someFail && (identifier == "com.broken" || identifier == "com.flaky")) {
     client_->assetTransferSucceeded(asset, false, identifier == "com.broken" ? kLostForGood : kLostForNow);
+    waitForInstalls();
     return;
   }
   client_->assetTransferUpdatedProgress(asset, 1.0);
@@ -157,7 +175,7 @@ void DirectSync::transfer(const Asset& asset, Transfers transfers) {
   if (asset->isRestore()) sendData(asset);
 }
 
-void DirectSync::send(const Asset& asset) {
+void WholeSync::send(const Asset& asset) {
   const std::string& identifier = asset->identifier();
   platform.files.put(std::string(kPublicStaging) + "/" + identifier + ".zip",
                      packageOf(identifier == "com.bad" ? "com.other" : identifier, "2.0"));
@@ -168,7 +186,7 @@ void DirectSync::send(const Asset& asset) {
 }
 
 /// The data part is a transfer of its own: an asset whose transfer has ended belongs to the plug-in.
-void DirectSync::sendData(const Asset& asset) {
+void WholeSync::sendData(const Asset& asset) {
   const auto data = std::make_shared<ZTAsset>(asset->identifier(), asset->dataclass(), asset->prettyName());
   data->setIsDownload(true);
   data->setIsRestore(true);
@@ -178,8 +196,17 @@ void DirectSync::sendData(const Asset& asset) {
   waitForInstalls();
 }
 
+/// While the daemon calls the client the service's thread stands still: all calls come in one order.
+void WholeSync::waitForInstalls() {
+  if (mode_ == Mode::coordinated) {
+    platform.coordination.runUntilIdle();
+  } else {
+    waitForDirectInstalls();
+  }
+}
+
 /// Installs own a share of the client until their last call is over, and so do those that wait to be tried again.
-void DirectSync::waitForInstalls() {
+void WholeSync::waitForDirectInstalls() {
   for (int attempt = 0; attempt < kMostAttempts; ++attempt) {
     while (true) {
       const std::size_t waiting = platform.time.pendingTasks();

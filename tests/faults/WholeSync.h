@@ -26,15 +26,18 @@ std::ostream& operator<<(std::ostream& out, const AppState& state);
 
 using DeviceState = std::vector<AppState>;
 
-/// A device on which everything happens that direct installs know: new apps, an update, a removal, a denied assertion,
-/// a package that no installer takes, transfers that fail for now and for good, a restore whose data follows its
-/// package and one whose package was parked by an earlier sync. The order of all platform calls is the same in every
-/// run.
-class DirectSync {
+/// How a device installs.
+enum class Mode { direct, coordinated };
+
+/// A device on which everything happens that a sync knows: new apps, an update, a removal, a denied assertion, a
+/// package that no installer takes, transfers that fail for now and for good, a restore whose data follows its package
+/// and one whose package was parked by an earlier sync (under coordination both are the store's, and wait for it). The
+/// order of all platform calls is the same in every run.
+class WholeSync {
  public:
   enum class Transfers { someFail, allArrive };
 
-  DirectSync();
+  explicit WholeSync(Mode mode);
 
   /// From the making of the client to its end. The host asks for what the device lacks, as it finds it.
   void run(Transfers transfers);
@@ -55,12 +58,13 @@ class DirectSync {
 
   void stage();
   [[nodiscard]] bool isWanted(const std::string& identifier, const std::string& version) const;
-  void stageApp(const std::string& identifier, const std::string& version);
   void transfer(const Asset& asset, Transfers transfers);
   void send(const Asset& asset);
   void sendData(const Asset& asset);
   void waitForInstalls();
+  void waitForDirectInstalls();
 
+  const Mode mode_;
   std::shared_ptr<AppsClient> client_;
   std::map<std::string, std::string> asked_;
 };
