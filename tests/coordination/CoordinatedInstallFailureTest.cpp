@@ -142,7 +142,7 @@ TEST_F(PreparationFaults, WhicheverCallFailsNothingIsLeftHalfway) {
 }
 
 /// A coordinator that cannot even be cancelled is the service's to end: what is the plug-in's alone goes all the same.
-TEST_F(PreparationFaults, ACancellationThatFailsToo) {
+TEST_F(PreparationFaults, ACancellationThatFailsLeavesTheCoordinatorToTheService) {
   platform.coordination.failures.failNext("coordinator.setPlaceholderPromise", "com.a", error);
   platform.coordination.failures.failNext("coordinator.cancelForReason", "com.a", error);
   EXPECT_FALSE(makeClient().prepareAppForInstallUsingCoordination(asset, false));
