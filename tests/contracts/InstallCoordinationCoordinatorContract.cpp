@@ -1,11 +1,9 @@
 // The part of the contract of coordinated installs that is about coordinators: looking them up and telling them things.
 #include "tests/contracts/InstallCoordinationContract.h"
-#include "tests/support/Threads.h"
 
 namespace appsync::test {
 
 using platform::IfMissing;
-using platform::InstallCoordinator;
 
 TEST_P(CoordinatedInstallContract, CoordinationIsEnabled) {
   EXPECT_TRUE(service().coordinationIsEnabled());

@@ -1,7 +1,6 @@
 #include "tests/support/CoordinationState.h"
 
 #include <algorithm>
-#include <map>
 #include <utility>
 
 #include "platform/InstallCoordination.h"

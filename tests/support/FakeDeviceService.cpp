@@ -54,7 +54,7 @@ void FakeDeviceService::prioritizeAsset(const std::shared_ptr<platform::ZTAsset>
     const std::scoped_lock lock(mutex_);
     if (!error) error = failure_;
     if (holdsCompletions_) {
-      pending_.push_back([completion = std::move(completion), error = std::move(error)] { completion(error); });
+      pending_.emplace_back([completion = std::move(completion), error = std::move(error)] { completion(error); });
       return;
     }
   }

@@ -8,7 +8,6 @@
 namespace appsync::test {
 
 using platform::ClientIdentity;
-using platform::CoordinatorKind;
 using platform::InstallObserverDelegate;
 
 void FakeInstallCoordination::enable() {
