@@ -38,8 +38,9 @@ void AppsClient::init() {
   _runsInsideDaemon = _platform.bundles().mainBundleIdentifier() == kDaemonBundleIdentifier;
   if (_runsInsideDaemon) {
     _finishedWaitingForPlaceHolderInstalls = true;
-    _platform.systemNotify().addObserver(this, &_handleZEPHStartupCompletedNotification, platform::kZTStartupCompleteNotification,
-                                         nullptr, platform::SuspensionBehavior::drop);
+    _platform.systemNotify().addObserver(this, &_handleZEPHStartupCompletedNotification,
+                                         platform::kZTStartupCompleteNotification, nullptr,
+                                         platform::SuspensionBehavior::drop);
   }
 }
 
