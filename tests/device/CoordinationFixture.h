@@ -11,6 +11,7 @@
 
 #include <gtest/gtest.h>
 
+#include "base/PropertyList.h"
 #include "device/InstallCoordination.h"
 #include "tests/device/TestDevice.h"
 
@@ -18,6 +19,9 @@ namespace appsync::test {
 
 inline constexpr platform::ClientIdentity kSync = platform::ClientIdentity::CXClientSync;
 inline constexpr platform::ClientIdentity kStore = platform::ClientIdentity::CXClientBazaarly;
+
+/// A reason to cancel for.
+inline const Error kEnough{"Test", 7, "enough of it", nullptr};
 
 /// Notes what it is told as "placeholder com.a", "completed com.a", "completed com.a: why", "prioritize com.a",
 /// "cancelled com.a by 2: why".
@@ -152,6 +156,20 @@ class CoordinationTest : public testing::Test {
   }
   [[nodiscard]] std::unique_ptr<platform::InstallObserver> listen(platform::InstallObserverDelegate& delegate) {
     return service().initWithMachServiceName("com.example.observer", {kSync}, delegate);
+  }
+
+  /// Where the app's bundle, or placeholder, lies on this machine.
+  [[nodiscard]] std::string container(std::string_view identifier) {
+    return device_.host(*device_.record(identifier)->bundleContainerPath());
+  }
+  [[nodiscard]] plist::Dictionary info(std::string_view identifier) {
+    const auto read =
+        plist::read(bytesOf(readHostFile(device_.host(*device_.record(identifier)->bundlePath()) + "/Info.plist")));
+    return read && read->dictionary() != nullptr ? *read->dictionary() : plist::Dictionary();
+  }
+  [[nodiscard]] std::shared_ptr<platform::InstallProgress> progress(std::string_view identifier) {
+    const auto app = device_.record(identifier);
+    return app == nullptr ? nullptr : app->installProgress();
   }
 
   TestDevice device_{device::InstallMode::coordinated};

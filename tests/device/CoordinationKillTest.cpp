@@ -101,7 +101,7 @@ TEST(KilledCoordination, IsCancelledWhollyOrNotAtAll) {
         CoordinationClient::deliver(coordinator, kPackage);
       },
       [](TestDevice& device) {
-        if (!CoordinationClient(device).find("com.a")->cancelForReason({"Test", 1, "enough", nullptr}, kSync)) _exit(2);
+        if (!CoordinationClient(device).find("com.a")->cancelForReason(kEnough, kSync)) _exit(2);
       },
       [](TestDevice& device) {
         const std::string state = versionOf(device, "com.a");

@@ -13,8 +13,6 @@ using platform::TSInstallState;
 using platform::TSInstallType;
 using testing::IsEmpty;
 
-const Error kReason{"Test", 7, "enough of it", nullptr};
-
 class CoordinationRestart : public CoordinationTest {
  protected:
   std::shared_ptr<platform::PromisedOutOfBandTransfer> userData() {
@@ -136,7 +134,7 @@ TEST_F(CoordinationRestart, EndsWhatHasLostItsPackage) {
 
 TEST_F(CoordinationRestart, KeepsWhatWasTakenBackAwayFromItsCoordinator) {
   const auto coordinator = client_.prepare("com.a");
-  ASSERT_TRUE(coordinator->appAssetPromise()->cancelForReason(kReason, kSync).ok());
+  ASSERT_TRUE(coordinator->appAssetPromise()->cancelForReason(kEnough, kSync).ok());
   device_.reopen();
   CoordinationClient::deliver(client_.find("com.a"), stage("com.a"));
   client_.settle();
@@ -166,7 +164,7 @@ TEST_F(CoordinationRestart, MakesAPlaceholderAgainWhoseFilesAreLost) {
 }
 
 TEST_F(CoordinationRestart, ForgetsWhatHasEnded) {
-  ASSERT_TRUE(client_.prepare("com.a")->cancelForReason(kReason, kSync).ok());
+  ASSERT_TRUE(client_.prepare("com.a")->cancelForReason(kEnough, kSync).ok());
   CoordinationClient::deliver(client_.prepare("com.b"), stage("com.b"));
   client_.settle();
   for (const char* table : {"coordinators", "coordinator_promises", "coordinator_placeholders", "spent_packages"}) {

@@ -19,8 +19,6 @@ using platform::TSInstallType;
 using testing::ElementsAre;
 using testing::IsEmpty;
 
-const Error kReason{"Test", 7, "enough of it", nullptr};
-
 class CoordinationService : public CoordinationTest {
  protected:
   Error refusal(std::string_view identifier) {
@@ -101,10 +99,10 @@ TEST_F(CoordinationService, RefusesPromisesOfAnotherDevice) {
 }
 
 TEST_F(CoordinationService, ShowsAnErrorToPeopleInTheWordsOfTheOneUnderneath) {
-  const Error error = service().createUserPresentableError(1, {}, kReason);
-  EXPECT_EQ(error, (Error{std::string(platform::kInstallCoordinationErrorDomain), 1, kReason.text, nullptr}));
+  const Error error = service().createUserPresentableError(1, {}, kEnough);
+  EXPECT_EQ(error, (Error{std::string(platform::kInstallCoordinationErrorDomain), 1, kEnough.text, nullptr}));
   ASSERT_NE(error.underlying, nullptr);
-  EXPECT_EQ(*error.underlying, kReason);
+  EXPECT_EQ(*error.underlying, kEnough);
 }
 
 TEST_F(CoordinationService, HandlesThatOutliveItChangeNothing) {
@@ -117,9 +115,9 @@ TEST_F(CoordinationService, HandlesThatOutliveItChangeNothing) {
   promise->setPercentComplete(0.5);
   promise->setComplete(true);
   EXPECT_FALSE(promise->isComplete());
-  EXPECT_EQ(failureOf(promise->cancelForReason(kReason, kSync)), CoordinationFailure::closed);
+  EXPECT_EQ(failureOf(promise->cancelForReason(kEnough, kSync)), CoordinationFailure::closed);
   EXPECT_EQ(failureOf(coordinator->setUserDataPromise(nullptr)), CoordinationFailure::closed);
-  EXPECT_EQ(failureOf(coordinator->cancelForReason(kReason, kSync)), CoordinationFailure::closed);
+  EXPECT_EQ(failureOf(coordinator->cancelForReason(kEnough, kSync)), CoordinationFailure::closed);
   EXPECT_EQ(failureOf(placeholder->setConfigurationComplete()), CoordinationFailure::closed);
   EXPECT_TRUE(coordinator->hasPlaceholderPromise());
 }
@@ -131,7 +129,7 @@ TEST_F(CoordinationService, DescribesWhatItHandsOut) {
   promise->setPercentComplete(0.5);
   EXPECT_EQ(promise->description(), "<promise com.a-Asset 0.5>");
   promise->setTransferPath({"/x.zip"});
-  ASSERT_TRUE(promise->cancelForReason(kReason, kSync).ok());
+  ASSERT_TRUE(promise->cancelForReason(kEnough, kSync).ok());
   EXPECT_EQ(promise->description(), "<promise com.a-Asset 0.5 at /x.zip cancelled>");
   EXPECT_EQ(client_.placeholder("com.a")->description(), "<placeholder com.a>");
 }

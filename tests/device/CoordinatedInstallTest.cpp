@@ -1,15 +1,13 @@
 // Coordinated installs and updates on a device, and how they end.
 #include <cmath>
 #include <filesystem>
-#include <set>
+#include <thread>
 
 #include <gmock/gmock.h>
 
 #include "device/InstallerError.h"
-#include "device/ScreenPicture.h"
 #include "device/Step.h"
 #include "tests/device/CoordinationFixture.h"
-#include "tests/device/Pictures.h"
 #include "tests/support/Gate.h"
 #include "tests/support/Threads.h"
 
@@ -24,15 +22,6 @@ using platform::TSInstallState;
 using platform::TSInstallType;
 using testing::ElementsAre;
 using testing::IsEmpty;
-
-const Error kReason{"Test", 7, "enough of it", nullptr};
-
-std::vector<std::string> namesIn(const std::filesystem::path& folder) {
-  std::set<std::string> names;
-  for (const auto& entry : std::filesystem::directory_iterator(folder))
-    names.insert(entry.path().filename().string());
-  return {names.begin(), names.end()};
-}
 
 /// Holds back every install in front of the step that brings its container to the disk.
 class HeldInstalls {
@@ -61,22 +50,7 @@ class HeldInstalls {
   }
 };
 
-class CoordinatedInstall : public CoordinationTest {
- protected:
-  /// Where the app's bundle, or placeholder, lies on this machine.
-  [[nodiscard]] std::string container(std::string_view identifier) {
-    return device_.host(*device_.record(identifier)->bundleContainerPath());
-  }
-  [[nodiscard]] plist::Dictionary info(std::string_view identifier) {
-    const auto read =
-        plist::read(bytesOf(readHostFile(device_.host(*device_.record(identifier)->bundlePath()) + "/Info.plist")));
-    return read && read->dictionary() != nullptr ? *read->dictionary() : plist::Dictionary();
-  }
-  [[nodiscard]] std::shared_ptr<platform::InstallProgress> progress(std::string_view identifier) {
-    const auto app = device_.record(identifier);
-    return app == nullptr ? nullptr : app->installProgress();
-  }
-};
+class CoordinatedInstall : public CoordinationTest {};
 
 }  // namespace
 
@@ -175,7 +149,7 @@ TEST_F(CoordinatedInstall, LosesNothingWithManyClientsAtOnce) {
       const auto coordinator = client.prepare(identifier);
       switch (number) {
         case 0:
-          EXPECT_TRUE(coordinator->cancelForReason(kReason, kSync).ok());
+          EXPECT_TRUE(coordinator->cancelForReason(kEnough, kSync).ok());
           break;
         case 1:
           client.service().uninstallApp(identifier, platform::UserConfirmation::skip,
@@ -190,6 +164,25 @@ TEST_F(CoordinatedInstall, LosesNothingWithManyClientsAtOnce) {
   EXPECT_EQ(device_.registry().apps()->size(), 24U);
   EXPECT_EQ(device_.containers(), 24);
   EXPECT_THAT(*service().list(), IsEmpty());
+  EXPECT_EQ(TestDevice::entriesIn(device_.host("/var/mobile/Media/PublicStaging")), 0);
+}
+
+TEST_F(CoordinatedInstall, LeavesToTheNextProcessWhatItCouldNotBegin) {
+  constexpr std::size_t kApps = 15;
+  {
+    const HeldInstalls held;
+    for (std::size_t index = 0; index < kApps; ++index) {
+      const std::string identifier = "com.app" + std::to_string(index);
+      CoordinationClient::deliver(client_.prepare(identifier), stage(identifier));
+    }
+    HeldInstalls::waitFor(device::Coordinators::kInstallsAtOnce);
+    const std::jthread closing([this] { device_.close(); });
+    HeldInstalls::release();
+  }
+  device_.reopen();
+  client_.settle();
+  for (std::size_t index = 0; index < kApps; ++index)
+    EXPECT_EQ(state("com.app" + std::to_string(index)), "1.0");
   EXPECT_EQ(TestDevice::entriesIn(device_.host("/var/mobile/Media/PublicStaging")), 0);
 }
 
@@ -232,127 +225,16 @@ TEST_F(CoordinatedInstall, OfARestoreGoesByItsPlaceholder) {
   EXPECT_EQ(textOf(**licence), "licence");
 }
 
-// The placeholder.
-
-TEST_F(CoordinatedInstall, PutsAnAppFolderOnTheDeviceForThePlaceholder) {
-  const auto icon = device_.stage("Icon.png", textOf(makePNG(60, 60, kGreen)));
-  auto placeholder = service().initAppPlaceholder("My Notes", "com.a", TSInstallType::Sync, kSync);
-  auto attributes = platform::PlaceholderAttributes::initWithInfoPlistDictionary(
-      {{"UIPeriodixApp", true}, {"BundleIconFile", "Other.png"}, {"BundleVersion", "0.1"}});
-  attributes.setBundleVersion("2.5");
-  attributes.setLaunchProhibited(true);
-  auto promise = client_.service().makePromisedTransferToPath("icon", kSync, icon, 10);
-  promise->setComplete(true);
-  ASSERT_TRUE(placeholder->setIconPromise(promise).ok());
-  ASSERT_TRUE(placeholder->setPlaceholderAttributes(attributes).ok());
-  ASSERT_TRUE(placeholder->setMetadata(platform::StoreMetadata::initWithDictionary({{"title", "N"}})).ok());
-  ASSERT_TRUE(placeholder->setConfigurationComplete().ok());
-  ASSERT_TRUE(client_.make("com.a")->setPlaceholderPromise(placeholder).ok());
-  EXPECT_EQ(device_.record("com.a")->bundlePath(), *device_.record("com.a")->bundleContainerPath() + "/com.a.app");
-  EXPECT_THAT(namesIn(container("com.a")), ElementsAre("HarvoMetadata.plist", "com.a.app"));
-  EXPECT_THAT(namesIn(container("com.a") + "/com.a.app"), ElementsAre("Icon.png", "Info.plist"));
-  EXPECT_EQ(readHostFile(container("com.a") + "/com.a.app/Icon.png"), readHostFile(device_.host(icon.path)));
-  EXPECT_EQ(info("com.a"), (plist::Dictionary{{"BundleDisplayName", "My Notes"},
-                                              {"BundleExecutable", "My Notes"},
-                                              {"BundleIconFile", "Icon.png"},
-                                              {"BundleIdentifier", "com.a"},
-                                              {"BundleVersion", "2.5"},
-                                              {"TSApplicationLaunchProhibited", true},
-                                              {"UIPeriodixApp", true}}));
-  EXPECT_EQ(state("com.a"), "2.5 placeholder");
-  EXPECT_TRUE(exists(icon));
-  EXPECT_EQ(*device_.services().homeScreen().iconOrder(), std::vector<std::string>{"com.a"});
-}
-
-TEST_F(CoordinatedInstall, ShowsAPlaceholderOnceItIsConfigured) {
-  const auto coordinator = client_.make("com.a");
-  const auto connection = listen(delegate_);
-  const auto placeholder = service().initAppPlaceholder("", "com.a", TSInstallType::Sync, kSync);
-  ASSERT_TRUE(coordinator->setPlaceholderPromise(placeholder).ok());
-  EXPECT_EQ(state("com.a"), "none");
-  ASSERT_TRUE(placeholder->setConfigurationComplete().ok());
-  EXPECT_EQ(state("com.a"), "no version placeholder");
-  EXPECT_EQ(info("com.a").find("BundleDisplayName")->string(), "com.a");
-  client_.settle();
-  EXPECT_THAT(delegate_.told(), ElementsAre("placeholder com.a"));
-}
-
-TEST_F(CoordinatedInstall, AddsAnIconThatComesLate) {
-  const auto icon = device_.stage("Icon.png", "a picture");
-  const auto coordinator = client_.make("com.a");
-  ASSERT_TRUE(coordinator->setAppAssetPromise(client_.promise("p")).ok());
-  auto placeholder = service().initAppPlaceholder("N", "com.a", TSInstallType::Sync, kSync);
-  auto promise = client_.promise("icon");
-  ASSERT_TRUE(placeholder->setIconPromise(promise).ok());
-  ASSERT_TRUE(placeholder->setConfigurationComplete().ok());
-  ASSERT_TRUE(coordinator->setPlaceholderPromise(placeholder).ok());
-  EXPECT_EQ(info("com.a").find("BundleIconFile"), nullptr);
-  coordinator->appAssetPromise()->setPercentComplete(0.5);
-  promise->setTransferPath(icon);
-  promise->setComplete(true);
-  EXPECT_EQ(readHostFile(container("com.a") + "/com.a.app/Icon.png"), "a picture");
-  EXPECT_EQ(progress("com.a")->completedUnitCount(), 500);
-  EXPECT_EQ(device_.containers(), 1);
-}
-
-TEST_F(CoordinatedInstall, DoesWithoutAnIconThatCannotBeRead) {
-  for (const auto& path : {"/var/mobile/missing.png", "/var/mobile", "/../../etc/passwd", "relative.png"}) {
-    auto placeholder = service().initAppPlaceholder("N", "com.a", TSInstallType::Sync, kSync);
-    auto promise = service().makePromisedTransferToPath("icon", kSync, platform::FileLocation{path}, 10);
-    promise->setComplete(true);
-    ASSERT_TRUE(placeholder->setIconPromise(promise).ok());
-    ASSERT_TRUE(placeholder->setConfigurationComplete().ok());
-    const auto coordinator = client_.make("com.a");
-    ASSERT_TRUE(coordinator->setPlaceholderPromise(placeholder).ok()) << path;
-    EXPECT_THAT(namesIn(container("com.a") + "/com.a.app"), ElementsAre("Info.plist")) << path;
-    ASSERT_TRUE(coordinator->cancelForReason(kReason, kSync).ok());
-  }
-}
-
-TEST_F(CoordinatedInstall, ChangesNothingWhenThePlaceholderCannotBeMade) {
-  const auto coordinator = client_.make("com.a");
-  const auto placeholder = client_.placeholder("com.a");
-  device::setStepHook([](const char* name) { return std::string_view(name) == "create file" ? ENOSPC : 0; });
-  const Status refused = coordinator->setPlaceholderPromise(placeholder);
-  device::setStepHook(nullptr);
-  ASSERT_FALSE(refused.ok());
-  EXPECT_EQ(refused.error().code, ENOSPC);
-  EXPECT_FALSE(coordinator->hasPlaceholderPromise());
-  EXPECT_EQ(state("com.a"), "none");
-  EXPECT_EQ(device_.containers(), 0);
-  EXPECT_TRUE(coordinator->setPlaceholderPromise(placeholder).ok());
-}
-
-TEST_F(CoordinatedInstall, RefusesANameThatNoPropertyListHolds) {
-  const auto placeholder = service().initAppPlaceholder("\xFF\xFE", "com.a", TSInstallType::Sync, kSync);
-  ASSERT_TRUE(placeholder->setConfigurationComplete().ok());
-  EXPECT_FALSE(client_.make("com.a")->setPlaceholderPromise(placeholder).ok());
-  EXPECT_EQ(state("com.a"), "none");
-}
-
-TEST_F(CoordinatedInstall, ShowsAVeryLongName) {
-  const std::string name(65536, 'n');
-  ASSERT_TRUE(client_.make("com.a")->setPlaceholderPromise(client_.placeholder("com.a", name)).ok());
-  EXPECT_EQ(info("com.a").find("BundleDisplayName")->string(), name);
-  EXPECT_EQ(service().list()->front().name, name);
-  const TemporaryFolder folder;
-  device::Services& services = device_.services();
-  EXPECT_TRUE(device::drawScreen(
-                  {services.homeScreen(), services.defaultRegistry(), services.bundles(), services.iconRenderer()},
-                  folder.path("screen.png"))
-                  .ok());
-}
-
 TEST_F(CoordinatedInstall, KeepsThePlaceholderForTheOtherCoordinatorOfTheApp) {
   const auto first = client_.prepare("com.a");
   const auto second = client_.prepare("com.a", Kind::updating);
-  ASSERT_TRUE(first->cancelForReason(kReason, kSync).ok());
+  ASSERT_TRUE(first->cancelForReason(kEnough, kSync).ok());
   EXPECT_EQ(state("com.a"), "0.9 placeholder");
   ASSERT_NE(progress("com.a"), nullptr);
   CoordinationClient::deliver(client_.prepare("com.a"), stage("com.a"));
   client_.settle();
   EXPECT_EQ(state("com.a"), "1.0 placeholder");
-  ASSERT_TRUE(second->cancelForReason(kReason, kSync).ok());
+  ASSERT_TRUE(second->cancelForReason(kEnough, kSync).ok());
   EXPECT_EQ(state("com.a"), "1.0");
   EXPECT_EQ(device_.containers(), 1);
 }
@@ -418,9 +300,9 @@ TEST_F(CoordinatedInstall, CannotBeCancelledOnceItRuns) {
   const auto coordinator = client_.prepare("com.a");
   CoordinationClient::deliver(coordinator, stage("com.a"));
   HeldInstalls::waitFor(1);
-  EXPECT_EQ(failureOf(coordinator->cancelForReason(kReason, kSync)), CoordinationFailure::installing);
+  EXPECT_EQ(failureOf(coordinator->cancelForReason(kEnough, kSync)), CoordinationFailure::installing);
   EXPECT_EQ(failureOf(service().cancelByUser("com.a")), CoordinationFailure::installing);
-  EXPECT_EQ(failureOf(coordinator->appAssetPromise()->cancelForReason(kReason, kSync)),
+  EXPECT_EQ(failureOf(coordinator->appAssetPromise()->cancelForReason(kEnough, kSync)),
             CoordinationFailure::installing);
   EXPECT_FALSE(service().waitUntilIdle(std::chrono::milliseconds(0)));
   HeldInstalls::release();
@@ -436,24 +318,24 @@ TEST_F(CoordinatedInstall, IsCancelledWithItsPackage) {
   CoordinationClient::deliver(coordinator, package);
   client_.settle();
   EXPECT_TRUE(exists(package));
-  ASSERT_TRUE(coordinator->cancelForReason(kReason, kSync).ok());
+  ASSERT_TRUE(coordinator->cancelForReason(kEnough, kSync).ok());
   EXPECT_FALSE(exists(package));
   EXPECT_EQ(state("com.a"), "1.0");
-  EXPECT_EQ(coordinator->coordinatorError(), kReason);
-  EXPECT_EQ(failureOf(coordinator->cancelForReason(kReason, kSync)), CoordinationFailure::ended);
+  EXPECT_EQ(coordinator->coordinatorError(), kEnough);
+  EXPECT_EQ(failureOf(coordinator->cancelForReason(kEnough, kSync)), CoordinationFailure::ended);
 }
 
 TEST_F(CoordinatedInstall, CannotBeCancelledWhileTheDatabaseFails) {
   const auto coordinator = client_.prepare("com.a");
   device::setStepHook([](const char* name) { return std::string_view(name).starts_with("database") ? ENOSPC : 0; });
-  const Status cancelled = coordinator->cancelForReason(kReason, kSync);
+  const Status cancelled = coordinator->cancelForReason(kEnough, kSync);
   const auto none = client_.make("com.b");
   device::setStepHook(nullptr);
   EXPECT_FALSE(cancelled.ok());
   EXPECT_EQ(none, nullptr);
   EXPECT_EQ(state("com.a"), "0.9 placeholder");
   EXPECT_EQ(coordinator->coordinatorError(), std::nullopt);
-  EXPECT_TRUE(coordinator->cancelForReason(kReason, kSync).ok());
+  EXPECT_TRUE(coordinator->cancelForReason(kEnough, kSync).ok());
 }
 
 }  // namespace appsync::test
