@@ -20,6 +20,7 @@ constexpr const char* kExamples = R"(Examples:
   appsync pack Tides.app -o lib/tides.zip
   appsync sync phone lib                install and update everything in lib
   appsync sync phone lib --remove org.example.tides
+  appsync tap phone org.example.tides   while a sync runs: this app before the others
   appsync apps phone                    what is on it now
   appsync screen phone -o screen.png    what its home screen looks like
 
@@ -30,6 +31,8 @@ void addCommands(CLI::App& line, Invocation& invocation) {
   addInitCommand(line, invocation);
   addPackCommand(line, invocation);
   addSyncCommand(line, invocation);
+  addTapCommand(line, invocation);
+  addCancelCommand(line, invocation);
   addAppsCommand(line, invocation);
   addScreenCommand(line, invocation);
   addHistoryCommand(line, invocation);

@@ -20,8 +20,8 @@ using platform::InstallCoordinator;
 
 constexpr std::string_view kServiceName = "com.corvel.appsync.sync";
 constexpr auto kTimeBetweenLooks = 100ms;
-/// An install moves as fast as the disk does. One that has not moved for so long never will, and must not hold up the
-/// end of the sync for good.
+/// Installs and removals move as fast as the disk does. What has not moved for so long never will, and must not hold up
+/// the end of the sync for good.
 constexpr auto kLongestSilence = 5min;
 /// The same for somebody who asked for an end.
 constexpr auto kLongestSilenceOnceInterrupted = 10s;
@@ -66,15 +66,16 @@ class CoordinatedInstallWatcher final : public InstallWatcher, private platform:
 
   void waitForRoom(std::uint64_t bytes) override { packages_.waitForRoom(bytes, interruption_); }
 
-  void waitForRemovals() override {}
+  void waitForOthers() override {
+    waitUntilIdle();
+    const std::lock_guard lock(mutex_);
+    early_.clear();  // how an earlier sync's installs ended
+  }
 
   void waitForInstalls() override {
-    hasNews();
-    while (!packages_.waitUntilEmpty(kTimeBetweenLooks)) {
-      const auto longest = interruption_.requested() ? kLongestSilenceOnceInterrupted : kLongestSilence;
-      if (Clock::now() - lastNews_.load() < longest) continue;
-      packages_.settle([&](const SentPackage& package) { return lost(device_, package); });
-    }
+    waitUntilIdle();
+    // Of what is left the service will say no more.
+    packages_.settle([&](const SentPackage& package) { return lost(device_, package); });
   }
 
  private:
@@ -107,6 +108,15 @@ class CoordinatedInstallWatcher final : public InstallWatcher, private platform:
     for (const SentPackage& package : packages_.first(kShownInstalls))
       sum += showInstall(device_, package.app.identifier, progress_);
     if (std::exchange(shown_, sum) != sum) hasNews();
+  }
+
+  /// Until the service has done, and told everybody, all that it can.
+  void waitUntilIdle() {
+    hasNews();
+    while (!device_.services().installCoordination().waitUntilIdle(kTimeBetweenLooks)) {
+      const auto longest = interruption_.requested() ? kLongestSilenceOnceInterrupted : kLongestSilence;
+      if (Clock::now() - lastNews_.load() >= longest) return;
+    }
   }
 
   void hasNews() { lastNews_ = Clock::now(); }

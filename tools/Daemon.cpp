@@ -6,7 +6,9 @@
 
 #include "core/SyncFiles.h"
 #include "device/SyncFramework.h"
+#include "tools/Leftovers.h"
 #include "tools/StagingArea.h"
+#include "tools/SyncControl.h"
 
 namespace appsync::tools {
 namespace {
@@ -99,6 +101,10 @@ Daemon::Daemon(device::Device& device, platform::ZTClient& client, SyncProgress&
 
 Status Daemon::sync(const SyncRequest& request) {
   const ServiceConnection connection(device_, queue_);
+  const auto control = openSyncControl(device_);
+  auto watcher = makeWatcher(device_, progress_, interruption_);
+  watcher->waitForOthers();
+  giveUpLeftovers(device_);
   device_.platform().systemNotify().post(platform::kZTStartupCompleteNotification);
   client_.prepareForSyncWithHostAnchor(client_.currentSyncAnchor(), {}, nullptr);
   learnDeletedApps();
@@ -109,11 +115,10 @@ Status Daemon::sync(const SyncRequest& request) {
     client_.syncEndedWithSuccess(false);
     return handedOver;
   }
-  {
-    const auto watcher = makeWatcher(device_, progress_, interruption_);
-    tellRemovals(*watcher);
-    transferPackages(*watcher);
-  }
+  tellRemovals(*watcher);
+  transferPackages(*watcher);
+  watcher.reset();
+  giveUpLeftovers(device_);
   tellUnfinished();
   Status remembered = remember();
   client_.syncEndedWithSuccess(remembered.ok() && !interruption_.requested());
@@ -210,7 +215,7 @@ void Daemon::tellWhatIsKnown() {
 }
 
 void Daemon::tellRemovals(InstallWatcher& watcher) {
-  watcher.waitForRemovals();
+  watcher.waitForOthers();
   const bool forbidden = isForbidden(device_, RestrictionSetting::appRemovalAllowed);
   for (const PlannedApp& app : plan_) {
     if (app.work != PlannedWork::remove) continue;

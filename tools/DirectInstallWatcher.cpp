@@ -26,8 +26,8 @@ class DirectInstallWatcher final : public InstallWatcher {
 
   void watch(SentPackage package) override { packages_.add(std::move(package)); }
   void waitForRoom(std::uint64_t bytes) override { packages_.waitForRoom(bytes, interruption_); }
-  /// The plug-in removes apps before it returns.
-  void waitForRemovals() override {}
+  /// Nothing does: the plug-in removes apps before it returns.
+  void waitForOthers() override {}
   /// The client has waited for all installs already.
   void waitForInstalls() override { settle(); }
 

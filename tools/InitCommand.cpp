@@ -11,18 +11,25 @@ namespace {
 
 struct InitOptions {
   std::string device;
-  bool direct = false;
+  bool isCoordinated = false;
+  bool isDirect = false;
 };
 
 constexpr const char* kExamples =
     R"(A device is a folder: DEVICE/root is its file system, the rest is its registry and settings. The folder must be
 missing or empty.
 
-Example:
-  appsync init phone)";
+A coordinated device installs apps through coordinators: while a sync runs, `appsync tap` brings an app before the
+others, and `appsync cancel` leaves one out. On a direct device the sync installs each package itself. Both end with
+the same apps; `appsync set DEVICE coordination=on` or `=off` changes a device later.
+
+Examples:
+  appsync init phone
+  appsync init old-phone --direct)";
 
 ExitStatus run(const InitOptions& options) {
-  const auto device = device::Device::create(options.device);
+  const auto device = device::Device::create(
+      options.device, options.isDirect ? device::InstallMode::direct : device::InstallMode::coordinated);
   if (!device) return reportUnusable(device.error());
   StandardOutput output;
   output.writeLine("Made the device " + printable(options.device) + ".");
@@ -35,7 +42,9 @@ void addInitCommand(CLI::App& line, Invocation& invocation) {
   const auto options = std::make_shared<InitOptions>();
   CLI::App* command = line.add_subcommand("init", "Make a new, empty device.");
   command->add_option("DEVICE", options->device, "the folder that becomes the device")->required();
-  command->add_flag("--direct", options->direct, "let the sync install packages itself; this is what happens anyway");
+  CLI::Option* coordinated =
+      command->add_flag("--coordinated", options->isCoordinated, "install through coordinators, also when not said");
+  command->add_flag("--direct", options->isDirect, "let the sync install packages itself")->excludes(coordinated);
   command->footer(kExamples);
   command->callback([options, &invocation] { invocation = [options] { return run(*options); }; });
 }

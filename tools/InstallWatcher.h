@@ -22,8 +22,9 @@ class InstallWatcher {
   /// Blocks until another package of that size may lie on the device beside those whose install is not over, or the
   /// user interrupts.
   virtual void waitForRoom(std::uint64_t bytes) = 0;
-  /// Blocks until the removals that were begun are over, well or not.
-  virtual void waitForRemovals() = 0;
+  /// Blocks until what goes on by itself is over, well or not: the removals that were begun, and the installs for which
+  /// an earlier sync that was killed had brought everything.
+  virtual void waitForOthers() = 0;
   /// To be called once all packages are handed over and the client has ended the transfers: blocks until every install
   /// has its outcome.
   virtual void waitForInstalls() = 0;

@@ -18,7 +18,7 @@ using testing::HasSubstr;
 using testing::IsEmpty;
 using testing::Not;
 
-class HostileLibrary : public ToolFixture {
+class HostileLibrary : public ToolFixtureOfEachMode {
  protected:
   /// A package whose "Info.plist" is this.
   void publishInfo(const std::string& fileName, const plist::Dictionary& info) const {
@@ -35,7 +35,9 @@ class HostileLibrary : public ToolFixture {
   }
 };
 
-TEST_F(HostileLibrary, AnIdentifierThatLeadsOutIsRefused) {
+INSTANTIATE_TEST_SUITE_P(Modes, HostileLibrary, kModes, nameOfMode);
+
+TEST_P(HostileLibrary, AnIdentifierThatLeadsOutIsRefused) {
   for (const char* identifier : {"../../escape", "/etc/passwd", "..", "a/../../b", ""}) {
     publishInfo("bad.zip", {{platform::BundleIdentifierKey, identifier}});
     expectOneFailure(sync({"--json"}));
@@ -43,24 +45,24 @@ TEST_F(HostileLibrary, AnIdentifierThatLeadsOutIsRefused) {
   EXPECT_FALSE(std::filesystem::exists(path("escape")));
 }
 
-TEST_F(HostileLibrary, AHugeIdentifierIsRefused) {
+TEST_P(HostileLibrary, AHugeIdentifierIsRefused) {
   publishInfo("bad.zip", {{platform::BundleIdentifierKey, std::string(65536, 'x')}});
   expectOneFailure(sync({"--json"}));
 }
 
-TEST_F(HostileLibrary, AnIdentifierThatIsNoTextIsRefused) {
+TEST_P(HostileLibrary, AnIdentifierThatIsNoTextIsRefused) {
   publishInfo("bad.zip", {{platform::BundleIdentifierKey, 7}});
   expectOneFailure(sync({"--json"}));
 }
 
-TEST_F(HostileLibrary, AnInfoListInBadUTF8IsRefused) {
+TEST_P(HostileLibrary, AnInfoListInBadUTF8IsRefused) {
   write(library() + "/bad.zip",
         zipArchive({{"Notes.app/Info.plist",
                      "<plist><dict><key>BundleIdentifier</key><string>org.\xff</string></dict></plist>"}}));
   expectOneFailure(sync({"--json"}));
 }
 
-TEST_F(HostileLibrary, AnEscapeSequenceInANameNeverReachesTheTerminal) {
+TEST_P(HostileLibrary, AnEscapeSequenceInANameNeverReachesTheTerminal) {
   publishInfo("app.zip", {{platform::BundleIdentifierKey, "org.a"},
                           {platform::BundleVersionKey, "1\x1b[2J"},
                           {platform::BundleDisplayNameKey, "\x1b]0;owned\x07\n"}});
@@ -71,7 +73,7 @@ TEST_F(HostileLibrary, AnEscapeSequenceInANameNeverReachesTheTerminal) {
   EXPECT_THAT(runTool({"apps", device()}).out, Not(HasSubstr("\x1b")));
 }
 
-TEST_F(HostileLibrary, AFileNameWithAnEscapeSequenceIsShownSafely) {
+TEST_P(HostileLibrary, AFileNameWithAnEscapeSequenceIsShownSafely) {
   write(library() + "/\x1b[31m\xff.zip", "nothing");
   const Finished run = sync();
   EXPECT_EQ(run.status, 1);
@@ -79,7 +81,7 @@ TEST_F(HostileLibrary, AFileNameWithAnEscapeSequenceIsShownSafely) {
   EXPECT_EQ(eventsIn(sync({"--json"}).out).size(), 2U);
 }
 
-TEST_F(HostileLibrary, AnIconOutsideTheAppStagesNothingElsewhere) {
+TEST_P(HostileLibrary, AnIconOutsideTheAppStagesNothingElsewhere) {
   publishInfo("app.zip", {{platform::BundleIdentifierKey, "org.a"},
                           {platform::BundleVersionKey, "1.0"},
                           {platform::BundleIconFileKey, "../../../../../Library/ApplicationSync/RestoreState.plist"}});
@@ -87,56 +89,58 @@ TEST_F(HostileLibrary, AnIconOutsideTheAppStagesNothingElsewhere) {
   EXPECT_FALSE(std::filesystem::exists(device() + "/root/var/mobile/Library/ApplicationSync/RestoreState.plist"));
 }
 
-TEST_F(HostileLibrary, AnEntryThatLeadsOutIsRefused) {
+TEST_P(HostileLibrary, AnEntryThatLeadsOutIsRefused) {
   publish("org.a", "1.0", {{"../../../escape", "x"}});
   expectOneFailure(sync({"--json"}));
 }
 
-TEST_F(HostileLibrary, FoldersHiddenFilesAndOtherFilesArePassedOver) {
+TEST_P(HostileLibrary, FoldersHiddenFilesAndOtherFilesArePassedOver) {
   std::filesystem::create_directory(library() + "/folder.zip");
   write(library() + "/.hidden.zip", "x");
   write(library() + "/README", "read me");
   EXPECT_EQ(sync().out, "Nothing to do.\n");
 }
 
-TEST_F(HostileLibrary, APackageIsKnownByItsContentToo) {
+TEST_P(HostileLibrary, APackageIsKnownByItsContentToo) {
   write(library() + "/notes-package", appPackage("org.a"));
   EXPECT_THAT(endsIn(sync({"--json"}).out), ElementsAre("installed org.a"));
 }
 
-TEST_F(HostileLibrary, AnUpperCaseSuffixCounts) {
+TEST_P(HostileLibrary, AnUpperCaseSuffixCounts) {
   write(library() + "/NOTES.ZIP", appPackage("org.a"));
   EXPECT_THAT(endsIn(sync({"--json"}).out), ElementsAre("installed org.a"));
 }
 
-TEST_F(HostileLibrary, APipeNamedLikeAPackageDoesNotHang) {
+TEST_P(HostileLibrary, APipeNamedLikeAPackageDoesNotHang) {
   ASSERT_EQ(::mkfifo((library() + "/pipe.zip").c_str(), 0600), 0);
   EXPECT_THAT(endsIn(sync({"--json"}).out), ElementsAre("failed pipe.zip"));
 }
 
-TEST_F(HostileLibrary, ALinkToNowhereFails) {
+TEST_P(HostileLibrary, ALinkToNowhereFails) {
   std::filesystem::create_symlink("nowhere", library() + "/link.zip");
   EXPECT_THAT(endsIn(sync({"--json"}).out), ElementsAre("failed link.zip"));
 }
 
-TEST_F(HostileLibrary, ALinkToAPackageIsOne) {
+TEST_P(HostileLibrary, ALinkToAPackageIsOne) {
   write(path("elsewhere"), appPackage("org.a"));
   std::filesystem::create_symlink(path("elsewhere"), library() + "/link.zip");
   EXPECT_THAT(endsIn(sync({"--json"}).out), ElementsAre("installed org.a"));
 }
 
-TEST_F(HostileLibrary, AMissingLibraryIsUnusable) {
+TEST_P(HostileLibrary, AMissingLibraryIsUnusable) {
   const Finished run = runTool({"sync", device(), path("nowhere")});
   EXPECT_EQ(run.status, 3);
   EXPECT_THAT(run.err, HasSubstr("nowhere"));
 }
 
-TEST_F(HostileLibrary, AFileIsNoLibrary) {
+TEST_P(HostileLibrary, AFileIsNoLibrary) {
   write(path("file"), "x");
   EXPECT_EQ(runTool({"sync", device(), path("file")}).status, 3);
 }
 
-TEST_F(HostileLibrary, ManyPackagesTakeTimeInProportion) {
+class LargeLibrary : public ToolFixture {};
+
+TEST_F(LargeLibrary, ManyPackagesTakeTimeInProportion) {
   publish("org.a");
   ASSERT_EQ(sync().status, 0);
   const auto secondsFor = [&](int count) {

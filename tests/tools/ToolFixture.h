@@ -17,9 +17,17 @@ namespace appsync::test {
 
 class ToolFixture : public testing::Test {
  protected:
+  /// The device is made with this option, if there is one.
+  explicit ToolFixture(std::string mode = {}) : mode_(std::move(mode)) {}
+
   void SetUp() override {
     std::filesystem::create_directory(library());
-    ASSERT_EQ(runTool({"init", device()}).status, 0);
+    makeDevice();
+  }
+  void makeDevice() const {
+    std::vector<std::string> words = {"init", device()};
+    if (!mode_.empty()) words.push_back(mode_);
+    ASSERT_EQ(runTool(words).status, 0);
   }
 
   [[nodiscard]] std::string device() const { return folder_.path("device"); }
@@ -72,7 +80,20 @@ class ToolFixture : public testing::Test {
   }
 
  private:
+  const std::string mode_;
   TemporaryFolder folder_;
 };
+
+/// The same on a device of each mode.
+class ToolFixtureOfEachMode : public ToolFixture, public testing::WithParamInterface<const char*> {
+ protected:
+  ToolFixtureOfEachMode() : ToolFixture(GetParam()) {}
+};
+
+/// To be instantiated with these.
+inline const auto kModes = testing::Values("--coordinated", "--direct");
+[[nodiscard]] inline std::string nameOfMode(const testing::TestParamInfo<const char*>& mode) {
+  return std::string(mode.param).substr(2);
+}
 
 }  // namespace appsync::test

@@ -91,6 +91,10 @@ std::string ToolRun::outputSoFar() const {
   return contentOf(folder_.path("out"));
 }
 
+std::string ToolRun::errorsSoFar() const {
+  return contentOf(folder_.path("err"));
+}
+
 Finished ToolRun::wait() {
   int status = 0;
   ::waitpid(process_, &status, 0);

@@ -38,6 +38,8 @@ class ToolRun {
   void signal(int number) const;
   /// Everything it has written so far to standard output.
   [[nodiscard]] std::string outputSoFar() const;
+  /// The same of standard error.
+  [[nodiscard]] std::string errorsSoFar() const;
   [[nodiscard]] Finished wait();
 
  private:
