@@ -67,17 +67,24 @@ void Coordinators::end() {
   removalQueue_.reset();
   installs_.reset();
   observers_->end();
+  storeWhatIsAhead();
+}
+
+void Coordinators::storeWhatIsAhead() {
   const std::lock_guard lock(mutex_);
+  std::vector<const CoordinatorState*> ahead;
   for (const auto& [identifier, ofApp] : coordinators_) {
     for (const Coordinator& coordinator : ofApp) {
-      if (!coordinator->appAsset) continue;
-      const auto store = [&](Database::Session& session) {
-        coordinator_table::storePromise(session, coordinator->number, PromiseRole::appAsset, *coordinator->appAsset)
-            .ignore();
-      };
-      this->store(*coordinator, store).ignore();
+      if (coordinator->appAsset && coordinator->appAsset->isAhead) ahead.push_back(coordinator.get());
     }
   }
+  if (ahead.empty()) return;
+  Database::Transaction transaction(database_);
+  for (const CoordinatorState* coordinator : ahead) {
+    coordinator_table::storePromise(transaction, coordinator->number, PromiseRole::appAsset, *coordinator->appAsset)
+        .ignore();
+  }
+  transaction.commit().ignore();
 }
 
 void Coordinators::advance(const Coordinator& coordinator) {

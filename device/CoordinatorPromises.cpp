@@ -27,6 +27,7 @@ void Coordinators::setFraction(const std::shared_ptr<PromiseState>& promise, dou
   const std::lock_guard lock(mutex_);
   if (isEnding_ || !promise->canChange()) return;
   promise->fraction = std::isnan(fraction) ? 0 : std::clamp(fraction, 0.0, 1.0);
+  promise->isAhead = true;
   if (promise->role != PromiseRole::appAsset) return;
   if (const Coordinator coordinator = promise->coordinator.lock()) followPromise(*coordinator);
 }
@@ -43,7 +44,9 @@ void Coordinators::followPromise(const CoordinatorState& coordinator) {
 void Coordinators::setTransferPath(const std::shared_ptr<PromiseState>& promise, const platform::FileLocation& path) {
   const std::lock_guard lock(mutex_);
   const bool isTheServices = promise->isComplete && promise->role;
-  if (!isEnding_ && promise->canChange() && !isTheServices) promise->transferPath = path;
+  if (isEnding_ || !promise->canChange() || isTheServices) return;
+  promise->transferPath = path;
+  promise->isAhead = true;
 }
 
 void Coordinators::fulfil(const std::shared_ptr<PromiseState>& promise) {
@@ -105,11 +108,11 @@ Status Coordinators::configure(const std::shared_ptr<PlaceholderState>& placehol
   PlaceholderState copy = *placeholder;
   if (Status changed = change(copy); !changed) return changed;
   const Coordinator coordinator = placeholder->coordinator.lock();
+  const bool isToShow = coordinator && copy.isConfigured && coordinator->stage == CoordinatorStage::waiting;
   if (coordinator) {
     const auto store = [&](Database::Session& session) {
       coordinator_table::storePlaceholder(session, coordinator->number, copy).ignore();
     };
-    const bool isToShow = copy.isConfigured && coordinator->stage == CoordinatorStage::waiting;
     Status stored = isToShow ? show(copy, store) : this->store(*coordinator, store);
     if (!stored) return stored;
   }
@@ -118,7 +121,7 @@ Status Coordinators::configure(const std::shared_ptr<PlaceholderState>& placehol
     copy.icon->coordinator = coordinator;
   }
   static_cast<PlaceholderConfiguration&>(*placeholder) = std::move(copy);
-  if (!coordinator || !placeholder->isConfigured) return {};
+  if (!isToShow) return {};
   tell(coordinator, &InstallObserverDelegate::coordinatorDidInstallPlaceholder);
   followPromise(*coordinator);
   return {};

@@ -29,6 +29,8 @@ struct PromiseState {
   bool isCancelled = false;
   /// What it belonged to has ended.
   bool isOver = false;
+  /// Its path or fraction are still to be stored.
+  bool isAhead = false;
   /// None while it is attached to nothing.
   std::optional<PromiseRole> role;
   /// Null until it, or the placeholder that has it, is a coordinator's.

@@ -260,7 +260,7 @@ Status Coordinators::erase(const CoordinatorState& coordinator) {
   const bool isShownByAnother = std::ranges::any_of(
       coordinators, [&](const Coordinator& other) { return other.get() != &coordinator && other->showsPlaceholder(); });
   if (coordinator.showsPlaceholder() && !isShownByAnother) {
-    const Status removed = registry_.removePlaceholder(coordinator.identifier, remove);
+    Status removed = registry_.removePlaceholder(coordinator.identifier, remove);
     const bool isGone = !removed && removed.error().domain == platform::InstallerErrorDomain;
     if (!isGone) return removed;
   }

@@ -133,12 +133,16 @@ class Coordinators : public std::enable_shared_from_this<Coordinators> {
   void keepShown(const CoordinatorState& coordinator);
   void tell(const Coordinator& coordinator, Report report);
 
+  // With it or without.
+
+  /// Removes the package that is the service's, if there is one.
+  void removePackage(const CoordinatorState& coordinator);
+
   // Without it.
 
   void install(const Coordinator& coordinator);
   [[nodiscard]] std::optional<Error> uninstallNow(const std::string& identifier);
-  /// Removes the package that is the service's, if there is one.
-  void removePackage(const CoordinatorState& coordinator);
+  void storeWhatIsAhead();
 
   Database& database_;
   DeviceFileSystem& files_;

@@ -24,7 +24,7 @@ Error noBundleIdentifier(std::string_view text) {
 }
 
 std::shared_ptr<PromiseState> newPromise(std::string_view name, ClientIdentity client, std::uint64_t diskSpaceNeeded) {
-  const auto state = std::make_shared<PromiseState>();
+  auto state = std::make_shared<PromiseState>();
   state->name = name;
   state->client = client;
   state->diskSpaceNeeded = diskSpaceNeeded;
