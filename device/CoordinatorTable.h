@@ -52,7 +52,7 @@ create table if not exists spent_packages (path text primary key) strict, withou
 /// Every coordinator, in the order in which they were made; none where the tables are still missing.
 [[nodiscard]] Result<std::vector<std::shared_ptr<CoordinatorState>>> all(Database::Session& session);
 
-/// Makes a row and gives `state` its number.
+/// Makes a row, in place of one that could not be taken away when its coordinator ended, and gives `state` its number.
 Status insert(Database::Session& session, CoordinatorState& state);
 
 // Of a coordinator whose row has gone nothing is stored, or the statement fails.
