@@ -2,6 +2,7 @@
 
 #include <cerrno>
 #include <cstdint>
+#include <initializer_list>
 #include <utility>
 
 #include <fcntl.h>
@@ -40,30 +41,40 @@ Status makeMissingTables(Database& database) {
   return transaction.commit();
 }
 
-/// Makes the database under its working name and then gives it its own, at which moment the folder is a device.
-Status makeDatabase(const std::string& path, int folder, InstallMode mode) {
-  for (const std::string_view ending : {"", "-journal", "-wal", "-shm"}) {
+/// Removes those files of a new database that are there.
+Status removeNewDatabase(int folder, std::initializer_list<std::string_view> endings) {
+  for (const std::string_view ending : endings) {
     const int number = sys::removeFile(folder, (kNewDatabaseFile + std::string(ending)).c_str());
     if (number != 0 && number != ENOENT) return Error::fromErrno(number, kNewDatabaseFile);
   }
+  return {};
+}
+
+/// Makes the database under its working name, in one file, so that there is one thing to rename.
+Status fillNewDatabase(const std::string& path, InstallMode mode) {
+  const Result<std::unique_ptr<Database>> database = Database::open(path + '/' + kNewDatabaseFile, Access::exclusive);
+  if (!database) return database.error();
   {
-    const Result<std::unique_ptr<Database>> database = Database::open(path + '/' + kNewDatabaseFile, Access::exclusive);
-    if (!database) return database.error();
-    {
-      Database::Transaction transaction(**database);
-      for (const char* schema : Services::kSchemas)
-        transaction.runScript(schema).ignore();
-      if (mode == InstallMode::coordinated) {
-        transaction.run("insert into settings values ('coordination', '', 'on')").ignore();
-      }
-      transaction.runScript(("pragma application_id = " + std::to_string(kApplicationId)).c_str()).ignore();
-      transaction.runScript(("pragma user_version = " + std::to_string(kLayoutVersion)).c_str()).ignore();
-      if (Status committed = transaction.commit(); !committed) return committed;
+    Database::Transaction transaction(**database);
+    for (const char* schema : Services::kSchemas)
+      transaction.runScript(schema).ignore();
+    if (mode == InstallMode::coordinated) {
+      transaction.run("insert into settings values ('coordination', '', 'on')").ignore();
     }
-    // Into one file, so that there is one thing to rename.
-    Database::Session session(**database);
-    if (Status joined = session.runScript("pragma journal_mode = delete"); !joined) return joined;
+    transaction.runScript(("pragma application_id = " + std::to_string(kApplicationId)).c_str()).ignore();
+    transaction.runScript(("pragma user_version = " + std::to_string(kLayoutVersion)).c_str()).ignore();
+    if (Status committed = transaction.commit(); !committed) return committed;
   }
+  Database::Session session(**database);
+  return session.runScript("pragma journal_mode = delete");
+}
+
+/// When the database has its name the folder is a device.
+Status makeDatabase(const std::string& path, int folder, InstallMode mode) {
+  if (Status removed = removeNewDatabase(folder, {"", "-journal", "-wal", "-shm"}); !removed) return removed;
+  if (Status filled = fillNewDatabase(path, mode); !filled) return filled;
+  // A log stays when its database is closed, also one that is not in use any more.
+  if (Status removed = removeNewDatabase(folder, {"-wal", "-shm"}); !removed) return removed;
   const int number = sys::rename(folder, kNewDatabaseFile, folder, kDatabaseFile, sys::Replace::no);
   if (number != 0) return Error::fromErrno(number, kDatabaseFile);
   return {};

@@ -45,6 +45,12 @@ run() {
   "$@"
 }
 
+# contents DEVICE: its apps and their files, but for the names of containers and the order in which they came.
+contents() {
+  appsync apps "$1" | sort
+  (cd "$1/root/var/mobile/Containers/Bundle" && find . -type f -exec sha256sum {} +) | sed 's|\./[^/]*/||' | sort
+}
+
 cp -R "$samples" apps
 rm -f apps/demo.sh apps/draw_icons.py
 mkdir library
@@ -75,8 +81,20 @@ say 'What was removed is not sent again, unless one asks for it'
 run appsync sync phone library
 run appsync sync phone library --only org.example.gambit
 
+say 'This device installs through coordinators; one that installs directly ends with the same apps and files'
+run appsync init direct-phone --direct
+run appsync sync direct-phone library
+if ! diff <(contents phone) <(contents direct-phone); then
+  echo 'demo: the two devices differ' >&2
+  exit 1
+fi
+echo 'The two devices are equal.'
+
+say 'While a sync runs, "appsync tap" has it bring an app before the others, and "appsync cancel" leave one out'
+run appsync tap phone org.example.tides || true
+
 if [[ $# -gt 0 ]]; then
-  say "The device and its pictures are in $1: phone, screen.png, screen-2.png"
+  say "The devices and the pictures are in $1: phone, direct-phone, screen.png, screen-2.png"
 else
   say 'All of it is gone now; "samples/demo.sh FOLDER" keeps it, with pictures of the home screen'
 fi

@@ -15,12 +15,15 @@ struct SetOptions {
 constexpr const char* kExamples = R"(Keys and their values:
   app-installation   yes, no or unset: whether apps may be installed
   app-removal        yes, no or unset: whether apps may be removed
+  coordination       on, off or unset: whether apps are installed through coordinators, which can be tapped and
+                     cancelled while a sync runs; from the next sync on
   assertion          ID:granted, ID:denied, ID:unknown, ID:failing or ID:unset: what the home screen
                      answers when app ID is about to be replaced
 
 Examples:
   appsync set phone app-removal=no
-  appsync set phone app-removal=unset app-installation=unset)";
+  appsync set phone app-removal=unset app-installation=unset
+  appsync set phone coordination=off)";
 
 ExitStatus run(const SetOptions& options, device::Device& device) {
   for (const std::string& assignment : options.assignments) {

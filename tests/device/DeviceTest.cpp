@@ -80,6 +80,12 @@ TEST_F(DeviceAtPath, IsMadeOfAnEmptyFolder) {
   EXPECT_TRUE(Device::create(path()).ok());
 }
 
+TEST_F(DeviceAtPath, ItsMakingLeavesNothingHalfDone) {
+  make();
+  for (const auto& [path, hash] : contents(path()))
+    EXPECT_EQ(path.find("device.db.new"), path.npos) << path;
+}
+
 TEST_F(DeviceAtPath, IsNotMadeTwice) {
   make();
   EXPECT_EQ(refusal(Device::create(path())),

@@ -56,6 +56,12 @@ TEST(Usage, OneAppCannotBeBothRemovedAndAskedFor) {
   EXPECT_THAT(run.err, HasSubstr("both --remove and --only"));
 }
 
+TEST(Usage, ADeviceCannotBeBothCoordinatedAndDirect) {
+  const Finished run = runTool({"init", "device", "--coordinated", "--direct"});
+  EXPECT_EQ(run.status, 2);
+  EXPECT_THAT(run.err, HasSubstr("--direct"));
+}
+
 class Help : public testing::TestWithParam<const char*> {};
 
 TEST_P(Help, TeachesWithAnExample) {
@@ -67,7 +73,8 @@ TEST_P(Help, TeachesWithAnExample) {
 }
 
 INSTANTIATE_TEST_SUITE_P(Commands, Help,
-                         testing::Values("init", "pack", "sync", "apps", "screen", "history", "set", "clear", "plist"),
+                         testing::Values("init", "pack", "sync", "tap", "cancel", "apps", "screen", "history", "set",
+                                         "clear", "plist"),
                          [](const auto& command) { return std::string(command.param); });
 
 TEST(Usage, TheHelpNamesEveryExitStatus) {
