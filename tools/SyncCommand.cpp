@@ -29,7 +29,7 @@ counts. Apps that the device lacks are installed, older ones updated. One bad ap
 
 An app that was deleted on the device, or removed with --remove, is not sent again until --only asks for it.
 Interrupting (Ctrl-C) ends the sync in order; what was cut off is offered again next time. A second Ctrl-C ends
-it at once.
+it at once. While it runs, `appsync tap` has it bring an app before the others, and `appsync cancel` leave one out.
 
 With --json each line is an object: {"event":"progress","identifier":...,"fraction":...}; exactly one of
 installed, updated, removed, failed and skipped for each app, the last two with a "reason"; {"event":"waiting",...}
