@@ -1,6 +1,7 @@
 #include "tests/integration/DeviceSync.h"
 
 #include <algorithm>
+#include <chrono>
 #include <filesystem>
 
 #include "core/SyncFiles.h"
@@ -36,8 +37,12 @@ std::vector<std::string> DeviceSync::run(const std::vector<HostApp>& apps, const
       if (app != apps.end()) transfer(*client, assets[next], *app);
     }
   });
-  client->assetTransferEndedWithSuccess(true);
-  client->syncEndedWithSuccess(true);
+  beforeTransfersEnd();
+  const bool isWhole =
+      std::ranges::none_of(apps, [](const HostApp& app) { return app.package == HostApp::Package::stalled; });
+  client->assetTransferEndedWithSuccess(isWhole);
+  EXPECT_TRUE(device_.services().installCoordination().waitUntilIdle(std::chrono::minutes(2)));
+  client->syncEndedWithSuccess(isWhole);
   EXPECT_EQ(client.use_count(), 1) << "the client would outlive the sync, and perhaps the device";
 
   std::vector<std::string> asked;
@@ -60,6 +65,7 @@ void DeviceSync::transfer(AppsClient& client, const std::shared_ptr<ZTAsset>& as
   for (const double fraction : {0.25, 0.75}) {
     client.assetTransferUpdatedProgress(asset, fraction);
   }
+  if (app.package == HostApp::Package::stalled) return;
   if (app.package == HostApp::Package::lost) {
     client.assetTransferSucceeded(asset, false, Error{"ZTError", 7, "the host has lost the package", nullptr});
     return;

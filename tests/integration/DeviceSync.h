@@ -2,6 +2,7 @@
 #pragma once
 
 #include <cstddef>
+#include <functional>
 #include <map>
 #include <memory>
 #include <optional>
@@ -16,7 +17,8 @@ namespace appsync::test {
 
 /// One app that the host wants on the device.
 struct HostApp {
-  enum class Package { good, damaged, lost };
+  /// Of a stalled one the first part comes, and then nothing, until the host gives all transfers up.
+  enum class Package { good, damaged, lost, stalled };
 
   std::string identifier;
   std::string version;
@@ -33,6 +35,9 @@ class DeviceSync {
   /// `threads` threads at once. Returns the identifiers of the assets that were asked for.
   std::vector<std::string> run(const std::vector<HostApp>& apps, const std::vector<std::string>& toRemove,
                                std::size_t threads = 1);
+
+  /// Called when every transfer was reported, and the end of them all was not.
+  std::function<void()> beforeTransfersEnd = [] {};
 
   /// What the todo list says now, by identifier.
   [[nodiscard]] std::map<std::string, std::string> todoWords();

@@ -25,7 +25,7 @@ std::ostream& operator<<(std::ostream& out, const Seen& seen) {
   return out << seen.version << (seen.isInstalled ? " installed" : "") << (seen.isPlaceholder ? " placeholder" : "");
 }
 
-class DeviceSyncTest : public testing::Test {
+class DeviceSyncTest : public testing::TestWithParam<device::InstallMode> {
  protected:
   [[nodiscard]] std::map<std::string, Seen> appsOnDevice() {
     std::map<std::string, Seen> apps;
@@ -52,11 +52,17 @@ class DeviceSyncTest : public testing::Test {
 
   static std::string name(std::size_t number) { return "com.app" + std::to_string(number); }
 
-  TestDevice device;
+  TestDevice device{GetParam()};
   DeviceSync sync{device};
 };
 
-TEST_F(DeviceSyncTest, ThirtyPackagesAnUpdateARemovalAndTwoBadOnesEndInTheExpectedState) {
+INSTANTIATE_TEST_SUITE_P(Modes, DeviceSyncTest,
+                         testing::Values(device::InstallMode::direct, device::InstallMode::coordinated),
+                         [](const auto& mode) {
+                           return mode.param == device::InstallMode::direct ? "direct" : "coordinated";
+                         });
+
+TEST_P(DeviceSyncTest, ThirtyPackagesAnUpdateARemovalAndTwoBadOnesEndInTheExpectedState) {
   for (const char* identifier : {"com.gone", "com.keep", "com.app0", "com.app1"})
     device.install(identifier, "1.0");
   std::filesystem::remove(device.host("/var/mobile/Media/PublicStaging/package.zip"));
@@ -83,7 +89,7 @@ TEST_F(DeviceSyncTest, ThirtyPackagesAnUpdateARemovalAndTwoBadOnesEndInTheExpect
   expectTidy(29);
 }
 
-TEST_F(DeviceSyncTest, TheNextSyncBringsWhatTheLastOneCouldNot) {
+TEST_P(DeviceSyncTest, TheNextSyncBringsWhatTheLastOneCouldNot) {
   sync.run({{"com.damaged", "2.0", Package::damaged}, {"com.lost", "2.0", Package::lost}, {"com.a", "2.0"}}, {});
   EXPECT_EQ(appsOnDevice(), (std::map<std::string, Seen>{{"com.a", {"2.0", true, false}}}));
   device.reopen();
@@ -93,7 +99,7 @@ TEST_F(DeviceSyncTest, TheNextSyncBringsWhatTheLastOneCouldNot) {
   expectTidy(2);
 }
 
-TEST_F(DeviceSyncTest, TenInstallsAtOnceOfTwoHundredPackagesLoseNoUpdateOfTheTodoList) {
+TEST_P(DeviceSyncTest, TenInstallsAtOnceOfTwoHundredPackagesLoseNoUpdateOfTheTodoList) {
   std::vector<HostApp> apps;
   std::map<std::string, std::string> words;
   for (std::size_t number = 0; number < 200; ++number) {
