@@ -35,6 +35,8 @@ inline constexpr int kMaximumDepth = 512;
 
 /// Reads whichever of the three forms the bytes are in, told by their content.
 [[nodiscard]] Result<Value> read(ByteView document);
+/// The same of a document that is given away: long data in the binary form is not copied, and keeps all of it alive.
+[[nodiscard]] Result<Value> read(Bytes&& document);
 /// "bplist00". Sets are refused.
 [[nodiscard]] Result<Value> readBinary(ByteView document);
 /// UTF-8 or, with a byte-order mark, UTF-16. Entity declarations are refused, other document types skipped.
@@ -63,5 +65,8 @@ inline constexpr int kMaximumDepth = 512;
 /// Appends `value` on one line in the style of the old text form, for logs. Dictionaries keep their order,
 /// long data is cut short and followed by its length, deep nesting is cut to "…".
 void appendDescription(std::string& out, const Value& value);
+inline void appendDescription(std::string& out, const Dictionary& dictionary) {
+  appendDescription(out, Value(dictionary));
+}
 
 }  // namespace appsync::plist

@@ -184,7 +184,7 @@ inline void BinaryReader::readContent(std::size_t at, unsigned marker, int depth
   switch (marker >> 4) {
     case 0x4:
       if (!fits(at, extent, 1) || !spend(extent.count / kBytesPerUnit, at)) return;
-      place = Value::data({begin_ + extent.start, static_cast<std::size_t>(extent.count)});
+      place = readData({begin_ + extent.start, static_cast<std::size_t>(extent.count)});
       return;
     case 0x5:
       place = readASCII(at, extent);

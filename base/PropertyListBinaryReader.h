@@ -8,6 +8,7 @@
 #include <string>
 #include <string_view>
 #include <unordered_map>
+#include <utility>
 #include <vector>
 
 #include "base/PropertyListBigEndian.h"
@@ -28,6 +29,10 @@ inline constexpr std::uint64_t kFreeUnits = 65536;
 class BinaryReader {
  public:
   explicit BinaryReader(ByteView document) noexcept : begin_(document.data()), size_(document.size()) {}
+  /// What is read may keep the document.
+  explicit BinaryReader(std::shared_ptr<const Bytes> document) noexcept : BinaryReader(ByteView(*document)) {
+    document_ = std::move(document);
+  }
 
   Result<Value> read() {
     readTrailer();
@@ -74,6 +79,7 @@ class BinaryReader {
   void readArray(std::size_t at, Extent extent, int depth, Value& place);
   void readDictionary(std::size_t at, Extent extent, int depth, Value& place);
   void readRepeatingDictionary(Extent extent, int depth, Value& place);
+  [[nodiscard]] Value readData(ByteView bytes) const;
   Value readInteger(std::size_t at, unsigned exponent);
   Value readReal(std::size_t at, unsigned exponent);
   Value readDate(std::size_t at, unsigned low);
@@ -108,6 +114,8 @@ class BinaryReader {
 
   const std::byte* begin_;
   std::size_t size_;
+  /// Null when nothing may keep it.
+  std::shared_ptr<const Bytes> document_;
   unsigned offsetSize_ = 0;
   unsigned referenceSize_ = 0;
   std::uint64_t objectCount_ = 0;

@@ -43,6 +43,12 @@ Value BinaryReader::readUid(std::size_t at, unsigned size) {
   return Uid{loadBigEndian(begin_ + at + 1, size)};
 }
 
+Value BinaryReader::readData(ByteView bytes) const {
+  // Not worth keeping a whole document for.
+  constexpr std::size_t kShort = 256;
+  return document_ == nullptr || bytes.size() < kShort ? Value::data(bytes) : Internals::dataIn(document_, bytes);
+}
+
 Value BinaryReader::readASCII(std::size_t at, Extent extent) {
   if (!fits(at, extent, 1) || !spend(extent.count / kBytesPerUnit, at)) return {};
   const std::string_view text = textOf({begin_ + extent.start, static_cast<std::size_t>(extent.count)});

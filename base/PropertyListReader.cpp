@@ -2,6 +2,7 @@
 #include <algorithm>
 
 #include "base/PropertyList.h"
+#include "base/PropertyListBinaryReader.h"
 
 namespace appsync::plist {
 
@@ -18,6 +19,10 @@ std::string beginning(ByteView document) {
   return start;
 }
 
+bool isBinary(ByteView document) {
+  return textOf(document).starts_with("bplist");
+}
+
 /// Both XML and data in the old text form begin with '<'; only the latter goes on with nothing but digits.
 bool isXML(ByteView document) {
   const std::string start = beginning(document);
@@ -29,8 +34,13 @@ bool isXML(ByteView document) {
 }  // namespace
 
 Result<Value> read(ByteView document) {
-  if (textOf(document).starts_with("bplist")) return readBinary(document);
+  if (isBinary(document)) return readBinary(document);
   return isXML(document) ? readXML(document) : readText(document);
+}
+
+Result<Value> read(Bytes&& document) {
+  if (!isBinary(document)) return read(ByteView(document));
+  return BinaryReader(std::make_shared<const Bytes>(std::move(document))).read();
 }
 
 }  // namespace appsync::plist

@@ -38,9 +38,14 @@ struct TextPayload : Payload {
   static void destroy(TextPayload* text) noexcept;
 };
 
+/// Bytes of its own, or a part of a document that it keeps alive.
 struct DataPayload : Payload {
-  explicit DataPayload(Bytes content) noexcept : bytes(std::move(content)) {}
-  Bytes bytes;
+  explicit DataPayload(Bytes content) noexcept : own(std::move(content)), bytes(own) {}
+  DataPayload(std::shared_ptr<const Bytes> whole, ByteView part) noexcept : document(std::move(whole)), bytes(part) {}
+
+  const Bytes own;
+  const std::shared_ptr<const Bytes> document;
+  const ByteView bytes;
 };
 
 /// Content that holds values. Freed through `bury`, so that deep nesting does not take deep recursion.
@@ -155,6 +160,12 @@ struct Internals {
     std::memcpy(static_cast<void*>(&null.bits_), words.data(), sizeof null.bits_);
     null.bits_.length = static_cast<std::uint8_t>(size);
     null.bits_.type = Type::string;
+  }
+  /// Data that stays where it is, in `document`, and keeps it alive.
+  [[nodiscard]] static Value dataIn(std::shared_ptr<const Bytes> document, ByteView part) {
+    Value data;
+    data.store<Payload*>(Type::data, new DataPayload(std::move(document), part), Value::kShared);
+    return data;
   }
   static constexpr std::size_t kInlineCapacity = Value::kInlineCapacity;
   [[nodiscard]] static const void* bits(const Value& value) noexcept { return &value.bits_; }

@@ -8,7 +8,6 @@ namespace appsync {
 
 namespace {
 
-using platform::ClientIdentity;
 using platform::StoreMetadata;
 using platform::TransactionStep;
 using platform::TSInstallType;
@@ -68,20 +67,14 @@ bool provideAppAssetPromise(InstallPreparation& preparation) {
 /// What the preparation holds must not stay behind.
 void giveUp(const InstallPreparation& preparation) {
   const Error reason = syncError(SyncFailure::preparationFailed);
-  if (preparation.placeholder) {
-    preparation.log.message("%s|Cancelling placeholder for appBundleIdentifier:%{public}@", preparation.identifier);
-    preparation.placeholder->cancelForReason(reason, ClientIdentity::CXClientSync).ignore();
-  }
-  if (preparation.coordinator) {
-    preparation.log.message("%s|Cancelling coordinator for appBundleIdentifier:%{public}@", preparation.identifier);
-    preparation.coordinator->cancelForReason(reason, ClientIdentity::CXClientSync).ignore();
-  }
+  preparation.cancelPlaceholder(reason);
+  preparation.cancelCoordinator(reason);
 }
 
 }  // namespace
 
 bool AppsClient::prepareAppForInstallUsingCoordination(const ZTAsset& asset, bool existingApp) {
-  InstallPreparation preparation{*this, _platform, _log, asset};
+  InstallPreparation preparation{{*this, _platform, _log, asset.identifier()}, asset};
   const std::string& identifier = asset.identifier();
   _log.summary(
       "%s|processing app install for bundle '%{public}@', title %{public}@ assetplist %{public}@, version %{public}@ with install coordination",

@@ -8,6 +8,7 @@
 #include <map>
 #include <memory>
 #include <optional>
+#include <set>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -218,11 +219,47 @@ class AppsClient final : public platform::ZTClient,
   using PlaceholderVisitor = std::function<void(const platform::AppRecord& record, bool& stop)>;
 
   /// _placeholderExistsForApplication:
-  [[nodiscard]] bool _placeholderExistsForApplication(std::string_view bundleIdentifier);
+  /// Walks the registry, unless who asks about many apps brings what a walk has found.
+  [[nodiscard]] bool _placeholderExistsForApplication(std::string_view bundleIdentifier,
+                                                      const Identifiers* userBundles = nullptr);
   /// _enumeratePlaceholdersWithBlock: on the calling thread, before it returns.
   void _enumeratePlaceholdersWithBlock(const PlaceholderVisitor& visit);
   /// _getSystemAppPlaceholders
   [[nodiscard]] Identifiers _getSystemAppPlaceholders();
+
+  // ---- restore: what a host has left on a restored device
+  // -----------------------------------------------------------------
+
+  /// reconcileRestoreOfType:withError: never fails. Blocks for at most five seconds per placeholder.
+  bool reconcileRestoreOfType(std::int32_t restoreType, ErrorSlot error) override;
+  /// _processHarvoRestoreInfo: what came of the last app that there was something to do for; true without a file.
+  bool _processHarvoRestoreInfo();
+  /// _processHarvoRestoreInfoForApp:harvoMetaData:sinfData:iconData: builds a placeholder and has it installed. True,
+  /// too, for metadata that cannot be read.
+  bool _processHarvoRestoreInfoForApp(std::string_view bundleIdentifier, ByteView harvoMetaData,
+                                      const std::optional<ByteView>& sinfData, const std::optional<ByteView>& iconData);
+  /// _loadDemotedAppsPlist:withError: (class operation) the dictionary in that file; none, with a message unless the
+  /// file is absent or empty, when there is no such thing.
+  [[nodiscard]] static std::optional<plist::Dictionary> _loadDemotedAppsPlist(platform::Platform& platform,
+                                                                              std::string_view path, ErrorSlot error);
+
+  bool prepareAppForRestoreUsingCoordination(std::string_view bundleIdentifier, ByteView harvoMetadata,
+                                             const std::optional<ByteView>& sinfData,
+                                             const std::optional<ByteView>& iconData,
+                                             DemotionStatus demotionStatus) override;
+  /// _prepareNonDemotedAppForRestoreWithBundleId:harvoMetadata:sinfData:iconData:
+  bool _prepareNonDemotedAppForRestoreWithBundleId(std::string_view bundleIdentifier, ByteView harvoMetadata,
+                                                   const std::optional<ByteView>& sinfData,
+                                                   const std::optional<ByteView>& iconData);
+  /// _prepareDemotedAppForRestoreWithBundleId:harvoMetadata:sinfData:iconData:demotionStatus:
+  bool _prepareDemotedAppForRestoreWithBundleId(std::string_view bundleIdentifier, ByteView harvoMetadata,
+                                                const std::optional<ByteView>& sinfData,
+                                                const std::optional<ByteView>& iconData, DemotionStatus demotionStatus);
+  /// _placeHolderForBundleIdentifier:withHarvoMetadata:sinfData:iconData:demotionStatus: configured, the caller's; null
+  /// when it cannot be made.
+  [[nodiscard]] std::shared_ptr<platform::Placeholder> _placeHolderForBundleIdentifierWithHarvoMetadata(
+      std::string_view bundleIdentifier, const plist::Dictionary& harvoMetadata,
+      const std::optional<ByteView>& sinfData, const std::optional<ByteView>& iconData, DemotionStatus demotionStatus);
 
   /// dataMigratorSetPlaceHolderPromiseForRestoreAppBundle: that app's placeholder is awaited from now on.
   void dataMigratorSetPlaceHolderPromiseForRestoreAppBundle(std::string_view bundleIdentifier);
@@ -230,6 +267,14 @@ class AppsClient final : public platform::ZTClient,
   void dataMigratorCancelledCoordinatorForRestoreAppBundle(std::string_view bundleIdentifier);
   /// cnDidInstallPlaceHolderForAppBundle: it has come.
   void cnDidInstallPlaceHolderForAppBundle(std::string_view bundleIdentifier);
+
+  // ---- reporting
+  // -------------------------------------------------------------------------------------------------------
+
+  /// prepareForBackup: brings the store metadata of installed apps up to date.
+  void prepareForBackup() override;
+  /// disabledAssetTypes: "Application" where apps may be neither installed nor removed.
+  [[nodiscard]] std::optional<std::set<std::string>> disabledAssetTypes() override;
 
  private:
   /// The registrations of a new object.
@@ -244,6 +289,12 @@ class AppsClient final : public platform::ZTClient,
                                                                                  bool existingApp);
   void _satisfyAppAssetPromise(const platform::ZTAsset& asset,
                                const std::shared_ptr<platform::InstallCoordinator>& coordinator);
+  [[nodiscard]] bool _restoreApps(const plist::Dictionary& info);
+  void _waitForRestorePlaceholders();
+  /// The identifiers of installed apps and placeholders.
+  [[nodiscard]] Identifiers _userBundles();
+  [[nodiscard]] bool _buildRestorePlaceholder(const std::string& folder, const PlaceholderInfo& placeholder,
+                                              const std::optional<ByteView>& icon);
   [[nodiscard]] bool _stopAwaitingPlaceholder(std::string_view bundleIdentifier);
   [[nodiscard]] std::shared_ptr<platform::ZTAsset> _makeAsset(const WantedEntry& entry,
                                                               const std::optional<std::string>& displayName,
@@ -260,7 +311,8 @@ class AppsClient final : public platform::ZTClient,
   void _scheduleInstallRetry(const std::shared_ptr<platform::ZTAsset>& asset);
   void _cancelRestoreOfFailedInstall(const std::string& identifier);
   void _removeFailedInstall(const platform::ZTAsset& asset);
-  void _installPlaceholder(const std::string& folder, const PlaceholderInfo& placeholder);
+  bool _installPlaceholder(const std::string& folder, const PlaceholderInfo& placeholder, std::string_view scenario,
+                           const plist::Dictionary& options);
 
   /// The root of the restore state store: none when there is no file, null when it does not parse.
   [[nodiscard]] std::optional<plist::Value> _loadRestoreState();
@@ -287,8 +339,8 @@ class AppsClient final : public platform::ZTClient,
   Identifiers _updatingApps;
   Identifiers _userCancelledApps;
 
-  // Under `_restoreQueue`.
-  std::int64_t _restoringPlaceholderCount = 0;
+  // Changed under `_restoreQueue`; the wait reads the count without it.
+  std::atomic<std::int64_t> _restoringPlaceholderCount = 0;
   Identifiers _placeholdersForRestoringApps;
   bool _finishedWaitingForPlaceHolderInstalls = false;
 

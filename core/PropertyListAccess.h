@@ -21,6 +21,11 @@ namespace appsync {
   return text ? std::optional<std::string>(*text) : std::nullopt;
 }
 
+/// The bytes of data that `value`, which may be null, holds; none for any other type.
+[[nodiscard]] inline std::optional<ByteView> dataIn(const plist::Value* value) {
+  return value == nullptr ? std::nullopt : value->data();
+}
+
 /// False for what is absent or cannot give a boolean.
 [[nodiscard]] inline bool booleanIn(const plist::Value* value) {
   return value != nullptr && plist::truth(*value).value_or(false);

@@ -4,10 +4,24 @@
 
 namespace appsync {
 
+Result<plist::Dictionary> dictionaryOf(Result<plist::Value> read) {
+  if (!read) return std::move(read).error();
+  plist::Dictionary* dictionary = read->dictionary();
+  if (dictionary != nullptr) return std::move(*dictionary);
+  return Error{std::string(domains::kPropertyList), static_cast<long>(plist::Failure::malformed),
+               "The root is no dictionary", nullptr};
+}
+
 plist::Value readDictionary(platform::FileSystem& files, const std::optional<std::string>& path) {
-  const auto bytes = files.readFile(path.value_or(""));
-  auto root = bytes ? plist::read(*bytes) : plist::Value();
-  return root && root->dictionary() != nullptr ? std::move(root).value() : plist::Value();
+  auto bytes = files.readFile(path.value_or(""));
+  if (!bytes) return {};
+  auto dictionary = dictionaryOf(plist::read(std::move(bytes).value()));
+  return dictionary ? std::move(dictionary).value() : plist::Value();
+}
+
+Status writePropertyList(platform::FileSystem& files, std::string_view path, const plist::Value& root) {
+  const auto bytes = plist::writeXML(root);
+  return bytes ? files.writeFileAtomically(path, *bytes) : Status(bytes.error());
 }
 
 }  // namespace appsync

@@ -18,7 +18,11 @@ Result<plist::Value> readBinaryOrXML(ByteView document) {
 
 bool isValidBundleIdentifier(const plist::Value* value) {
   const auto text = stringIn(value);
-  return text && text->find("/..") == std::string_view::npos;
+  return text && isValidBundleIdentifier(*text);
+}
+
+bool isValidBundleIdentifier(std::string_view text) {
+  return text.find("/..") == std::string_view::npos;
 }
 
 std::optional<plist::Array> AppsClient::_loadPlist(platform::Platform& platform, std::string_view path,

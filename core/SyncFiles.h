@@ -51,5 +51,6 @@ inline constexpr std::string_view kFailed = "FAILED";
 /// Whether `value`, which may be null, may serve as an identifier or a path from the host: a string without "/.." in
 /// it.
 [[nodiscard]] bool isValidBundleIdentifier(const plist::Value* value);
+[[nodiscard]] bool isValidBundleIdentifier(std::string_view text);
 
 }  // namespace appsync

@@ -31,6 +31,7 @@ class AppRecord final : public platform::AppRecord {
   [[nodiscard]] platform::TSInstallType installType() const override;
   [[nodiscard]] bool isInstalled() const override { return row_.installed.has_value(); }
   [[nodiscard]] bool isPlaceholder() const override { return row_.placeholder.has_value(); }
+  [[nodiscard]] bool hasMIDBasedSINF() const override { return row_.hasDeviceBoundLicence; }
   [[nodiscard]] std::shared_ptr<platform::InstallProgress> installProgress() const override { return progress_; }
   /// "com.example.notes 1.2 (installed, placeholder)"
   [[nodiscard]] std::string description() const override;

@@ -1,5 +1,7 @@
 #include "device/AppTable.h"
 
+#include "device/Licence.h"
+
 namespace appsync::device::app_table {
 
 namespace {
@@ -8,12 +10,13 @@ namespace {
 constexpr std::string_view kSelect = R"(
 select a.position, a.identifier, a.application_type, a.run_state, a.run_phase, a.run_total, a.run_completed,
        i.container, i.folder, i.name, i.version, i.install_type, i.bytes, i.installed_at,
-       p.container, p.folder, p.name, p.version, p.install_type, p.bytes, p.installed_at
+       p.container, p.folder, p.name, p.version, p.install_type, p.bytes, p.installed_at, coalesce(i.licence, p.licence)
 from apps a left join bundles i on i.app = a.position and i.role = 0
             left join bundles p on p.app = a.position and p.role = 1)";
 constexpr int kProgressColumn = 3;
 constexpr int kInstalledColumn = 7;
 constexpr int kPlaceholderColumn = 14;
+constexpr int kLicenceColumn = 21;
 
 std::optional<StoredBundle> bundleAt(const Statement& query, int column) {
   if (query.isNull(column)) return std::nullopt;
@@ -43,6 +46,7 @@ AppRow rowAt(const Statement& query) {
   row.progress = progressAt(query, kProgressColumn);
   row.installed = bundleAt(query, kInstalledColumn);
   row.placeholder = bundleAt(query, kPlaceholderColumn);
+  row.hasDeviceBoundLicence = isDeviceBound(query.blob(kLicenceColumn));
   return row;
 }
 

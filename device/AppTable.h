@@ -42,6 +42,7 @@ struct AppRow {
   std::string applicationType;
   std::optional<StoredBundle> installed;
   std::optional<StoredBundle> placeholder;
+  bool hasDeviceBoundLicence = false;
   std::optional<ProgressValues> progress;
 
   [[nodiscard]] const std::optional<StoredBundle>& bundle(BundleRole role) const noexcept {

@@ -14,7 +14,7 @@ Error badOption(std::string_view key, std::string_view advice) {
 
 Result<std::optional<Bytes>> bytesUnder(const plist::Dictionary& options, std::string_view key) {
   const plist::Value* value = options.find(key);
-  if (value == nullptr) return std::optional<Bytes>();
+  if (value == nullptr || value->isNull()) return std::optional<Bytes>();
   const std::optional<ByteView> data = value->data();
   if (!data) return badOption(key, "must be data");
   return std::optional(Bytes(data->begin(), data->end()));

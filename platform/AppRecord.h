@@ -55,6 +55,9 @@ class AppRecord : public BundleRecord {
   /// A package is still to come.
   [[nodiscard]] virtual bool isPlaceholder() const = 0;
 
+  /// Whether its licence data is bound to this device: such an app cannot be used on another one it is restored to.
+  [[nodiscard]] virtual bool hasMIDBasedSINF() const = 0;
+
   /// Live progress of the running install, or null when none runs.
   [[nodiscard]] virtual std::shared_ptr<InstallProgress> installProgress() const = 0;
 };

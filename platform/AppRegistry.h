@@ -69,7 +69,7 @@ class AppRegistry {
   /// it; a placeholder (`PackageTypePlaceholder`, `location` is an app folder) becomes a placeholder, and leaves an
   /// installed app of that identifier whole and usable until its package comes. `BundleIdentifierKey` names the app and
   /// must agree with what is installed; `InstallTypeKey`, `StoreMetadataKey` and `LicenceDataKey` are kept with the
-  /// record.
+  /// record; a null under one of these two is as none.
   ///
   /// The location is read, never changed, and needed only during the call. Atomic: after a failure, or a crash at any
   /// moment, the app is as it was before. Errors: `InstallerErrorDomain`, or "POSIX" where the system failed.

@@ -1,9 +1,11 @@
 // What the sync daemon asks of a client that syncs one dataclass.
 #pragma once
 
+#include <cstdint>
 #include <functional>
 #include <memory>
 #include <optional>
+#include <set>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -20,14 +22,18 @@ using ProgressCallback = std::function<void(double fraction)>;
 /// What the daemon posts, system-wide, once it is up and its clients are made.
 inline constexpr std::string_view kZTStartupCompleteNotification = "com.corvel.zeph.ZTStartupCompleteNotification";
 
+/// The restore type of a device that a host has restored. Others are the daemon's own.
+inline constexpr std::int32_t kRestoreTypeHost = 2;
+
 /// The daemon drives a client with these calls, one sync at a time and in this order: `prepareForSyncWithHostAnchor`,
 /// `installedAssets`, `reconcileSync`, `outstandingAssetTransfers`, the transfers' reports,
 /// `assetTransferEndedWithSuccess`, `syncEndedWithSuccess`. `clearSyncData` and the questions may come at any time
-/// between syncs.
+/// between syncs. `reconcileRestoreOfType` comes once after a restore, before the first sync.
 ///
 /// Threads: calls come from the daemon's threads, not two at once, but for the reports on different assets' transfers
 /// of which several may run side by side. They run synchronously; `assetTransferEndedWithSuccess` blocks until all
-/// installs are done, so none may be made from work of the client's own. Errors: slots may be null; only a false result
+/// installs are done and `reconcileRestoreOfType` waits for placeholders, so none may be made from work of the client's
+/// own. Errors: slots may be null; only a false result
 /// makes what is in one an answer.
 class ZTClient {
  public:
@@ -49,6 +55,13 @@ class ZTClient {
   virtual void assetTransferEndedWithSuccess(bool success) = 0;
   virtual void syncEndedWithSuccess(bool success) = 0;
   virtual void clearSyncData() = 0;
+
+  /// Takes up what the host left on a restored device.
+  virtual bool reconcileRestoreOfType(std::int32_t restoreType, ErrorSlot error) = 0;
+  /// The device is about to be backed up.
+  virtual void prepareForBackup() = 0;
+  /// The dataclasses that this device cannot sync at all as it is set up; none when there is no such.
+  [[nodiscard]] virtual std::optional<std::set<std::string>> disabledAssetTypes() = 0;
 };
 
 }  // namespace appsync::platform

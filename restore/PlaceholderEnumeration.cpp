@@ -17,16 +17,23 @@ const AppRecord* asPlaceholder(const BundleRecord& bundle) {
 
 }  // namespace
 
-bool AppsClient::_placeholderExistsForApplication(std::string_view bundleIdentifier) {
+bool AppsClient::_placeholderExistsForApplication(std::string_view bundleIdentifier, const Identifiers* userBundles) {
   if (_useInstallCoordinator) return false;  // Coordinators own the placeholders then.
-  bool found = false;
-  _platform.defaultRegistry().enumerateBundlesOfType(BundleKind::User, [&](const BundleRecord& bundle, bool& stop) {
-    if (bundle.applicationIdentifier() != bundleIdentifier) return;
-    found = true;
-    _log.message("%s|Found placeholder for bundle %{public}@", bundleIdentifier);
-    stop = true;
-  });
+  bool found = userBundles != nullptr && userBundles->contains(bundleIdentifier);
+  if (userBundles == nullptr) {
+    _platform.defaultRegistry().enumerateBundlesOfType(BundleKind::User, [&](const BundleRecord& bundle, bool& stop) {
+      found = stop = bundle.applicationIdentifier() == bundleIdentifier;
+    });
+  }
+  if (found) _log.message("%s|Found placeholder for bundle %{public}@", bundleIdentifier);
   return found;
+}
+
+Identifiers AppsClient::_userBundles() {
+  Identifiers identifiers;
+  _platform.defaultRegistry().enumerateBundlesOfType(
+      BundleKind::User, [&](const BundleRecord& bundle, bool&) { identifiers.insert(bundle.applicationIdentifier()); });
+  return identifiers;
 }
 
 void AppsClient::_enumeratePlaceholdersWithBlock(const PlaceholderVisitor& visit) {

@@ -10,7 +10,7 @@ void AppsClient::dataMigratorSetPlaceHolderPromiseForRestoreAppBundle(std::strin
     ++_restoringPlaceholderCount;
     _log.message(
         "%s|DataMigrator will wait for CN to install placeholder for %{public}@, _restoringPlaceholderCount %lld",
-        bundleIdentifier, _restoringPlaceholderCount);
+        bundleIdentifier, _restoringPlaceholderCount.load());
   });
 }
 
@@ -19,7 +19,7 @@ void AppsClient::dataMigratorCancelledCoordinatorForRestoreAppBundle(std::string
     if (!_stopAwaitingPlaceholder(bundleIdentifier)) return;
     _log.message(
         "%s|DataMigrator cancelled coordinator for restoring app bundle %{public}@ _restoringPlaceholderCount %lld",
-        bundleIdentifier, _restoringPlaceholderCount);
+        bundleIdentifier, _restoringPlaceholderCount.load());
   });
 }
 
@@ -28,7 +28,7 @@ void AppsClient::cnDidInstallPlaceHolderForAppBundle(std::string_view bundleIden
     if (_finishedWaitingForPlaceHolderInstalls) return;
     if (_stopAwaitingPlaceholder(bundleIdentifier)) {
       _log.message("%s|CN finished installing placeholder for %{public}@, _restoringPlaceholderCount %lld",
-                   bundleIdentifier, _restoringPlaceholderCount);
+                   bundleIdentifier, _restoringPlaceholderCount.load());
     } else {
       _log.error("%s|Ignoring notification from CN about installing placeholder for %{public}@", bundleIdentifier);
     }

@@ -1,6 +1,7 @@
 // Where restored packages lie, by app and version, across restarts of the daemon.
 #include "core/AppsClient.h"
 #include "core/PropertyListAccess.h"
+#include "core/PropertyListFile.h"
 #include "restore/RestoreState.h"
 
 namespace appsync {
@@ -8,11 +9,6 @@ namespace appsync {
 namespace {
 
 constexpr std::string_view kRestoreStatePath = "/var/mobile/Library/ApplicationSync/RestoreState.plist";
-
-void writeAtomically(platform::FileSystem& files, const plist::Value& root) {
-  const auto bytes = plist::writeXML(root);
-  if (bytes) files.writeFileAtomically(kRestoreStatePath, *bytes).ignore();
-}
 
 /// The dictionary under `key`, made if there is none; null when something else is there.
 plist::Dictionary* dictionaryUnder(plist::Dictionary& parent, std::string_view key) {
@@ -53,7 +49,7 @@ void AppsClient::_setRestoreStatePropertyValue(const plist::Value& value, std::s
   plist::Dictionary* properties = versions == nullptr ? nullptr : dictionaryUnder(*versions, *versionKey);
   if (properties == nullptr) return;
   properties->set(key, value);
-  writeAtomically(_platform.fileSystem(), root);
+  writePropertyList(_platform.fileSystem(), kRestoreStatePath, root).ignore();
 }
 
 void AppsClient::cleanRestoreStateForIdentifier(std::string_view identifier) {
@@ -64,7 +60,7 @@ void AppsClient::cleanRestoreStateForIdentifier(std::string_view identifier) {
   if (identifiers == nullptr || identifiers->empty()) {
     _platform.fileSystem().removeItem(kRestoreStatePath).ignore();
   } else {
-    writeAtomically(_platform.fileSystem(), *root);
+    writePropertyList(_platform.fileSystem(), kRestoreStatePath, *root).ignore();
   }
 }
 

@@ -16,14 +16,9 @@ PlaceholderInfo describePlaceholder(const platform::ZTAsset& asset, const plist:
   const plist::Value* isPeriodical = hostInfo.find(kPeriodicalKey);
   return {.bundleIdentifier = asset.identifier(),
           .version = asset.variantOptions().find(platform::kAssetVersionKey),
-          .displayName = asset.prettyName().value_or(""),
+          .displayName = asset.prettyName(),
           .isPeriodical = isPeriodical == nullptr ? plist::Value(false) : *isPeriodical,
           .isLaunchProhibited = booleanIn(hostInfo.find(kLaunchProhibitedKey))};
-}
-
-Status writeInfo(platform::FileSystem& files, const std::string& path, const plist::Value& info) {
-  const auto bytes = plist::writeXML(info);
-  return bytes ? files.writeFileAtomically(path, *bytes) : Status(bytes.error());
 }
 
 }  // namespace
@@ -72,7 +67,7 @@ void AppsClient::_createPlaceHolderApplication(const platform::ZTAsset& asset) {
   platform::FileSystem& files = _platform.fileSystem();
   _log.message("%s|plist %{public}@", asset.infoPlist());
   const PlaceholderInfo placeholder = describePlaceholder(asset, readDictionary(files, asset.infoPlist()));
-  if (placeholder.displayName.empty() || identifier.empty()) return;
+  if (placeholder.displayName.value_or("").empty() || identifier.empty()) return;
 
   const std::string folder = placeholderAppPathForBundleIdentifier(identifier);
   if (!createPlaceHolderPath(folder, identifier, kMobileOwner)) return;
@@ -85,18 +80,15 @@ void AppsClient::_createPlaceHolderApplication(const platform::ZTAsset& asset) {
     }
   }
   const plist::Value info = placeholder.dictionary();
-  if (!writeInfo(files, folder + "/" + std::string(kInfoPlistName), info)) return;
-  _log.message("%s|creating placeholder for '%{public}@'. info.plist=%{public}@", identifier, info);
-  _installPlaceholder(folder, placeholder);
+  if (!writePropertyList(files, folder + "/" + std::string(kInfoPlistName), info)) return;
+  _log.message(kCreatingPlaceholder, identifier, info);
+  _installPlaceholder(folder, placeholder, "Install placeholder", placeholder.installOptions(TSInstallType::Sync));
 }
 
-void AppsClient::_installPlaceholder(const std::string& folder, const PlaceholderInfo& placeholder) {
-  constexpr std::string_view kScenario = "Install placeholder";
+bool AppsClient::_installPlaceholder(const std::string& folder, const PlaceholderInfo& placeholder,
+                                     std::string_view scenario, const plist::Dictionary& options) {
   const std::string& identifier = placeholder.bundleIdentifier;
-  const Status installed = _platform.defaultRegistry().installApplication(
-      FileLocation{folder, true}, {{platform::PackageTypeKey, platform::PackageTypePlaceholder},
-                                   {platform::BundleIdentifierKey, identifier},
-                                   {platform::InstallTypeKey, static_cast<std::uint64_t>(TSInstallType::Sync)}});
+  const Status installed = _platform.defaultRegistry().installApplication(FileLocation{folder, true}, options);
   if (installed) {
     _log.message(
         "%s|Installed Placeholder app from path %{public}@: %{public}@ [%{public}@ %{public}@] [isPeriodix: %{public}@]",
@@ -106,8 +98,9 @@ void AppsClient::_installPlaceholder(const std::string& folder, const Placeholde
         "%s|Placeholder app install failed from path %{public}@: %{public}@ [%{public}@ %{public}@] [isPeriodix: %{public}@]",
         folder, placeholder.displayName, identifier, placeholder.version, placeholder.isPeriodical);
   }
-  _platform.transactionLog().logScenario(kScenario, 0, installed.ok(), identifier,
+  _platform.transactionLog().logScenario(scenario, 0, installed.ok(), identifier,
                                          installed ? "Installed placeholder" : "Failed to install placeholder");
+  return installed.ok();
 }
 
 }  // namespace appsync

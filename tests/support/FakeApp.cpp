@@ -63,6 +63,10 @@ FakeApp FakeApp::withInstallType(platform::TSInstallType type) const {
   return changed(*this, [&](FakeApp& app) { app.installType = type; });
 }
 
+FakeApp FakeApp::withMIDBasedSINF() const {
+  return changed(*this, [](FakeApp& app) { app.hasMIDBasedSINF = true; });
+}
+
 FakeApp FakeApp::withProgress(platform::TSInstallState state, platform::TSInstallPhase phase) const {
   return changed(
       *this, [&](FakeApp& app) { app.progress = std::make_shared<FakeInstallProgress>(app.identifier, state, phase); });

@@ -25,6 +25,8 @@ struct FakeApp {
   platform::TSInstallType installType = platform::TSInstallType::None;
   bool isInstalled = false;
   bool isPlaceholder = false;
+  /// Whether its licence data is bound to the device.
+  bool hasMIDBasedSINF = false;
   /// Live; null when no install runs.
   std::shared_ptr<FakeInstallProgress> progress;
   /// Of the latest install: what came with it.
@@ -47,6 +49,7 @@ struct FakeApp {
   [[nodiscard]] FakeApp withBundlePath(std::optional<std::string> value) const;
   [[nodiscard]] FakeApp ofType(std::string_view type) const;
   [[nodiscard]] FakeApp withInstallType(platform::TSInstallType type) const;
+  [[nodiscard]] FakeApp withMIDBasedSINF() const;
   [[nodiscard]] FakeApp withProgress(platform::TSInstallState state, platform::TSInstallPhase phase) const;
   [[nodiscard]] FakeApp withoutProgress() const;
 };
@@ -66,6 +69,7 @@ class FakeAppRecord final : public platform::AppRecord {
   [[nodiscard]] platform::TSInstallType installType() const override { return app_.installType; }
   [[nodiscard]] bool isInstalled() const override { return app_.isInstalled; }
   [[nodiscard]] bool isPlaceholder() const override { return app_.isPlaceholder; }
+  [[nodiscard]] bool hasMIDBasedSINF() const override { return app_.hasMIDBasedSINF; }
   [[nodiscard]] std::shared_ptr<platform::InstallProgress> installProgress() const override { return app_.progress; }
 
  private:
