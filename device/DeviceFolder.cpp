@@ -29,7 +29,8 @@ constexpr std::array<std::string_view, 7> kBeginnings = {kLockFile,
                                                          "device.db.new-journal"};
 
 /// Folders that other components of a device expect.
-constexpr std::array<std::string_view, 4> kDeviceFolders = {kContainersPath, DeviceFileSystem::kTemporaryDirectory,
+constexpr std::array<std::string_view, 5> kDeviceFolders = {kContainersPath, DeviceFileSystem::kTemporaryDirectory,
+                                                            "/var/mobile/Library/Logs/MediaServices",
                                                             "/var/mobile/Library/Preferences",
                                                             "/var/mobile/Media/PublicStaging"};
 
