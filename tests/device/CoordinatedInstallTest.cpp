@@ -16,7 +16,6 @@ namespace {
 
 using device::CoordinationFailure;
 using device::InstallerFailure;
-using platform::ClientIdentity;
 using platform::TSInstallPhase;
 using platform::TSInstallState;
 using platform::TSInstallType;

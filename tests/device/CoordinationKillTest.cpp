@@ -19,7 +19,7 @@ void stagePackage(TestDevice& device, std::string_view version) {
 /// Checks that what there is of the app fits together, and gives its state.
 std::string consistentState(TestDevice& device) {
   CoordinationClient client(device);
-  const std::string state = versionOf(device, "com.a");
+  std::string state = versionOf(device, "com.a");
   const auto coordinator = client.find("com.a");
   const bool isPromised = coordinator != nullptr && coordinator->hasPlaceholderPromise();
   EXPECT_EQ(state.ends_with(" placeholder"), isPromised) << state;

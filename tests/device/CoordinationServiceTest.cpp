@@ -13,7 +13,6 @@ namespace {
 
 using device::CoordinationFailure;
 using device::CoordinatorPhase;
-using platform::ClientIdentity;
 using platform::IfMissing;
 using platform::TSInstallType;
 using testing::ElementsAre;
