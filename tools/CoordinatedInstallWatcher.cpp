@@ -99,7 +99,9 @@ class CoordinatedInstallWatcher final : public InstallWatcher, private platform:
       if (package.app.identifier != identifier) return std::nullopt;
       return outcomeOf(ending, package);
     });
-    if (!wasSent) early_.insert_or_assign(identifier, ending);
+    if (wasSent) return;
+    early_.insert_or_assign(identifier, ending);
+    if (ending.isCancelled) progress_.finishExpected(identifier, AppEvent::skipped, kCancelledOnDevice);
   }
 
   void look() {

@@ -62,6 +62,17 @@ bool SyncProgress::finish(const AppOutcome& outcome) {
   return true;
 }
 
+void SyncProgress::finishExpected(std::string_view identifier, AppEvent event, std::string_view reason) {
+  AppOutcome outcome = {event, {}, std::string(reason)};
+  {
+    const std::lock_guard lock(mutex_);
+    const auto found = running_.find(identifier);
+    if (found == running_.end()) return;
+    outcome.app = found->second.app;
+  }
+  finish(outcome);
+}
+
 bool SyncProgress::isFinished(std::string_view identifier) {
   const std::lock_guard lock(mutex_);
   return finished_.find(identifier) != finished_.end();

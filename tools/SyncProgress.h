@@ -33,6 +33,8 @@ class SyncProgress {
 
   /// The app's end. Only the first one of an identifier counts; returns whether it was that.
   bool finish(const AppOutcome& outcome);
+  /// The same for an app that is expected, named as it was then; does nothing for others.
+  void finishExpected(std::string_view identifier, AppEvent event, std::string_view reason);
   [[nodiscard]] bool isFinished(std::string_view identifier);
 
   /// Tells the reporter that it was all. The outcomes, in the order in which they came.

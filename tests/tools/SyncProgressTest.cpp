@@ -79,6 +79,18 @@ TEST_F(Progress, OnlyTheFirstEndOfAnAppCounts) {
   EXPECT_EQ(progress_.summarise().front().event, AppEvent::installed);
 }
 
+TEST_F(Progress, AnExpectedAppEndsUnderTheNameItWasExpectedBy) {
+  progress_.expect({"a", "Notes", "1.0"}, 1);
+  progress_.finishExpected("a", AppEvent::skipped, "reason");
+  progress_.finishExpected("b", AppEvent::skipped, "reason");
+  EXPECT_FALSE(finish("a"));
+  const AppOutcomes& outcomes = progress_.summarise();
+  ASSERT_EQ(outcomes.size(), 1U);
+  EXPECT_EQ(outcomes[0].app.name, "Notes");
+  EXPECT_EQ(outcomes[0].event, AppEvent::skipped);
+  EXPECT_EQ(outcomes[0].reason, "reason");
+}
+
 TEST_F(Progress, AFailureIsNotShownAsComplete) {
   expect("a", 1);
   finish("a", AppEvent::failed);

@@ -59,6 +59,7 @@ TEST_F(TapAndCancel, ACancelledAppIsNotSentAndSkipped) {
   EXPECT_THAT(apps(), Not(Contains("org.c 1.0?")));
   hold.letGo();
   const RecordingReporter& told = sync.finish();
+  EXPECT_EQ(told.ended.front(), "skipped org.c: cancelled on the device") << "it is told late";
   EXPECT_THAT(told.sent, ElementsAre("org.a", "org.b", "org.d"));
   EXPECT_THAT(told.ended, UnorderedElementsAre("installed org.a", "installed org.b", "installed org.d",
                                                "skipped org.c: cancelled on the device"));
