@@ -56,6 +56,19 @@ class AppRegistry final : public platform::AppRegistry {
   [[nodiscard]] Status installSystemApplication(const platform::FileLocation& location,
                                                 const plist::Dictionary& options);
 
+  /// Makes an installed app a demoted one: its package goes, a placeholder of `type` stays with its icon, name,
+  /// version, store metadata and licence, and its data stays. Fails for an app that is not installed, or is being
+  /// updated.
+  [[nodiscard]] Status demote(std::string_view bundleIdentifier, platform::TSInstallType type) {
+    return installer_.demote(bundleIdentifier, type);
+  }
+
+  /// Says anew why there is a placeholder of an app that is not installed: a demoted app's install does not wait for a
+  /// package, a restored app's does.
+  [[nodiscard]] Status setPlaceholderType(std::string_view bundleIdentifier, platform::TSInstallType type) {
+    return installer_.setPlaceholderType(bundleIdentifier, type);
+  }
+
   /// A running install of the app comes before all others.
   void prioritizeInstall(std::string_view bundleIdentifier) { running_->prioritize(bundleIdentifier); }
 

@@ -17,6 +17,11 @@ namespace appsync::device {
 /// An app has up to two bundles: the one that is installed, and the placeholder for a package still to come.
 enum class BundleRole : std::uint8_t { installed, placeholder };
 
+/// Whether a placeholder of that type stands for a demoted app: nobody is about to bring its package.
+[[nodiscard]] constexpr bool isDemotion(platform::TSInstallType type) noexcept {
+  return type == platform::TSInstallType::Downgrade || type == platform::TSInstallType::IntentionalDowngrade;
+}
+
 struct StoredBundle {
   std::string container;  ///< the container's name
   std::string folder;     ///< the bundle's, in the container

@@ -1,25 +1,25 @@
 #include "device/BackupManager.h"
 
-#include "device/Database.h"
-
 namespace appsync::device {
 
-Status BackupManager::keepRestoreData(std::string_view bundleIdentifier, std::uint64_t size) {
+Status BackupManager::keepRestoreData(std::string_view bundleIdentifier, const std::string& hostFolder) {
+  return app_data::keep(files_, database_, bundleIdentifier, hostFolder);
+}
+
+Status BackupManager::restoreDataNow(std::string_view bundleIdentifier) {
+  if (Status given = app_data::giveBack(files_, database_, bundleIdentifier); !given) return given;
   Database::Session session(database_);
-  return session.run("insert or replace into restore_data values (?, ?)", bundleIdentifier, size);
+  return app_data::forget(session, bundleIdentifier);
 }
 
 bool BackupManager::restoreDataExists(std::string_view bundleIdentifier, std::uint64_t* size) {
   Database::Session session(database_);
-  Statement data = session.prepare("select size from restore_data where identifier = ?", bundleIdentifier);
-  if (!data.next()) return false;
-  if (size != nullptr) *size = static_cast<std::uint64_t>(data.integer(0));
-  return true;
+  const Result<bool> kept = app_data::isKept(session, bundleIdentifier, size);
+  return kept && *kept;
 }
 
 bool BackupManager::cancelApplicationRestore(std::string_view bundleIdentifier, ErrorSlot error) {
-  Database::Session session(database_);
-  const Status dropped = session.run("delete from restore_data where identifier = ?", bundleIdentifier);
+  const Status dropped = app_data::drop(files_, database_, bundleIdentifier);
   if (!dropped) setError(error, dropped.error());
   return dropped.ok();
 }

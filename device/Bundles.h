@@ -15,6 +15,8 @@ class Bundles final : public platform::Bundles {
  public:
   /// The bundle of the daemon's own process.
   static constexpr std::string_view kDaemonIdentifier = "com.corvel.zeph";
+  /// That of the process that sets a restored device up.
+  static constexpr std::string_view kDataMigratorIdentifier = "com.corvel.datamigrator";
 
   /// `fileSystem` must outlive this. `mainBundleIdentifier` is whose process this is; a tool that plays the daemon
   /// leaves it as it is.
@@ -27,9 +29,12 @@ class Bundles final : public platform::Bundles {
 
   [[nodiscard]] std::optional<std::string> mainBundleIdentifier() override { return mainBundleIdentifier_; }
 
+  /// From now on the process counts as that one. Not beside other calls.
+  void actAs(std::string mainBundleIdentifier) { mainBundleIdentifier_ = std::move(mainBundleIdentifier); }
+
  private:
   platform::FileSystem& fileSystem_;
-  const std::optional<std::string> mainBundleIdentifier_;
+  std::optional<std::string> mainBundleIdentifier_;
 };
 
 }  // namespace appsync::device

@@ -46,6 +46,7 @@ void Coordinators::begin() {
     const auto progress = registry_.runningInstalls().find(coordinator->identifier);
     if (progress != nullptr) progress->setInstallState(TSInstallState::Waiting);
     advance(coordinator);
+    endIfDemoted(coordinator);
   }
 }
 

@@ -61,6 +61,7 @@ void Coordinators::fulfil(const std::shared_ptr<PromiseState>& promise) {
   if (promise->role == PromiseRole::icon && coordinator->showsPlaceholder()) {
     if (coordinator->stage == CoordinatorStage::waiting) show(*coordinator->placeholder, store).ignore();
     followPromise(*coordinator);
+    endIfDemoted(coordinator);
     return;
   }
   // What cannot be stored is complete all the same, for as long as the service lives.
@@ -124,6 +125,7 @@ Status Coordinators::configure(const std::shared_ptr<PlaceholderState>& placehol
   if (!isToShow) return {};
   tell(coordinator, &InstallObserverDelegate::coordinatorDidInstallPlaceholder);
   followPromise(*coordinator);
+  endIfDemoted(coordinator);
   return {};
 }
 

@@ -198,7 +198,20 @@ Status Coordinators::setPlaceholder(const Coordinator& coordinator, ClientIdenti
   if (placeholder->isConfigured) tell(coordinator, &InstallObserverDelegate::coordinatorDidInstallPlaceholder);
   followPromise(*coordinator);
   advance(coordinator);
+  endIfDemoted(coordinator);
   return {};
+}
+
+void Coordinators::endIfDemoted(const Coordinator& coordinator) {
+  const bool hasDone = coordinator->kind == CoordinatorKind::restoringDemoted && coordinator->showsPlaceholder() &&
+                       coordinator->appAsset == nullptr && coordinator->stage == CoordinatorStage::waiting;
+  if (!hasDone) return;
+  const auto& icon = coordinator->placeholder->icon;
+  if (icon && icon->canChange() && !icon->isComplete) return;
+  Database::Transaction transaction(database_);
+  coordinator_table::remove(transaction, *coordinator).ignore();
+  // What cannot be stored now ends when the device is opened next.
+  if (transaction.commit()) close(coordinator, std::nullopt);
 }
 
 Status Coordinators::show(const PlaceholderState& placeholder, const Store& store) {

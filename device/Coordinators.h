@@ -129,6 +129,8 @@ class Coordinators : public std::enable_shared_from_this<Coordinators> {
   void close(const Coordinator& coordinator, std::optional<Error> error);
   [[nodiscard]] CoordinatorList ofApp(std::string_view identifier) const;
   [[nodiscard]] bool isInstalling(std::string_view identifier) const;
+  /// Ends one that restores a demoted app, once its placeholder is shown: nobody brings a package.
+  void endIfDemoted(const Coordinator& coordinator);
   /// Shows the placeholder again if nothing does.
   void keepShown(const CoordinatorState& coordinator);
   void tell(const Coordinator& coordinator, Report report);

@@ -32,7 +32,7 @@ Result<std::int64_t> readNumber(Database& database, std::string_view question) {
 /// Devices made by earlier versions of this layout lack tables that came later.
 Status makeMissingTables(Database& database) {
   const Result<std::int64_t> newest =
-      readNumber(database, "select count(*) from sqlite_schema where name = 'coordinators'");
+      readNumber(database, "select count(*) from sqlite_schema where name = 'removed_data'");
   if (!newest) return newest.error();
   if (*newest == 1) return {};
   Database::Transaction transaction(database);

@@ -7,6 +7,7 @@
 
 #include <fcntl.h>
 
+#include "device/AppData.h"
 #include "device/DatabaseError.h"
 #include "device/FileTree.h"
 #include "device/InstallerError.h"
@@ -166,12 +167,19 @@ Status Installer::installPlaceholder(const platform::FileLocation& location, con
 Status Installer::recordPlaceholder(NewContainer& container, const InstallRequest& request,
                                     std::string_view applicationType, StoredBundle bundle) {
   if (Status done = record(container, request, applicationType, std::move(bundle)); !done) return done;
-  running_.begin(known(request.identifier), {});
+  if (request.installType && isDemotion(*request.installType)) {
+    running_.end(request.identifier, TSInstallState::Finished);
+  } else {
+    running_.begin(known(request.identifier), {});
+  }
   return {};
 }
 
 Status Installer::record(NewContainer& container, const InstallRequest& request, std::string_view applicationType,
                          StoredBundle bundle) {
+  if (request.role == BundleRole::installed) {
+    if (Status given = app_data::giveBack(files_, database_, request.identifier); !given) return given;
+  }
   if (Status settled = container.settle(); !settled) return settled;
   const Durability durability = durabilityFor(replacedBy(request.role, known(request.identifier)));
   AppRow before;
@@ -190,6 +198,7 @@ Status Installer::record(NewContainer& container, const InstallRequest& request,
     if (request.role == BundleRole::installed) {
       app_table::remove(transaction, before, BundleRole::placeholder).ignore();
       UninstalledApps::remove(transaction, request.identifier).ignore();
+      app_data::forget(transaction, request.identifier).ignore();
     }
     if (request.alongside) request.alongside(transaction);
     if (Status committed = transaction.commit(); !committed) return asSystemError(committed.error());
@@ -222,9 +231,11 @@ Status Installer::uninstall(std::string_view bundleIdentifier, const plist::Dict
       UninstalledApps::add(transaction, bundleIdentifier).ignore();
     }
     app_table::remove(transaction, app, BundleRole::placeholder).ignore();
+    if (role == BundleRole::installed) app_data::markRemoved(transaction, bundleIdentifier).ignore();
     if (alongside) alongside(transaction);
     if (Status committed = transaction.commit(); !committed) return asSystemError(committed.error());
   }
+  if (role == BundleRole::installed) app_data::sweepRemoved(files_, database_, bundleIdentifier);
   if (app.placeholder || role == BundleRole::installed) running_.end(bundleIdentifier, TSInstallState::Canceled);
   for (const StoredBundle* removed : replacedBy(role, app))
     removeContainer(files_, removed->container);

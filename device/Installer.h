@@ -30,9 +30,13 @@ class Installer {
   [[nodiscard]] Status installPackage(const platform::FileLocation& location, const InstallRequest& request,
                                       std::string_view applicationType);
 
-  /// Makes a filled container the app's placeholder, whose install waits from now on.
+  /// Makes a filled container the app's placeholder, whose install waits from now on unless the app is demoted.
   [[nodiscard]] Status recordPlaceholder(NewContainer& container, const InstallRequest& request,
                                          std::string_view applicationType, StoredBundle bundle);
+
+  /// As `AppRegistry::demote` and `AppRegistry::setPlaceholderType`.
+  [[nodiscard]] Status demote(std::string_view bundleIdentifier, platform::TSInstallType type);
+  [[nodiscard]] Status setPlaceholderType(std::string_view bundleIdentifier, platform::TSInstallType type);
 
   /// As `platform::AppRegistry::uninstallApplication`.
   [[nodiscard]] Status uninstall(std::string_view bundleIdentifier, const plist::Dictionary& options,

@@ -9,6 +9,7 @@
 #include <fcntl.h>
 #include <sys/stat.h>
 
+#include "device/AppData.h"
 #include "device/AppRecord.h"
 #include "device/AppTable.h"
 #include "device/BundleInfo.h"
@@ -157,6 +158,7 @@ Status recover(Database& database, DeviceFileSystem& files, Settings& settings) 
     return reconciled;
   }
   if (Status swept = sweepPackages(database, files, packages); !swept) return swept;
+  if (Status data = app_data::recover(files, database); !data) return data;
   int number = sweepContainers(containers->get(), kept, files.work());
   if (number == 0) number = tree::empty(temporary->get(), files.work());
   if (number == 0) number = tree::empty(files.work(), files.work());

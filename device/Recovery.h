@@ -13,8 +13,8 @@ namespace appsync::device {
 /// - no record names a container that is not there;
 /// - where install coordination is off, coordinators of a sync are gone with their placeholders and packages;
 /// - placeholders of a sync (install type 4) that no coordinator owns are gone, so that their apps are offered again;
-/// an
-///   app under one stays;
+///   an app under one stays;
+/// - data of removed apps is gone, and what a restore was just about to keep;
 /// - packages that the coordination service was to remove are gone;
 /// - the installs of other placeholders wait to be taken up again.
 /// Doing it again changes nothing, and being cut off does not matter.

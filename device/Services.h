@@ -69,7 +69,7 @@ class Services final : public platform::Platform {
   [[nodiscard]] Scheduler& scheduler() override { return scheduler_; }
 
   [[nodiscard]] std::unique_ptr<platform::BackupManager> makeBackupManager() override {
-    return std::make_unique<BackupManager>(database_);
+    return std::make_unique<BackupManager>(database_, files_);
   }
   [[nodiscard]] std::unique_ptr<platform::SoftwareLibrary> makeSoftwareLibrary() override {
     return std::make_unique<SoftwareLibrary>(database_, registry_);

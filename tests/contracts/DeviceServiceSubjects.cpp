@@ -56,7 +56,8 @@ class DeviceBackups final : public BackupManagerSubject {
  public:
   std::unique_ptr<platform::BackupManager> makeManager() override { return device_.services().makeBackupManager(); }
   void keepRestoreData(std::string_view identifier, std::uint64_t size) override {
-    EXPECT_TRUE(device::BackupManager(device_.services().database()).keepRestoreData(identifier, size));
+    device::Database::Session session(device_.services().database());
+    EXPECT_TRUE(session.run("insert into restore_data values (?, ?)", identifier, size));
   }
 
  private:
