@@ -51,9 +51,4 @@ class PlugInLog {
   platform::SyncFramework* framework_;
 };
 
-/// How messages print a yes or no.
-constexpr char yesOrNo(bool answer) {
-  return answer ? 'y' : 'n';
-}
-
 }  // namespace appsync

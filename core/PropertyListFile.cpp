@@ -13,7 +13,8 @@ Result<plist::Dictionary> dictionaryOf(Result<plist::Value> read) {
 }
 
 plist::Value readDictionary(platform::FileSystem& files, const std::optional<std::string>& path) {
-  auto bytes = files.readFile(path.value_or(""));
+  if (!path) return {};
+  auto bytes = files.readFile(*path);
   if (!bytes) return {};
   auto dictionary = dictionaryOf(plist::read(std::move(bytes).value()));
   return dictionary ? std::move(dictionary).value() : plist::Value();

@@ -29,7 +29,7 @@ void refreshReceipts(platform::Platform& platform, const PlugInLog& log) {
 }  // namespace
 
 void AppsClient::assetTransferEndedWithSuccess(bool success) {
-  _log.message("%s|asset transfer ended withsuccess: %c", yesOrNo(success));
+  _log.message("%s|asset transfer ended withsuccess: %c", success);
   _installGroup->wait();
   _notifySolvary(_platform, false);
   if (_getAndResetNumAppInstallsAttempted() >= 1) refreshReceipts(_platform, _log);
@@ -64,7 +64,7 @@ void AppsClient::_closeOutstandingTransfers(const Identifiers& outstanding, bool
 }
 
 void AppsClient::syncEndedWithSuccess(bool success) {
-  _log.message("%s|sync ended with success: %c", yesOrNo(success));
+  _log.message("%s|sync ended with success: %c", success);
   if (!success) return;
 
   platform::FileSystem& files = _platform.fileSystem();
@@ -90,7 +90,7 @@ void AppsClient::clearSyncData() {
   _enumeratePlaceholdersWithBlock([this](const platform::AppRecord& record, bool&) {
     const std::string identifier = record.bundleIdentifier().value_or(record.applicationIdentifier());
     const bool uninstalled = _platform.defaultRegistry().uninstallApplication(identifier).ok();
-    _log.message("%s|Uninstall %{public}@ = %c", identifier, yesOrNo(uninstalled));
+    _log.message("%s|Uninstall %{public}@ = %c", identifier, uninstalled);
   });
 
   platform::UninstalledAppsList& list = _platform.uninstalledApps();

@@ -65,11 +65,10 @@ void AppsClient::_performAssetInstall(const std::shared_ptr<ZTAsset>& asset) {
 }
 
 void AppsClient::_installPackage(const ZTAsset& asset) {
-  const auto location = platform::FileLocation::file(asset.path().value_or(""));
+  const platform::FileLocation package{asset.path().value_or("")};
   const plist::Dictionary options{{platform::PackageTypeKey, platform::PackageTypeCustomer},
                                   {platform::BundleIdentifierKey, asset.identifier()}};
-  const Status installed = _platform.defaultRegistry().installApplication(
-      location.value_or(platform::FileLocation{asset.path().value_or("")}), options);
+  const Status installed = _platform.defaultRegistry().installApplication(package, options);
   if (installed) {
     assetInstallSucceeded(asset);
   } else {

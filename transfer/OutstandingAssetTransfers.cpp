@@ -197,7 +197,7 @@ std::shared_ptr<ZTAsset> AppsClient::_makeAsset(const WantedEntry& entry, const 
   _log.message(
       "%s|Asset %{public}@ (pretty=%{public}@, version=%{public}@) prepped with icon %{public}@, at %{public}@, meta at %{public}@, info at %{public}@, storePid=%lld, isRestore=%c",
       identifier, prettyName, version, icon, entry.path(), asset->storePlist(), asset->infoPlist(), asset->storePID(),
-      yesOrNo(asset->isRestore()));
+      asset->isRestore());
   return asset;
 }
 

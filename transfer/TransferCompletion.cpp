@@ -72,7 +72,7 @@ void AppsClient::assetTransferSucceeded(const std::shared_ptr<ZTAsset>& asset, b
   });
   _outstandingDCXTransfers.erase(identifier);
   _log.message("%s|transfer for asset %{public}@ ended with success %c error %{public}@ existingApp:%d", identifier,
-               yesOrNo(succeeded), error, marks.isExistingApp);
+               succeeded, error, marks.isExistingApp);
   const auto progress = _progressForAssetIdentifier(identifier);
   if (succeeded) {
     _handleReceivedAsset(asset, marks, progress.get());

@@ -91,9 +91,4 @@ TEST_F(PlugInLogTest, AWholeReportWithItsLevelsOffWritesNothing) {
   EXPECT_TRUE(platform.log.lines().empty());
 }
 
-TEST_F(PlugInLogTest, YesAndNoArePrintedAsLetters) {
-  EXPECT_EQ(yesOrNo(true), 'y');
-  EXPECT_EQ(yesOrNo(false), 'n');
-}
-
 }  // namespace appsync::test

@@ -32,6 +32,7 @@ TEST_F(PropertyListFile, ADictionaryIsReadInEachForm) {
 
 TEST_F(PropertyListFile, WithoutAPathOrAFileThereIsNone) {
   EXPECT_TRUE(read(std::nullopt).isNull());
+  EXPECT_EQ(platform.journal.count("fileSystem."), 0U) << "there is nothing to ask for";
   EXPECT_TRUE(read().isNull());
 }
 
