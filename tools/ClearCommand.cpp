@@ -3,6 +3,7 @@
 #include "core/AppsClient.h"
 #include "tools/Commands.h"
 #include "tools/HostState.h"
+#include "tools/Leftovers.h"
 #include "tools/OpenDevice.h"
 #include "tools/StagingArea.h"
 #include "tools/StandardOutput.h"
@@ -22,6 +23,7 @@ Example:
   appsync clear phone)";
 
 ExitStatus run(const ClearOptions& /*options*/, device::Device& device) {
+  giveUpLeftovers(device);
   AppsClient::create(device.platform())->clearSyncData();
   clearStaging(device);
   const Status forgotten = removeHostState(device.path());

@@ -182,6 +182,18 @@ TEST_F(CoordinatedSync, APackageThatVanishesFailsItsAppAndTakesItsPlaceholder) {
   EXPECT_THAT(apps(), ElementsAre("org.a 1.0"));
 }
 
+TEST_F(CoordinatedSync, ClearGivesUpWhatAKilledSyncLeft) {
+  publish("org.a");
+  for (int step = 20; coordinators().empty(); step += 10) {
+    const Finished killed =
+        sync({}, {.environment = {{"APPSYNC_KILL_AT", std::to_string(step)}}, .output = OutputTo::file, .input = {}});
+    ASSERT_EQ(killed.status, -SIGKILL) << "no kill left a coordinator";
+  }
+  ASSERT_EQ(runTool({"clear", device()}).status, 0);
+  EXPECT_THAT(coordinators(), IsEmpty());
+  EXPECT_THAT(apps(), AnyOf(IsEmpty(), ElementsAre("org.a 1.0")));
+}
+
 class Interrupted : public ToolFixtureOfEachMode {};
 INSTANTIATE_TEST_SUITE_P(Modes, Interrupted, kModes, nameOfMode);
 
