@@ -58,8 +58,7 @@ class AppRegistry {
 
   /// Calls `visit` for each bundle of a kind, in an order that does not change between two walks of an unchanged
   /// registry, on the calling thread, before it returns; ends early once `visit` sets `stop`. The walk sees the
-  /// registry as it was when it began: `visit` may install and uninstall. Memory does not grow with the number of
-  /// bundles' contents.
+  /// registry as it was when it began: `visit` may install and uninstall. A record is good during its visit.
   virtual void enumerateBundlesOfType(BundleKind kind,
                                       const std::function<void(const BundleRecord& bundle, bool& stop)>& visit) = 0;
 

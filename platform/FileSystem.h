@@ -11,7 +11,8 @@
 
 namespace appsync::platform {
 
-/// The accounts that a new file or folder is to belong to. An absent name leaves the creating process's own.
+/// The accounts that a new file or folder, with the parents made on the way to it, is to belong to. An absent name
+/// leaves the creating process's own.
 struct OwnerAttributes {
   std::optional<std::string> ownerAccountName;
   std::optional<std::string> groupOwnerAccountName;
@@ -51,7 +52,7 @@ class FileSystem {
   /// old bytes or the new, never a mixture and never nothing.
   [[nodiscard]] virtual Status writeFileAtomically(std::string_view path, ByteView bytes) = 0;
 
-  /// Makes a file with these bytes and owners; a file already there is replaced.
+  /// Makes a file with these bytes and owners; a file already there is replaced, the parent must exist.
   [[nodiscard]] virtual Status createFile(std::string_view path, ByteView bytes, const OwnerAttributes& attributes) = 0;
 
   /// Makes a folder. With `IntermediateDirectories::create` a folder already there is a success and keeps its owners,
@@ -59,12 +60,12 @@ class FileSystem {
   [[nodiscard]] virtual Status createDirectory(std::string_view path, IntermediateDirectories intermediates,
                                                const OwnerAttributes& attributes) = 0;
 
-  /// Copies a file, or a folder with all that is in it. Something already at `to` is a failure, and stays. A copy that
-  /// fails midway is removed.
+  /// Copies a file, or a folder with all that is in it; the parent of `to` must exist. Something already at `to` is a
+  /// failure, and stays. A copy that fails midway is removed.
   [[nodiscard]] virtual Status copyItem(std::string_view from, std::string_view to) = 0;
 
-  /// Moves a file or folder in one step: at any moment it is whole at `from` or whole at `to`. Something already at
-  /// `to` is a failure, and stays.
+  /// Moves a file or folder in one step: at any moment it is whole at `from` or whole at `to`, whose parent must exist.
+  /// Something already at `to` is a failure, and stays.
   [[nodiscard]] virtual Status moveItem(std::string_view from, std::string_view to) = 0;
 
   /// Removes a file, a link (not what it leads to) or a folder with all that is in it. Nothing there is a failure. A

@@ -75,7 +75,8 @@ class InstallCoordination {
   [[nodiscard]] virtual Error createUserPresentableError(long code, const plist::Dictionary& information,
                                                          const Error& underlying) = 0;
 
-  /// Opens an observer connection under a service name. `delegate` stays the caller's and must outlive the connection.
+  /// Opens an observer connection under a service name. `delegate` stays the caller's and must outlive the connection;
+  /// null when it cannot be opened.
   [[nodiscard]] virtual std::unique_ptr<InstallObserver> initWithMachServiceName(
       std::string_view serviceName, const std::set<ClientIdentity>& clients, InstallObserverDelegate& delegate) = 0;
 };

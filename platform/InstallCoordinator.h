@@ -27,8 +27,8 @@ enum class CoordinatorKind : std::uint8_t {
 
 /// A handle on the service's coordinator. Handles on one coordinator see the same state; dropping them all changes
 /// nothing: a coordinator lives in the service, also across restarts, until its app is installed, the install has
-/// failed, or it is cancelled. One that restores a demoted app may have ended as soon as its placeholder is shown, if it
-/// has no app-asset promise by then; the placeholder stays.
+/// failed, or it is cancelled. One that restores a demoted app may have ended as soon as its placeholder is shown, if
+/// it has no app-asset promise by then; the placeholder stays.
 ///
 /// The service installs the app once the coordinator has its install options (one that restores can do without) and its
 /// placeholder promise, its app-asset promise is complete and, where it has a user-data promise, that is complete too.

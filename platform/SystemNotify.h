@@ -33,7 +33,8 @@ class SystemNotify {
   /// Ends it. When this returns no callback for `observer` and `name` runs on another thread and none will begin.
   virtual void removeObserver(void* observer, std::string_view name) = 0;
 
-  /// A token for a name's state.
+  /// A token for a name's state. No registration is ever taken back, and clients make one for each post: the same name
+  /// may well get the same token again.
   [[nodiscard]] virtual Registration registerCheck(std::string_view name) = 0;
 
   /// Sets the state of the token's name; seen by everyone before the next `post` of the name reaches them.

@@ -33,8 +33,8 @@ inline constexpr std::int32_t kRestoreTypeHost = 2;
 /// Threads: calls come from the daemon's threads, not two at once, but for the reports on different assets' transfers
 /// of which several may run side by side. They run synchronously; `assetTransferEndedWithSuccess` blocks until all
 /// installs are done and `reconcileRestoreOfType` waits for placeholders, so none may be made from work of the client's
-/// own. Errors: slots may be null; only a false result
-/// makes what is in one an answer.
+/// own. Assets are never null, and a transfer that failed always comes with an error: without one a client would take
+/// the package for whole. Errors: slots may be null; only a false result makes what is in one an answer.
 class ZTClient {
  public:
   virtual ~ZTClient() = default;

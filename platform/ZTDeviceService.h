@@ -20,7 +20,8 @@ class ZTDeviceService {
   /// Daemons of some ages lack one or both.
   enum class Operation : std::uint8_t { prioritizeAsset, cancelAssetTransferForFailedAsset };
 
-  /// Called once, on a thread of the service's or before `prioritizeAsset` returns; without an error when it was done.
+  /// Called once, on a thread of the service's or before `prioritizeAsset` returns, at the latest before the service
+  /// ends; without an error when it was done.
   using Completion = std::function<void(const std::optional<Error>& error)>;
 
   virtual ~ZTDeviceService() = default;

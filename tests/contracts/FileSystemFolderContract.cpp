@@ -50,6 +50,17 @@ TEST_P(FileSystemContract, WithIntermediatesAnExistingFolderKeepsItsOwners) {
   EXPECT_EQ(*kept, owners);
 }
 
+TEST_P(FileSystemContract, ParentsMadeOnTheWayHaveTheSameOwners) {
+  const OwnerAttributes owners{"mobile", "mobile"};
+  makeFolder("above");
+  ASSERT_TRUE(files().createDirectory(at("above/parent/folder"), IntermediateDirectories::create, owners).ok());
+  const std::optional<OwnerAttributes> given = subject().ownersOf(at("above/parent/folder"));
+  if (!given) GTEST_SKIP() << "owners cannot be told";
+  EXPECT_EQ(*given, owners);
+  EXPECT_EQ(subject().ownersOf(at("above/parent")), owners);
+  EXPECT_NE(subject().ownersOf(at("above")), owners);
+}
+
 TEST_P(FileSystemContract, AFileInAFoldersPlaceIsAFailureAndStays) {
   write("file", "kept");
   EXPECT_FALSE(files().createDirectory(at("file"), IntermediateDirectories::create, {}).ok());
