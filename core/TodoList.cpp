@@ -7,11 +7,24 @@
 
 namespace appsync {
 
-const plist::Value* firstEntry(const plist::Array& list, std::string_view identifier) {
+namespace {
+
+template <class Array>
+auto* firstEntryOf(Array& list, std::string_view identifier) {
   const auto found = std::find_if(list.begin(), list.end(), [identifier](const plist::Value& entry) {
     return entryHas(entry, todo::kIdentifier, identifier);
   });
   return found == list.end() ? nullptr : &*found;
+}
+
+}  // namespace
+
+const plist::Value* firstEntry(const plist::Array& list, std::string_view identifier) {
+  return firstEntryOf(list, identifier);
+}
+
+plist::Value* firstEntry(plist::Array& list, std::string_view identifier) {
+  return firstEntryOf(list, identifier);
 }
 
 TodoIndex::TodoIndex(const std::optional<plist::Array>& list) {

@@ -11,6 +11,7 @@ namespace appsync {
 
 /// The first entry whose "identifier" is `identifier`, or null; later ones are never seen.
 [[nodiscard]] const plist::Value* firstEntry(const plist::Array& list, std::string_view identifier);
+[[nodiscard]] plist::Value* firstEntry(plist::Array& list, std::string_view identifier);
 
 /// The same answers for many identifiers, after one walk of the list. Refers to the list, which must stay as it is.
 class TodoIndex {

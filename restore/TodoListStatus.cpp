@@ -1,4 +1,6 @@
 // How far each app of the host's todo list has come, written back into it.
+#include <utility>
+
 #include "core/AppsClient.h"
 #include "core/SyncFiles.h"
 #include "core/TodoList.h"
@@ -7,13 +9,12 @@ namespace appsync {
 
 void AppsClient::changeAssetID(std::string_view identifier, std::string_view toDo) {
   auto todoList = _loadPlist(_platform, kTodoListPath, nullptr);
-  const plist::Value* found = todoList ? firstEntry(*todoList, identifier) : nullptr;
-  if (found == nullptr) return;
+  plist::Value* entry = todoList ? firstEntry(*todoList, identifier) : nullptr;
+  if (entry == nullptr) return;
 
-  plist::Dictionary& entry = *(*todoList)[static_cast<std::size_t>(found - todoList->data())].dictionary();
   _log.message("%s|Changing %{public}@ from %{public}@ to %{public}@", identifier,
-               std::as_const(entry).find(todo::kOperation), toDo);
-  entry.set(todo::kOperation, toDo);
+               std::as_const(*entry).find(todo::kOperation), toDo);
+  entry->dictionary()->set(todo::kOperation, toDo);
   const auto bytes = plist::writeBinary(std::move(*todoList));
   if (bytes) _platform.fileSystem().writeFileAtomically(kTodoListPath, *bytes).ignore();
 }
