@@ -1,0 +1,180 @@
+// What a restore costs when the backup held many apps: the time must grow with their number and no faster, and memory
+// not beyond the host's file and a few of its apps.
+#include <algorithm>
+#include <atomic>
+#include <cerrno>
+#include <cstdlib>
+#include <memory>
+#include <new>
+#include <string>
+
+#include <benchmark/benchmark.h>
+#include <malloc.h>
+
+#include "core/AppsClient.h"
+#include "tests/support/FakePlatform.h"
+#include "tests/support/TodoList.h"
+
+namespace {
+
+std::atomic<std::size_t> held = 0;
+std::atomic<std::size_t> mostHeld = 0;
+
+}  // namespace
+
+// Every allocation of this program is counted.
+void* operator new(std::size_t size) {
+  void* memory = std::malloc(size);
+  if (memory == nullptr) throw std::bad_alloc();
+  const std::size_t now = held += malloc_usable_size(memory);
+  std::size_t most = mostHeld;
+  while (now > most && !mostHeld.compare_exchange_weak(most, now)) {
+  }
+  return memory;
+}
+
+void operator delete(void* memory) noexcept {
+  held -= malloc_usable_size(memory);
+  std::free(memory);
+}
+
+void operator delete(void* memory, std::size_t) noexcept {
+  operator delete(memory);
+}
+
+namespace appsync::bench {
+namespace {
+
+using test::FakePlatform;
+
+constexpr int kFew = 200;
+constexpr int kMany = 2'000;
+constexpr std::size_t kIconSize = 20'000;
+constexpr std::size_t kLicenceSize = 1'000;
+
+constexpr std::string_view kRestoreInfo = "/var/mobile/Media/HarvoRestore/RestoreApplications.plist";
+
+plist::Value restoredApp(std::int64_t number) {
+  const std::string name = "App number " + std::to_string(number);
+  const plist::Dictionary metadata{{"title", name}, {"bundleVersion", "1.2.3"}, {"itemId", number}};
+  Bytes licence(kLicenceSize, static_cast<std::byte>(number));
+  Bytes icon(kIconSize, static_cast<std::byte>(number >> 8));
+  std::copy_n(bytesOf(name).begin(), name.size(), licence.begin());
+  std::copy_n(bytesOf(name).begin(), name.size(), icon.begin());
+  return plist::Dictionary{{"ApplicationSINF", std::move(licence)},
+                           {"HarvoMetadata", test::xmlForm(metadata)},
+                           {"PlaceholderIcon", std::move(icon)}};
+}
+
+Bytes restoreInfo(std::int64_t count) {
+  plist::Dictionary apps;
+  for (std::int64_t number = 0; number < count; ++number)
+    apps.set("com.example.app" + std::to_string(1'000'000 + number), restoredApp(number));
+  return test::binaryForm(apps);
+}
+
+// A device that keeps nothing of what it is given.
+
+class Files final : public test::FakeFileSystem {
+ public:
+  Files(test::CallJournal& journal, const Bytes& document) : FakeFileSystem(journal), document_(document) {}
+
+  [[nodiscard]] bool fileExists(std::string_view) override { return true; }
+  [[nodiscard]] Result<platform::FileAttributes> attributesOfItem(std::string_view) override {
+    return platform::FileAttributes{kIconSize, false};
+  }
+  [[nodiscard]] Result<Bytes> readFile(std::string_view path) override {
+    if (path == kRestoreInfo) return document_;
+    return Error::fromErrno(ENOENT);
+  }
+  [[nodiscard]] Status writeFileAtomically(std::string_view, ByteView) override { return {}; }
+  [[nodiscard]] Status createFile(std::string_view, ByteView, const platform::OwnerAttributes&) override { return {}; }
+  [[nodiscard]] Status createDirectory(std::string_view, platform::IntermediateDirectories,
+                                       const platform::OwnerAttributes&) override {
+    return {};
+  }
+  [[nodiscard]] Status moveItem(std::string_view, std::string_view) override { return {}; }
+  [[nodiscard]] Status removeItem(std::string_view) override { return {}; }
+  [[nodiscard]] std::string temporaryDirectory() override { return "/tmp"; }
+
+ private:
+  const Bytes& document_;
+};
+
+class Registry final : public platform::AppRegistry {
+ public:
+  void addObserver(platform::AppRegistryObserver&) override {}
+  void removeObserver(platform::AppRegistryObserver&) override {}
+  [[nodiscard]] bool applicationIsInstalled(std::string_view) override { return false; }
+  [[nodiscard]] std::shared_ptr<const platform::AppRecord> recordForIdentifier(std::string_view,
+                                                                               platform::PlaceholderLookup) override {
+    return nullptr;
+  }
+  /// Meets every placeholder that was installed.
+  void enumerateBundlesOfType(
+      platform::BundleKind,
+      const std::function<void(const platform::BundleRecord& bundle, bool& stop)>& visit) override {
+    bool stop = false;
+    for (std::int64_t number = 0; number < installed && !stop; ++number)
+      visit(test::FakeBundleRecord("com.example.other" + std::to_string(number)), stop);
+  }
+  [[nodiscard]] Status installApplication(const platform::FileLocation&, const plist::Dictionary&) override {
+    ++installed;
+    return {};
+  }
+  [[nodiscard]] Status uninstallApplication(std::string_view, const plist::Dictionary&) override { return {}; }
+  [[nodiscard]] std::shared_ptr<platform::InstallProgress> installProgressForApplication(
+      const platform::AppRecord&, platform::TSInstallPhase) override {
+    return nullptr;
+  }
+  void installPhaseFinishedForProgress(platform::InstallProgress&) override {}
+
+  std::int64_t installed = 0;
+};
+
+class Transactions final : public platform::TransactionLog {
+ public:
+  void initializeWithLog(std::shared_ptr<platform::SystemLogHandle>) override {}
+  void logStep(platform::TransactionStep, platform::TransactionParty, platform::TransactionPhase, bool,
+               std::string_view, std::string_view) override {}
+  void logScenario(std::string_view, std::uint32_t, bool, std::string_view, std::string_view) override {}
+};
+
+/// The host's file, three times its largest app, and what it takes to find the apps in it.
+std::size_t allowedMemory(const Bytes& document, std::int64_t count) {
+  constexpr std::size_t kApp = kIconSize + kLicenceSize + 1'000;
+  constexpr std::size_t kIndexEntry = 600;
+  return document.size() + 3 * kApp + static_cast<std::size_t>(count) * kIndexEntry;
+}
+
+void processRestoreInfo(benchmark::State& state) {
+  const Bytes document = restoreInfo(state.range(0));
+  FakePlatform platform;
+  Files files(platform.journal, document);
+  Registry registry;
+  Transactions transactions;
+  platform.use(files);
+  platform.use(registry);
+  platform.use(transactions);
+  for (const int category : {8, 14}) {
+    platform.log.disable(category, LogLevel::standard);
+    platform.log.disable(category, LogLevel::error);
+  }
+  const auto client = AppsClient::create(platform);
+  std::size_t most = 0;
+  for (auto _ : state) {
+    registry.installed = 0;
+    const std::size_t before = held;
+    mostHeld = before;
+    client->_processHarvoRestoreInfo();
+    most = mostHeld - before;
+    if (registry.installed != state.range(0)) return state.SkipWithError("not every app got its placeholder");
+    if (most > allowedMemory(document, state.range(0))) return state.SkipWithError("it took too much memory");
+  }
+  state.counters["file"] = static_cast<double>(document.size());
+  state.counters["memory"] = static_cast<double>(most);
+}
+BENCHMARK(processRestoreInfo)->Arg(kFew)->Arg(kMany)->Unit(benchmark::kMillisecond);
+
+}  // namespace
+}  // namespace appsync::bench

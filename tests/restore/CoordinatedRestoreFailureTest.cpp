@@ -1,0 +1,242 @@
+// Each call of a coordinated restore fails in turn: what is given up, in which order, for which reason.
+#include <string>
+#include <vector>
+
+#include <gtest/gtest.h>
+
+#include "tests/restore/RestoreFixture.h"
+
+namespace appsync::test {
+namespace {
+
+using platform::CoordinatorKind;
+using platform::TransactionPhase;
+using platform::TransactionStep;
+using Strings = std::vector<std::string>;
+
+/// A call whose failure fails the restore.
+struct FatalCall {
+  const char* operation;
+  const char* subject;
+  /// What is logged as an error; "%" stands for the service's error.
+  Strings complaints;
+  /// Whether the service's error is the one that the restore ends with.
+  bool endsWithError;
+  /// What is cancelled, in order, as journal lines.
+  Strings cancelled;
+  /// Whether the app was awaited by then.
+  bool wasAwaited = false;
+};
+
+const std::string kCoordinatorGoes = "coordinator.cancelForReason com.a ZTError 29 3";
+const std::string kPlaceholderGoes = "placeholder.cancelForReason com.a ZTError 29 3";
+const std::string kIconGoes = "promise.cancelForReason com.a-Icon ZTError 29 3";
+const std::string kUserDataGoes = "promise.cancelForReason com.a-UserData ZTError 29 3";
+
+std::string nameOf(const testing::TestParamInfo<FatalCall>& info) {
+  std::string name = info.param.operation;
+  return name.substr(name.find('.') + 1) + (std::string(info.param.subject) == "com.a-Icon" ? "Icon" : "");
+}
+
+class RestoreFailure : public CoordinatedRestoreFixture, public testing::WithParamInterface<FatalCall> {
+ protected:
+  [[nodiscard]] Strings complaints() const {
+    Strings complaints;
+    for (const LogLine& line : platform.log.lines()) {
+      if (line.level == LogLevel::error) complaints.push_back(line.text.substr(line.text.find('|') + 1));
+    }
+    return complaints;
+  }
+
+  [[nodiscard]] Strings cancellations() const {
+    return platform.journal.lines(
+        {"coordinator.cancelForReason", "placeholder.cancelForReason", "promise.cancelForReason"});
+  }
+
+  /// The lines with which a failed restore ends.
+  [[nodiscard]] LogLines ending() const {
+    const FatalCall& call = GetParam();
+    LogLines lines{logged("processing app restore for com.a finished with status 0 error " +
+                          (call.endsWithError ? description(error) : "(null)")),
+                   called("transactionLog.logStep 2 com.a n Restore app")};
+    for (const std::string& line : call.cancelled) {
+      if (line != kCoordinatorGoes && !(line == kPlaceholderGoes && call.cancelled.front() == kCoordinatorGoes))
+        continue;
+      lines.push_back(logged(std::string("Cancelling ") + (line == kCoordinatorGoes ? "coordinator" : "placeholder") +
+                             " for appBundleIdentifier:com.a"));
+      lines.push_back(called(line));
+    }
+    if (call.wasAwaited) {
+      lines.push_back(
+          logged("DataMigrator cancelled coordinator for restoring app bundle com.a _restoringPlaceholderCount 0"));
+    }
+    return lines;
+  }
+};
+
+TEST_P(RestoreFailure, NothingOfThePlugInsOwnIsLeftAndNobodyWaits) {
+  const FatalCall& call = GetParam();
+  platform.coordination.failures.failNext(call.operation, call.subject, error);
+  AppsClient& client = makeTracedClient();
+  EXPECT_FALSE(prepare(client));
+
+  Strings expected = call.complaints;
+  for (std::string& complaint : expected) {
+    const auto at = complaint.find('%');
+    if (at != std::string::npos) complaint.replace(at, 1, description(error));
+  }
+  EXPECT_EQ(complaints(), expected);
+  EXPECT_EQ(cancellations(), call.cancelled);
+  const LogLines lines = platform.log.lines();
+  const LogLines end = ending();
+  ASSERT_GE(lines.size(), end.size());
+  EXPECT_TRUE(sameLines(end, {lines.end() - static_cast<std::ptrdiff_t>(end.size()), lines.end()}));
+
+  EXPECT_TRUE(platform.coordination.coordinators().empty());
+  EXPECT_TRUE(platform.coordination.abandoned().empty());
+  EXPECT_EQ(platform.transactions.steps().back(),
+            (StepEntry{TransactionStep::restoreApp, TransactionPhase::end, Success::no, "com.a", "Restore app"}));
+
+  platform.log.clear();
+  client.cnDidInstallPlaceHolderForAppBundle("com.a");
+  EXPECT_TRUE(complained("Ignoring notification from CN about installing placeholder for com.a"));
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Calls, RestoreFailure,
+    testing::Values(FatalCall{"installCoordination.coordinatorForApp",
+                              "com.a",
+                              {"Error % creating restore coordinator for com.a"},
+                              true,
+                              {}},
+                    FatalCall{"coordinator.setUserDataPromise",
+                              "com.a",
+                              {"Error % adding out of band data promise for 'com.a'"},
+                              true,
+                              {kUserDataGoes, kCoordinatorGoes}},
+                    FatalCall{"installCoordination.initAppPlaceholder", "com.a", {}, false, {kCoordinatorGoes}},
+                    FatalCall{"installCoordination.makePromisedTransferToPath",
+                              "com.a-Icon",
+                              {},
+                              false,
+                              {kPlaceholderGoes, kCoordinatorGoes}},
+                    FatalCall{"placeholder.setIconPromise",
+                              "com.a",
+                              {"Error % adding icon promise to placeholder for 'com.a'"},
+                              false,
+                              {kIconGoes, kPlaceholderGoes, kCoordinatorGoes}},
+                    FatalCall{"placeholder.setPlaceholderAttributes",
+                              "com.a",
+                              {"Error % setting placeholder attributes for 'com.a'"},
+                              false,
+                              {kPlaceholderGoes, kCoordinatorGoes}},
+                    FatalCall{"placeholder.setMetadata",
+                              "com.a",
+                              {"Error % setting store metadata for 'com.a'"},
+                              false,
+                              {kPlaceholderGoes, kCoordinatorGoes}},
+                    FatalCall{"placeholder.setSinfData",
+                              "com.a",
+                              {"Error % setting SINF data for 'com.a'"},
+                              false,
+                              {kPlaceholderGoes, kCoordinatorGoes}},
+                    FatalCall{"placeholder.setConfigurationComplete",
+                              "com.a",
+                              {"Error % setting placeholder configuration as complete for 'com.a'"},
+                              false,
+                              {kPlaceholderGoes, kCoordinatorGoes}},
+                    FatalCall{"coordinator.setPlaceholderPromise",
+                              "com.a",
+                              {"Error % setting placeholder promise for 'com.a'"},
+                              true,
+                              {kCoordinatorGoes, kPlaceholderGoes}},
+                    FatalCall{"coordinator.setAppAssetPromiseResponsibleClient",
+                              "com.a",
+                              {"Error % setting CXClientBazaarly to satisfy app data promise for 'com.a'"},
+                              true,
+                              {kCoordinatorGoes},
+                              true}),
+    nameOf);
+
+class RestoreFaults : public CoordinatedRestoreFixture {};
+
+/// An app that another run has announced is withdrawn by whatever fails now.
+TEST_F(RestoreFaults, AFailureAfterAnEarlierAnnouncementWithdrawsTheApp) {
+  AppsClient& client = makeTracedClient();
+  client.dataMigratorSetPlaceHolderPromiseForRestoreAppBundle("com.a");
+  platform.coordination.failures.failNext("installCoordination.coordinatorForApp", "com.a", error);
+  EXPECT_FALSE(prepare(client));
+  EXPECT_TRUE(said("DataMigrator cancelled coordinator for restoring app bundle com.a _restoringPlaceholderCount 0"));
+}
+
+TEST_F(RestoreFaults, APlaceholderThatTheCoordinatorRefusesLeavesTheCountAsItWas) {
+  AppsClient& client = makeTracedClient();
+  client.dataMigratorSetPlaceHolderPromiseForRestoreAppBundle("com.b");
+  platform.coordination.failures.failNext("coordinator.setPlaceholderPromise", "com.a", error);
+  platform.log.clear();
+  EXPECT_FALSE(prepare(client));
+  EXPECT_EQ(cancellation(), givenUp);
+  EXPECT_EQ(platform.coordination.placeholder("com.a")->cancellation, givenUp);
+  for (const std::string& message : platform.log.messages())
+    EXPECT_EQ(message.find("DataMigrator"), std::string::npos) << message;
+  client.dataMigratorCancelledCoordinatorForRestoreAppBundle("com.b");
+  EXPECT_TRUE(said("DataMigrator cancelled coordinator for restoring app bundle com.b _restoringPlaceholderCount 0"));
+}
+
+TEST_F(RestoreFaults, AnInterruptedRunsCoordinatorGoesWithWhatItHad) {
+  FakePlaceholder placeholder;
+  placeholder.identifier = "com.a";
+  platform.coordination.add(FakeCoordinator::of("com.a", CoordinatorKind::restoring).withPlaceholder(placeholder));
+  platform.coordination.failures.failNext("coordinator.setAppAssetPromiseResponsibleClient", "com.a", error);
+  EXPECT_FALSE(prepare());
+  EXPECT_EQ(cancellation(), givenUp);
+  EXPECT_EQ(platform.journal.count("placeholder.cancelForReason"), 0U);
+}
+
+/// Of a restore that fails the count is what it was, of one that succeeds one more; the count and the group agree.
+TEST_F(RestoreFaults, WhicheverCallFailsNothingIsLeftHalfwayAndTheCountAgrees) {
+  for (const DemotionStatus status : {DemotionStatus::notDemoted, DemotionStatus::intentionallyDemoted}) {
+    AppsClient& client = makeClient();
+    const std::size_t before = platform.journal.callCount();
+    EXPECT_TRUE(prepare(client, status));
+    const std::size_t calls = platform.journal.callCount() - before;
+    EXPECT_GT(calls, 25U);
+    for (std::size_t number = 1; number <= calls; ++number) {
+      SCOPED_TRACE("call " + std::to_string(number) + " of " + std::to_string(calls));
+      for (const FakeCoordinator& coordinator : platform.coordination.coordinators())
+        platform.coordination.cancel(coordinator.identifier, {error, kSync});
+      client.dataMigratorCancelledCoordinatorForRestoreAppBundle("com.a");
+      platform.files.erase(kAppFolder);
+      platform.journal.failCall(number, error);
+      const bool isReady = client.prepareAppForRestoreUsingCoordination("com.a", metadata, sinf, icon, status);
+      platform.journal.setHook(nullptr);
+      const auto left = platform.coordination.coordinator("com.a");
+      EXPECT_EQ(left.has_value(), isReady);
+      EXPECT_TRUE(platform.coordination.abandoned().empty());
+      EXPECT_TRUE(!left || left->placeholder);
+
+      platform.log.clear();
+      client.dataMigratorSetPlaceHolderPromiseForRestoreAppBundle("com.counted");
+      EXPECT_TRUE(
+          said("DataMigrator will wait for CN to install placeholder for com.counted, "
+               "_restoringPlaceholderCount " +
+               std::to_string(isReady ? 2 : 1)));
+      client.dataMigratorCancelledCoordinatorForRestoreAppBundle("com.counted");
+    }
+    for (const FakeCoordinator& coordinator : platform.coordination.coordinators())
+      platform.coordination.cancel(coordinator.identifier, {error, kSync});
+    client.dataMigratorCancelledCoordinatorForRestoreAppBundle("com.a");
+  }
+}
+
+/// A coordinator that cannot even be cancelled is the service's to end: what is the plug-in's alone goes all the same.
+TEST_F(RestoreFaults, ACancellationThatFailsToo) {
+  platform.coordination.failures.failNext("coordinator.setPlaceholderPromise", "com.a", error);
+  platform.coordination.failures.failNext("coordinator.cancelForReason", "com.a", error);
+  EXPECT_FALSE(prepare());
+  EXPECT_TRUE(platform.coordination.abandoned().empty());
+  EXPECT_EQ(platform.coordination.coordinators().size(), 1U);
+}
+
+}  // namespace
+}  // namespace appsync::test
