@@ -29,15 +29,15 @@ Result<std::int64_t> readNumber(Database& database, std::string_view question) {
   return query.status() ? std::int64_t{0} : Result<std::int64_t>(query.status().error());
 }
 
-/// Devices made by earlier versions of this layout lack tables that came later.
-Status makeMissingTables(Database& database) {
-  const Result<std::int64_t> newest =
-      readNumber(database, "select count(*) from sqlite_schema where name = 'removed_data'");
-  if (!newest) return newest.error();
-  if (*newest == 1) return {};
-  Database::Transaction transaction(database);
+/// Makes what is missing: devices of earlier versions of this layout lack the tables that came later.
+void makeTables(Database::Transaction& transaction) {
   for (const char* schema : Services::kSchemas)
     transaction.runScript(schema).ignore();
+}
+
+Status makeMissingTables(Database& database) {
+  Database::Transaction transaction(database);
+  makeTables(transaction);
   return transaction.commit();
 }
 
@@ -56,8 +56,7 @@ Status fillNewDatabase(const std::string& path, InstallMode mode) {
   if (!database) return database.error();
   {
     Database::Transaction transaction(**database);
-    for (const char* schema : Services::kSchemas)
-      transaction.runScript(schema).ignore();
+    makeTables(transaction);
     if (mode == InstallMode::coordinated) {
       transaction.run("insert into settings values ('coordination', '', 'on')").ignore();
     }

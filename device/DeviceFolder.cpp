@@ -29,10 +29,9 @@ constexpr std::array<std::string_view, 7> kBeginnings = {kLockFile,
                                                          "device.db.new-journal"};
 
 /// Folders that other components of a device expect.
-constexpr std::array<std::string_view, 5> kDeviceFolders = {kContainersPath, DeviceFileSystem::kTemporaryDirectory,
-                                                            "/var/mobile/Library/Logs/MediaServices",
-                                                            "/var/mobile/Library/Preferences",
-                                                            "/var/mobile/Media/PublicStaging"};
+constexpr std::array<std::string_view, 5> kDeviceFolders = {
+    kContainersPath, DeviceFileSystem::kTemporaryDirectory, "/var/mobile/Library/Logs/MediaServices",
+    "/var/mobile/Library/Preferences", "/var/mobile/Media/PublicStaging"};
 
 /// The process that says in the lock file that it holds the device; empty when it says nothing.
 std::string holder(int lock) {
