@@ -28,8 +28,8 @@ inline constexpr PlugInLog::Format<std::string, plist::Value> kCreatingPlacehold
 /// What makes one placeholder differ from another.
 struct PlaceholderInfo {
   std::string bundleIdentifier;
-  const plist::Value* version = nullptr;   ///< null when there is none
-  std::optional<std::string> displayName;  ///< an absent one makes a dictionary that cannot be written
+  const plist::Value* version = nullptr;        ///< null when there is none
+  std::optional<std::string> displayName = {};  ///< an absent one makes a dictionary that cannot be written
   plist::Value isPeriodical = false;
   bool isLaunchProhibited = false;
 

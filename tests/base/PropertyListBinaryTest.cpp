@@ -1,4 +1,6 @@
 #include <bit>
+#include <optional>
+#include <utility>
 
 #include <gtest/gtest.h>
 
@@ -34,6 +36,40 @@ TEST(PropertyListBinary, KeepsUidsRealsAndFractionsOfSeconds) {
   const auto read = plist::readBinary(*plist::writeBinary(value));
   ASSERT_TRUE(read.ok()) << outcome(read);
   EXPECT_EQ(*read, value);
+}
+
+TEST(PropertyListBinary, LongDataStaysInADocumentThatIsGivenAway) {
+  const Bytes data(5'000, std::byte{7});
+  const Dictionary value{{"long", data}, {"again", data}, {"short", Value::data(bytesOf("short"))}, {"text", "text"}};
+  Bytes document = *plist::writeBinary(value);
+  const std::byte* begin = document.data();
+  const std::byte* end = begin + document.size();
+  std::optional<Value> kept;
+  {
+    auto read = plist::read(std::move(document));
+    ASSERT_TRUE(read.ok()) << outcome(read);
+    EXPECT_EQ(*read, Value(value));
+    for (const char* key : {"long", "again"}) {
+      const std::byte* place = read->find(key)->data()->data();
+      EXPECT_TRUE(place > begin && place < end) << key;
+    }
+    const std::byte* place = read->find("short")->data()->data();
+    EXPECT_TRUE(place < begin || place >= end);
+    kept = *read->find("long");
+  }
+  EXPECT_EQ(*kept, Value(data)) << "data keeps the document";
+}
+
+TEST(PropertyListBinary, ADocumentThatIsGivenAwayIsReadWhateverItsForm) {
+  const Value value = Dictionary{{"data", Bytes(5'000, std::byte{7})}};
+  auto xml = plist::read(std::move(plist::writeXML(value)).value());
+  ASSERT_TRUE(xml.ok()) << outcome(xml);
+  EXPECT_EQ(*xml, value);
+  EXPECT_EQ(plist::read(Bytes()).ok(), plist::read(ByteView()).ok());
+  Bytes broken = *plist::writeBinary(value);
+  broken.resize(broken.size() / 2);
+  const Error failure = plist::read(ByteView(broken)).error();
+  EXPECT_EQ(plist::read(std::move(broken)).error(), failure);
 }
 
 TEST(PropertyListBinary, EqualValuesGiveEqualBytes) {

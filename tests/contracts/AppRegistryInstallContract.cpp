@@ -91,6 +91,14 @@ TEST_P(AppRegistryContract, ARestoredAppsStoreMetadataAndLicenceAreKept) {
   EXPECT_EQ(licence.value_or("licence"), "licence");
 }
 
+TEST_P(AppRegistryContract, ANullForMetadataOrLicenceIsAsNone) {
+  plist::Dictionary restored = options(platform::PackageTypePlaceholder, "com.a");
+  restored.set(platform::StoreMetadataKey, nullptr);
+  restored.set(platform::LicenceDataKey, nullptr);
+  ASSERT_TRUE(registry().installApplication(subject().makePlaceholderFolder("com.a", "1.0"), restored).ok());
+  EXPECT_FALSE(record("com.a")->hasMIDBasedSINF());
+}
+
 TEST_P(AppRegistryContract, TheLocationIsNotChanged) {
   const FileLocation package = subject().makePackage("com.a", "1.0");
   const FileLocation folder = subject().makePlaceholderFolder("com.b", "1.0");

@@ -45,5 +45,22 @@ TEST_F(PropertyListFile, WhatIsNoDictionaryIsNone) {
   EXPECT_TRUE(read().isNull());
 }
 
+TEST_F(PropertyListFile, ARootOfAnotherTypeIsAnErrorOfItsOwn) {
+  EXPECT_EQ(dictionaryOf(dictionary).value(), *dictionary.dictionary());
+  EXPECT_EQ(dictionaryOf(plist::Value(7)).error(), (Error{"PropertyList", 2, "The root is no dictionary", nullptr}));
+  const Error error{"POSIX", 5, "no", nullptr};
+  EXPECT_EQ(dictionaryOf(error).error(), error);
+}
+
+TEST_F(PropertyListFile, IsWrittenAsXML) {
+  EXPECT_TRUE(writePropertyList(platform.files, "/tmp/a.plist", dictionary));
+  EXPECT_EQ(platform.files.contents("/tmp/a.plist"), xmlForm(dictionary));
+}
+
+TEST_F(PropertyListFile, WhatCannotBeWrittenLeavesTheFileAlone) {
+  EXPECT_FALSE(writePropertyList(platform.files, "/tmp/a.plist", plist::Dictionary{{"key", nullptr}}));
+  EXPECT_FALSE(platform.files.has("/tmp/a.plist"));
+}
+
 }  // namespace
 }  // namespace appsync::test

@@ -34,6 +34,23 @@ TEST(PlaceholderInfo, WithoutAVersionThereIsNoEntryForIt) {
   EXPECT_EQ(dictionary.size(), 6U);
 }
 
+TEST(PlaceholderInfo, AMissingNameAndAnExplicitNullMakeADictionaryThatCannotBeWritten) {
+  const plist::Value none;
+  const plist::Dictionary unnamed = PlaceholderInfo{.bundleIdentifier = "com.a"}.dictionary();
+  EXPECT_TRUE(unnamed.find("BundleDisplayName")->isNull());
+  EXPECT_TRUE(unnamed.find("BundleExecutable")->isNull());
+  EXPECT_FALSE(plist::writeXML(unnamed));
+  const plist::Dictionary unversioned =
+      PlaceholderInfo{.bundleIdentifier = "com.a", .version = &none, .displayName = "A"}.dictionary();
+  EXPECT_EQ(unversioned.size(), 7U);
+  EXPECT_FALSE(plist::writeXML(unversioned));
+}
+
+TEST(PlaceholderInfo, TheInstallerIsToldWhatItIs) {
+  EXPECT_EQ(PlaceholderInfo{.bundleIdentifier = "com.a"}.installOptions(platform::TSInstallType::Restore),
+            (plist::Dictionary{{"PackageType", "Placeholder"}, {"BundleIdentifier", "com.a"}, {"TSInstallType", 2}}));
+}
+
 TEST(PlaceholderInfo, AVersionAndAPeriodicalFlagOfAnyTypeAreHandedOnAsTheyAre) {
   const plist::Value version = 7;
   const plist::Dictionary dictionary =
