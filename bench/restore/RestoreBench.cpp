@@ -25,6 +25,7 @@ std::atomic<std::size_t> mostHeld = 0;
 
 // Every allocation of this program is counted. Not inlined: where both ends are seen, a compiler takes them for a
 // mismatch.
+// NOLINTBEGIN(cppcoreguidelines-no-malloc): this is the allocator.
 [[gnu::noinline]] void* operator new(std::size_t size) {
   void* memory = std::malloc(size);
   if (memory == nullptr) throw std::bad_alloc();
@@ -43,6 +44,8 @@ std::atomic<std::size_t> mostHeld = 0;
 void operator delete(void* memory, std::size_t) noexcept {
   operator delete(memory);
 }
+
+// NOLINTEND(cppcoreguidelines-no-malloc)
 
 namespace appsync::bench {
 namespace {
