@@ -3,6 +3,7 @@
 #include <utility>
 
 #include "device/DatabaseError.h"
+#include "device/InstallerError.h"
 
 namespace appsync::device {
 
@@ -136,6 +137,17 @@ Result<std::vector<std::shared_ptr<const AppRecord>>> AppRegistry::apps() {
   for (AppRow& row : *rows)
     records.push_back(recordOf(std::move(row)));
   return records;
+}
+
+Status AppRegistry::setLicenceData(std::string_view bundleIdentifier, ByteView licence) {
+  Database::Session session(database_);
+  Status set =
+      session.run("update bundles set licence = ? where app = (select position from apps where identifier = ?)",
+                  licence, bundleIdentifier);
+  if (!set) return asSystemError(set.error());
+  if (session.changes() > 0) return {};
+  return installerError(InstallerFailure::unknownApp,
+                        "there is no app \"" + std::string(bundleIdentifier) + "\" to give a licence to");
 }
 
 Result<std::optional<Bytes>> AppRegistry::licenceData(std::string_view bundleIdentifier) {

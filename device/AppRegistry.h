@@ -78,6 +78,9 @@ class AppRegistry final : public platform::AppRegistry {
   /// Every app, in the order of walks.
   [[nodiscard]] Result<std::vector<std::shared_ptr<const AppRecord>>> apps();
 
+  /// Gives the app, and its placeholder, licence data in place of what they had. Fails for an unknown app.
+  [[nodiscard]] Status setLicenceData(std::string_view bundleIdentifier, ByteView licence);
+
   /// The licence data that the app, or its placeholder, was installed with.
   [[nodiscard]] Result<std::optional<Bytes>> licenceData(std::string_view bundleIdentifier);
 

@@ -10,6 +10,8 @@ std::string_view wordFor(AppEvent event) {
       return "updated";
     case AppEvent::removed:
       return "removed";
+    case AppEvent::restored:
+      return "restored";
     case AppEvent::failed:
     case AppEvent::cutOff:
       return "failed";

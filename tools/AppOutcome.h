@@ -1,4 +1,4 @@
-// What came of each app in a sync.
+// What came of each app in a sync, or a restore.
 #pragma once
 
 #include <cstdint>
@@ -12,6 +12,7 @@ enum class AppEvent : std::uint8_t {
   installed,
   updated,
   removed,
+  restored,  ///< its placeholder is there again; the package comes with the next sync
   failed,
   cutOff,     ///< the sync was interrupted before the app was on the device; machines are told "failed"
   skipped,    ///< something would have been to do, and was not done on purpose
@@ -36,7 +37,8 @@ struct AppOutcome {
 
 /// Whether the app now is as it was to be.
 [[nodiscard]] constexpr bool isSuccess(AppEvent event) {
-  return event == AppEvent::installed || event == AppEvent::updated || event == AppEvent::removed;
+  return event == AppEvent::installed || event == AppEvent::updated || event == AppEvent::removed ||
+         event == AppEvent::restored;
 }
 
 /// Whether the sync did not do for the app what it was to do.

@@ -13,7 +13,8 @@ namespace {
 constexpr const char* kPurpose = R"(appsync keeps the apps on a device in step with a folder of app packages.
 
 A device is a directory of this machine. `init` makes one, `pack` turns an app's folder into a package, and `sync` installs
-and updates what the library holds, and removes what you ask it to.)";
+and updates what the library holds, and removes what you ask it to. `backup` and `restore` bring the apps of one device to
+a new one.)";
 
 constexpr const char* kExamples = R"(Examples:
   appsync init phone                    make a device
@@ -21,16 +22,20 @@ constexpr const char* kExamples = R"(Examples:
   appsync sync phone lib                install and update everything in lib
   appsync sync phone lib --remove org.example.tides
   appsync tap phone org.example.tides   while a sync runs: this app before the others
+  appsync backup phone phone-backup     what its apps need to come back
+  appsync restore new-phone phone-backup
   appsync apps phone                    what is on it now
   appsync screen phone -o screen.png    what its home screen looks like
 
-Exit status: 0 done, 1 some app failed, 2 wrong usage, 3 the device, library or file cannot be used.
+Exit status: 0 done, 1 some app failed, 2 wrong usage, 3 the device, library, backup or file cannot be used.
 `appsync COMMAND --help` tells more about a command.)";
 
 void addCommands(CLI::App& line, Invocation& invocation) {
   addInitCommand(line, invocation);
   addPackCommand(line, invocation);
   addSyncCommand(line, invocation);
+  addBackupCommand(line, invocation);
+  addRestoreCommand(line, invocation);
   addTapCommand(line, invocation);
   addCancelCommand(line, invocation);
   addAppsCommand(line, invocation);

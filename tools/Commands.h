@@ -17,6 +17,8 @@ using Invocation = std::function<ExitStatus()>;
 void addInitCommand(CLI::App& line, Invocation& invocation);
 void addPackCommand(CLI::App& line, Invocation& invocation);
 void addSyncCommand(CLI::App& line, Invocation& invocation);
+void addBackupCommand(CLI::App& line, Invocation& invocation);
+void addRestoreCommand(CLI::App& line, Invocation& invocation);
 void addTapCommand(CLI::App& line, Invocation& invocation);
 void addCancelCommand(CLI::App& line, Invocation& invocation);
 void addAppsCommand(CLI::App& line, Invocation& invocation);

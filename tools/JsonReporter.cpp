@@ -1,13 +1,21 @@
+#include <vector>
+
 #include "tools/Json.h"
 #include "tools/SyncReporter.h"
 
 namespace appsync::tools {
 namespace {
 
+/// The ends that an app can come to.
+std::vector<AppEvent> endsOf(Course course) {
+  if (course == Course::restore) return {AppEvent::restored, AppEvent::failed, AppEvent::skipped};
+  return {AppEvent::installed, AppEvent::updated, AppEvent::removed, AppEvent::failed, AppEvent::skipped};
+}
+
 /// `{"event":"progress","identifier":…,"fraction":…}` and the like, each line complete and handed on at once.
 class JsonReporter final : public SyncReporter {
  public:
-  explicit JsonReporter(StandardOutput& output) : output_(output) {}
+  JsonReporter(StandardOutput& output, Course course) : output_(output), course_(course) {}
 
   void progressed(const AppProgress& progress) override {
     write({{"event", "progress"}, {"identifier", progress.app.identifier}, {"fraction", progress.fraction}});
@@ -29,10 +37,8 @@ class JsonReporter final : public SyncReporter {
 
   void summarise(const AppOutcomes& outcomes) override {
     Json line = {{"event", "summary"}};
-    for (const AppEvent event :
-         {AppEvent::installed, AppEvent::updated, AppEvent::removed, AppEvent::failed, AppEvent::skipped}) {
+    for (const AppEvent event : endsOf(course_))
       line[std::string(wordFor(event))] = Json::array();
-    }
     for (const AppOutcome& outcome : outcomes) {
       line[std::string(wordFor(outcome.event))].push_back(outcome.app.identifier);
     }
@@ -46,12 +52,13 @@ class JsonReporter final : public SyncReporter {
   }
 
   StandardOutput& output_;
+  const Course course_;
 };
 
 }  // namespace
 
-std::unique_ptr<SyncReporter> makeJsonReporter(StandardOutput& output) {
-  return std::make_unique<JsonReporter>(output);
+std::unique_ptr<SyncReporter> makeJsonReporter(StandardOutput& output, Course course) {
+  return std::make_unique<JsonReporter>(output, course);
 }
 
 }  // namespace appsync::tools

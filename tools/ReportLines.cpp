@@ -33,6 +33,7 @@ std::string outcomeLine(const AppOutcome& outcome) {
     case AppEvent::installed:
     case AppEvent::updated:
     case AppEvent::removed:
+    case AppEvent::restored:
       return line(wordFor(outcome.event), shownName(outcome.app));
     case AppEvent::skipped:
       return line("skipped", shownName(outcome.app) + ": " + printable(outcome.reason));
@@ -56,10 +57,11 @@ std::string waitingLine(const AppName& app, std::string_view reason) {
 
 std::string summaryLine(const AppOutcomes& outcomes) {
   const std::string current = countOf(outcomes, AppEvent::unchanged, "up to date");
-  const std::array<std::string, 6> done = {
+  const std::array<std::string, 7> done = {
       countOf(outcomes, AppEvent::installed, "installed"),
       countOf(outcomes, AppEvent::updated, "updated"),
       countOf(outcomes, AppEvent::removed, "removed"),
+      countOf(outcomes, AppEvent::restored, "restored"),
       countOf(outcomes, AppEvent::failed, "failed"),
       countOf(outcomes, AppEvent::skipped, "skipped"),
       countOf(outcomes, AppEvent::cutOff, "cut off, to be offered again at the next sync")};

@@ -1,6 +1,13 @@
+#include <algorithm>
+#include <array>
+#include <string>
+#include <string_view>
 #include <vector>
 
+#include "device/Demotion.h"
+#include "device/InstallerError.h"
 #include "tools/Commands.h"
+#include "tools/HostFile.h"
 #include "tools/OpenDevice.h"
 #include "tools/StandardOutput.h"
 
@@ -12,6 +19,36 @@ struct SetOptions {
   std::vector<std::string> assignments;
 };
 
+using device::InstallerFailure;
+using platform::TSInstallType;
+
+/// What is done to an app rather than set.
+struct Deed {
+  std::string_view key;
+  Status (*perform)(device::Device& device, const std::string& value);
+};
+
+template <TSInstallType kType>
+Status demote(device::Device& device, const std::string& identifier) {
+  device::Services& services = device.services();
+  return device::demote(services.defaultRegistry(), services.fileSystem(), identifier, kType);
+}
+
+/// "ID:FILE"
+Status giveLicence(device::Device& device, const std::string& value) {
+  const std::size_t colon = value.find(':');
+  if (colon == value.npos) {
+    return device::installerError(InstallerFailure::badOptions, "setting licence takes ID:FILE");
+  }
+  const Result<Bytes> licence = readHostFile(value.substr(colon + 1));
+  if (!licence) return licence.error();
+  return device.services().defaultRegistry().setLicenceData(value.substr(0, colon), *licence);
+}
+
+constexpr std::array<Deed, 3> kDeeds = {{{"demote", demote<TSInstallType::IntentionalDowngrade>},
+                                         {"demote-auto", demote<TSInstallType::Downgrade>},
+                                         {"licence", giveLicence}}};
+
 constexpr const char* kExamples = R"(Keys and their values:
   app-installation   yes, no or unset: whether apps may be installed
   app-removal        yes, no or unset: whether apps may be removed
@@ -19,17 +56,32 @@ constexpr const char* kExamples = R"(Keys and their values:
                      cancelled while a sync runs; from the next sync on
   assertion          ID:granted, ID:denied, ID:unknown, ID:failing or ID:unset: what the home screen
                      answers when app ID is about to be replaced
+  store              a folder of packages, or unset: where an app that was restored through coordinators gets its
+                     package from
+  demote             ID: leaves of an installed app the icon and the data, as a person wishes it
+  demote-auto        ID: the same, as a device does it that needs room
+  licence            ID:FILE: gives an app the licence data in FILE
 
 Examples:
   appsync set phone app-removal=no
+  appsync set phone demote=org.example.tides
   appsync set phone app-removal=unset app-installation=unset
   appsync set phone coordination=off)";
 
+Status assign(device::Device& device, const std::string& assignment) {
+  const std::size_t equals = assignment.find('=');
+  const auto deed = std::ranges::find(kDeeds, std::string_view(assignment).substr(0, equals), &Deed::key);
+  if (equals == assignment.npos || deed == kDeeds.end()) return device.services().settings().assign(assignment);
+  return deed->perform(device, assignment.substr(equals + 1));
+}
+
 ExitStatus run(const SetOptions& options, device::Device& device) {
   for (const std::string& assignment : options.assignments) {
-    const Status set = device.services().settings().assign(assignment);
+    const Status set = assign(device, assignment);
     if (set) continue;
-    if (set.error().domain != device::kSettingsDomain) return reportUnusable(set.error());
+    const bool isWrongUsage =
+        set.error().domain == device::kSettingsDomain || set.error().domain == platform::InstallerErrorDomain;
+    if (!isWrongUsage) return reportUnusable(set.error());
     printError(set.error().text);
     return ExitStatus::wrongUsage;
   }

@@ -2,9 +2,8 @@
 #include <memory>
 #include <vector>
 
-#include <unistd.h>
-
 #include "core/AppsClient.h"
+#include "tools/CommandReports.h"
 #include "tools/Commands.h"
 #include "tools/Daemon.h"
 #include "tools/OpenDevice.h"
@@ -19,8 +18,7 @@ struct SyncOptions {
   std::string library;
   std::vector<std::string> remove;
   std::vector<std::string> only;
-  bool json = false;
-  std::string log;
+  ReportOptions report;
 };
 
 constexpr const char* kExamples =
@@ -44,11 +42,6 @@ Examples:
 
 Exit status: 0 done, 1 some app failed, 2 wrong usage, 3 the device or library cannot be used.)";
 
-std::unique_ptr<SyncReporter> makeReporter(const SyncOptions& options, StandardOutput& output) {
-  if (options.json) return makeJsonReporter(output);
-  return ::isatty(STDOUT_FILENO) == 1 ? makeTerminalReporter(output) : makePlainReporter(output);
-}
-
 bool isUsable(const SyncOptions& options) {
   for (const auto* identifiers : {&options.remove, &options.only}) {
     for (const std::string& identifier : *identifiers) {
@@ -65,21 +58,13 @@ bool isUsable(const SyncOptions& options) {
   return true;
 }
 
-Status openLog(const SyncOptions& options, device::Device& device) {
-  if (options.log.empty()) return {};
-  auto sink = device::FileLogSink::open(options.log);
-  if (!sink) return sink.error();
-  device.services().syncFramework().logTo(std::move(sink).value());
-  return {};
-}
-
 ExitStatus run(const SyncOptions& options, device::Device& device) {
-  if (Status opened = openLog(options, device); !opened) return reportUnusable(opened.error());
+  if (Status opened = openLog(options.report, device); !opened) return reportUnusable(opened.error());
   const Result<Library> library = readLibrary(options.library);
   if (!library) return reportUnusable(library.error());
   const Interruption interruption;
   StandardOutput output;
-  const auto reporter = makeReporter(options, output);
+  const auto reporter = makeReporter(options.report, output, Course::sync);
   SyncProgress progress(*reporter);
   const auto client = AppsClient::create(device.platform());
   Daemon daemon(device, *client, progress, interruption);
@@ -101,8 +86,7 @@ void addSyncCommand(CLI::App& line, Invocation& invocation) {
   command->add_option("--remove", options->remove, "remove this app from the device")->type_name("ID")->take_all();
   command->add_option("--only", options->only, "install or update this app only, even if it was deleted before")
       ->type_name("ID");
-  command->add_flag("--json", options->json, "write JSON Lines");
-  command->add_option("--log", options->log, "append the sync framework's log to this file")->type_name("FILE");
+  addReportOptions(*command, options->report);
   command->footer(kExamples);
   command->callback([options, &invocation] {
     invocation = [options] {

@@ -10,6 +10,9 @@
 
 namespace appsync::tools {
 
+/// What is reported on.
+enum class Course : std::uint8_t { sync, restore };
+
 enum class AppStage : std::uint8_t { sending, installing, waiting };
 
 /// How far one app is, and the whole sync. Fractions run from 0 to 1 and never go back.
@@ -47,6 +50,6 @@ inline constexpr std::string_view kInterruptedNotice =
 /// The same lines, and below them, redrawn in place, one per running app and one for the whole.
 [[nodiscard]] std::unique_ptr<SyncReporter> makeTerminalReporter(StandardOutput& output);
 /// JSON Lines for machines.
-[[nodiscard]] std::unique_ptr<SyncReporter> makeJsonReporter(StandardOutput& output);
+[[nodiscard]] std::unique_ptr<SyncReporter> makeJsonReporter(StandardOutput& output, Course course);
 
 }  // namespace appsync::tools

@@ -73,7 +73,7 @@ TEST(JsonReporter, TellsProgressEndsAndSummaryAsOneObjectPerLine) {
   CaptureStdout();
   {
     StandardOutput output;
-    const auto reporter = makeJsonReporter(output);
+    const auto reporter = makeJsonReporter(output, Course::sync);
     reporter->progressed({kTides, AppStage::sending, 0.25, 0.1, 0, 1});
     reporter->finished(outcome(AppEvent::failed, "it is damaged"));
     reporter->summarise({outcome(AppEvent::failed, "it is damaged"), outcome(AppEvent::unchanged)});
@@ -92,7 +92,7 @@ TEST(JsonReporter, HostileNamesStayJSON) {
   CaptureStdout();
   {
     StandardOutput output;
-    makeJsonReporter(output)->finished({AppEvent::failed, {"\xff\"\n", std::string(1, '\0'), ""}, "\x1b"});
+    makeJsonReporter(output, Course::sync)->finished({AppEvent::failed, {"\xff\"\n", std::string(1, '\0'), ""}, "\x1b"});
   }
   EXPECT_EQ(linesOf(GetCapturedStdout()).size(), 1U);
 }

@@ -1,0 +1,59 @@
+#include <algorithm>
+#include <string>
+
+#include "core/AppsClient.h"
+#include "device/Demotion.h"
+#include "tools/BackupWriter.h"
+#include "tools/Commands.h"
+#include "tools/OpenDevice.h"
+#include "tools/Printable.h"
+#include "tools/StandardOutput.h"
+
+namespace appsync::tools {
+namespace {
+
+struct BackupOptions {
+  std::string device;
+  std::string backup;
+};
+
+constexpr const char* kExamples =
+    R"(BACKUP is a folder that must not exist yet. It gets what the apps of the device need to come back: of each its store
+metadata, licence, icon, version and data, which apps are demoted, and the order of the icons. Packages are not in
+it: after `appsync restore` the next sync brings them.
+
+Whatever ends the process, the folder is whole or not there.
+
+Example:
+  appsync backup phone phone-backup
+
+Exit status: 0 done, 2 wrong usage, 3 the device cannot be used or the backup not be written.)";
+
+std::string summaryOf(const Backup& backup) {
+  const auto count = [&](auto&& has) { return std::to_string(std::ranges::count_if(backup.apps, has)); };
+  return "Saved " + std::to_string(backup.apps.size()) + (backup.apps.size() == 1 ? " app" : " apps") + ", " +
+         count([](const BackedUpApp& app) { return app.isDemoted(); }) + " demoted, " +
+         count([](const BackedUpApp& app) { return app.data.has_value(); }) + " with data, to " +
+         printable(backup.path) + ".";
+}
+
+ExitStatus run(const BackupOptions& options, device::Device& device) {
+  AppsClient::create(device.platform())->prepareForBackup();
+  const Status listed = device::recordDemotedApps(device.services().defaultRegistry(), device.services().fileSystem());
+  if (!listed) return reportUnusable(listed.error());
+  const Result<Backup> backup = writeBackup(device, options.backup);
+  if (!backup) return reportUnusable(backup.error());
+  StandardOutput output;
+  output.writeLine(summaryOf(*backup));
+  return output.finish(ExitStatus::done);
+}
+
+}  // namespace
+
+void addBackupCommand(CLI::App& line, Invocation& invocation) {
+  const CommandText text = {"backup", "Save what a device's apps need to come back.", kExamples};
+  const auto added = addDeviceCommand(line, invocation, text, device::Access::exclusive, run);
+  added.command.add_option("BACKUP", added.options->backup, "the folder to make")->required();
+}
+
+}  // namespace appsync::tools

@@ -1,0 +1,29 @@
+#include "tools/CommandReports.h"
+
+#include <utility>
+
+#include <unistd.h>
+
+#include "device/LogSink.h"
+
+namespace appsync::tools {
+
+void addReportOptions(CLI::App& command, ReportOptions& options) {
+  command.add_flag("--json", options.json, "write JSON Lines");
+  command.add_option("--log", options.log, "append the sync framework's log to this file")->type_name("FILE");
+}
+
+std::unique_ptr<SyncReporter> makeReporter(const ReportOptions& options, StandardOutput& output, Course course) {
+  if (options.json) return makeJsonReporter(output, course);
+  return ::isatty(STDOUT_FILENO) == 1 ? makeTerminalReporter(output) : makePlainReporter(output);
+}
+
+Status openLog(const ReportOptions& options, device::Device& device) {
+  if (options.log.empty()) return {};
+  auto sink = device::FileLogSink::open(options.log);
+  if (!sink) return sink.error();
+  device.services().syncFramework().logTo(std::move(sink).value());
+  return {};
+}
+
+}  // namespace appsync::tools

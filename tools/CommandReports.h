@@ -1,0 +1,30 @@
+// How commands that work on many apps tell of it.
+#pragma once
+
+#include <memory>
+#include <string>
+
+#include <CLI/CLI.hpp>
+
+#include "device/Device.h"
+#include "tools/StandardOutput.h"
+#include "tools/SyncReporter.h"
+
+namespace appsync::tools {
+
+struct ReportOptions {
+  bool json = false;
+  std::string log;
+};
+
+/// Adds --json and --log.
+void addReportOptions(CLI::App& command, ReportOptions& options);
+
+/// JSON Lines if they are asked for, else lines for a terminal or a pipe.
+[[nodiscard]] std::unique_ptr<SyncReporter> makeReporter(const ReportOptions& options, StandardOutput& output,
+                                                         Course course);
+
+/// Lets the sync framework log to the file, if one is asked for.
+[[nodiscard]] Status openLog(const ReportOptions& options, device::Device& device);
+
+}  // namespace appsync::tools

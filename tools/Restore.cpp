@@ -1,0 +1,207 @@
+#include "tools/Restore.h"
+
+#include <cerrno>
+#include <chrono>
+#include <memory>
+#include <utility>
+
+#include "core/AppsClient.h"
+#include "device/AppData.h"
+#include "device/BackupManager.h"
+#include "device/Demotion.h"
+#include "tools/DeviceApps.h"
+#include "tools/RestoreMarker.h"
+#include "tools/Ticker.h"
+
+namespace appsync::tools {
+namespace {
+
+using namespace std::chrono_literals;
+using platform::TSInstallType;
+
+constexpr std::string_view kHostRestoreFolder = "/var/mobile/Media/HarvoRestore";
+constexpr std::string_view kHostRestorePath = "/var/mobile/Media/HarvoRestore/RestoreApplications.plist";
+constexpr auto kTimeBetweenLooks = 20ms;
+
+Error refusal(std::string text) {
+  return {std::string(domains::kPOSIX), EEXIST, std::move(text), nullptr};
+}
+
+std::shared_ptr<const platform::AppRecord> recordOf(device::Device& device, std::string_view identifier) {
+  return device.platform().defaultRegistry().recordForIdentifier(identifier, platform::PlaceholderLookup::on);
+}
+
+/// What the sync client has to know of an app beside what the store said of it.
+Result<Bytes> completed(const BackedUpApp& app, const std::optional<Bytes>& saved) {
+  plist::Dictionary metadata;
+  if (saved) {
+    const Result<plist::Value> root = plist::read(*saved);
+    if (!root) return root.error().in("its store metadata is damaged");
+    if (root->dictionary() == nullptr) return refusal("its store metadata is damaged: it is no dictionary");
+    metadata = *root->dictionary();
+  }
+  if (metadata.find("title") == nullptr && metadata.find("itemName") == nullptr) {
+    metadata.set("title", app.app.name.empty() ? app.app.identifier : app.app.name);
+  }
+  const bool lacksVersion = metadata.find("bundleVersion") == nullptr;
+  if (lacksVersion || !app.app.version.empty()) metadata.set("bundleVersion", app.app.version);
+  return plist::writeBinary(metadata);
+}
+
+Status writeList(device::Device& device, std::string_view path, const plist::Value& root) {
+  const Result<Bytes> document = plist::writeBinary(root);
+  return document ? device.platform().fileSystem().writeFileAtomically(path, *document) : Status(document.error());
+}
+
+}  // namespace
+
+Status Restore::check() const {
+  const auto underWay = restoreUnderWay(device_.path());
+  if (underWay == backup_.identifier || appsOn(device_).empty()) return {};
+  if (underWay) {
+    return refusal(device_.path() +
+                   " is in the middle of the restore of another backup; finish that one first, or restore to a new "
+                   "device, made with `appsync init`");
+  }
+  return refusal(device_.path() + " has apps already; restore to a new device, made with `appsync init`");
+}
+
+Status Restore::run() {
+  for (const BackedUpApp& app : backup_.apps) {
+    if (app.damage.empty()) {
+      progress_.expect(app.app, 0);
+    } else {
+      refuse(app, app.damage);
+    }
+  }
+  Status placed = beginRestore(device_.path(), backup_.identifier);
+  if (placed) placed = putFilesInPlace();
+  if (!placed) {
+    for (const BackedUpApp& app : backup_.apps)
+      progress_.finish({AppEvent::failed, app.app, placed.error().text});
+    return placed;
+  }
+  makePlaceholders();
+  finishApps();
+  return endRestore(device_.path());
+}
+
+Status Restore::putFilesInPlace() {
+  plist::Dictionary entries;
+  plist::Array automatic;
+  plist::Array intentional;
+  for (const BackedUpApp& app : backup_.apps) {
+    if (!isWanted(app)) continue;
+    if (Status taken = takeOver(app, entries); !taken) {
+      refuse(app, taken.error().text);
+      continue;
+    }
+    if (!app.isDemoted()) continue;
+    (app.demotion == TSInstallType::Downgrade ? automatic : intentional).push_back(app.app.identifier);
+  }
+  const plist::Dictionary demoted = {{device::kAutomaticDowngradesKey, std::move(automatic)},
+                                     {device::kIntentionalDowngradesKey, std::move(intentional)}};
+  if (Status written = writeList(device_, device::kDemotedAppsPath, demoted); !written) return written;
+  Status made = device_.platform().fileSystem().createDirectory(kHostRestoreFolder,
+                                                                platform::IntermediateDirectories::create, {});
+  return made ? writeList(device_, kHostRestorePath, entries) : made;
+}
+
+Status Restore::takeOver(const BackedUpApp& app, plist::Dictionary& entries) {
+  Result<plist::Dictionary> entry = entryOf(app);
+  if (!entry) return entry.error();
+  if (Status kept = keepData(app); !kept) return kept;
+  entries.set(app.app.identifier, std::move(entry).value());
+  return {};
+}
+
+Result<plist::Dictionary> Restore::entryOf(const BackedUpApp& app) const {
+  plist::Dictionary entry;
+  std::optional<Bytes> metadata;
+  const auto read = [&](std::string_view name, const std::optional<std::uint64_t>& size, auto&& use) -> Status {
+    if (!size) return {};
+    Result<Bytes> bytes = readBackupFile(backup_, app, name, *size);
+    if (!bytes) return bytes.error();
+    use(std::move(bytes).value());
+    return {};
+  };
+  const auto addTo = [&entry](std::string_view key) {
+    return [&entry, key](Bytes bytes) { entry.set(key, std::move(bytes)); };
+  };
+  Status done =
+      read(backup_files::kStoreMetadata, app.storeMetadata, [&](Bytes bytes) { metadata = std::move(bytes); });
+  if (done) done = read(backup_files::kLicence, app.licence, addTo("ApplicationSINF"));
+  if (done) done = read(backup_files::kIcon, app.icon, addTo("PlaceholderIcon"));
+  if (!done) return done.error();
+  Result<Bytes> document = completed(app, metadata);
+  if (!document) return document.error();
+  entry.set("HarvoMetadata", std::move(document).value());
+  return entry;
+}
+
+Status Restore::keepData(const BackedUpApp& app) {
+  const std::string& identifier = app.app.identifier;
+  if (!app.data) return {};
+  device::BackupManager manager(device_.services().database(), device_.services().fileSystem());
+  std::uint64_t size = 0;
+  const bool isKept = manager.restoreDataExists(identifier, &size);
+  // An attempt that was cut off may have come further.
+  if (!isKept && device_.platform().fileSystem().fileExists(device::dataContainerOf(identifier))) return {};
+  if (isKept && size == *app.data) return {};
+  if (Status kept = manager.keepRestoreData(identifier, dataFolderIn(backup_, app)); !kept) return kept;
+  if (manager.restoreDataExists(identifier, &size) && size == *app.data) return {};
+  manager.cancelApplicationRestore(identifier, nullptr);
+  return Error{std::string(domains::kPOSIX), EINVAL,
+               "its data in the backup is damaged: there are " + std::to_string(size) + " bytes and must be " +
+                   std::to_string(*app.data),
+               nullptr};
+}
+
+void Restore::makePlaceholders() {
+  // Not the daemon: this is the process that waits for placeholders.
+  device_.services().bundles().actAs(std::string(device::Bundles::kDataMigratorIdentifier));
+  const auto client = AppsClient::create(device_.platform());
+  const Ticker ticker(kTimeBetweenLooks, [this] {
+    for (const BackedUpApp& app : backup_.apps) {
+      if (recordOf(device_, app.app.identifier) != nullptr) progress_.installing(app.app.identifier, 1);
+    }
+  });
+  client->reconcileRestoreOfType(platform::kRestoreTypeHost, nullptr);
+}
+
+void Restore::finishApps() {
+  for (const BackedUpApp& app : backup_.apps) {
+    if (!isWanted(app)) continue;
+    if (recordOf(device_, app.app.identifier) == nullptr) {
+      refuse(app, "the device made no placeholder for it; --log may tell why");
+    } else if (Status demoted = app.isDemoted() ? demote(app) : Status(); !demoted) {
+      refuse(app, demoted.error().text);
+    } else {
+      progress_.finish({AppEvent::restored, app.app, {}});
+    }
+  }
+  const plist::Array layout(backup_.iconOrder.begin(), backup_.iconOrder.end());
+  const Result<Bytes> document = plist::writeBinary(layout);
+  auto& homeScreen = device_.services().homeScreen();
+  if (document && !layout.empty()) homeScreen.setIconState(homeScreen.blockableServerPort(), *document);
+}
+
+/// Without coordination the sync client makes all placeholders alike. No package comes at which the data would be given
+/// back.
+Status Restore::demote(const BackedUpApp& app) {
+  const std::string& identifier = app.app.identifier;
+  const auto record = recordOf(device_, identifier);
+  if (record->isPlaceholder() && record->installType() != app.demotion) {
+    Status set = device_.services().defaultRegistry().setPlaceholderType(identifier, app.demotion);
+    if (!set) return set;
+  }
+  device::BackupManager manager(device_.services().database(), device_.services().fileSystem());
+  return manager.restoreDataNow(identifier);
+}
+
+void Restore::refuse(const BackedUpApp& app, std::string_view reason) {
+  refused_.insert(app.app.identifier);
+  progress_.finish({AppEvent::failed, app.app, std::string(reason)});
+}
+
+}  // namespace appsync::tools

@@ -1,0 +1,69 @@
+#include <algorithm>
+#include <memory>
+#include <string>
+
+#include "tools/Backup.h"
+#include "tools/CommandReports.h"
+#include "tools/Commands.h"
+#include "tools/OpenDevice.h"
+#include "tools/Restore.h"
+#include "tools/StandardOutput.h"
+
+namespace appsync::tools {
+namespace {
+
+struct RestoreOptions {
+  std::string device;
+  std::string backup;
+  ReportOptions report;
+};
+
+constexpr const char* kExamples =
+    R"(BACKUP is a folder that `appsync backup` made. DEVICE must have no apps yet. Each app of the backup gets a placeholder
+on it, with its name, version and icon; its data is kept for it. Then
+
+  appsync sync DEVICE LIBRARY
+
+brings the packages of those that are not demoted: from the library, or where apps are installed through
+coordinators from the folder that was set with `appsync set DEVICE store=FOLDER`.
+
+A restore that was cut off is completed by running it again. One bad app does not stop the others.
+
+With --json each line is an object: {"event":"progress","identifier":...,"fraction":...} while placeholders arrive;
+exactly one of restored, failed and skipped for each app, the last two with a "reason"; and at the end
+{"event":"summary",...} with the identifiers as arrays.
+
+Examples:
+  appsync init new-phone --coordinated
+  appsync set new-phone store=lib
+  appsync restore new-phone phone-backup
+  appsync sync new-phone lib
+
+Exit status: 0 done, 1 some app failed, 2 wrong usage, 3 the device or backup cannot be used.)";
+
+ExitStatus run(const RestoreOptions& options, device::Device& device) {
+  if (Status opened = openLog(options.report, device); !opened) return reportUnusable(opened.error());
+  const Result<Backup> backup = readBackup(options.backup);
+  if (!backup) return reportUnusable(backup.error());
+  StandardOutput output;
+  const auto reporter = makeReporter(options.report, output, Course::restore);
+  SyncProgress progress(*reporter);
+  Restore restore(device, *backup, progress);
+  if (Status checked = restore.check(); !checked) return reportUnusable(checked.error());
+  const Status restored = restore.run();
+  const AppOutcomes& outcomes = progress.summarise();
+  if (!restored) return output.finish(reportUnusable(restored.error()));
+  const bool allWell = std::ranges::none_of(outcomes, [](const AppOutcome& one) { return isFailure(one.event); });
+  return output.finish(allWell ? ExitStatus::done : ExitStatus::someAppFailed);
+}
+
+}  // namespace
+
+void addRestoreCommand(CLI::App& line, Invocation& invocation) {
+  const CommandText text = {"restore", "Bring the apps of a backup back to a new device.", kExamples};
+  const auto added = addDeviceCommand(line, invocation, text, device::Access::exclusive, run);
+  added.command.add_option("BACKUP", added.options->backup, "the backup's folder")->required();
+  addReportOptions(added.command, added.options->report);
+}
+
+}  // namespace appsync::tools

@@ -1,0 +1,42 @@
+#include "tools/RestoreMarker.h"
+
+#include <cerrno>
+
+#include <fcntl.h>
+
+#include "base/PropertyList.h"
+#include "device/HostFile.h"
+#include "device/SystemCalls.h"
+#include "tools/HostFile.h"
+
+namespace appsync::tools {
+namespace {
+
+constexpr std::string_view kBackup = "Backup";
+
+std::string pathIn(const std::string& devicePath) {
+  return devicePath + "/restore.plist";
+}
+
+}  // namespace
+
+std::optional<std::string> restoreUnderWay(const std::string& devicePath) {
+  const Result<Bytes> bytes = readHostFile(pathIn(devicePath));
+  if (!bytes) return std::nullopt;
+  const Result<plist::Value> root = plist::read(*bytes);
+  const plist::Value* backup = root ? root->find(kBackup) : nullptr;
+  const auto text = backup == nullptr ? std::nullopt : backup->string();
+  return text ? std::optional(std::string(*text)) : std::nullopt;
+}
+
+Status beginRestore(const std::string& devicePath, const std::string& backupIdentifier) {
+  const Result<Bytes> bytes = plist::writeXML(plist::Dictionary{{kBackup, backupIdentifier}});
+  return bytes ? device::replaceHostFile(pathIn(devicePath), *bytes) : Status(bytes.error());
+}
+
+Status endRestore(const std::string& devicePath) {
+  const int number = device::sys::removeFile(AT_FDCWD, pathIn(devicePath).c_str());
+  return number == 0 || number == ENOENT ? Status() : Status(Error::fromErrno(number, pathIn(devicePath)));
+}
+
+}  // namespace appsync::tools
