@@ -1,5 +1,6 @@
 #include <algorithm>
 
+#include "device/AppTable.h"
 #include "tools/Commands.h"
 #include "tools/DeviceApps.h"
 #include "tools/Json.h"
@@ -38,7 +39,8 @@ Json toJson(const std::vector<DeviceApp>& apps) {
 
 std::string_view stateOf(const DeviceApp& app) {
   if (!app.isPlaceholder) return "installed";
-  return app.isInstalled ? "being updated" : "waiting for its package";
+  if (app.isInstalled) return "being updated";
+  return device::isDemotion(app.installType) ? "demoted" : "waiting for its package";
 }
 
 constexpr std::size_t kWidest = 40;

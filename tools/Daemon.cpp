@@ -132,7 +132,8 @@ void Daemon::learnDeletedApps() {
 
 void Daemon::planSync(const SyncRequest& request) {
   const auto apps = appsByIdentifier(device_);
-  plan_ = makePlan({request.library, apps, state_.declined, request.only, request.remove});
+  const IdentifierSet fromStore = awaitedFromStore(device_);
+  plan_ = makePlan({request.library, apps, state_.declined, request.only, request.remove, fromStore});
   for (const std::string& identifier : request.only)
     state_.declined.erase(identifier);
   state_.declined.insert(request.remove.begin(), request.remove.end());
@@ -140,6 +141,21 @@ void Daemon::planSync(const SyncRequest& request) {
     if (app.package == nullptr) continue;
     state_.offered.insert(app.app.identifier);
     transfers_.emplace(app.app.identifier, &app);
+  }
+  wakeDemotedApps(apps);
+}
+
+/// Who installs directly asks for no package of an app that has a placeholder, unless it was restored: a demoted app
+/// that is wanted again counts as that.
+void Daemon::wakeDemotedApps(const std::map<std::string, DeviceApp, std::less<>>& apps) {
+  if (device_.platform().installCoordination().coordinationIsEnabled()) return;
+  for (const auto& [identifier, app] : transfers_) {
+    const auto present = apps.find(identifier);
+    const bool isDemoted =
+        present != apps.end() && !present->second.isInstalled && device::isDemotion(present->second.installType);
+    if (!isDemoted) continue;
+    // One that cannot be changed is not asked for, and told so.
+    device_.services().defaultRegistry().setPlaceholderType(identifier, platform::TSInstallType::Restore).ignore();
   }
 }
 
@@ -159,6 +175,7 @@ void Daemon::transferPackages(InstallWatcher& watcher) {
     if (app != nullptr) progress_.expect(app->app, app->package->bytes);
   }
   queue_.fill(assets);
+  StoreRun store(device_, plan_, progress_, watcher, interruption_);
   while (const auto next = queue_.front()) {
     const PlannedApp* app = planned(next->identifier());
     watcher.waitForRoom(app == nullptr ? 0 : app->package->bytes);
@@ -166,6 +183,7 @@ void Daemon::transferPackages(InstallWatcher& watcher) {
     if (const auto asset = queue_.take()) transfer(asset, watcher);
   }
   client_.assetTransferEndedWithSuccess(!interruption_.requested());
+  store.wait();
   watcher.waitForInstalls();
 }
 
@@ -197,6 +215,16 @@ void Daemon::transfer(const std::shared_ptr<ZTAsset>& asset, InstallWatcher& wat
   watcher.watch({app->app, success, std::string(kPublicStaging) + "/" + *path, app->package->bytes,
                  std::chrono::steady_clock::now()});
   progress_.installing(asset->identifier(), 0);
+  client_.assetTransferSucceeded(asset, true, std::nullopt);
+  handOverData(asset);
+}
+
+void Daemon::handOverData(const std::shared_ptr<ZTAsset>& asset) {
+  if (!asset->isRestore()) return;
+  if (!device_.platform().makeBackupManager()->restoreDataExists(asset->identifier(), nullptr)) return;
+  // The client has parked the package, and finds it again by itself.
+  asset->setPath(std::nullopt);
+  asset->setCompletedAssetParts(platform::kZTAssetPartApplicationData);
   client_.assetTransferSucceeded(asset, true, std::nullopt);
 }
 
@@ -232,6 +260,9 @@ void Daemon::tellRemovals(InstallWatcher& watcher) {
 void Daemon::tellUnfinished() {
   const bool forbidden = isForbidden(device_, RestrictionSetting::appInstallationAllowed);
   for (const PlannedApp& app : plan_) {
+    if (app.work == PlannedWork::restore) {
+      progress_.finish({AppEvent::failed, app.app, "the store did not bring its package; the next sync tries again"});
+    }
     if (app.package == nullptr) continue;
     if (queue_.wasCancelled(app.app.identifier)) {
       progress_.finish({AppEvent::skipped, app.app, std::string(kCancelledOnDevice)});

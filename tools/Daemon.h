@@ -14,6 +14,7 @@
 #include "tools/InstallWatcher.h"
 #include "tools/Interruption.h"
 #include "tools/PackageSender.h"
+#include "tools/StoreRun.h"
 #include "tools/SyncPlan.h"
 #include "tools/SyncProgress.h"
 #include "tools/TransferQueue.h"
@@ -45,8 +46,11 @@ class Daemon {
 
   void learnDeletedApps();
   void planSync(const SyncRequest& request);
+  void wakeDemotedApps(const std::map<std::string, DeviceApp, std::less<>>& apps);
   [[nodiscard]] Status handOverInstructions();
   void transferPackages(InstallWatcher& watcher);
+  /// Tells the client that the data of a restored app, which the device keeps, has come too.
+  void handOverData(const std::shared_ptr<platform::ZTAsset>& asset);
   void transfer(const std::shared_ptr<platform::ZTAsset>& asset, InstallWatcher& watcher);
   void tellWhatIsKnown();
   void tellRemovals(InstallWatcher& watcher);

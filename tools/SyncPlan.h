@@ -17,9 +17,10 @@ enum class PlannedWork : std::uint8_t {
   install,
   update,
   remove,
-  none,    ///< the app is as it should be
-  skip,    ///< left alone on purpose
-  refuse,  ///< cannot be done
+  restore,  ///< the device's store brings the package
+  none,     ///< the app is as it should be
+  skip,     ///< left alone on purpose
+  refuse,   ///< cannot be done
 };
 
 struct PlannedApp {
@@ -37,10 +38,12 @@ struct PlanInput {
   /// When not empty, the only apps that are installed or updated.
   const IdentifierSet& only;
   const IdentifierSet& remove;
+  /// Restored apps whose packages are the device's store's to bring.
+  const IdentifierSet& fromStore;
 };
 
-/// One entry for each app concerned: first the removals, then the library's apps by identifier, then its broken
-/// packages. The packages stay the library's.
+/// One entry for each app concerned: first the removals, then restored apps whose packages the library does not bring,
+/// then the library's apps by identifier, then its broken packages. The packages stay the library's.
 [[nodiscard]] std::vector<PlannedApp> makePlan(const PlanInput& input);
 
 }  // namespace appsync::tools

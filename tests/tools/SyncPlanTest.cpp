@@ -22,7 +22,7 @@ class SyncPlan : public testing::Test {
     apps_[identifier].isInstalled = false;
     apps_[identifier].isPlaceholder = true;
   }
-  std::vector<PlannedApp> plan() { return makePlan({library_, apps_, declined_, only_, remove_}); }
+  std::vector<PlannedApp> plan() { return makePlan({library_, apps_, declined_, only_, remove_, fromStore_}); }
   PlannedApp planOfOne() {
     const auto all = plan();
     EXPECT_EQ(all.size(), 1U);
@@ -34,6 +34,7 @@ class SyncPlan : public testing::Test {
   IdentifierSet declined_;
   IdentifierSet only_;
   IdentifierSet remove_;
+  IdentifierSet fromStore_;
 };
 
 TEST_F(SyncPlan, NothingIsPlannedForAnEmptyLibrary) {
