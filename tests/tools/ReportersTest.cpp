@@ -92,7 +92,8 @@ TEST(JsonReporter, HostileNamesStayJSON) {
   CaptureStdout();
   {
     StandardOutput output;
-    makeJsonReporter(output, Course::sync)->finished({AppEvent::failed, {"\xff\"\n", std::string(1, '\0'), ""}, "\x1b"});
+    makeJsonReporter(output, Course::sync)
+        ->finished({AppEvent::failed, {"\xff\"\n", std::string(1, '\0'), ""}, "\x1b"});
   }
   EXPECT_EQ(linesOf(GetCapturedStdout()).size(), 1U);
 }

@@ -1,0 +1,119 @@
+#include <csignal>
+
+#include <gmock/gmock.h>
+
+#include "tests/tools/RestoreFixture.h"
+#include "tools/Backup.h"
+
+namespace appsync::test {
+namespace {
+
+using platform::TSInstallType;
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::UnorderedElementsAre;
+using tools::BackedUpApp;
+
+class Backup : public RestoreFixture {
+ protected:
+  [[nodiscard]] BackedUpApp entry(const std::string& identifier) const {
+    const auto read = tools::readBackup(backup());
+    EXPECT_TRUE(read.ok());
+    for (const BackedUpApp& app : read->apps) {
+      if (app.app.identifier == identifier) return app;
+    }
+    ADD_FAILURE() << identifier << " is not in the backup";
+    return {};
+  }
+  [[nodiscard]] std::string file(const std::string& name) const { return readHostFile(backup() + "/Apps/" + name); }
+  /// What is in the folder in which the backup is made.
+  [[nodiscard]] std::vector<std::string> beside() const {
+    std::vector<std::string> names;
+    for (const auto& entry : std::filesystem::directory_iterator(path("")))
+      names.push_back(entry.path().filename());
+    return names;
+  }
+};
+
+TEST_P(Backup, HasOfEachAppWhatItNeedsToComeBack) {
+  fillDevice();
+  const Finished saved = run({"backup", device(), backup()});
+  EXPECT_THAT(saved.out, HasSubstr("Saved 5 apps, 2 demoted, 2 with data, to "));
+  EXPECT_EQ(entry("org.data").app.version, "2.0");
+  EXPECT_EQ(entry("org.data").data, 16U);
+  EXPECT_EQ(file("org.data/Data/Documents/notes"), "what was written");
+  EXPECT_THAT(file("org.data/HarvoMetadata.plist"), HasSubstr("With Data"));
+  EXPECT_EQ(file("org.licence/ApplicationSINF"), "a licence");
+  EXPECT_EQ(entry("org.wished").demotion, TSInstallType::IntentionalDowngrade);
+  EXPECT_EQ(entry("org.auto").demotion, TSInstallType::Downgrade);
+  EXPECT_EQ(file("org.auto/Data/Documents/scores"), "100");
+  EXPECT_FALSE(entry("org.plain").isDemoted());
+  EXPECT_FALSE(entry("org.plain").data);
+}
+
+TEST_P(Backup, OfADeviceWithoutAppsHasNone) {
+  EXPECT_THAT(run({"backup", device(), backup()}).out, HasSubstr("Saved 0 apps"));
+  EXPECT_TRUE(tools::readBackup(backup())->apps.empty());
+}
+
+TEST_P(Backup, NothingInThePlaceIsTouched) {
+  write(path("file"), "mine");
+  EXPECT_THAT(run({"backup", device(), path("file")}, 3).err, HasSubstr("exists already; choose another name"));
+  EXPECT_EQ(readHostFile(path("file")), "mine");
+  makeBackup();
+  EXPECT_THAT(run({"backup", device(), backup()}, 3).err, HasSubstr("exists already"));
+  EXPECT_THAT(run({"backup", device(), backup() + "/"}, 3).err, HasSubstr("exists already"));
+  EXPECT_THAT(run({"backup", device(), "."}, 3).err, HasSubstr("exists already"));
+}
+
+TEST_P(Backup, NeedsAFolderToBeMadeInAndADevice) {
+  EXPECT_THAT(run({"backup", device(), path("missing/backup")}, 3).err, HasSubstr("missing"));
+  EXPECT_THAT(run({"backup", library(), backup()}, 3).err, HasSubstr("is not a device"));
+  EXPECT_FALSE(std::filesystem::exists(backup()));
+}
+
+TEST_P(Backup, AnAppWithSpecialFilesInItsDataIsToldAndNothingIsLeft) {
+  fillDevice();
+  ASSERT_EQ(mkfifo((device() + kData + "org.data/pipe").c_str(), 0600), 0);
+  EXPECT_THAT(run({"backup", device(), backup()}, 3).err, HasSubstr("org.data"));
+  EXPECT_THAT(beside(), UnorderedElementsAre("device", "library", "licence"));
+}
+
+TEST_P(Backup, LinksInDataLeadNowhereElse) {
+  fillDevice();
+  write(path("secret"), "secret");
+  std::filesystem::create_symlink(path("secret"), device() + kData + "org.data/link");
+  std::filesystem::create_symlink(path(""), device() + kData + "org.plain");
+  run({"backup", device(), backup()}, 3);
+  std::filesystem::remove(device() + kData + "org.plain");
+  makeBackup();
+  EXPECT_TRUE(std::filesystem::is_symlink(backup() + "/Apps/org.data/Data/link"));
+}
+
+TEST_P(Backup, KilledAtAnyStepIsNotThereAndTheNextOneIsWhole) {
+  fillDevice();
+  long step = 1;
+  for (; step < 2000; step += 5) {
+    std::filesystem::remove_all(backup());
+    const Finished killed =
+        runTool({"backup", device(), backup()},
+                {.environment = {{"APPSYNC_KILL_AT", std::to_string(step)}}, .output = OutputTo::file, .input = {}});
+    if (killed.status == 0) break;
+    ASSERT_EQ(killed.status, -SIGKILL) << killed.err;
+    if (std::filesystem::exists(backup())) {
+      ASSERT_EQ(tools::readBackup(backup())->apps.size(), 5U) << "step " << step;
+      continue;
+    }
+    makeBackup();
+    ASSERT_EQ(tools::readBackup(backup())->apps.size(), 5U) << "step " << step;
+    ASSERT_THAT(beside(), UnorderedElementsAre("device", "library", "licence", "backup")) << "step " << step;
+  }
+  EXPECT_GT(step, 30);
+  EXPECT_LT(step, 2000);
+}
+
+INSTANTIATE_TEST_SUITE_P(Modes, Backup, testing::Values("--direct", "--coordinated"),
+                         [](const auto& mode) { return mode.param.substr(2); });
+
+}  // namespace
+}  // namespace appsync::test
