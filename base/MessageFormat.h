@@ -26,10 +26,11 @@ struct Conversion {
 inline constexpr std::array kConversions{
     Conversion{"s", ConversionKind::text},
     Conversion{"d", ConversionKind::signedInteger, sizeof(int)},
-    Conversion{"ld", ConversionKind::signedInteger, sizeof(long)},
+    // Long is as wide as it is anywhere, so that what compiles does not depend on the device.
+    Conversion{"ld", ConversionKind::signedInteger, sizeof(long long)},
     Conversion{"lld", ConversionKind::signedInteger, sizeof(long long)},
     Conversion{"u", ConversionKind::unsignedInteger, sizeof(unsigned)},
-    Conversion{"lu", ConversionKind::unsignedInteger, sizeof(unsigned long)},
+    Conversion{"lu", ConversionKind::unsignedInteger, sizeof(unsigned long long)},
     Conversion{"llu", ConversionKind::unsignedInteger, sizeof(unsigned long long)},
     Conversion{"f", ConversionKind::real, sizeof(double)},
     Conversion{"lf", ConversionKind::real, sizeof(double)},

@@ -53,7 +53,6 @@ class AppsClient final : public platform::ZTClient,
 
  public:
   // ---- core: lifecycle
-  // -----------------------------------------------------------------------------------------------
 
   /// The object, registered with the platform's services, which must outlive it. Never null.
   [[nodiscard]] static std::shared_ptr<AppsClient> create(platform::Platform& platform);
@@ -67,7 +66,6 @@ class AppsClient final : public platform::ZTClient,
   [[nodiscard]] std::string description() const { return "<AppsClient>"; }
 
   // ---- core: what the daemon asks, in the order of a sync
-  // --------------------------------------------------------------
 
   /// supportedDataclasses
   [[nodiscard]] std::vector<std::string> supportedDataclasses() override;
@@ -90,7 +88,6 @@ class AppsClient final : public platform::ZTClient,
   void clearSyncData() override;
 
   // ---- core: used by the other rooms
-  // ---------------------------------------------------------------------------------
 
   /// _appInstallationAllowed, _appRemovalAllowed: true unless a restriction says no.
   [[nodiscard]] bool _appInstallationAllowed();
@@ -111,7 +108,6 @@ class AppsClient final : public platform::ZTClient,
                                                         std::map<std::string, Item, std::less<>>& items);
 
   // ---- transfer
-  // ------------------------------------------------------------------------------------------------------
 
   /// outstandingAssetTransfers: the packages that the host must still send, each with its placeholder made.
   [[nodiscard]] platform::Assets outstandingAssetTransfers() override;
@@ -150,7 +146,6 @@ class AppsClient final : public platform::ZTClient,
   void _createPlaceHolderApplication(const platform::ZTAsset& asset);
 
   // ---- coordination
-  // --------------------------------------------------------------------------------------------------
 
   bool prepareAppForInstallUsingCoordination(const platform::ZTAsset& asset, bool existingApp) override;
   /// updateTransferProgressForApp:existingApp: false when no coordinator waits for the package.
@@ -182,7 +177,6 @@ class AppsClient final : public platform::ZTClient,
       std::string_view bundleIdentifier);
 
   // ---- coordination: what the services report, on their threads
-  // ----------------------------------------------------------
 
   /// setupInstallCoordinatorObserver: opens the observer connection unless it is open.
   void setupInstallCoordinatorObserver();
@@ -195,9 +189,9 @@ class AppsClient final : public platform::ZTClient,
   /// applicationInstallsDidCancel: matters only where installs are not coordinated.
   void applicationInstallsDidCancel(const platform::AppRecords& records) override;
 
-  // ---- restore: state and todo words. These read, change and rewrite whole files without a lock: who is not on a
-  // queue submits them to `_accessQueue`.
-  // ---------------------------------------------------------------------------------------
+  // ---- restore: state and todo words
+
+  // These read, change and rewrite whole files without a lock: who is not on a queue submits them to `_accessQueue`.
 
   /// _restoreStatePropertyForKey:identifier:version: none at a missing level, and for a version that is no string.
   [[nodiscard]] std::optional<plist::Value> _restoreStatePropertyForKey(std::string_view key,
@@ -214,7 +208,6 @@ class AppsClient final : public platform::ZTClient,
   [[nodiscard]] std::optional<plist::Value> _operationStateForIdentifier(std::string_view identifier);
 
   // ---- restore: placeholders
-  // -------------------------------------------------------------------------------------------
 
   using PlaceholderVisitor = std::function<void(const platform::AppRecord& record, bool& stop)>;
 
@@ -228,7 +221,6 @@ class AppsClient final : public platform::ZTClient,
   [[nodiscard]] Identifiers _getSystemAppPlaceholders();
 
   // ---- restore: what a host has left on a restored device
-  // -----------------------------------------------------------------
 
   /// reconcileRestoreOfType:withError: never fails. Blocks for at most five seconds per placeholder.
   bool reconcileRestoreOfType(std::int32_t restoreType, ErrorSlot error) override;
@@ -269,7 +261,6 @@ class AppsClient final : public platform::ZTClient,
   void cnDidInstallPlaceHolderForAppBundle(std::string_view bundleIdentifier);
 
   // ---- reporting
-  // -------------------------------------------------------------------------------------------------------
 
   /// prepareForBackup: brings the store metadata of installed apps up to date.
   void prepareForBackup() override;

@@ -71,7 +71,10 @@ void writeDebugCopy(platform::FileSystem& files, plist::Array todoList) {
 bool AppsClient::reconcileSync(const platform::Assets&, std::string_view newAnchor, const platform::ProgressCallback&,
                                ErrorSlot error) {
   _log.message("%s|starting to reconcile sync with new anchor %{public}@", newAnchor);
-  const Takeover takeover = takeOverStagingFolder(_platform.fileSystem(), _log, error);
+  // Between changes of the todo list: one that an install of the sync before still has to make would write the old list
+  // over the new one.
+  const Takeover takeover =
+      _accessQueue.sync([&] { return takeOverStagingFolder(_platform.fileSystem(), _log, error); });
   if (takeover == Takeover::taken) {
     const bool removalAllowed = _appRemovalAllowed();
     auto todoList = _loadPlist(_platform, kTodoListPath, error);

@@ -3,6 +3,7 @@
 #include <initializer_list>
 #include <memory>
 #include <optional>
+#include <stdexcept>
 #include <string>
 #include <string_view>
 #include <utility>
@@ -131,6 +132,27 @@ TEST_F(ReconcileSync, TheStagingFolderBecomesTheWorkArea) {
   EXPECT_FALSE(platform.files.has(kStaging));
   EXPECT_EQ(platform.files.text(std::string(kWorkArea) + "/Packages/a"), "package");
   EXPECT_FALSE(platform.files.has(std::string(kWorkArea) + "/old"));
+}
+
+/// Otherwise the list that is being written would replace the new one. Waiting for the queue from its own work is
+/// reported.
+TEST_F(ReconcileSync, TheStagingFolderIsNotTakenOverWhileTheTodoListIsBeingChanged) {
+  putPropertyList(platform.files, kTodoListPath, plist::Array{installEntry("com.old")});
+  stage({installEntry("com.new")});
+  bool isReported = false;
+  platform.journal.setHook([&](std::string_view operation, std::string_view) -> std::optional<Error> {
+    if (operation != "fileSystem.writeFileAtomically" || isReported) return std::nullopt;
+    try {
+      reconcile();
+    } catch (const std::logic_error&) {
+      isReported = true;
+    }
+    return std::nullopt;
+  });
+  client.assetInstallSucceeded(*platform.framework.downloadAssetWithIdentifier("com.old", "Application", "Old"));
+  platform.journal.setHook(nullptr);
+  EXPECT_TRUE(isReported);
+  EXPECT_TRUE(platform.files.has(kStagedTodoListPath));
 }
 
 TEST_F(ReconcileSync, FailureToMakeTheSyncFolderFailsTheSync) {
