@@ -14,7 +14,6 @@
 namespace appsync::device {
 
 using platform::ClientIdentity;
-using platform::CoordinatorKind;
 using platform::PromisedTransferToPath;
 
 namespace {
