@@ -123,7 +123,7 @@ Status Coordinators::configure(const std::shared_ptr<PlaceholderState>& placehol
   }
   static_cast<PlaceholderConfiguration&>(*placeholder) = std::move(copy);
   if (!isToShow) return {};
-  tell(coordinator, &InstallObserverDelegate::coordinatorDidInstallPlaceholder);
+  tellPlaceholder(coordinator);
   followPromise(*coordinator);
   endIfDemoted(coordinator);
   return {};

@@ -8,42 +8,8 @@
 set -euo pipefail
 
 samples="$(cd "$(dirname "${BASH_SOURCE[0]}")" && pwd)"
-command -v appsync >/dev/null || PATH="$samples/../build/bin:$PATH"
-command -v appsync >/dev/null || {
-  echo "demo: there is no appsync yet; make it with ./dev build" >&2
-  exit 1
-}
-
-if [[ $# -gt 0 ]]; then
-  mkdir -p "$1"
-  folder="$(cd "$1" && pwd)"
-  if [[ -n "$(ls -A "$folder")" ]]; then
-    echo "demo: $1 is not empty; give a new folder" >&2
-    exit 1
-  fi
-else
-  folder="$(mktemp -d)"
-  trap 'rm -rf "$folder"' EXIT
-fi
-cd "$folder"
-
-bold='' plain=''
-if [[ -t 1 ]]; then
-  bold=$'\e[1m' plain=$'\e[0m'
-fi
-
-say() { printf '\n%s# %s%s\n' "$bold" "$*" "$plain"; }
-
-# run COMMAND...: shows the command as one would type it, then what it does.
-run() {
-  local word shown='$'
-  for word in "$@"; do
-    [[ "$word" == *[^a-zA-Z0-9_./=-]* ]] && word="'$word'"
-    shown+=" $word"
-  done
-  printf '%s%s%s\n' "$bold" "$shown" "$plain"
-  "$@"
-}
+# shellcheck source=samples/demo-common.sh
+source "$samples/demo-common.sh"
 
 # contents DEVICE: its apps and their files, but for the names of containers and the order in which they came.
 contents() {
@@ -51,9 +17,7 @@ contents() {
   (cd "$1/root/var/mobile/Containers/Bundle" && find . -type f -exec sha256sum {} +) | sed 's|\./[^/]*/||' | sort
 }
 
-cp -R "$samples" apps
-rm -f apps/demo.sh apps/draw_icons.py
-mkdir library
+make_apps "$samples"
 
 say 'Turn the apps into packages'
 for app in apps/*/; do
