@@ -143,5 +143,38 @@ TEST_F(SyncPlan, RemovalsComeFirst) {
   EXPECT_EQ(all[1].work, PlannedWork::install);
 }
 
+TEST_F(SyncPlan, ADemotedAppIsLeftAloneUnlessItIsAskedFor) {
+  libraryHas("org.a", "1.0");
+  deviceAwaits("org.a");
+  apps_["org.a"].installType = platform::TSInstallType::IntentionalDowngrade;
+  const PlannedApp app = planOfOne();
+  EXPECT_EQ(app.work, PlannedWork::skip);
+  EXPECT_NE(app.reason.find("it is demoted"), std::string::npos);
+  only_ = {"org.a"};
+  EXPECT_EQ(planOfOne().work, PlannedWork::install);
+}
+
+TEST_F(SyncPlan, ARestoredAppThatTheStoreBringsIsNotTheLibrarys) {
+  libraryHas("org.a", "1.0");
+  deviceAwaits("org.a");
+  fromStore_ = {"org.a"};
+  EXPECT_EQ(planOfOne().work, PlannedWork::restore);
+  only_ = {"org.a"};
+  EXPECT_EQ(planOfOne().work, PlannedWork::restore);
+  only_ = {"org.b"};
+  EXPECT_EQ(planOfOne().work, PlannedWork::refuse);  // org.b itself
+  only_ = {};
+  remove_ = {"org.a"};
+  EXPECT_EQ(planOfOne().work, PlannedWork::remove);
+}
+
+TEST_F(SyncPlan, ARestoredAppThatTheLibraryLacksIsToldAndOneThatItHasIsInstalled) {
+  deviceAwaits("org.a");
+  apps_["org.a"].installType = platform::TSInstallType::Restore;
+  EXPECT_EQ(planOfOne().work, PlannedWork::refuse);
+  libraryHas("org.a", "1.0");
+  EXPECT_EQ(planOfOne().work, PlannedWork::install);
+}
+
 }  // namespace
 }  // namespace appsync::tools
