@@ -9,7 +9,6 @@ namespace appsync::test {
 namespace {
 
 using platform::TSInstallType;
-using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::UnorderedElementsAre;
 using tools::BackedUpApp;
