@@ -93,7 +93,8 @@ TEST_F(RestorePlaceholder, WithoutATitleItGoesByTheItemsName) {
 }
 
 TEST_F(RestorePlaceholder, UnreadableMetadataCountsAsDealtWith) {
-  const Bytes broken(binaryForm(storeMetadata()).begin(), binaryForm(storeMetadata()).begin());
+  const Bytes whole = binaryForm(storeMetadata());
+  const Bytes broken(whole.begin(), whole.begin() + 20);
   EXPECT_TRUE(process(broken));
   const auto failure = plist::read(ByteView(broken));
   ASSERT_FALSE(failure);
