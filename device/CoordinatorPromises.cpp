@@ -8,7 +8,6 @@
 namespace appsync::device {
 
 using platform::ClientIdentity;
-using platform::InstallObserverDelegate;
 using platform::TSInstallState;
 
 namespace {

@@ -12,6 +12,7 @@
 
 #include <archive.h>
 #include <archive_entry.h>
+#include <benchmark/benchmark.h>
 #include <fcntl.h>
 #include <unistd.h>
 
@@ -128,6 +129,18 @@ inline void unpackOnly(const std::string& package, const fs::path& target) {
 /// All packages, each into a folder of its own in `folder`, on ten threads.
 inline void unpackAll(const fs::path& folder) {
   onTenThreads([&](int number) { unpackOnly(library().package(number), folder / std::to_string(number)); });
+}
+
+inline void measureUnpacking(benchmark::State& state) {
+  library();
+  for (auto _ : state) {
+    state.PauseTiming();
+    const fs::path folder = library().fresh();
+    fs::create_directory(folder);
+    sync();
+    state.ResumeTiming();
+    unpackAll(folder);
+  }
 }
 
 }  // namespace appsync::bench

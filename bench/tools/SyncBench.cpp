@@ -32,18 +32,6 @@ class Silence {
   const device::FileDescriptor saved_;
 };
 
-void UnpackOnly(benchmark::State& state) {
-  library();
-  for (auto _ : state) {
-    state.PauseTiming();
-    const fs::path folder = library().fresh();
-    fs::create_directory(folder);
-    sync();
-    state.ResumeTiming();
-    unpackAll(folder);
-  }
-}
-
 /// The tool as it is started from a command line, in this process.
 void wholeSync(benchmark::State& state, device::InstallMode mode) {
   library();
@@ -67,7 +55,7 @@ void CoordinatedSync(benchmark::State& state) {
   wholeSync(state, device::InstallMode::coordinated);
 }
 
-BENCHMARK(UnpackOnly)
+BENCHMARK(measureUnpacking)
     ->Name("Sync/unpackOnly")
     ->Unit(benchmark::kMillisecond)
     ->UseRealTime()

@@ -136,6 +136,7 @@ TEST_P(SyncFault, WhicheverCallFailsTheNextSyncEndsInTheSameState) {
   const DeviceState expected = undisturbed(mode());
   const std::size_t calls = callsOfOneSync();
   EXPECT_GT(calls, 300U) << "the sync has lost most of what it did";
+  RecordProperty("calls", static_cast<int>(calls));
   for (std::size_t number = 1; number <= calls; ++number)
     syncWithinPatience(number, expected);
 }
