@@ -8,7 +8,7 @@ import sys
 ROOT = pathlib.Path(__file__).resolve().parent.parent
 
 PLUG_IN = {"core", "transfer", "coordination", "restore", "reporting"}
-ALL = PLUG_IN | {"base", "platform", "device", "tools", "tests", "bench", "fuzz"}
+ALL = PLUG_IN | {"base", "platform", "device", "tools", "kit", "tests", "bench", "fuzz"}
 
 # Room: the rooms whose headers it may include, its own among them.
 MAY_INCLUDE = {
@@ -17,6 +17,7 @@ MAY_INCLUDE = {
     **{room: PLUG_IN | {"base", "platform"} for room in PLUG_IN},
     "device": {"base", "platform", "device"},
     "tools": {"base", "platform", "device", "tools"},
+    "kit": {"base", "platform", "kit"},
     "tests": ALL,
     "bench": ALL,
     "fuzz": ALL,

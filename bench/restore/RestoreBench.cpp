@@ -13,8 +13,8 @@
 #include <malloc.h>
 
 #include "core/AppsClient.h"
-#include "tests/support/FakePlatform.h"
-#include "tests/support/TodoList.h"
+#include "kit/fakes/FakePlatform.h"
+#include "kit/fakes/TodoList.h"
 
 namespace {
 

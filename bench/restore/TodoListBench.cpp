@@ -14,7 +14,7 @@
 #include "base/PropertyList.h"
 #include "bench/base/PropertyListCorpora.h"
 #include "core/AppsClient.h"
-#include "tests/support/FakePlatform.h"
+#include "kit/fakes/FakePlatform.h"
 
 namespace appsync::bench {
 namespace {

@@ -16,8 +16,8 @@
 #include "base/OperationQueue.h"
 #include "base/Semaphore.h"
 #include "base/SystemClock.h"
+#include "kit/fakes/Gate.h"
 #include "tests/base/AtEnd.h"
-#include "tests/support/Gate.h"
 
 namespace appsync::test {
 namespace {

@@ -7,7 +7,7 @@
 
 #include "base/PropertyList.h"
 #include "generated/BuildPaths.h"
-#include "tests/support/TemporaryFolder.h"
+#include "kit/fakes/TemporaryFolder.h"
 
 namespace appsync::test {
 

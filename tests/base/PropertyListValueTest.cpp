@@ -5,7 +5,7 @@
 #include <gtest/gtest.h>
 
 #include "base/PropertyList.h"
-#include "tests/support/Threads.h"
+#include "kit/fakes/Threads.h"
 
 namespace appsync::test {
 

@@ -8,7 +8,7 @@
 #include <gtest/gtest.h>
 
 #include "base/SerialQueue.h"
-#include "tests/support/Gate.h"
+#include "kit/fakes/Gate.h"
 
 namespace appsync::test {
 namespace {

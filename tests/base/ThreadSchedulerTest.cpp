@@ -11,8 +11,8 @@
 #include "base/SystemClock.h"
 #include "base/ThreadScheduler.h"
 #include "base/VirtualTime.h"
+#include "kit/fakes/Gate.h"
 #include "tests/base/AtEnd.h"
-#include "tests/support/Gate.h"
 
 namespace appsync::test {
 namespace {

@@ -14,7 +14,7 @@
 
 #include "base/Semaphore.h"
 #include "base/VirtualTime.h"
-#include "tests/support/Gate.h"
+#include "kit/fakes/Gate.h"
 
 namespace appsync::test {
 namespace {

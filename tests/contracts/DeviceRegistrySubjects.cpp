@@ -2,10 +2,10 @@
 #include <chrono>
 #include <filesystem>
 
-#include "tests/contracts/AppRegistryContract.h"
-#include "tests/contracts/FileSystemContract.h"
-#include "tests/contracts/TimeContract.h"
-#include "tests/contracts/UninstalledAppsListContract.h"
+#include "kit/contracts/AppRegistryContract.h"
+#include "kit/contracts/FileSystemContract.h"
+#include "kit/contracts/TimeContract.h"
+#include "kit/contracts/UninstalledAppsListContract.h"
 #include "tests/device/TestDevice.h"
 
 namespace appsync::test {

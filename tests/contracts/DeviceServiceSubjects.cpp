@@ -6,22 +6,22 @@
 #include <string>
 #include <vector>
 
+#include "kit/contracts/BackupManagerContract.h"
+#include "kit/contracts/BundlesContract.h"
+#include "kit/contracts/HomeScreenContract.h"
+#include "kit/contracts/IconsContract.h"
+#include "kit/contracts/InstallCoordinationContract.h"
+#include "kit/contracts/PlatformContract.h"
+#include "kit/contracts/ProfileConnectionContract.h"
+#include "kit/contracts/SoftwareLibraryContract.h"
+#include "kit/contracts/SyncFrameworkContract.h"
+#include "kit/contracts/SystemNotifyContract.h"
+#include "kit/contracts/TransactionLogContract.h"
+#include "kit/contracts/ZTDeviceServiceContract.h"
+#include "kit/fakes/FakeDeviceService.h"
 #include "platform/Keys.h"
-#include "tests/contracts/BackupManagerContract.h"
-#include "tests/contracts/BundlesContract.h"
-#include "tests/contracts/HomeScreenContract.h"
-#include "tests/contracts/IconsContract.h"
-#include "tests/contracts/InstallCoordinationContract.h"
-#include "tests/contracts/PlatformContract.h"
-#include "tests/contracts/ProfileConnectionContract.h"
-#include "tests/contracts/SoftwareLibraryContract.h"
-#include "tests/contracts/SyncFrameworkContract.h"
-#include "tests/contracts/SystemNotifyContract.h"
-#include "tests/contracts/TransactionLogContract.h"
-#include "tests/contracts/ZTDeviceServiceContract.h"
 #include "tests/device/Pictures.h"
 #include "tests/device/TestDevice.h"
-#include "tests/support/FakeDeviceService.h"
 
 namespace appsync::test {
 

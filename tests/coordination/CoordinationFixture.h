@@ -8,9 +8,9 @@
 #include <utility>
 #include <vector>
 
-#include "tests/support/CallsInLog.h"
-#include "tests/support/ClientFixture.h"
-#include "tests/support/TodoList.h"
+#include "kit/fakes/CallsInLog.h"
+#include "kit/fakes/TodoList.h"
+#include "tests/ClientFixture.h"
 
 namespace appsync::test {
 

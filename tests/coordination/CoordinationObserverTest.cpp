@@ -5,8 +5,8 @@
 
 #include <gtest/gtest.h>
 
-#include "tests/support/ClientFixture.h"
-#include "tests/support/TextDiff.h"
+#include "kit/fakes/TextDiff.h"
+#include "tests/ClientFixture.h"
 
 namespace appsync::test {
 

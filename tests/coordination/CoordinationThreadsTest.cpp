@@ -6,8 +6,8 @@
 
 #include <gtest/gtest.h>
 
+#include "kit/fakes/Threads.h"
 #include "tests/coordination/CoordinationFixture.h"
-#include "tests/support/Threads.h"
 
 namespace appsync::test {
 namespace {

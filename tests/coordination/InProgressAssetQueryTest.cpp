@@ -14,9 +14,9 @@
 #include <gtest/gtest.h>
 
 #include "coordination/InProgressAssetQuery.h"
-#include "tests/support/CallsInLog.h"
-#include "tests/support/FakePlatform.h"
-#include "tests/support/TextDiff.h"
+#include "kit/fakes/CallsInLog.h"
+#include "kit/fakes/FakePlatform.h"
+#include "kit/fakes/TextDiff.h"
 
 namespace appsync::test {
 

@@ -4,7 +4,7 @@
 #include <gtest/gtest.h>
 
 #include "core/IdentifierSet.h"
-#include "tests/support/Threads.h"
+#include "kit/fakes/Threads.h"
 
 namespace appsync::test {
 

@@ -15,10 +15,10 @@
 #include <gtest/gtest.h>
 
 #include "core/AppsClient.h"
-#include "tests/support/CallsInLog.h"
-#include "tests/support/ClientFixture.h"
-#include "tests/support/TextDiff.h"
-#include "tests/support/Threads.h"
+#include "kit/fakes/CallsInLog.h"
+#include "kit/fakes/TextDiff.h"
+#include "kit/fakes/Threads.h"
+#include "tests/ClientFixture.h"
 
 namespace appsync::test {
 

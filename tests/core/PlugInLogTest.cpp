@@ -5,7 +5,7 @@
 #include <gtest/gtest.h>
 
 #include "core/PlugInLog.h"
-#include "tests/support/ClientFixture.h"
+#include "tests/ClientFixture.h"
 
 namespace appsync::test {
 

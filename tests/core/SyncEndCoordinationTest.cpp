@@ -5,8 +5,8 @@
 
 #include <gtest/gtest.h>
 
-#include "tests/support/CallsInLog.h"
-#include "tests/support/ClientFixture.h"
+#include "kit/fakes/CallsInLog.h"
+#include "tests/ClientFixture.h"
 
 namespace appsync::test {
 namespace {

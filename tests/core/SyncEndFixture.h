@@ -6,8 +6,8 @@
 #include <string>
 #include <string_view>
 
-#include "tests/support/CallsInLog.h"
-#include "tests/support/ClientFixture.h"
+#include "kit/fakes/CallsInLog.h"
+#include "tests/ClientFixture.h"
 
 namespace appsync::test {
 

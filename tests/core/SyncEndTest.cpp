@@ -13,9 +13,9 @@
 
 #include <gtest/gtest.h>
 
+#include "kit/fakes/TextDiff.h"
+#include "kit/fakes/TodoList.h"
 #include "tests/core/SyncEndFixture.h"
-#include "tests/support/TextDiff.h"
-#include "tests/support/TodoList.h"
 
 namespace appsync::test {
 

@@ -7,9 +7,9 @@
 #include <gtest/gtest.h>
 
 #include "core/SyncFiles.h"
-#include "tests/support/ClientFixture.h"
-#include "tests/support/TextDiff.h"
-#include "tests/support/TodoList.h"
+#include "kit/fakes/TextDiff.h"
+#include "kit/fakes/TodoList.h"
+#include "tests/ClientFixture.h"
 
 namespace appsync::test {
 

@@ -5,7 +5,7 @@
 #include <gtest/gtest.h>
 
 #include "core/TodoList.h"
-#include "tests/support/TodoList.h"
+#include "kit/fakes/TodoList.h"
 
 namespace appsync::test {
 

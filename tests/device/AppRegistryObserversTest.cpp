@@ -8,7 +8,7 @@
 
 #include <gtest/gtest.h>
 
-#include "tests/contracts/Occurrences.h"
+#include "kit/contracts/Occurrences.h"
 #include "tests/device/AppRegistryFixture.h"
 
 namespace appsync::test {

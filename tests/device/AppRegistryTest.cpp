@@ -12,8 +12,8 @@
 
 #include "device/InstallerError.h"
 #include "device/Step.h"
+#include "kit/fakes/Threads.h"
 #include "tests/device/AppRegistryFixture.h"
-#include "tests/support/Threads.h"
 
 namespace appsync::test {
 

@@ -4,8 +4,8 @@
 
 #include "device/BundleInfo.h"
 #include "device/Bundles.h"
+#include "kit/fakes/FakeFileSystem.h"
 #include "platform/Keys.h"
-#include "tests/support/FakeFileSystem.h"
 
 namespace appsync::test {
 namespace {

@@ -9,7 +9,7 @@
 #include "base/Semaphore.h"
 #include "base/SystemClock.h"
 #include "device/CallbackThread.h"
-#include "tests/support/Gate.h"
+#include "kit/fakes/Gate.h"
 
 namespace appsync::test {
 namespace {

@@ -7,9 +7,9 @@
 
 #include "device/InstallerError.h"
 #include "device/Step.h"
+#include "kit/fakes/Gate.h"
+#include "kit/fakes/Threads.h"
 #include "tests/device/CoordinationFixture.h"
-#include "tests/support/Gate.h"
-#include "tests/support/Threads.h"
 
 namespace appsync::test {
 namespace {

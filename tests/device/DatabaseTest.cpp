@@ -12,8 +12,8 @@
 #include "device/Database.h"
 #include "device/DatabaseError.h"
 #include "device/Step.h"
+#include "kit/fakes/Threads.h"
 #include "tests/device/ServiceDatabase.h"
-#include "tests/support/Threads.h"
 
 namespace appsync::test {
 

@@ -8,8 +8,8 @@
 
 #include "base/PropertyList.h"
 #include "device/HomeScreen.h"
+#include "kit/fakes/FakeAppRegistry.h"
 #include "tests/device/ServiceDatabase.h"
-#include "tests/support/FakeAppRegistry.h"
 
 namespace appsync::test {
 namespace {

@@ -7,7 +7,7 @@
 #include <gtest/gtest.h>
 
 #include "device/HostFile.h"
-#include "tests/support/TemporaryFolder.h"
+#include "kit/fakes/TemporaryFolder.h"
 
 namespace appsync::test {
 namespace {

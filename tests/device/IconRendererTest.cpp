@@ -6,8 +6,8 @@
 #include "device/Bundles.h"
 #include "device/IconRenderer.h"
 #include "device/PNGEncoders.h"
+#include "kit/fakes/FakeFileSystem.h"
 #include "tests/device/Pictures.h"
-#include "tests/support/FakeFileSystem.h"
 
 namespace appsync::test {
 namespace {

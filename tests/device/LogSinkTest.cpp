@@ -8,7 +8,7 @@
 #include <gtest/gtest.h>
 
 #include "device/LogSink.h"
-#include "tests/support/TemporaryFolder.h"
+#include "kit/fakes/TemporaryFolder.h"
 
 namespace appsync::test {
 namespace {

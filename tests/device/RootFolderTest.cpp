@@ -10,8 +10,8 @@
 
 #include "device/FileTree.h"
 #include "device/RootFolder.h"
+#include "kit/fakes/Threads.h"
 #include "tests/device/TestDevice.h"
-#include "tests/support/Threads.h"
 
 namespace appsync::test {
 

@@ -6,9 +6,9 @@
 
 #include "device/Bundles.h"
 #include "device/ScreenPicture.h"
+#include "kit/fakes/FakeAppRegistry.h"
 #include "tests/device/Pictures.h"
 #include "tests/device/ServiceDatabase.h"
-#include "tests/support/FakeAppRegistry.h"
 
 namespace appsync::test {
 namespace {

@@ -5,8 +5,8 @@
 #include <gtest/gtest.h>
 
 #include "device/SoftwareLibrary.h"
+#include "kit/fakes/FakeAppRegistry.h"
 #include "tests/device/ServiceDatabase.h"
-#include "tests/support/FakeAppRegistry.h"
 
 namespace appsync::test {
 namespace {

@@ -10,8 +10,8 @@
 #include "base/Semaphore.h"
 #include "base/SystemClock.h"
 #include "device/SystemNotify.h"
+#include "kit/fakes/Gate.h"
 #include "tests/device/ServiceDatabase.h"
-#include "tests/support/Gate.h"
 
 namespace appsync::test {
 namespace {

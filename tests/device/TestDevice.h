@@ -12,8 +12,8 @@
 #include <gtest/gtest.h>
 
 #include "device/Device.h"
+#include "kit/fakes/TemporaryFolder.h"
 #include "tests/device/ZipArchive.h"
-#include "tests/support/TemporaryFolder.h"
 
 namespace appsync::test {
 

@@ -13,8 +13,8 @@
 #include <gtest/gtest.h>
 
 #include "core/SyncFiles.h"
+#include "kit/fakes/TodoList.h"
 #include "tests/faults/WholeSync.h"
-#include "tests/support/TodoList.h"
 
 namespace appsync::test {
 namespace {

@@ -8,8 +8,8 @@
 #include <gtest/gtest.h>
 
 #include "core/SyncFiles.h"
-#include "tests/support/FakePackages.h"
-#include "tests/support/TodoList.h"
+#include "kit/fakes/FakePackages.h"
+#include "kit/fakes/TodoList.h"
 
 namespace appsync::test {
 

@@ -10,7 +10,7 @@
 #include <vector>
 
 #include "core/AppsClient.h"
-#include "tests/support/FakePlatform.h"
+#include "kit/fakes/FakePlatform.h"
 
 namespace appsync::test {
 

@@ -5,8 +5,8 @@
 #include <filesystem>
 
 #include "core/SyncFiles.h"
-#include "tests/support/Threads.h"
-#include "tests/support/TodoList.h"
+#include "kit/fakes/Threads.h"
+#include "kit/fakes/TodoList.h"
 
 namespace appsync::test {
 

@@ -5,9 +5,9 @@
 
 #include <gtest/gtest.h>
 
-#include "tests/support/CallsInLog.h"
-#include "tests/support/ClientFixture.h"
-#include "tests/support/TextDiff.h"
+#include "kit/fakes/CallsInLog.h"
+#include "kit/fakes/TextDiff.h"
+#include "tests/ClientFixture.h"
 
 namespace appsync::test {
 

@@ -3,8 +3,8 @@
 
 #include <gtest/gtest.h>
 
-#include "tests/support/ClientFixture.h"
-#include "tests/support/Threads.h"
+#include "kit/fakes/Threads.h"
+#include "tests/ClientFixture.h"
 
 namespace appsync::test {
 namespace {

@@ -9,11 +9,11 @@
 
 #include <gtest/gtest.h>
 
+#include "kit/fakes/TextDiff.h"
+#include "kit/fakes/Threads.h"
+#include "kit/fakes/TodoList.h"
 #include "restore/RestoreState.h"
-#include "tests/support/ClientFixture.h"
-#include "tests/support/TextDiff.h"
-#include "tests/support/Threads.h"
-#include "tests/support/TodoList.h"
+#include "tests/ClientFixture.h"
 
 namespace appsync::test {
 

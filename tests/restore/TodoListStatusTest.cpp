@@ -10,10 +10,10 @@
 
 #include <gtest/gtest.h>
 
-#include "tests/support/CallsInLog.h"
-#include "tests/support/ClientFixture.h"
-#include "tests/support/Threads.h"
-#include "tests/support/TodoList.h"
+#include "kit/fakes/CallsInLog.h"
+#include "kit/fakes/Threads.h"
+#include "kit/fakes/TodoList.h"
+#include "tests/ClientFixture.h"
 
 namespace appsync::test {
 

@@ -13,7 +13,7 @@
 #include <sys/syscall.h>
 #include <unistd.h>
 
-#include "tests/support/TemporaryFolder.h"
+#include "kit/fakes/TemporaryFolder.h"
 #include "tools/ControlClient.h"
 #include "tools/ControlServer.h"
 #include "tools/ControlSocket.h"

@@ -3,7 +3,7 @@
 
 #include <gtest/gtest.h>
 
-#include "tests/support/TemporaryFolder.h"
+#include "kit/fakes/TemporaryFolder.h"
 #include "tools/HostState.h"
 
 namespace appsync::tools {

@@ -10,7 +10,7 @@
 #include <unistd.h>
 
 #include "device/Device.h"
-#include "tests/support/TemporaryFolder.h"
+#include "kit/fakes/TemporaryFolder.h"
 #include "tools/PackageSender.h"
 
 namespace appsync::tools {

@@ -10,7 +10,7 @@
 #include <vector>
 
 #include "device/Device.h"
-#include "tests/support/Gate.h"
+#include "kit/fakes/Gate.h"
 #include "tools/SyncReporter.h"
 
 namespace appsync::test {

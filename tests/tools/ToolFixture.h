@@ -8,8 +8,8 @@
 
 #include <gtest/gtest.h>
 
+#include "kit/fakes/TemporaryFolder.h"
 #include "tests/device/ZipArchive.h"
-#include "tests/support/TemporaryFolder.h"
 #include "tests/tools/ToolRun.h"
 #include "tools/Json.h"
 

@@ -7,7 +7,7 @@
 
 #include <sys/types.h>
 
-#include "tests/support/TemporaryFolder.h"
+#include "kit/fakes/TemporaryFolder.h"
 
 namespace appsync::test {
 

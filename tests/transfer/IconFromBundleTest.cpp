@@ -4,8 +4,8 @@
 #include <gtest/gtest.h>
 
 #include "core/AppsClient.h"
-#include "tests/support/FakePlatform.h"
-#include "tests/support/TodoList.h"
+#include "kit/fakes/FakePlatform.h"
+#include "kit/fakes/TodoList.h"
 
 namespace appsync::test {
 namespace {

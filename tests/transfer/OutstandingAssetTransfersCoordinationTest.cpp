@@ -5,8 +5,8 @@
 #include <gtest/gtest.h>
 
 #include "core/AppsClient.h"
-#include "tests/support/ClientFixture.h"
-#include "tests/support/TodoList.h"
+#include "kit/fakes/TodoList.h"
+#include "tests/ClientFixture.h"
 
 namespace appsync::test {
 namespace {

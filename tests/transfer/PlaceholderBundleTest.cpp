@@ -5,9 +5,9 @@
 #include <gtest/gtest.h>
 
 #include "core/AppsClient.h"
-#include "tests/support/ClientFixture.h"
-#include "tests/support/FakePackages.h"
-#include "tests/support/TodoList.h"
+#include "kit/fakes/FakePackages.h"
+#include "kit/fakes/TodoList.h"
+#include "tests/ClientFixture.h"
 
 namespace appsync::test {
 namespace {

@@ -3,7 +3,7 @@
 
 #include <gtest/gtest.h>
 
-#include "tests/support/FakeSyncFramework.h"
+#include "kit/fakes/FakeSyncFramework.h"
 #include "transfer/SkipRules.h"
 
 namespace appsync::test {

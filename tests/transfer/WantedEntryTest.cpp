@@ -2,7 +2,7 @@
 #include <gtest/gtest.h>
 
 #include "base/Describe.h"
-#include "tests/support/FakeApp.h"
+#include "kit/fakes/FakeApp.h"
 #include "transfer/WantedEntry.h"
 
 namespace appsync::test {

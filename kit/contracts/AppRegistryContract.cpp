@@ -1,0 +1,221 @@
+#include "kit/contracts/AppRegistryContract.h"
+
+#include <algorithm>
+#include <cstdint>
+#include <thread>
+
+#include "platform/Keys.h"
+
+namespace appsync::test {
+
+using platform::AppRecord;
+using platform::BundleKind;
+using platform::BundleRecord;
+using platform::FileLocation;
+using platform::PlaceholderLookup;
+using platform::TSInstallType;
+
+GTEST_ALLOW_UNINSTANTIATED_PARAMETERIZED_TEST(AppRegistryContract);
+
+namespace {
+
+using Identifiers = std::vector<std::string>;
+
+}  // namespace
+
+plist::Dictionary AppRegistryContract::options(std::string_view packageType, std::string_view identifier) {
+  return {{platform::PackageTypeKey, packageType}, {platform::BundleIdentifierKey, identifier}};
+}
+
+Status AppRegistryContract::tryInstall(const FileLocation& package, std::string_view identifier) {
+  return registry().installApplication(package, options(platform::PackageTypeCustomer, identifier));
+}
+
+Status AppRegistryContract::tryPlaceholder(const FileLocation& folder, std::string_view identifier) {
+  plist::Dictionary withType = options(platform::PackageTypePlaceholder, identifier);
+  withType.set(platform::InstallTypeKey, static_cast<std::uint64_t>(TSInstallType::Sync));
+  return registry().installApplication(folder, withType);
+}
+
+void AppRegistryContract::install(std::string_view identifier, std::string_view version) {
+  const Status status = tryInstall(subject().makePackage(identifier, version), identifier);
+  ASSERT_TRUE(status.ok()) << status.error().text;
+}
+
+void AppRegistryContract::placeholder(std::string_view identifier, std::string_view version) {
+  const Status status = tryPlaceholder(subject().makePlaceholderFolder(identifier, version), identifier);
+  ASSERT_TRUE(status.ok()) << status.error().text;
+}
+
+std::shared_ptr<const AppRecord> AppRegistryContract::record(std::string_view identifier) {
+  return registry().recordForIdentifier(identifier, PlaceholderLookup::on);
+}
+
+std::string AppRegistryContract::stateOf(std::string_view identifier) {
+  const auto found = record(identifier);
+  if (found == nullptr) return "absent";
+  if (found->isInstalled()) return found->isPlaceholder() ? "both" : "installed";
+  return found->isPlaceholder() ? "placeholder" : "neither";
+}
+
+std::optional<std::string> AppRegistryContract::versionOf(std::string_view identifier) {
+  const auto found = record(identifier);
+  return found == nullptr ? std::nullopt : found->bundleVersion();
+}
+
+std::shared_ptr<platform::InstallProgress> AppRegistryContract::progressOf(std::string_view identifier) {
+  const auto found = record(identifier);
+  return found == nullptr ? nullptr
+                          : registry().installProgressForApplication(*found, platform::TSInstallPhase::Loading);
+}
+
+std::vector<std::string> AppRegistryContract::walk(BundleKind kind) {
+  Identifiers met;
+  registry().enumerateBundlesOfType(
+      kind, [&](const BundleRecord& bundle, bool&) { met.push_back(bundle.applicationIdentifier()); });
+  return met;
+}
+
+std::vector<std::string> AppRegistryContract::removedApps() {
+  Identifiers removed;
+  const std::optional<plist::Dictionary> answer = subject().uninstalledApps().lookupUninstalled();
+  if (!answer) return {"(no answer)"};
+  for (const auto& [identifier, value] : *answer)
+    removed.emplace_back(identifier);
+  return removed;
+}
+
+// Looking up.
+
+TEST_P(AppRegistryContract, AnUnknownAppIsNotThere) {
+  EXPECT_FALSE(registry().applicationIsInstalled("com.a"));
+  EXPECT_EQ(registry().recordForIdentifier("com.a", PlaceholderLookup::on), nullptr);
+  EXPECT_EQ(registry().recordForIdentifier("com.a", PlaceholderLookup::off), nullptr);
+  EXPECT_FALSE(registry().applicationIsInstalled(""));
+}
+
+TEST_P(AppRegistryContract, AppsAndPlaceholdersCountAsInstalled) {
+  install("com.app");
+  placeholder("com.placeholder");
+  EXPECT_TRUE(registry().applicationIsInstalled("com.app"));
+  EXPECT_TRUE(registry().applicationIsInstalled("com.placeholder"));
+  EXPECT_FALSE(registry().applicationIsInstalled("com.APP"));
+}
+
+TEST_P(AppRegistryContract, APlaceholderIsFoundOnlyByThoseWhoLookForIt) {
+  placeholder("com.a");
+  EXPECT_EQ(registry().recordForIdentifier("com.a", PlaceholderLookup::off), nullptr);
+  EXPECT_NE(registry().recordForIdentifier("com.a", PlaceholderLookup::on), nullptr);
+}
+
+TEST_P(AppRegistryContract, AnAppThatIsBeingUpdatedIsFoundEitherWay) {
+  install("com.a");
+  placeholder("com.a", "2.0");
+  EXPECT_NE(registry().recordForIdentifier("com.a", PlaceholderLookup::off), nullptr);
+  EXPECT_NE(registry().recordForIdentifier("com.a", PlaceholderLookup::on), nullptr);
+}
+
+TEST_P(AppRegistryContract, ARecordDescribesTheApp) {
+  install("com.a", "1.2.3");
+  const auto found = record("com.a");
+  ASSERT_NE(found, nullptr);
+  EXPECT_EQ(found->applicationIdentifier(), "com.a");
+  EXPECT_EQ(found->bundleIdentifier(), "com.a");
+  EXPECT_EQ(found->bundleVersion(), "1.2.3");
+  EXPECT_EQ(found->applicationType(), platform::ApplicationTypeUser);
+  EXPECT_EQ(found->asAppRecord(), found.get());
+  EXPECT_FALSE(found->description().empty());
+  ASSERT_TRUE(found->bundlePath());
+  ASSERT_TRUE(found->bundleContainerPath());
+  EXPECT_TRUE(found->bundlePath()->starts_with(*found->bundleContainerPath() + "/")) << *found->bundlePath();
+  EXPECT_TRUE(found->bundlePath()->ends_with(".app")) << *found->bundlePath();
+  EXPECT_TRUE(subject().isUsable(*found->bundlePath()));
+}
+
+TEST_P(AppRegistryContract, ARecordIsASnapshot) {
+  install("com.a", "1.0");
+  const auto before = record("com.a");
+  ASSERT_NE(before, nullptr);
+  install("com.a", "2.0");
+  EXPECT_EQ(before->bundleVersion(), "1.0");
+  ASSERT_TRUE(registry().uninstallApplication("com.a").ok());
+  EXPECT_EQ(before->bundleVersion(), "1.0");
+  EXPECT_TRUE(before->isInstalled());
+}
+
+// Walks.
+
+TEST_P(AppRegistryContract, AWalkMeetsEveryUserBundle) {
+  install("com.app");
+  placeholder("com.placeholder");
+  install("com.both");
+  placeholder("com.both", "2.0");
+  for (const BundleKind kind : {BundleKind::All, BundleKind::User}) {
+    Identifiers met = walk(kind);
+    std::ranges::sort(met);
+    EXPECT_EQ(met, (Identifiers{"com.app", "com.both", "com.placeholder"}));
+  }
+  EXPECT_EQ(walk(BundleKind::System), Identifiers());
+}
+
+TEST_P(AppRegistryContract, AWalkOfTheSystemsBundlesMeetsThemAlone) {
+  install("com.user");
+  if (!subject().addSystemApp("com.system")) GTEST_SKIP() << "no system apps";
+  EXPECT_EQ(walk(BundleKind::System), Identifiers{"com.system"});
+  EXPECT_EQ(walk(BundleKind::User), Identifiers{"com.user"});
+  EXPECT_EQ(walk(BundleKind::All).size(), 2U);
+}
+
+TEST_P(AppRegistryContract, TwoWalksMeetBundlesInOneOrder) {
+  for (const char* identifier : {"com.c", "com.a", "com.b"})
+    install(identifier);
+  EXPECT_EQ(walk(BundleKind::All), walk(BundleKind::All));
+}
+
+TEST_P(AppRegistryContract, AWalkVisitsWithWholeRecords) {
+  install("com.app", "1.5");
+  placeholder("com.placeholder");
+  registry().enumerateBundlesOfType(BundleKind::User, [](const BundleRecord& bundle, bool&) {
+    const AppRecord* app = bundle.asAppRecord();
+    ASSERT_NE(app, nullptr);
+    const bool isApp = bundle.applicationIdentifier() == "com.app";
+    EXPECT_EQ(app->isInstalled(), isApp);
+    EXPECT_EQ(app->isPlaceholder(), !isApp);
+    EXPECT_EQ(app->bundleVersion(), isApp ? "1.5" : "1.0");
+  });
+}
+
+TEST_P(AppRegistryContract, AWalkEndsWhenItIsTold) {
+  for (const char* identifier : {"com.a", "com.b", "com.c"})
+    install(identifier);
+  int visits = 0;
+  registry().enumerateBundlesOfType(BundleKind::All, [&](const BundleRecord&, bool& stop) { stop = ++visits == 2; });
+  EXPECT_EQ(visits, 2);
+}
+
+TEST_P(AppRegistryContract, AWalkVisitsOnTheCallersThread) {
+  install("com.a");
+  registry().enumerateBundlesOfType(BundleKind::All, [caller = std::this_thread::get_id()](const BundleRecord&, bool&) {
+    EXPECT_EQ(std::this_thread::get_id(), caller);
+  });
+}
+
+TEST_P(AppRegistryContract, AWalkSeesTheRegistryAsItWasWhenItBegan) {
+  for (const char* identifier : {"com.a", "com.b", "com.c"})
+    install(identifier);
+  Identifiers met;
+  registry().enumerateBundlesOfType(BundleKind::All, [&](const BundleRecord& bundle, bool&) {
+    if (met.empty()) {
+      install("com.d");
+      for (const char* identifier : {"com.a", "com.b", "com.c"}) {
+        EXPECT_TRUE(registry().uninstallApplication(identifier).ok());
+      }
+    }
+    met.push_back(bundle.applicationIdentifier());
+  });
+  std::ranges::sort(met);
+  EXPECT_EQ(met, (Identifiers{"com.a", "com.b", "com.c"}));
+  EXPECT_EQ(walk(BundleKind::All), Identifiers{"com.d"});
+}
+
+}  // namespace appsync::test

@@ -1,0 +1,269 @@
+// The part of the registry's contract that is about installing and removing.
+#include <cstdint>
+
+#include "kit/contracts/AppRegistryContract.h"
+#include "kit/fakes/Threads.h"
+#include "platform/Keys.h"
+
+namespace appsync::test {
+
+using platform::BundleKind;
+using platform::FileLocation;
+using platform::PlaceholderLookup;
+using platform::TSInstallType;
+
+namespace {
+
+using Identifiers = std::vector<std::string>;
+
+const plist::Dictionary& placeholdersOnly() {
+  static const plist::Dictionary options{{platform::UninstallPlaceholdersOnlyKey, true}};
+  return options;
+}
+
+bool isInstallersError(const Status& status) {
+  return !status &&
+         (status.error().domain == platform::InstallerErrorDomain || status.error().domain == domains::kPOSIX);
+}
+
+}  // namespace
+
+TEST_P(AppRegistryContract, APackageBecomesAnInstalledApp) {
+  install("com.a");
+  EXPECT_EQ(stateOf("com.a"), "installed");
+}
+
+TEST_P(AppRegistryContract, ALaterPackageTakesTheEarliersPlace) {
+  install("com.a", "1.0");
+  install("com.a", "2.0");
+  EXPECT_EQ(versionOf("com.a"), "2.0");
+  EXPECT_EQ(walk(BundleKind::All), Identifiers{"com.a"});
+  EXPECT_TRUE(subject().isUsable(*record("com.a")->bundlePath()));
+}
+
+TEST_P(AppRegistryContract, APlaceholderIsNoApp) {
+  placeholder("com.a", "1.5");
+  EXPECT_EQ(stateOf("com.a"), "placeholder");
+  EXPECT_EQ(versionOf("com.a"), "1.5");
+  EXPECT_EQ(record("com.a")->installType(), TSInstallType::Sync);
+}
+
+TEST_P(AppRegistryContract, APlaceholderLeavesAnInstalledAppUsable) {
+  install("com.a", "1.0");
+  placeholder("com.a", "2.0");
+  EXPECT_EQ(stateOf("com.a"), "both");
+  const auto app = registry().recordForIdentifier("com.a", PlaceholderLookup::off);
+  ASSERT_NE(app, nullptr);
+  ASSERT_TRUE(app->bundlePath());
+  EXPECT_TRUE(subject().isUsable(*app->bundlePath()));
+}
+
+TEST_P(AppRegistryContract, APackageTakesItsPlaceholdersPlace) {
+  placeholder("com.a");
+  install("com.a");
+  EXPECT_EQ(stateOf("com.a"), "installed");
+}
+
+TEST_P(AppRegistryContract, APackageTakesThePlaceOfAppAndPlaceholder) {
+  install("com.a", "1.0");
+  placeholder("com.a", "2.0");
+  install("com.a", "2.0");
+  EXPECT_EQ(stateOf("com.a"), "installed");
+  EXPECT_EQ(versionOf("com.a"), "2.0");
+}
+
+TEST_P(AppRegistryContract, TheInstallTypeIsKept) {
+  plist::Dictionary restoring = options(platform::PackageTypePlaceholder, "com.a");
+  restoring.set(platform::InstallTypeKey, static_cast<std::uint64_t>(TSInstallType::Restore));
+  ASSERT_TRUE(registry().installApplication(subject().makePlaceholderFolder("com.a", "1.0"), restoring).ok());
+  EXPECT_EQ(record("com.a")->installType(), TSInstallType::Restore);
+}
+
+TEST_P(AppRegistryContract, ARestoredAppsStoreMetadataAndLicenceAreKept) {
+  plist::Dictionary restored = options(platform::PackageTypeCustomer, "com.a");
+  restored.set(platform::StoreMetadataKey, plist::Value::data(bytesOf("metadata")));
+  restored.set(platform::LicenceDataKey, plist::Value::data(bytesOf("licence")));
+  ASSERT_TRUE(registry().installApplication(subject().makePackage("com.a", "1.0"), restored).ok());
+  const std::optional<std::string> metadata = subject().storeMetadataOf("com.a");
+  const std::optional<std::string> licence = subject().licenceDataOf("com.a");
+  if (!metadata && !licence) GTEST_SKIP() << "neither can be told";
+  EXPECT_EQ(metadata.value_or("metadata"), "metadata");
+  EXPECT_EQ(licence.value_or("licence"), "licence");
+}
+
+TEST_P(AppRegistryContract, ANullForMetadataOrLicenceIsAsNone) {
+  plist::Dictionary restored = options(platform::PackageTypePlaceholder, "com.a");
+  restored.set(platform::StoreMetadataKey, nullptr);
+  restored.set(platform::LicenceDataKey, nullptr);
+  ASSERT_TRUE(registry().installApplication(subject().makePlaceholderFolder("com.a", "1.0"), restored).ok());
+  EXPECT_FALSE(record("com.a")->hasMIDBasedSINF());
+}
+
+TEST_P(AppRegistryContract, TheLocationIsNotChanged) {
+  const FileLocation package = subject().makePackage("com.a", "1.0");
+  const FileLocation folder = subject().makePlaceholderFolder("com.b", "1.0");
+  const std::string before = subject().fingerprint(package) + subject().fingerprint(folder);
+  ASSERT_TRUE(tryInstall(package, "com.a").ok());
+  ASSERT_TRUE(tryPlaceholder(folder, "com.b").ok());
+  EXPECT_EQ(subject().fingerprint(package) + subject().fingerprint(folder), before);
+}
+
+TEST_P(AppRegistryContract, TheLocationIsNeededDuringTheCallOnly) {
+  const FileLocation package = subject().makePackage("com.a", "1.0");
+  const FileLocation folder = subject().makePlaceholderFolder("com.b", "1.0");
+  ASSERT_TRUE(tryInstall(package, "com.a").ok());
+  ASSERT_TRUE(tryPlaceholder(folder, "com.b").ok());
+  subject().removeLocation(package);
+  subject().removeLocation(folder);
+  EXPECT_EQ(stateOf("com.a"), "installed");
+  EXPECT_TRUE(subject().isUsable(*record("com.a")->bundlePath()));
+  EXPECT_EQ(stateOf("com.b"), "placeholder");
+}
+
+TEST_P(AppRegistryContract, APackageOfAnotherAppFails) {
+  EXPECT_TRUE(isInstallersError(tryInstall(subject().makePackage("com.other", "1.0"), "com.a")));
+  EXPECT_EQ(walk(BundleKind::All), Identifiers());
+}
+
+TEST_P(AppRegistryContract, APlaceholderOfAnotherAppFails) {
+  EXPECT_TRUE(isInstallersError(tryPlaceholder(subject().makePlaceholderFolder("com.other", "1.0"), "com.a")));
+  EXPECT_EQ(walk(BundleKind::All), Identifiers());
+}
+
+TEST_P(AppRegistryContract, AMissingPackageFails) {
+  const FileLocation package = subject().makePackage("com.a", "1.0");
+  const FileLocation folder = subject().makePlaceholderFolder("com.a", "1.0");
+  subject().removeLocation(package);
+  subject().removeLocation(folder);
+  EXPECT_TRUE(isInstallersError(tryInstall(package, "com.a")));
+  EXPECT_TRUE(isInstallersError(tryPlaceholder(folder, "com.a")));
+  EXPECT_EQ(stateOf("com.a"), "absent");
+}
+
+TEST_P(AppRegistryContract, ADamagedPackageLeavesTheAppAsItWas) {
+  install("com.a", "1.0");
+  EXPECT_TRUE(isInstallersError(tryInstall(subject().makeDamagedPackage("com.a"), "com.a")));
+  EXPECT_EQ(stateOf("com.a"), "installed");
+  EXPECT_EQ(versionOf("com.a"), "1.0");
+  EXPECT_TRUE(subject().isUsable(*record("com.a")->bundlePath()));
+}
+
+TEST_P(AppRegistryContract, ADamagedPackageLeavesThePlaceholderAsItWas) {
+  placeholder("com.a");
+  EXPECT_TRUE(isInstallersError(tryInstall(subject().makeDamagedPackage("com.a"), "com.a")));
+  EXPECT_EQ(stateOf("com.a"), "placeholder");
+}
+
+TEST_P(AppRegistryContract, TenAppsMayBeInstalledAtOnce) {
+  constexpr std::size_t kApps = 10;
+  std::vector<FileLocation> packages;
+  for (std::size_t index = 0; index < kApps; ++index) {
+    packages.push_back(subject().makePackage("com.a" + std::to_string(index), "1.0"));
+  }
+  runOnThreads(kApps, [&](std::size_t index) {
+    EXPECT_TRUE(tryInstall(packages[index], "com.a" + std::to_string(index)).ok());
+  });
+  EXPECT_EQ(walk(BundleKind::User).size(), kApps);
+}
+
+TEST_P(AppRegistryContract, OneAppMayBeInstalledByManyAtOnce) {
+  constexpr std::size_t kThreads = 6;
+  std::vector<FileLocation> packages;
+  for (std::size_t index = 0; index < kThreads; ++index) {
+    packages.push_back(subject().makePackage("com.a", std::to_string(index)));
+  }
+  runOnThreads(kThreads, [&](std::size_t index) { EXPECT_TRUE(tryInstall(packages[index], "com.a").ok()); });
+  EXPECT_EQ(walk(BundleKind::User), Identifiers{"com.a"});
+  EXPECT_EQ(stateOf("com.a"), "installed");
+  EXPECT_TRUE(subject().isUsable(*record("com.a")->bundlePath()));
+}
+
+TEST_P(AppRegistryContract, AppsOutliveTheProcess) {
+  install("com.app", "1.5");
+  if (!subject().restart()) GTEST_SKIP() << "cannot be started again";
+  EXPECT_EQ(stateOf("com.app"), "installed");
+  EXPECT_EQ(versionOf("com.app"), "1.5");
+  EXPECT_TRUE(subject().isUsable(*record("com.app")->bundlePath()));
+}
+
+// Uninstalling.
+
+TEST_P(AppRegistryContract, AnAppIsRemoved) {
+  install("com.a");
+  const std::string bundlePath = *record("com.a")->bundlePath();
+  EXPECT_TRUE(registry().uninstallApplication("com.a").ok());
+  EXPECT_EQ(stateOf("com.a"), "absent");
+  EXPECT_FALSE(subject().isUsable(bundlePath));
+}
+
+TEST_P(AppRegistryContract, APlaceholderIsRemoved) {
+  placeholder("com.a");
+  EXPECT_TRUE(registry().uninstallApplication("com.a").ok());
+  EXPECT_EQ(stateOf("com.a"), "absent");
+}
+
+TEST_P(AppRegistryContract, AnAppIsRemovedWithItsPlaceholder) {
+  install("com.a");
+  placeholder("com.a", "2.0");
+  EXPECT_TRUE(registry().uninstallApplication("com.a").ok());
+  EXPECT_EQ(stateOf("com.a"), "absent");
+}
+
+TEST_P(AppRegistryContract, RemovingAnUnknownAppFails) {
+  EXPECT_TRUE(isInstallersError(registry().uninstallApplication("com.a")));
+  EXPECT_FALSE(registry().uninstallApplication("com.a", placeholdersOnly()).ok());
+}
+
+TEST_P(AppRegistryContract, RemovingPlaceholdersOnlyRemovesAPlaceholder) {
+  placeholder("com.a");
+  EXPECT_TRUE(registry().uninstallApplication("com.a", placeholdersOnly()).ok());
+  EXPECT_EQ(stateOf("com.a"), "absent");
+}
+
+TEST_P(AppRegistryContract, RemovingPlaceholdersOnlyLeavesTheAppUnderIt) {
+  install("com.a", "1.0");
+  placeholder("com.a", "2.0");
+  EXPECT_TRUE(registry().uninstallApplication("com.a", placeholdersOnly()).ok());
+  EXPECT_EQ(stateOf("com.a"), "installed");
+  EXPECT_EQ(versionOf("com.a"), "1.0");
+  EXPECT_TRUE(subject().isUsable(*record("com.a")->bundlePath()));
+}
+
+TEST_P(AppRegistryContract, RemovingPlaceholdersOnlyNeverRemovesAnApp) {
+  install("com.a");
+  static_cast<void>(registry().uninstallApplication("com.a", placeholdersOnly()));
+  EXPECT_EQ(stateOf("com.a"), "installed");
+}
+
+TEST_P(AppRegistryContract, RemovingNotOnlyPlaceholdersRemovesTheApp) {
+  install("com.a");
+  EXPECT_TRUE(registry().uninstallApplication("com.a", {{platform::UninstallPlaceholdersOnlyKey, false}}).ok());
+  EXPECT_EQ(stateOf("com.a"), "absent");
+}
+
+TEST_P(AppRegistryContract, ARemovedAppEntersTheListOfUninstalledApps) {
+  install("com.app");
+  install("com.both");
+  placeholder("com.both", "2.0");
+  ASSERT_TRUE(registry().uninstallApplication("com.app").ok());
+  ASSERT_TRUE(registry().uninstallApplication("com.both").ok());
+  EXPECT_EQ(removedApps(), (Identifiers{"com.app", "com.both"}));
+}
+
+TEST_P(AppRegistryContract, ARemovedPlaceholderDoesNotEnterTheListOfUninstalledApps) {
+  placeholder("com.placeholder");
+  install("com.both");
+  placeholder("com.both", "2.0");
+  ASSERT_TRUE(registry().uninstallApplication("com.placeholder").ok());
+  ASSERT_TRUE(registry().uninstallApplication("com.both", placeholdersOnly()).ok());
+  EXPECT_EQ(removedApps(), Identifiers());
+}
+
+TEST_P(AppRegistryContract, AnAppThatIsInstalledAgainLeavesTheListOfUninstalledApps) {
+  install("com.a");
+  ASSERT_TRUE(registry().uninstallApplication("com.a").ok());
+  install("com.a");
+  EXPECT_EQ(removedApps(), Identifiers());
+}
+
+}  // namespace appsync::test

@@ -1,0 +1,121 @@
+#include "kit/contracts/HomeScreenContract.h"
+
+#include <memory>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include "base/PropertyList.h"
+#include "kit/fakes/Threads.h"
+
+namespace appsync::test {
+
+using platform::TerminationAssertion;
+using platform::TerminationAssertionOutcome;
+
+GTEST_ALLOW_UNINSTANTIATED_PARAMETERIZED_TEST(HomeScreenContract);
+
+namespace {
+
+constexpr TerminationAssertionOutcome kNotSet{77};
+
+std::vector<std::string> orderOf(platform::HomeScreenService& screen) {
+  const std::optional<Bytes> bytes = screen.getFlattenedIconState(screen.blockableServerPort(), 1);
+  if (!bytes) return {"(no answer)"};
+  const Result<plist::Value> order = plist::read(*bytes);
+  if (!order || order->array() == nullptr) return {"(no array)"};
+  std::vector<std::string> identifiers;
+  for (const plist::Value& identifier : *order->array())
+    identifiers.emplace_back(identifier.string().value_or("(no string)"));
+  return identifiers;
+}
+
+void handOver(platform::HomeScreenService& screen, std::string_view layout) {
+  // From a buffer that is gone afterwards.
+  const std::string buffer(layout);
+  screen.setIconState(screen.blockableServerPort(), bytesOf(buffer));
+}
+
+}  // namespace
+
+TEST_P(HomeScreenContract, ThePortStaysTheSame) {
+  EXPECT_EQ(subject().homeScreen().blockableServerPort(), subject().homeScreen().blockableServerPort());
+}
+
+TEST_P(HomeScreenContract, TheOrderIsAnArrayOfIdentifiers) {
+  subject().addApp("com.b");
+  subject().addApp("com.a");
+  EXPECT_EQ(orderOf(subject().homeScreen()), (std::vector<std::string>{"com.b", "com.a"}));
+}
+
+TEST_P(HomeScreenContract, TheOrdersBytesAreTheCallersOwn) {
+  subject().addApp("com.a");
+  platform::HomeScreenService& screen = subject().homeScreen();
+  std::optional<Bytes> bytes = screen.getFlattenedIconState(screen.blockableServerPort(), 1);
+  ASSERT_TRUE(bytes);
+  bytes->assign(bytes->size(), std::byte{0});
+  EXPECT_EQ(orderOf(screen), std::vector<std::string>{"com.a"});
+}
+
+TEST_P(HomeScreenContract, ALayoutThatCannotBeUsedIsIgnored) {
+  subject().addApp("com.b");
+  subject().addApp("com.a");
+  const std::vector<std::string> order = orderOf(subject().homeScreen());
+  for (const char* layout : {"", "garbage", "bplist00", "<plist><array>", "<plist><integer>7</integer></plist>"}) {
+    handOver(subject().homeScreen(), layout);
+    EXPECT_EQ(orderOf(subject().homeScreen()), order) << layout;
+  }
+}
+
+TEST_P(HomeScreenContract, AnAssertionOnAnAppIsGranted) {
+  subject().addApp("com.a");
+  TerminationAssertionOutcome outcome = kNotSet;
+  const auto assertion = subject().homeScreen().terminationAssertionCreate("com.a", 0, outcome);
+  EXPECT_EQ(outcome, TerminationAssertionOutcome::granted);
+  EXPECT_NE(assertion, nullptr);
+}
+
+TEST_P(HomeScreenContract, TheHomeScreenTellsThatItDoesNotKnowAnApp) {
+  TerminationAssertionOutcome outcome = kNotSet;
+  const auto assertion = subject().homeScreen().terminationAssertionCreate("com.unknown", 0, outcome);
+  EXPECT_EQ(outcome, TerminationAssertionOutcome::notFound);
+}
+
+TEST_P(HomeScreenContract, ADeniedAssertionIsNoAssertion) {
+  subject().addApp("com.a");
+  if (!subject().denyAssertions("com.a")) GTEST_SKIP() << "cannot be made to deny";
+  TerminationAssertionOutcome outcome = kNotSet;
+  const auto assertion = subject().homeScreen().terminationAssertionCreate("com.a", 0, outcome);
+  EXPECT_EQ(outcome, TerminationAssertionOutcome::denied);
+  EXPECT_EQ(assertion, nullptr);
+}
+
+TEST_P(HomeScreenContract, TheOutcomeIsAlwaysSet) {
+  for (const char* identifier : {"", "com.a", "not an identifier /.."}) {
+    TerminationAssertionOutcome outcome = kNotSet;
+    static_cast<void>(subject().homeScreen().terminationAssertionCreate(identifier, 0, outcome));
+    EXPECT_NE(outcome, kNotSet) << identifier;
+  }
+}
+
+TEST_P(HomeScreenContract, AnAssertionMayEndOnAnotherThread) {
+  subject().addApp("com.a");
+  TerminationAssertionOutcome outcome = kNotSet;
+  std::unique_ptr<TerminationAssertion> assertion =
+      subject().homeScreen().terminationAssertionCreate("com.a", 0, outcome);
+  std::jthread([&] { assertion.reset(); }).join();
+  assertion = subject().homeScreen().terminationAssertionCreate("com.a", 0, outcome);
+  EXPECT_EQ(outcome, TerminationAssertionOutcome::granted);
+}
+
+TEST_P(HomeScreenContract, ManyThreadsMayAskAtOnce) {
+  subject().addApp("com.a");
+  runOnThreads(10, [&](std::size_t) {
+    TerminationAssertionOutcome outcome = kNotSet;
+    const auto assertion = subject().homeScreen().terminationAssertionCreate("com.a", 0, outcome);
+    EXPECT_EQ(outcome, TerminationAssertionOutcome::granted);
+    EXPECT_EQ(orderOf(subject().homeScreen()), std::vector<std::string>{"com.a"});
+  });
+}
+
+}  // namespace appsync::test

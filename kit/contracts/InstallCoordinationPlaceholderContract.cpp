@@ -1,0 +1,145 @@
+// The part of the contract of coordinated installs that is about placeholders.
+#include "kit/contracts/InstallCoordinationContract.h"
+
+namespace appsync::test {
+
+using platform::PlaceholderAttributes;
+using platform::PlaceholderLookup;
+using platform::StoreMetadata;
+using platform::TSInstallType;
+
+TEST_P(CoordinatedInstallContract, APlaceholderKeepsWhatItWasMadeWith) {
+  const AppPlaceholder placeholder = service().initAppPlaceholder("An App", "com.a", TSInstallType::Sync, kStore);
+  ASSERT_NE(placeholder, nullptr);
+  EXPECT_EQ(placeholder->bundleName(), "An App");
+  EXPECT_EQ(placeholder->bundleID(), "com.a");
+  EXPECT_EQ(placeholder->installType(), TSInstallType::Sync);
+  EXPECT_EQ(placeholder->client(), kStore);
+  EXPECT_FALSE(placeholder->description().empty());
+}
+
+TEST_P(CoordinatedInstallContract, APlaceholderIsConfiguredStepByStep) {
+  const AppPlaceholder placeholder = makePlaceholder("com.a");
+  const Asset icon = service().makePromisedTransferToPath("com.a-Icon", kSync, subject().makeIcon(), 9);
+  icon->setPercentComplete(1);
+  icon->setComplete(true);
+  PlaceholderAttributes attributes = PlaceholderAttributes::initWithInfoPlistDictionary({{"Key", "value"}});
+  attributes.setLaunchProhibited(true);
+  attributes.setBundleVersion("2.0");
+  EXPECT_TRUE(placeholder->setIconPromise(icon));
+  EXPECT_TRUE(placeholder->setPlaceholderAttributes(attributes));
+  EXPECT_TRUE(placeholder->setMetadata(StoreMetadata::initWithDictionary({{"title", "An App"}})));
+  EXPECT_TRUE(placeholder->setSinfData(bytesOf("licence")));
+  EXPECT_TRUE(placeholder->setConfigurationComplete());
+  EXPECT_TRUE(coordinator("com.a")->setPlaceholderPromise(placeholder));
+  subject().waitUntilIdle();
+  EXPECT_EQ(stateOf("com.a"), "placeholder");
+}
+
+TEST_P(CoordinatedInstallContract, ACompleteConfigurationIsNotChanged) {
+  const AppPlaceholder placeholder = makePlaceholder("com.a");
+  EXPECT_TRUE(placeholder->setConfigurationComplete());
+  const Asset icon = makeAsset("icon");
+  EXPECT_FALSE(placeholder->setIconPromise(icon));
+  EXPECT_FALSE(placeholder->setPlaceholderAttributes({}));
+  EXPECT_FALSE(placeholder->setMetadata(std::nullopt));
+  EXPECT_FALSE(placeholder->setSinfData(bytesOf("licence")));
+  EXPECT_FALSE(placeholder->setConfigurationComplete());
+  EXPECT_TRUE(coordinator("com.a")->setAppAssetPromise(icon)) << "what was refused is still the caller's";
+}
+
+TEST_P(CoordinatedInstallContract, AConfiguredPlaceholderThatIsNobodysCanBeGivenUp) {
+  const AppPlaceholder placeholder = makeConfiguredPlaceholder("com.a");
+  EXPECT_TRUE(placeholder->cancelForReason(reason(), kSync));
+  EXPECT_FALSE(coordinator("com.a")->setPlaceholderPromise(placeholder));
+}
+
+TEST_P(CoordinatedInstallContract, ACancelledPlaceholderTakesNothingMore) {
+  const AppPlaceholder placeholder = makePlaceholder("com.a");
+  EXPECT_TRUE(placeholder->cancelForReason(reason(), kSync));
+  EXPECT_FALSE(placeholder->setIconPromise(makeAsset("icon")));
+  EXPECT_FALSE(placeholder->setPlaceholderAttributes({}));
+  EXPECT_FALSE(placeholder->setMetadata(std::nullopt));
+  EXPECT_FALSE(placeholder->setSinfData(bytesOf("licence")));
+  EXPECT_FALSE(placeholder->setConfigurationComplete());
+  EXPECT_FALSE(placeholder->cancelForReason(reason(), kSync));
+  const Coordinator made = coordinator("com.a");
+  EXPECT_FALSE(made->setPlaceholderPromise(placeholder));
+  EXPECT_FALSE(made->hasPlaceholderPromise());
+}
+
+TEST_P(CoordinatedInstallContract, APlaceholderThatIsGivenUpTakesItsIconWithIt) {
+  const AppPlaceholder placeholder = makePlaceholder("com.a");
+  const Asset icon = makeAsset("icon");
+  EXPECT_TRUE(placeholder->setIconPromise(icon));
+  EXPECT_TRUE(placeholder->cancelForReason(reason(), kSync));
+  icon->setComplete(true);
+  EXPECT_FALSE(icon->isComplete());
+  EXPECT_FALSE(makePlaceholder("com.a")->setIconPromise(icon));
+}
+
+TEST_P(CoordinatedInstallContract, ACoordinatorsPlaceholderGoesWithItOnly) {
+  const AppPlaceholder placeholder = makeConfiguredPlaceholder("com.a");
+  EXPECT_TRUE(coordinator("com.a")->setPlaceholderPromise(placeholder));
+  EXPECT_FALSE(placeholder->cancelForReason(reason(), kSync));
+  subject().waitUntilIdle();
+  EXPECT_EQ(stateOf("com.a"), "placeholder");
+}
+
+TEST_P(CoordinatedInstallContract, APlaceholderFitsItsOwnAppAndOneCoordinator) {
+  const AppPlaceholder placeholder = makeConfiguredPlaceholder("com.a");
+  EXPECT_FALSE(coordinator("com.b")->setPlaceholderPromise(placeholder));
+  EXPECT_FALSE(coordinator("com.b")->hasPlaceholderPromise());
+  EXPECT_FALSE(coordinator("com.b")->setPlaceholderPromise(nullptr));
+  EXPECT_TRUE(coordinator("com.a")->setPlaceholderPromise(placeholder));
+  EXPECT_FALSE(coordinator("com.a", Kind::restoring)->setPlaceholderPromise(placeholder));
+}
+
+TEST_P(CoordinatedInstallContract, APlaceholderThatWasRefusedIsStillTheCallers) {
+  EXPECT_TRUE(coordinator("com.a")->setPlaceholderPromise(makePlaceholder("com.a")));
+  const AppPlaceholder placeholder = makeConfiguredPlaceholder("com.a");
+  EXPECT_FALSE(coordinator("com.a")->setPlaceholderPromise(placeholder));
+  EXPECT_TRUE(placeholder->cancelForReason(reason(), kSync));
+}
+
+// On the home screen.
+
+TEST_P(CoordinatedInstallContract, APlaceholderThatIsDroppedLeavesNothingBehind) {
+  AppPlaceholder placeholder = makeConfiguredPlaceholder("com.a");
+  subject().waitUntilIdle();
+  EXPECT_EQ(stateOf("com.a"), "absent");
+  placeholder.reset();
+  subject().waitUntilIdle();
+  EXPECT_EQ(stateOf("com.a"), "absent");
+}
+
+TEST_P(CoordinatedInstallContract, ACoordinatorsConfiguredPlaceholderIsShown) {
+  const AppPlaceholder placeholder = makePlaceholder("com.a", TSInstallType::IntentionalDowngrade);
+  EXPECT_TRUE(placeholder->setConfigurationComplete());
+  EXPECT_TRUE(coordinator("com.a")->setPlaceholderPromise(placeholder));
+  subject().waitUntilIdle();
+  EXPECT_EQ(stateOf("com.a"), "placeholder");
+  const auto record = subject().registry().recordForIdentifier("com.a", PlaceholderLookup::on);
+  ASSERT_NE(record, nullptr);
+  EXPECT_EQ(record->installType(), TSInstallType::IntentionalDowngrade);
+}
+
+TEST_P(CoordinatedInstallContract, APlaceholderIsNotShownBeforeItIsConfigured) {
+  const AppPlaceholder placeholder = makePlaceholder("com.a");
+  EXPECT_TRUE(coordinator("com.a")->setPlaceholderPromise(placeholder));
+  subject().waitUntilIdle();
+  EXPECT_EQ(stateOf("com.a"), "absent");
+  EXPECT_TRUE(placeholder->setConfigurationComplete());
+  subject().waitUntilIdle();
+  EXPECT_EQ(stateOf("com.a"), "placeholder");
+}
+
+TEST_P(CoordinatedInstallContract, APlaceholderOverAnInstalledAppLeavesThatUsable) {
+  install("com.a", "1.0");
+  EXPECT_TRUE(coordinator("com.a", Kind::updating)->setPlaceholderPromise(makeConfiguredPlaceholder("com.a")));
+  subject().waitUntilIdle();
+  EXPECT_EQ(stateOf("com.a"), "both");
+  EXPECT_EQ(versionOf("com.a"), "1.0");
+}
+
+}  // namespace appsync::test

@@ -1,0 +1,69 @@
+#include "kit/contracts/SoftwareLibraryContract.h"
+
+#include <optional>
+
+#include "kit/contracts/Occurrences.h"
+
+namespace appsync::test {
+
+GTEST_ALLOW_UNINSTANTIATED_PARAMETERIZED_TEST(SoftwareLibraryContract);
+
+TEST_P(SoftwareLibraryContract, ARefreshCompletesOnce) {
+  Occurrences completions;
+  std::optional<Error> failure = Error{};
+  auto library = subject().makeLibrary();
+  ASSERT_NE(library, nullptr);
+  library->refreshReceipts([&](const std::optional<Error>& error) {
+    failure = error;
+    completions.happened();
+  });
+  ASSERT_TRUE(completions.waitFor(1));
+  EXPECT_FALSE(failure);
+  library.reset();
+  EXPECT_EQ(completions.count(), 1U);
+}
+
+TEST_P(SoftwareLibraryContract, AFailedRefreshTellsWhy) {
+  if (!subject().failRefreshes()) GTEST_SKIP() << "cannot be made to fail";
+  Occurrences completions;
+  std::optional<Error> failure;
+  const auto library = subject().makeLibrary();
+  library->refreshReceipts([&](const std::optional<Error>& error) {
+    failure = error;
+    completions.happened();
+  });
+  ASSERT_TRUE(completions.waitFor(1));
+  ASSERT_TRUE(failure);
+  EXPECT_FALSE(failure->domain.empty());
+}
+
+TEST_P(SoftwareLibraryContract, EveryRefreshCompletes) {
+  Occurrences completions;
+  const auto library = subject().makeLibrary();
+  for (int round = 0; round < 3; ++round) {
+    library->refreshReceipts([&](const std::optional<Error>&) { completions.happened(); });
+  }
+  EXPECT_TRUE(completions.waitFor(3));
+}
+
+TEST_P(SoftwareLibraryContract, TheLibraryMayBeDestroyedByItsCompletion) {
+  Occurrences completions;
+  std::shared_ptr<platform::SoftwareLibrary> library = subject().makeLibrary();
+  platform::SoftwareLibrary& stillHeld = *library;
+  stillHeld.refreshReceipts([&completions, owner = std::move(library)](const std::optional<Error>&) mutable {
+    owner.reset();
+    completions.happened();
+  });
+  EXPECT_TRUE(completions.waitFor(1));
+}
+
+TEST_P(SoftwareLibraryContract, LibrariesAreIndependent) {
+  Occurrences completions;
+  const auto first = subject().makeLibrary();
+  const auto second = subject().makeLibrary();
+  first->refreshReceipts([&](const std::optional<Error>&) { completions.happened(); });
+  second->refreshReceipts([&](const std::optional<Error>&) { completions.happened(); });
+  EXPECT_TRUE(completions.waitFor(2));
+}
+
+}  // namespace appsync::test

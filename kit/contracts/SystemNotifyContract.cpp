@@ -1,0 +1,232 @@
+#include "kit/contracts/SystemNotifyContract.h"
+
+#include <atomic>
+#include <functional>
+#include <mutex>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include "kit/contracts/Occurrences.h"
+#include "kit/fakes/Threads.h"
+
+namespace appsync::test {
+
+using platform::SuspensionBehavior;
+using platform::SystemNotify;
+
+GTEST_ALLOW_UNINSTANTIATED_PARAMETERIZED_TEST(SystemNotifyContract);
+
+namespace {
+
+constexpr std::string_view kName = "com.corvel.contract.first";
+constexpr std::string_view kOtherName = "com.corvel.contract.second";
+
+/// Observes for as long as it lives.
+class Listener {
+ public:
+  explicit Listener(SystemNotify& notify, std::string_view name = kName, const void* object = nullptr)
+      : notify_(notify), name_(name) {
+    notify_.addObserver(this, &Listener::called, name_, object, SuspensionBehavior::drop);
+  }
+  ~Listener() { stop(); }
+  Listener(const Listener&) = delete;
+  Listener& operator=(const Listener&) = delete;
+
+  void stop() { notify_.removeObserver(this, name_); }
+
+  [[nodiscard]] std::string heard() {
+    const std::scoped_lock lock(mutex_);
+    return heard_;
+  }
+
+  Occurrences calls;
+  /// Runs in each call; set before anything is posted.
+  std::function<void()> inCall;
+  std::thread::id thread;
+
+ private:
+  static void called(void* context, std::string_view name, const void*) {
+    Listener& self = *static_cast<Listener*>(context);
+    {
+      const std::scoped_lock lock(self.mutex_);
+      self.heard_ = name;
+      self.thread = std::this_thread::get_id();
+    }
+    if (self.inCall) self.inCall();
+    self.calls.happened();
+  }
+
+  SystemNotify& notify_;
+  const std::string name_;
+  std::mutex mutex_;
+  std::string heard_;
+};
+
+}  // namespace
+
+TEST_P(SystemNotifyContract, APostReachesItsObserver) {
+  Listener listener(subject().notify());
+  subject().notify().post(kName);
+  ASSERT_TRUE(listener.calls.waitFor(1));
+  EXPECT_EQ(listener.heard(), kName);
+}
+
+TEST_P(SystemNotifyContract, ObserversAreCalledOnTheServicesOwnThread) {
+  Listener listener(subject().notify());
+  subject().notify().post(kName);
+  ASSERT_TRUE(listener.calls.waitFor(1));
+  EXPECT_NE(listener.thread, std::this_thread::get_id());
+}
+
+TEST_P(SystemNotifyContract, EveryObserverOfTheNameIsCalled) {
+  Listener first(subject().notify());
+  Listener second(subject().notify());
+  subject().notify().post(kName);
+  EXPECT_TRUE(first.calls.waitFor(1));
+  EXPECT_TRUE(second.calls.waitFor(1));
+}
+
+TEST_P(SystemNotifyContract, OtherNamesAreNotHeard) {
+  Listener other(subject().notify(), kOtherName);
+  Listener listener(subject().notify());
+  subject().notify().post(kName);
+  ASSERT_TRUE(listener.calls.waitFor(1));
+  subject().notify().post(kOtherName);
+  ASSERT_TRUE(other.calls.waitFor(1));
+  EXPECT_EQ(other.calls.count(), 1U);
+  EXPECT_EQ(listener.calls.count(), 1U);
+}
+
+TEST_P(SystemNotifyContract, AnObserverOfOneSenderDoesNotHearPostsWithoutOne) {
+  const int sender = 0;
+  Listener choosy(subject().notify(), kName, &sender);
+  Listener listener(subject().notify());
+  subject().notify().post(kName);
+  subject().notify().post(kName);
+  ASSERT_TRUE(listener.calls.waitFor(2));
+  EXPECT_EQ(choosy.calls.count(), 0U);
+}
+
+TEST_P(SystemNotifyContract, APostWithoutObserversIsLost) {
+  subject().notify().post(kName);
+  Listener listener(subject().notify());
+  subject().notify().post(kName);
+  ASSERT_TRUE(listener.calls.waitFor(1));
+  EXPECT_EQ(listener.calls.count(), 1U);
+}
+
+TEST_P(SystemNotifyContract, ARemovedObserverHearsNothing) {
+  Listener removed(subject().notify());
+  Listener listener(subject().notify());
+  removed.stop();
+  subject().notify().post(kName);
+  ASSERT_TRUE(listener.calls.waitFor(1));
+  EXPECT_EQ(removed.calls.count(), 0U);
+}
+
+TEST_P(SystemNotifyContract, RemovalEndsOneNameOnly) {
+  Listener listener(subject().notify());
+  subject().notify().removeObserver(&listener, kOtherName);
+  subject().notify().post(kName);
+  EXPECT_TRUE(listener.calls.waitFor(1));
+}
+
+TEST_P(SystemNotifyContract, RemovingAnUnknownObserverDoesNothing) {
+  int nobody = 0;
+  subject().notify().removeObserver(&nobody, kName);
+}
+
+TEST_P(SystemNotifyContract, RemovalWaitsForTheRunningCall) {
+  Occurrences begun;
+  Occurrences mayEnd;
+  std::atomic<bool> hasEnded = false;
+  Listener listener(subject().notify());
+  listener.inCall = [&] {
+    begun.happened();
+    static_cast<void>(mayEnd.waitFor(1));
+    hasEnded = true;
+  };
+  subject().notify().post(kName);
+  ASSERT_TRUE(begun.waitFor(1));
+  std::jthread remover([&] {
+    listener.stop();
+    EXPECT_TRUE(hasEnded);
+  });
+  mayEnd.happened();
+}
+
+TEST_P(SystemNotifyContract, AnObserverMayBeRemovedFromItsOwnCall) {
+  Listener listener(subject().notify());
+  listener.inCall = [&] { listener.stop(); };
+  Listener other(subject().notify());
+  subject().notify().post(kName);
+  ASSERT_TRUE(listener.calls.waitFor(1));
+  ASSERT_TRUE(other.calls.waitFor(1));
+  subject().notify().post(kName);
+  ASSERT_TRUE(other.calls.waitFor(2));
+  EXPECT_EQ(listener.calls.count(), 1U);
+}
+
+TEST_P(SystemNotifyContract, ACallMayUseTheService) {
+  Listener other(subject().notify(), kOtherName);
+  Listener listener(subject().notify());
+  listener.inCall = [&] {
+    const SystemNotify::Registration registration = subject().notify().registerCheck(kOtherName);
+    EXPECT_EQ(registration.status, 0U);
+    subject().notify().setState(registration.token, 1);
+    subject().notify().post(kOtherName);
+  };
+  subject().notify().post(kName);
+  EXPECT_TRUE(other.calls.waitFor(1));
+}
+
+TEST_P(SystemNotifyContract, AStateIsSeenWhenThePostArrives) {
+  const SystemNotify::Registration registration = subject().notify().registerCheck(kName);
+  ASSERT_EQ(registration.status, 0U);
+  std::optional<std::uint64_t> seen;
+  Listener listener(subject().notify());
+  listener.inCall = [&] { seen = subject().stateOf(kName); };
+  subject().notify().setState(registration.token, 0x1'0000'0001);
+  subject().notify().post(kName);
+  ASSERT_TRUE(listener.calls.waitFor(1));
+  if (!seen) GTEST_SKIP() << "states cannot be told";
+  EXPECT_EQ(*seen, 0x1'0000'0001U);
+}
+
+TEST_P(SystemNotifyContract, TokensOfDifferentNamesSetDifferentStates) {
+  const SystemNotify::Registration first = subject().notify().registerCheck(kName);
+  const SystemNotify::Registration second = subject().notify().registerCheck(kOtherName);
+  ASSERT_EQ(first.status, 0U);
+  ASSERT_EQ(second.status, 0U);
+  subject().notify().setState(first.token, 1);
+  subject().notify().setState(second.token, 2);
+  if (!subject().stateOf(kName)) GTEST_SKIP() << "states cannot be told";
+  EXPECT_EQ(subject().stateOf(kName), 1U);
+  EXPECT_EQ(subject().stateOf(kOtherName), 2U);
+}
+
+TEST_P(SystemNotifyContract, ANameMayBeRegisteredAgainAndAgain) {
+  for (std::uint64_t state = 1; state <= 3; ++state) {
+    const SystemNotify::Registration registration = subject().notify().registerCheck(kName);
+    ASSERT_EQ(registration.status, 0U);
+    subject().notify().setState(registration.token, state);
+    if (subject().stateOf(kName)) {
+      EXPECT_EQ(subject().stateOf(kName), state);
+    }
+  }
+}
+
+TEST_P(SystemNotifyContract, ManyThreadsMayUseItAtOnce) {
+  Listener listener(subject().notify());
+  runOnThreads(8, [&](std::size_t) {
+    Listener own(subject().notify());
+    const SystemNotify::Registration registration = subject().notify().registerCheck(kName);
+    subject().notify().setState(registration.token, 1);
+    subject().notify().post(kName);
+    EXPECT_TRUE(own.calls.waitFor(1));
+  });
+  EXPECT_TRUE(listener.calls.waitFor(8));
+}
+
+}  // namespace appsync::test

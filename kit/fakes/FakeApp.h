@@ -1,0 +1,91 @@
+// Apps as tests describe them, and as the fake registry reports them.
+#pragma once
+
+#include <memory>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <utility>
+
+#include "base/PropertyList.h"
+#include "kit/fakes/FakeInstallProgress.h"
+#include "platform/AppRecord.h"
+
+namespace appsync::test {
+
+/// One app of the registry. Made by what it is, then adapted:
+/// `FakeApp::placeholder("com.a").ofType(ApplicationTypeSystem).withVersion("2")`.
+struct FakeApp {
+  std::string identifier;
+  std::optional<std::string> bundleIdentifier;
+  std::optional<std::string> version;
+  std::optional<std::string> containerPath;
+  std::optional<std::string> bundlePath;
+  std::string applicationType;
+  platform::TSInstallType installType = platform::TSInstallType::None;
+  bool isInstalled = false;
+  bool isPlaceholder = false;
+  /// Whether its licence data is bound to the device.
+  bool hasMIDBasedSINF = false;
+  /// Live; null when no install runs.
+  std::shared_ptr<FakeInstallProgress> progress;
+  /// Of the latest install: what came with it.
+  plist::Dictionary installOptions;
+
+  /// A user's app, version "1.0", in "/var/mobile/Containers/Bundle/<identifier>", neither installed nor placeholder.
+  explicit FakeApp(std::string appIdentifier);
+
+  [[nodiscard]] static FakeApp installed(std::string identifier);
+  /// With a progress that waits and loads.
+  [[nodiscard]] static FakeApp placeholder(std::string identifier,
+                                           platform::TSInstallType type = platform::TSInstallType::Sync);
+  /// Installed, and a placeholder of a later version over it.
+  [[nodiscard]] static FakeApp updating(std::string identifier,
+                                        platform::TSInstallType type = platform::TSInstallType::Sync);
+
+  [[nodiscard]] FakeApp withBundleIdentifier(std::optional<std::string> value) const;
+  [[nodiscard]] FakeApp withVersion(std::optional<std::string> value) const;
+  [[nodiscard]] FakeApp withContainerPath(std::optional<std::string> value) const;
+  [[nodiscard]] FakeApp withBundlePath(std::optional<std::string> value) const;
+  [[nodiscard]] FakeApp ofType(std::string_view type) const;
+  [[nodiscard]] FakeApp withInstallType(platform::TSInstallType type) const;
+  [[nodiscard]] FakeApp withMIDBasedSINF() const;
+  [[nodiscard]] FakeApp withProgress(platform::TSInstallState state, platform::TSInstallPhase phase) const;
+  [[nodiscard]] FakeApp withoutProgress() const;
+};
+
+/// A snapshot of an app. Described as "<identifier>".
+class FakeAppRecord final : public platform::AppRecord {
+ public:
+  explicit FakeAppRecord(FakeApp app) : app_(std::move(app)) {}
+
+  [[nodiscard]] std::string applicationIdentifier() const override { return app_.identifier; }
+  [[nodiscard]] std::string description() const override { return app_.identifier; }
+  [[nodiscard]] std::optional<std::string> bundleIdentifier() const override { return app_.bundleIdentifier; }
+  [[nodiscard]] std::optional<std::string> bundleVersion() const override { return app_.version; }
+  [[nodiscard]] std::optional<std::string> bundleContainerPath() const override { return app_.containerPath; }
+  [[nodiscard]] std::optional<std::string> bundlePath() const override { return app_.bundlePath; }
+  [[nodiscard]] std::string applicationType() const override { return app_.applicationType; }
+  [[nodiscard]] platform::TSInstallType installType() const override { return app_.installType; }
+  [[nodiscard]] bool isInstalled() const override { return app_.isInstalled; }
+  [[nodiscard]] bool isPlaceholder() const override { return app_.isPlaceholder; }
+  [[nodiscard]] bool hasMIDBasedSINF() const override { return app_.hasMIDBasedSINF; }
+  [[nodiscard]] std::shared_ptr<platform::InstallProgress> installProgress() const override { return app_.progress; }
+
+ private:
+  FakeApp app_;
+};
+
+/// A bundle that is no app.
+class FakeBundleRecord final : public platform::BundleRecord {
+ public:
+  explicit FakeBundleRecord(std::string identifier) : identifier_(std::move(identifier)) {}
+
+  [[nodiscard]] std::string applicationIdentifier() const override { return identifier_; }
+  [[nodiscard]] std::string description() const override { return identifier_; }
+
+ private:
+  std::string identifier_;
+};
+
+}  // namespace appsync::test

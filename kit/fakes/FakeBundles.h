@@ -1,0 +1,36 @@
+// App bundles as folders of the fake file system.
+#pragma once
+
+#include <memory>
+#include <mutex>
+#include <optional>
+#include <set>
+#include <string>
+
+#include "kit/fakes/CallJournal.h"
+#include "kit/fakes/FakeFileSystem.h"
+#include "platform/Bundle.h"
+
+namespace appsync::test {
+
+/// The process has no bundle unless told. Journal lines: "bundles.openBundle /path", "bundles.mainBundleIdentifier".
+class FakeBundles final : public platform::Bundles {
+ public:
+  FakeBundles(CallJournal& journal, FakeFileSystem& files) : journal_(journal), files_(files) {}
+
+  void setMainBundleIdentifier(std::optional<std::string> identifier);
+  /// From now on the folder cannot be opened as a bundle.
+  void failOpening(std::string path);
+
+  [[nodiscard]] std::unique_ptr<platform::Bundle> openBundle(const platform::FileLocation& location) override;
+  [[nodiscard]] std::optional<std::string> mainBundleIdentifier() override;
+
+ private:
+  CallJournal& journal_;
+  FakeFileSystem& files_;
+  std::mutex mutex_;
+  std::optional<std::string> mainIdentifier_;
+  std::set<std::string> unreadable_;
+};
+
+}  // namespace appsync::test

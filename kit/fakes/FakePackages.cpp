@@ -1,0 +1,76 @@
+#include "kit/fakes/FakePackages.h"
+
+#include "platform/Keys.h"
+
+namespace appsync::test {
+
+namespace {
+
+using platform::TSInstallPhase;
+using platform::TSInstallState;
+using platform::TSInstallType;
+
+constexpr long kInstallerFailure = 1;
+
+std::optional<std::string> text(const plist::Value* value) {
+  const std::optional<std::string_view> view = value == nullptr ? std::nullopt : value->string();
+  return view ? std::optional<std::string>(*view) : std::nullopt;
+}
+
+std::optional<PackageKind> kindIn(const plist::Dictionary& options) {
+  const std::optional<std::string> word = text(options.find(platform::PackageTypeKey));
+  if (word == platform::PackageTypeCustomer) return PackageKind::app;
+  if (word == platform::PackageTypePlaceholder) return PackageKind::placeholder;
+  return std::nullopt;
+}
+
+}  // namespace
+
+Bytes packageOf(std::string_view identifier, std::string_view version) {
+  const plist::Dictionary content{{platform::BundleIdentifierKey, identifier}, {platform::BundleVersionKey, version}};
+  return plist::writeBinary(content).value();
+}
+
+Error installerError(std::string text) {
+  return {std::string(platform::InstallerErrorDomain), kInstallerFailure, std::move(text), nullptr};
+}
+
+std::string identifierIn(const plist::Dictionary& options) {
+  return text(options.find(platform::BundleIdentifierKey)).value_or("");
+}
+
+Result<FakePackage> readPackage(FakeFileSystem& files, const platform::FileLocation& location,
+                                const plist::Dictionary& options) {
+  const std::string identifier = identifierIn(options);
+  const std::optional<PackageKind> kind = kindIn(options);
+  if (identifier.empty() || !kind) return installerError("the options name no app or no kind of package");
+  const bool isPlaceholder = *kind == PackageKind::placeholder;
+  const std::optional<Bytes> bytes = files.contents(isPlaceholder ? location.path + "/Info.plist" : location.path);
+  if (!bytes || bytes->empty()) return installerError("no package at " + location.path);
+  const Result<plist::Value> info = plist::read(*bytes);
+  const std::optional<std::string> named =
+      info ? text(info->find(platform::BundleIdentifierKey)) : std::optional<std::string>();
+  if (isPlaceholder ? named != identifier : named && named != identifier) {
+    return installerError(location.path + " does not hold " + identifier);
+  }
+  return FakePackage{*kind, info ? text(info->find(platform::BundleVersionKey)) : std::nullopt};
+}
+
+void applyPackage(FakeApp& app, const FakePackage& package, const plist::Dictionary& options) {
+  const bool leavesTheApp = app.isInstalled && package.kind == PackageKind::placeholder;
+  if (package.version && !leavesTheApp) app.version = package.version;
+  app.installOptions = options;
+  const plist::Value* type = options.find(platform::InstallTypeKey);
+  const std::optional<std::uint64_t> number = type == nullptr ? std::nullopt : type->uint64();
+  if (number) app.installType = static_cast<TSInstallType>(*number);
+  app.isPlaceholder = package.kind == PackageKind::placeholder;
+  if (app.isPlaceholder) {
+    if (app.progress == nullptr) app.progress = std::make_shared<FakeInstallProgress>(app.identifier);
+    return;
+  }
+  app.isInstalled = true;
+  if (app.progress) app.progress->end(TSInstallState::Finished);
+  app.progress = nullptr;
+}
+
+}  // namespace appsync::test

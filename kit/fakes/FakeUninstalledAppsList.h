@@ -1,0 +1,40 @@
+// The installer's memory of removed apps.
+#pragma once
+
+#include <mutex>
+#include <set>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "kit/fakes/CallJournal.h"
+#include "platform/UninstalledAppsList.h"
+
+namespace appsync::test {
+
+/// Journal lines: "uninstalledApps.lookupUninstalled", "uninstalledApps.clearUninstalled com.a com.b".
+class FakeUninstalledAppsList final : public platform::UninstalledAppsList {
+ public:
+  explicit FakeUninstalledAppsList(CallJournal& journal) : journal_(journal) {}
+
+  void add(std::string_view identifier);
+  void remove(std::string_view identifier);
+  [[nodiscard]] std::set<std::string> identifiers() const;
+
+  /// From now on a look-up has no answer.
+  void loseAnswers();
+  /// From now on clearing fails with this number; 0 ends it.
+  void failClearingWith(int errorNumber);
+
+  [[nodiscard]] std::optional<plist::Dictionary> lookupUninstalled() override;
+  [[nodiscard]] int clearUninstalled(const std::vector<std::string>& bundleIdentifiers) override;
+
+ private:
+  CallJournal& journal_;
+  mutable std::mutex mutex_;
+  std::set<std::string> identifiers_;
+  bool answers_ = true;
+  int clearError_ = 0;
+};
+
+}  // namespace appsync::test

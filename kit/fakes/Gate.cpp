@@ -1,0 +1,35 @@
+#include "kit/fakes/Gate.h"
+
+namespace appsync::test {
+
+void Gate::close() {
+  const std::scoped_lock lock(mutex_);
+  closed_ = true;
+}
+
+void Gate::open() {
+  const std::scoped_lock lock(mutex_);
+  closed_ = false;
+  changed_.notify_all();
+}
+
+void Gate::pass() {
+  std::unique_lock lock(mutex_);
+  if (!closed_) return;
+  ++stopped_;
+  changed_.notify_all();
+  changed_.wait(lock, [this] { return !closed_; });
+  --stopped_;
+}
+
+void Gate::waitUntilStopped(std::size_t count) {
+  std::unique_lock lock(mutex_);
+  changed_.wait(lock, [&] { return stopped_ >= count; });
+}
+
+std::size_t Gate::stopped() const {
+  const std::scoped_lock lock(mutex_);
+  return stopped_;
+}
+
+}  // namespace appsync::test
