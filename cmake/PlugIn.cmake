@@ -11,17 +11,19 @@ endforeach()
 
 foreach(room IN LISTS APPSYNC_PLUGIN_ROOMS)
   add_subdirectory(${room})
-  get_target_property(type ${room} TYPE)
-  if(type STREQUAL "OBJECT_LIBRARY")
-    list(APPEND plugin_objects $<TARGET_OBJECTS:${room}>)
-  endif()
+  list(APPEND plugin_objects $<TARGET_OBJECTS:${room}>)
 endforeach()
 
-if(plugin_objects)
-  add_library(appsync_client STATIC ${plugin_objects})
-  target_link_libraries(appsync_client PUBLIC plugin_headers base platform)
-else()
-  add_library(appsync_client INTERFACE)
-  target_link_libraries(appsync_client INTERFACE plugin_headers base platform)
-endif()
+add_library(appsync_client STATIC ${plugin_objects})
+target_link_libraries(appsync_client PUBLIC $<BUILD_INTERFACE:plugin_headers> base platform)
 add_library(appsync::client ALIAS appsync_client)
+
+# The public headers, and what they are made of.
+set(public_headers
+    core/AppsClient.h core/SyncFiles.h
+    core/IdentifierSet.h core/PlugInLog.h coordination/AppInstallUsingCoordination.h restore/DemotionStatus.h)
+appsync_install_library(appsync_client client appsync)
+foreach(header IN LISTS public_headers)
+  cmake_path(GET header PARENT_PATH room)
+  install(FILES "${CMAKE_SOURCE_DIR}/${header}" DESTINATION "${APPSYNC_INSTALL_INCLUDEDIR}/${room}")
+endforeach()
