@@ -1,11 +1,13 @@
 // What all contract suites share. A suite holds an implementation of one platform service to what its header promises.
 //
-// To hold your own implementation to a suite, derive from the suite's subject, compile the suite's source into a test
-// program and write there
+// To hold your own implementation to a suite, derive from the suite's subject in a test program that links the suites
+// (`appsync::contracts` in CMake, `appsync-contracts` in pkg-config), and write there
 //
 //     INSTANTIATE_TEST_SUITE_P(MyDevice, FileSystemContract,
 //                              testing::Values(implementation<FileSystemSubject, MyFileSystemSubject>("MyDevice")),
 //                              implementationName);
+//
+// The program runs the suites that are instantiated in it and no others; one that instantiates none fails.
 #pragma once
 
 #include <functional>

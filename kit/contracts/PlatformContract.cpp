@@ -11,14 +11,22 @@ GTEST_ALLOW_UNINSTANTIATED_PARAMETERIZED_TEST(PlatformContract);
 
 namespace {
 
-std::array<const void*, 15> servicesOf(platform::Platform& platform) {
-  return {&platform.syncFramework(),   &platform.defaultRegistry(),
-          &platform.uninstalledApps(), &platform.installCoordination(),
-          &platform.homeScreen(),      &platform.sharedConnection(),
-          &platform.transactionLog(),  &platform.systemLog(),
-          &platform.systemNotify(),    &platform.bundles(),
-          &platform.iconRenderer(),    &platform.pngEncoders(),
-          &platform.fileSystem(),      &platform.clock(),
+std::array<const void*, 16> servicesOf(platform::Platform& platform) {
+  return {&platform.syncFramework(),
+          &platform.sharedDeviceService(),
+          &platform.defaultRegistry(),
+          &platform.uninstalledApps(),
+          &platform.installCoordination(),
+          &platform.homeScreen(),
+          &platform.sharedConnection(),
+          &platform.transactionLog(),
+          &platform.systemLog(),
+          &platform.systemNotify(),
+          &platform.bundles(),
+          &platform.iconRenderer(),
+          &platform.pngEncoders(),
+          &platform.fileSystem(),
+          &platform.clock(),
           &platform.scheduler()};
 }
 
