@@ -218,10 +218,10 @@ void Dictionary::set(std::string_view key, Value value) {
     return;
   }
   if (payload_ == nullptr) payload_ = DictionaryPayload::make(new Shape, 4);
-  Value name(key);
+  Value name(key);  // First: `key` may lie in a value that now moves.
   payload_ = withRoom(payload_);
   Shape& shape = ownShape(*payload_);
-  const std::size_t position = positionOf(shape, key);
+  const std::size_t position = positionOf(shape, keyText(name));
   shape.keys.insert(shape.keys.begin() + static_cast<std::ptrdiff_t>(position), std::move(name));
   Value* values = payload_->values();
   std::construct_at(values + payload_->count++);

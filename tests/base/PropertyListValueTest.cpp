@@ -171,6 +171,12 @@ TEST(PropertyListDictionary, ACopyKeepsWhatTheOtherErases) {
   EXPECT_EQ(dictionary, (Dictionary{{"b", 2}, {"c", 3}}));
 }
 
+TEST(PropertyListDictionary, AKeyMayBeATextWithinTheDictionary) {
+  Dictionary dictionary{{"a", "z"}, {"m", 1}};
+  dictionary.set(*std::as_const(dictionary).find("a")->string(), 2);
+  EXPECT_EQ(dictionary, (Dictionary{{"a", "z"}, {"m", 1}, {"z", 2}}));
+}
+
 TEST(PropertyListFind, ToleratesNothing) {
   const Value value = Dictionary{{"a", Dictionary{{"b", 1}}}};
   EXPECT_EQ(*plist::find(plist::find(&value, "a"), "b"), Value(1));
