@@ -84,7 +84,8 @@ void AppsClient::syncEndedWithSuccess(bool success) {
 
 void AppsClient::clearSyncData() {
   _log.message("%s|blasting work area");
-  _platform.fileSystem().removeItem(kSyncFolder).ignore();
+  // Between changes of the files in it: one that a coordinated install still has to make would leave the folder behind.
+  _accessQueue.sync([this] { _platform.fileSystem().removeItem(kSyncFolder).ignore(); });
 
   _log.message("%s|Uninstalling all placeholder apps");
   _enumeratePlaceholdersWithBlock([this](const platform::AppRecord& record, bool&) {

@@ -1,6 +1,9 @@
 // The end of syncing altogether.
+#include <optional>
 #include <set>
+#include <stdexcept>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include <gtest/gtest.h>
@@ -44,6 +47,26 @@ TEST_F(ClearSyncData, WithNothingToClearNoErrorIsLogged) {
   EXPECT_TRUE(sameLines(LogLines{logged("blasting work area"), logged("Uninstalling all placeholder apps")},
                         platform.log.lines()));
   EXPECT_TRUE(platform.journal.contains("uninstalledApps.clearUninstalled"));
+}
+
+/// Otherwise the list that is being written would stay, or keep its folder from going. Waiting for the queue from its
+/// own work is reported.
+TEST_F(ClearSyncData, NothingIsClearedWhileTheTodoListIsBeingChanged) {
+  putPropertyList(platform.files, kTodoListPath, plist::Array{installEntry("com.a")});
+  bool isReported = false;
+  platform.journal.setHook([&](std::string_view operation, std::string_view) -> std::optional<Error> {
+    if (operation != "fileSystem.writeFileAtomically" || isReported) return std::nullopt;
+    try {
+      client.clearSyncData();
+    } catch (const std::logic_error&) {
+      isReported = true;
+    }
+    return std::nullopt;
+  });
+  client.assetInstallSucceeded(*receivedAsset("com.a"));
+  platform.journal.setHook(nullptr);
+  EXPECT_TRUE(isReported);
+  EXPECT_TRUE(platform.files.has(kTodoListPath));
 }
 
 TEST_F(ClearSyncData, AnAbsentFolderIsNoError) {
