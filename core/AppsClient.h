@@ -39,11 +39,11 @@ struct TransferMarks {
 /// host's todo list asks, and writes into that list how far each has come.
 ///
 /// Threads: as `platform::ZTClient` says. Nothing is thrown; failures go to the log, and to error slots where the
-/// daemon gives one. Queued installs, scheduled retries and callbacks that are under way own a share of the object, so
-/// its destructor may run on any thread.
+/// daemon gives one. Queued installs, scheduled retries and a coordinator's callbacks that are under way own a share of
+/// the object, so its destructor may run on any thread; callbacks of the services that it observes are waited for.
 ///
 /// Class operations need no object and take the platform instead. Operations and fields that begin with an underscore
-/// are the plug-in's own; they are public because tests and the other rooms' files use them as they stand.
+/// are the plug-in's own; of the operations those are public that tests and the other rooms' files use as they stand.
 class AppsClient final : public platform::ZTClient,
                          public platform::AppRegistryObserver,
                          public platform::InstallObserverDelegate,
@@ -340,7 +340,7 @@ class AppsClient final : public platform::ZTClient,
 
   // Synchronisation.
   const std::shared_ptr<Group> _installGroup;  ///< installs queued, running or waiting to be tried again; left by those
-                                               ///< who have given their share of the object up
+                                               ///< who have given up their shares of the object and of the asset
   Group _restorePlaceHoldersWaitGroup;         ///< restore placeholders still awaited
   SerialQueue _accessQueue{"com.corvel.qor.Zephtra.AppSync"};
   SerialQueue _restoreQueue{"com.corvel.qor.Zephtra.AppRestore"};

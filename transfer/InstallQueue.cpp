@@ -17,6 +17,20 @@ constexpr std::string_view kInstallScenario = "Asset install";
 constexpr std::string_view kRestoreScenario = "Nimbra restore";
 constexpr std::chrono::seconds kRetryDelay{30};
 
+/// What an install holds while it is queued, runs or waits to be tried again.
+struct PendingInstall {
+  std::shared_ptr<AppsClient> client;
+  std::shared_ptr<ZTAsset> asset;
+  std::shared_ptr<Group> group;  ///< entered for it
+
+  /// The group comes last: whoever waits for it may then end the client, the assets and the platform.
+  void end() {
+    client.reset();
+    asset.reset();
+    group->leave();
+  }
+};
+
 void logAssertion(const PlugInLog& log, TerminationAssertionOutcome outcome, const std::string& identifier) {
   switch (outcome) {
     case TerminationAssertionOutcome::granted:
@@ -34,13 +48,14 @@ void logAssertion(const PlugInLog& log, TerminationAssertionOutcome outcome, con
 void AppsClient::_enqueueAssetInstall(const std::shared_ptr<ZTAsset>& asset) {
   _installGroup->enter();
   _log.message("%s|Enqueue install request for %{public}@", asset->identifier());
-  _installOperationQueue.add([self = shared_from_this(), group = _installGroup, asset]() mutable {
-    self->_log.message("%s|Performing install for %{public}@", asset->identifier());
-    self->_performAssetInstall(asset);
-    self->_log.message("%s|Finished install for %{public}@", asset->identifier());
-    self->_accessQueue.sync([&] { self->cleanRestoreStateForIdentifier(asset->identifier()); });
-    self.reset();  // First: whoever waited for the group may end the client, and then the platform.
-    group->leave();
+  _installOperationQueue.add([install = PendingInstall{shared_from_this(), asset, _installGroup}]() mutable {
+    AppsClient& client = *install.client;
+    const std::string& identifier = install.asset->identifier();
+    client._log.message("%s|Performing install for %{public}@", identifier);
+    client._performAssetInstall(install.asset);
+    client._log.message("%s|Finished install for %{public}@", identifier);
+    client._accessQueue.sync([&] { client.cleanRestoreStateForIdentifier(identifier); });
+    install.end();
   });
 }
 
@@ -83,12 +98,12 @@ void AppsClient::_scheduleInstallRetry(const std::shared_ptr<ZTAsset>& asset) {
              static_cast<int>(kRetryDelay.count()));
   _platform.transactionLog().logScenario(kInstallScenario, 0, true, identifier, "retrying asset install");
   _installGroup->enter();
-  _platform.scheduler().after(kRetryDelay, [self = shared_from_this(), group = _installGroup, asset]() mutable {
-    self->_log.error("%s|Re-enqueue installation request for %{public}@", asset->identifier());
-    self->_enqueueAssetInstall(asset);
-    self.reset();
-    group->leave();
-  });
+  _platform.scheduler().after(
+      kRetryDelay, [install = PendingInstall{shared_from_this(), asset, _installGroup}]() mutable {
+        install.client->_log.error("%s|Re-enqueue installation request for %{public}@", install.asset->identifier());
+        install.client->_enqueueAssetInstall(install.asset);
+        install.end();
+      });
 }
 
 void AppsClient::assetInstallSucceeded(const ZTAsset& asset) {

@@ -1,6 +1,10 @@
 // Installing received packages: assertions, retries, outcomes, and ten at a time.
 #include <chrono>
+#include <condition_variable>
+#include <functional>
 #include <future>
+#include <memory>
+#include <mutex>
 #include <string>
 #include <utility>
 #include <vector>
@@ -357,9 +361,31 @@ class LingeringAsset final : public ZTAsset {
   Gate& gate_;
 };
 
-TEST_F(InstallQueue, OnceTheTransfersHaveEndedNoInstallOwnsTheClient) {
+/// Tells whether the first one to wait on it had anything to wait for.
+class WatchedClock final : public Clock {
+ public:
+  explicit WatchedClock(Clock& clock) : clock_(clock) {}
+  TimePoint now() const override { return clock_.now(); }
+  bool wait(std::condition_variable& condition, std::unique_lock<std::mutex>& lock, TimePoint deadline,
+            const std::function<bool()>& ready) override {
+    std::call_once(first_, [&] { firstWait_.set_value(!ready()); });
+    return clock_.wait(condition, lock, deadline, ready);
+  }
+
+  /// Blocks until somebody waits.
+  [[nodiscard]] bool firstWaitWasNeeded() { return firstWait_.get_future().get(); }
+
+ private:
+  Clock& clock_;
+  std::once_flag first_;
+  std::promise<bool> firstWait_;
+};
+
+TEST_F(InstallQueue, OnceTheTransfersHaveEndedNoInstallOwnsTheClientOrTheAsset) {
   Gate gate;
   gate.close();
+  WatchedClock clock(platform.time);
+  platform.use(clock);
   AppsClient& client = makeClient();
   auto asset = std::make_shared<LingeringAsset>("com.a", gate);
   asset->setPath(pathOf("com.a"));
@@ -368,10 +394,14 @@ TEST_F(InstallQueue, OnceTheTransfersHaveEndedNoInstallOwnsTheClient) {
   client._enqueueAssetInstall(asset);
   asset.reset();  // The install is its last owner now.
   platform.registry.installGate.open();
-  client.assetTransferEndedWithSuccess(true);
+  gate.waitUntilStopped(1);
   const auto last = takeClient();
   EXPECT_EQ(last.use_count(), 1);
+
+  auto ended = std::async(std::launch::async, [&client] { client.assetTransferEndedWithSuccess(true); });
+  EXPECT_TRUE(clock.firstWaitWasNeeded()) << "the transfers ended before the asset";
   gate.open();
+  ended.get();
 }
 
 TEST_F(InstallQueue, QueuedInstallsKeepTheClientAliveAndItEndsOnTheirThread) {
