@@ -1,0 +1,75 @@
+#include "Daemon.h"
+
+#include <iostream>
+#include <optional>
+
+#include "kit/fakes/FakePackages.h"
+#include "kit/fakes/TodoList.h"
+
+namespace port {
+
+namespace {
+
+using appsync::platform::ZTAsset;
+using appsync::platform::ZTClient;
+using appsync::test::FakePlatform;
+namespace plist = appsync::plist;
+
+/// Relative paths of received packages are relative to this folder.
+const std::string kPublicStaging = "/var/mobile/Media/PublicStaging";
+
+/// The host's instructions: what to install, and beside that each app's info dictionary and icon.
+void stage(FakePlatform& device, const std::vector<WantedApp>& library) {
+  plist::Array todoList;
+  for (const WantedApp& app : library) {
+    todoList.emplace_back(appsync::test::installEntry(app.identifier, app.version, app.name));
+    appsync::test::putAppFolder(device.files, kPublicStaging + "/ApplicationSync/" + app.identifier, app.identifier,
+                                app.name);
+  }
+  device.files.put(appsync::test::kStagedTodoListPath, appsync::test::binaryForm(std::move(todoList)));
+}
+
+/// What the host does not push again, because a person removed it on the device.
+void tellRemovedApps(const plist::Dictionary& report) {
+  const plist::Value* deleted = report.find("_Deleted");
+  if (deleted == nullptr || deleted->array() == nullptr) return;
+  for (const plist::Value& app : *deleted->array()) {
+    const plist::Value* identifier = app.find(appsync::platform::BundleIdentifierKey);
+    if (identifier != nullptr) std::cout << "removed on the device: " << identifier->string().value_or("") << "\n";
+  }
+}
+
+/// The host sends one package. Here it comes out of thin air; a daemon copies bytes, and reports as they arrive.
+void transfer(FakePlatform& device, ZTClient& client, const std::shared_ptr<ZTAsset>& asset) {
+  const plist::Value* version = asset->variantOptions().find(appsync::platform::kAssetVersionKey);
+  const std::string wanted(version == nullptr ? "" : version->string().value_or(""));
+  std::cout << "sending: " << asset->identifier() << " " << wanted << "\n";
+  client.assetTransferUpdatedProgress(asset, 0.5);
+  device.files.put(kPublicStaging + "/" + asset->identifier() + ".zip",
+                   appsync::test::packageOf(asset->identifier(), wanted));
+  client.assetTransferUpdatedProgress(asset, 1.0);
+  asset->setPath(asset->identifier() + ".zip");
+  asset->setCompletedAssetParts(appsync::platform::kZTAssetPartApplication);
+  client.assetTransferSucceeded(asset, true, std::nullopt);
+}
+
+}  // namespace
+
+bool sync(FakePlatform& device, ZTClient& client, const std::vector<WantedApp>& library) {
+  stage(device, library);
+  client.prepareForSyncWithHostAnchor(client.currentSyncAnchor(), {}, nullptr);
+  tellRemovedApps(client.installedAssets());
+  std::optional<appsync::Error> error;
+  if (!client.reconcileSync({}, client.currentSyncAnchor(), {}, &error)) {
+    std::cout << "the plug-in refused the sync: " << (error ? error->text : "it does not say why") << "\n";
+    client.syncEndedWithSuccess(false);
+    return false;
+  }
+  for (const auto& asset : client.outstandingAssetTransfers())
+    transfer(device, client, asset);
+  client.assetTransferEndedWithSuccess(true);  // Returns when every package is installed, or has failed.
+  client.syncEndedWithSuccess(true);
+  return true;
+}
+
+}  // namespace port
