@@ -2,6 +2,7 @@
 //
 // A subject is what a suite needs to get at a service from its other side: to have an app removed, to read back what
 // was logged. Each test gets a subject of its own, in its first state.
+#include <filesystem>
 #include <fstream>
 #include <memory>
 #include <optional>
@@ -27,6 +28,7 @@ class RemovedAppsSubject final : public UninstalledAppsListSubject {
   platform::UninstalledAppsList& list() override { return *list_; }
   void removeRealApp(std::string_view identifier) override { EXPECT_EQ(list_->remember(identifier), 0); }
   void installApp(std::string_view identifier) override { EXPECT_EQ(list_->forget(identifier), 0); }
+  bool failClearing() override { return std::filesystem::create_directory(folder_.path("removed-apps.txt.new")); }
   bool restart() override {
     list_ = open();
     return true;

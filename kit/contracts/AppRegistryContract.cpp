@@ -166,6 +166,19 @@ TEST_P(AppRegistryContract, AWalkOfTheSystemsBundlesMeetsThemAlone) {
   EXPECT_EQ(walk(BundleKind::All).size(), 2U);
 }
 
+TEST_P(AppRegistryContract, AWalkMeetsBundlesThatAreNoAppsToo) {
+  install("com.app");
+  if (!subject().addExtension("com.app.extension")) GTEST_SKIP() << "nothing but apps";
+  Identifiers met;
+  registry().enumerateBundlesOfType(BundleKind::All, [&](const BundleRecord& bundle, bool&) {
+    met.push_back(bundle.applicationIdentifier());
+    EXPECT_EQ(bundle.asAppRecord() != nullptr, met.back() == "com.app") << met.back();
+    EXPECT_FALSE(bundle.description().empty());
+  });
+  std::ranges::sort(met);
+  EXPECT_EQ(met, (Identifiers{"com.app", "com.app.extension"}));
+}
+
 TEST_P(AppRegistryContract, TwoWalksMeetBundlesInOneOrder) {
   for (const char* identifier : {"com.c", "com.a", "com.b"})
     install(identifier);

@@ -45,6 +45,13 @@ class AppRegistrySubject {
     static_cast<void>(identifier);
     return false;
   }
+  /// Has a user's bundle there that is no app.
+  [[nodiscard]] virtual bool addExtension(std::string_view identifier) {
+    static_cast<void>(identifier);
+    return false;
+  }
+  /// Licence data that is bound to this device.
+  [[nodiscard]] virtual std::optional<std::string> deviceBoundLicence() { return std::nullopt; }
   /// What an app was installed with, where it can be told.
   [[nodiscard]] virtual std::optional<std::string> storeMetadataOf(std::string_view identifier) {
     static_cast<void>(identifier);

@@ -91,6 +91,17 @@ TEST_P(AppRegistryContract, ARestoredAppsStoreMetadataAndLicenceAreKept) {
   EXPECT_EQ(licence.value_or("licence"), "licence");
 }
 
+TEST_P(AppRegistryContract, ALicenceThatIsBoundToTheDeviceIsToldSo) {
+  const std::optional<std::string> licence = subject().deviceBoundLicence();
+  if (!licence) GTEST_SKIP() << "no licences for one device";
+  plist::Dictionary restored = options(platform::PackageTypeCustomer, "com.a");
+  restored.set(platform::LicenceDataKey, plist::Value::data(bytesOf(*licence)));
+  ASSERT_TRUE(registry().installApplication(subject().makePackage("com.a", "1.0"), restored).ok());
+  install("com.b");
+  EXPECT_TRUE(record("com.a")->hasMIDBasedSINF());
+  EXPECT_FALSE(record("com.b")->hasMIDBasedSINF());
+}
+
 TEST_P(AppRegistryContract, ANullForMetadataOrLicenceIsAsNone) {
   plist::Dictionary restored = options(platform::PackageTypePlaceholder, "com.a");
   restored.set(platform::StoreMetadataKey, nullptr);

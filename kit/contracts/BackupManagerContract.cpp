@@ -52,6 +52,17 @@ TEST_P(BackupManagerContract, NobodyNeedsToWantTheError) {
   EXPECT_TRUE(manager->cancelApplicationRestore("com.a", nullptr));
 }
 
+TEST_P(BackupManagerContract, CancellingThatFailsTellsWhyAndDropsNothing) {
+  subject().keepRestoreData("com.a", 5);
+  if (!subject().failCancelling()) GTEST_SKIP() << "cannot be made to fail";
+  std::optional<Error> error;
+  EXPECT_FALSE(manager->cancelApplicationRestore("com.a", &error));
+  ASSERT_TRUE(error);
+  EXPECT_FALSE(error->domain.empty());
+  EXPECT_FALSE(manager->cancelApplicationRestore("com.a", nullptr));
+  EXPECT_TRUE(manager->restoreDataExists("com.a", nullptr));
+}
+
 TEST_P(BackupManagerContract, ConnectionsSeeTheSame) {
   subject().keepRestoreData("com.a", 5);
   const auto other = subject().makeManager();

@@ -17,6 +17,8 @@ class BackupManagerSubject {
   [[nodiscard]] virtual std::unique_ptr<platform::BackupManager> makeManager() = 0;
   /// From now on a restore holds `size` bytes of data for the app.
   virtual void keepRestoreData(std::string_view identifier, std::uint64_t size) = 0;
+  /// From now on no restore of an app's data can be given up; false where that cannot be done.
+  [[nodiscard]] virtual bool failCancelling() { return false; }
 };
 
 class BackupManagerContract : public Contract<BackupManagerSubject> {

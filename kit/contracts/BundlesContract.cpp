@@ -1,6 +1,7 @@
 #include "kit/contracts/BundlesContract.h"
 
 #include "base/PropertyList.h"
+#include "kit/fakes/Threads.h"
 
 namespace appsync::test {
 
@@ -78,6 +79,20 @@ TEST_P(BundlesContract, AnUnusableInfoDictionaryOpensWithoutInfo) {
     ASSERT_NE(bundle, nullptr) << info;
     EXPECT_EQ(bundle->infoDictionaryValue("Name"), nullptr) << info;
   }
+}
+
+TEST_P(BundlesContract, ManyThreadsMayOpenAndReadAtOnce) {
+  const auto shared = openWithInfo(kInfo);
+  ASSERT_NE(shared, nullptr);
+  runOnThreads(8, [&](std::size_t) {
+    const auto own = subject().bundles().openBundle(shared->location());
+    ASSERT_NE(own, nullptr);
+    for (const platform::Bundle* bundle : {shared.get(), own.get()}) {
+      const plist::Value* name = bundle->infoDictionaryValue("Name");
+      ASSERT_NE(name, nullptr);
+      EXPECT_EQ(*name, plist::Value("An app"));
+    }
+  });
 }
 
 TEST_P(BundlesContract, TheMainBundleStaysTheSame) {

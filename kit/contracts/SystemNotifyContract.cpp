@@ -48,17 +48,20 @@ class Listener {
  private:
   static void called(void* context, std::string_view name, const void*) {
     Listener& self = *static_cast<Listener*>(context);
+    EXPECT_EQ(++self.inside_, 1) << "calls overlap";
     {
       const std::scoped_lock lock(self.mutex_);
       self.heard_ = name;
       self.thread = std::this_thread::get_id();
     }
     if (self.inCall) self.inCall();
+    --self.inside_;
     self.calls.happened();
   }
 
   SystemNotify& notify_;
   const std::string name_;
+  std::atomic<int> inside_ = 0;
   std::mutex mutex_;
   std::string heard_;
 };
@@ -215,6 +218,16 @@ TEST_P(SystemNotifyContract, ANameMayBeRegisteredAgainAndAgain) {
       EXPECT_EQ(subject().stateOf(kName), state);
     }
   }
+}
+
+TEST_P(SystemNotifyContract, CallsToOneObserverNeverOverlap) {
+  Listener listener(subject().notify());
+  listener.inCall = [] { std::this_thread::yield(); };
+  runOnThreads(4, [&](std::size_t) {
+    for (int round = 0; round < 5; ++round)
+      subject().notify().post(kName);
+  });
+  EXPECT_TRUE(listener.calls.waitFor(20));
 }
 
 TEST_P(SystemNotifyContract, ManyThreadsMayUseItAtOnce) {

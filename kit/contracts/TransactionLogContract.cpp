@@ -55,6 +55,17 @@ TEST_P(TransactionLogContract, TheTextsAreNeededDuringTheCallOnly) {
   EXPECT_EQ(entries[0].description, std::string(100, 'd'));
 }
 
+TEST_P(TransactionLogContract, TextsAreKeptToTheByte) {
+  initialize();
+  const std::string text = "first\tline\\\nsecond 'line', \"quoted\"; \xC3\xA4 \\n %s ";
+  subject().log().logStep(TransactionStep::installApp, TransactionParty::syncClient, TransactionPhase::begin, true,
+                          text, text);
+  subject().log().logScenario(text, 0, true, text, text);
+  EXPECT_EQ(subject().entries(),
+            (std::vector<KeptEntry>{{1, {}, TransactionParty::syncClient, TransactionPhase::begin, true, text, text},
+                                    {0, text, {}, {}, true, text, text}}));
+}
+
 TEST_P(TransactionLogContract, ALaterHandleReplacesTheFirst) {
   initialize();
   subject().log().logScenario("s", 0, true, "com.a", "before");

@@ -61,6 +61,14 @@ TEST_P(UninstalledAppsListContract, ClearingNothingIsASuccess) {
   EXPECT_EQ(identifiersIn(subject().list()), Identifiers{"com.a"});
 }
 
+TEST_P(UninstalledAppsListContract, ClearingThatFailsTakesOffNone) {
+  subject().removeRealApp("com.a");
+  subject().removeRealApp("com.b");
+  if (!subject().failClearing()) GTEST_SKIP() << "cannot be made to fail";
+  EXPECT_NE(subject().list().clearUninstalled({"com.a", "com.b"}), 0);
+  EXPECT_EQ(identifiersIn(subject().list()), (Identifiers{"com.a", "com.b"}));
+}
+
 TEST_P(UninstalledAppsListContract, TheAnswerIsTheCallersOwn) {
   subject().removeRealApp("com.a");
   std::optional<plist::Dictionary> answer = subject().list().lookupUninstalled();

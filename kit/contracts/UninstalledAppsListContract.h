@@ -18,6 +18,8 @@ class UninstalledAppsListSubject {
   virtual void removeRealApp(std::string_view identifier) = 0;
   /// Has an app of that identifier installed.
   virtual void installApp(std::string_view identifier) = 0;
+  /// From now on nothing can be cleared; false where that cannot be done.
+  [[nodiscard]] virtual bool failClearing() { return false; }
   /// Ends the process that keeps the list and begins another; false where that cannot be done.
   [[nodiscard]] virtual bool restart() { return false; }
 };

@@ -56,6 +56,9 @@ class DeviceRegistry final : public AppRegistrySubject {
   platform::AppRegistry& registry() override { return device_.registry(); }
   platform::UninstalledAppsList& uninstalledApps() override { return device_.services().uninstalledApps(); }
 
+  std::optional<std::string> deviceBoundLicence() override {
+    return "<plist><dict><key>DeviceIdentifier</key><string>this one</string></dict></plist>";
+  }
   platform::FileLocation makePackage(std::string_view identifier, std::string_view version) override {
     return device_.stage(newName(), appPackage(identifier, version));
   }

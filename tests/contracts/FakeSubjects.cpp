@@ -84,6 +84,10 @@ class FakeRegistrySubject final : public AppRegistrySubject {
     platform_.registry.add(FakeApp::placeholder("com.first"));
     platform_.registry.setInstallOrder({"com.first"});
   }
+  bool addExtension(std::string_view identifier) override {
+    platform_.registry.addBundle(std::string(identifier), platform::BundleKind::User);
+    return true;
+  }
   bool addSystemApp(std::string_view identifier) override {
     platform_.registry.add(FakeApp::installed(std::string(identifier)).ofType(platform::ApplicationTypeSystem));
     return true;
@@ -113,6 +117,10 @@ class FakeUninstalledApps final : public UninstalledAppsListSubject {
   platform::UninstalledAppsList& list() override { return platform_.uninstalledList; }
   void removeRealApp(std::string_view identifier) override { platform_.uninstalledList.add(identifier); }
   void installApp(std::string_view identifier) override { platform_.uninstalledList.remove(identifier); }
+  bool failClearing() override {
+    platform_.uninstalledList.failClearingWith(5);
+    return true;
+  }
 
  private:
   FakePlatform platform_;
@@ -142,6 +150,11 @@ class FakeBackupsSubject final : public BackupManagerSubject {
   std::unique_ptr<platform::BackupManager> makeManager() override { return platform_.makeBackupManager(); }
   void keepRestoreData(std::string_view identifier, std::uint64_t size) override {
     platform_.backups.addRestoreData(identifier, size);
+  }
+  bool failCancelling() override {
+    platform_.backups.failures.failAlways(BackupOperation::cancelApplicationRestore, kAnything,
+                                          {"Backup", 1, "busy", nullptr});
+    return true;
   }
 
  private:
