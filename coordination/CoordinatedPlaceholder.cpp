@@ -3,6 +3,7 @@
 #include "coordination/TransactionSteps.h"
 #include "core/AppsClient.h"
 #include "core/PropertyListAccess.h"
+#include "transfer/PlaceholderIcon.h"
 #include "transfer/PlaceholderInfo.h"
 
 namespace appsync {
@@ -19,26 +20,28 @@ struct PlaceholderIcon {
   std::uint64_t size = 0;
 };
 
-PlaceholderIcon copyIcon(InstallPreparation& preparation) {
+/// 0 when it is not known.
+std::uint64_t sizeOnDisk(InstallPreparation& preparation, const std::string& icon) {
+  const auto attributes = preparation.platform.fileSystem().attributesOfItem(icon);
+  if (!attributes) preparation.error = attributes.error();
+  const std::uint64_t size = attributes ? attributes->size : 0;
+  preparation.log.message("%s|icon for %{public}@ at %{public}@ has a size of %llu", preparation.identifier, icon,
+                          size);
+  return size;
+}
+
+PlaceholderIcon provideIcon(InstallPreparation& preparation) {
   const std::string folder = preparation.client.placeholderAppPathForBundleIdentifier(preparation.identifier);
-  PlaceholderIcon icon{folder + "/" + std::string(kPlaceholderIconName), 0};
+  PlaceholderIcon icon{placeholderIconPath(folder)};
   const bool hasFolder = preparation.client.createPlaceHolderPath(folder, preparation.identifier, kMobileOwner);
   if (!hasFolder || !preparation.asset.icon()) return icon;
 
-  platform::FileSystem& files = preparation.platform.fileSystem();
   platform::TransactionLog& transactions = preparation.platform.transactionLog();
   const std::string& source = preparation.asset.icon()->path;
   beginStep(transactions, TransactionStep::copyIcon, preparation.identifier, "Copying icon");
-  const Status copied = files.copyItem(source, icon.path);
+  const Status copied = copyPlaceholderIcon(preparation.platform.fileSystem(), source, icon.path);
   if (copied) {
-    const auto attributes = files.attributesOfItem(icon.path);
-    if (attributes) {
-      icon.size = attributes->size;
-    } else {
-      preparation.error = attributes.error();
-    }
-    preparation.log.message("%s|icon for %{public}@ at %{public}@ has a size of %llu", preparation.identifier,
-                            icon.path, icon.size);
+    icon.size = sizeOnDisk(preparation, icon.path);
   } else {
     preparation.error = copied.error();
   }
@@ -88,7 +91,7 @@ bool providePlaceholder(InstallPreparation& preparation) {
     preparation.log.message("%s|coordinator for %{public}@ has a placeholder promise", preparation.identifier);
     return true;
   }
-  const PlaceholderIcon icon = copyIcon(preparation);
+  const PlaceholderIcon icon = provideIcon(preparation);
   preparation.placeholder = preparation.client._placeHolderForBundleIdentifier(
       preparation.identifier, preparation.asset.prettyName().value_or(preparation.identifier), TSInstallType::Sync);
   // With an icon that cannot be attached the placeholder stays unconfigured, and so unseen.

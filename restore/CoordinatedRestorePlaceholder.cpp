@@ -4,6 +4,7 @@
 #include "core/AppsClient.h"
 #include "core/PropertyListAccess.h"
 #include "restore/RestoreMetadata.h"
+#include "transfer/PlaceholderIcon.h"
 #include "transfer/PlaceholderInfo.h"
 
 namespace appsync {
@@ -70,7 +71,7 @@ std::shared_ptr<Placeholder> AppsClient::_placeHolderForBundleIdentifierWithHarv
 
   const std::string folder = placeholderAppPathForBundleIdentifier(identifier);
   if (!createPlaceHolderPath(folder, identifier, kMobileOwner)) return nullptr;
-  const std::string icon = folder + "/" + std::string(kPlaceholderIconName);
+  const std::string icon = placeholderIconPath(folder);
   std::uint64_t iconSize = 0;
   writeIconData(iconData, icon, &iconSize, identifier, kMobileOwner);
 

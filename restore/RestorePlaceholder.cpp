@@ -4,6 +4,7 @@
 #include "core/SyncFiles.h"
 #include "platform/Keys.h"
 #include "restore/RestoreMetadata.h"
+#include "transfer/PlaceholderIcon.h"
 #include "transfer/PlaceholderInfo.h"
 
 namespace appsync {
@@ -67,7 +68,7 @@ bool AppsClient::_buildRestorePlaceholder(const std::string& folder, const Place
     transactions.logScenario(kScenario, 0, false, identifier, "Failed to create app directory");
     return false;
   }
-  writeIconData(icon, folder + "/" + std::string(kPlaceholderIconName), nullptr, identifier, kMobileOwner);
+  writeIconData(icon, placeholderIconPath(folder), nullptr, identifier, kMobileOwner);
 
   const plist::Value info = placeholder.dictionary();
   const std::string path = folder + "/" + std::string(kInfoPlistName);

@@ -3,6 +3,7 @@
 #include "core/PropertyListAccess.h"
 #include "core/PropertyListFile.h"
 #include "core/SyncFiles.h"
+#include "transfer/PlaceholderIcon.h"
 #include "transfer/PlaceholderInfo.h"
 
 namespace appsync {
@@ -72,8 +73,8 @@ void AppsClient::_createPlaceHolderApplication(const platform::ZTAsset& asset) {
   const std::string folder = placeholderAppPathForBundleIdentifier(identifier);
   if (!createPlaceHolderPath(folder, identifier, kMobileOwner)) return;
   if (asset.icon()) {
-    const std::string icon = folder + "/" + std::string(kPlaceholderIconName);
-    const Status copied = files.copyItem(asset.icon()->path, icon);
+    const std::string icon = placeholderIconPath(folder);
+    const Status copied = copyPlaceholderIcon(files, asset.icon()->path, icon);
     if (!copied) {
       _log.error("%s|Copying icon from %{public}@ to %{public}@ failed: %{public}@", asset.icon()->path, icon,
                  copied.error());

@@ -1,6 +1,7 @@
 #include "transfer/PlaceholderInfo.h"
 
 #include "platform/Keys.h"
+#include "transfer/PlaceholderIcon.h"
 
 namespace appsync {
 

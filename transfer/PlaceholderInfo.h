@@ -11,9 +11,6 @@
 
 namespace appsync {
 
-/// The name of the icon file in a placeholder bundle.
-inline constexpr std::string_view kPlaceholderIconName = "Icon.png";
-
 /// Whose a placeholder bundle is.
 inline const platform::OwnerAttributes kMobileOwner{"mobile", "mobile"};
 

@@ -64,6 +64,15 @@ TEST_F(CoordinatedPlaceholder, AnEmptyIconFileIsNone) {
   EXPECT_TRUE(placeholder().isConfigured);
 }
 
+TEST_F(CoordinatedPlaceholder, AnIconThatAnEarlierPlaceholderLeftIsReplaced) {
+  platform.files.put(kPlaceholderIcon, "the icon of an older version");
+  EXPECT_TRUE(prepare());
+  ASSERT_NE(placeholder().icon, nullptr);
+  EXPECT_EQ(placeholder().icon->diskSpaceNeeded, 9U);
+  EXPECT_EQ(platform.files.text(kPlaceholderIcon), "a picture");
+  EXPECT_TRUE(said(copied(std::nullopt, 9)));
+}
+
 TEST_F(CoordinatedPlaceholder, AnAssetWithoutAnIconCopiesNone) {
   asset.setIcon(std::nullopt);
   EXPECT_TRUE(prepare());

@@ -197,6 +197,15 @@ TEST_F(PlaceholderBundle, AnIconThatCannotBeCopiedStillYieldsAPlaceholderThatNam
       << messages[2];
 }
 
+TEST_F(PlaceholderBundle, AnIconThatAnEarlierPlaceholderLeftIsReplaced) {
+  create(asset_);
+  platform.files.put("/icons/com.a.png", "the icon of a newer version");
+  create(asset_);
+  EXPECT_EQ(platform.files.text(std::string(kFolder) + "/Icon.png"), "the icon of a newer version");
+  for (const LogLine& line : platform.log.lines())
+    EXPECT_EQ(line.level, LogLevel::standard) << line.text;
+}
+
 TEST_F(PlaceholderBundle, AnAssetWithoutAnIconCopiesNone) {
   asset_.setIcon(std::nullopt);
   create(asset_);
