@@ -1,6 +1,7 @@
 #include "tests/tools/ToolRun.h"
 
 #include <csignal>
+#include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
@@ -13,9 +14,9 @@ namespace appsync::test {
 
 namespace {
 
-/// Built beside the tests.
-std::string toolPath() {
-  return (std::filesystem::canonical("/proc/self/exe").parent_path() / "appsync").string();
+/// Where the tests are built, and the tool.
+std::string binaryFolder() {
+  return std::filesystem::canonical("/proc/self/exe").parent_path().string();
 }
 
 std::string contentOf(const std::string& path) {
@@ -54,8 +55,8 @@ std::vector<char*> pointersTo(std::vector<std::string>& texts) {
 
 }  // namespace
 
-ToolRun::ToolRun(const std::vector<std::string>& words, const ToolOptions& options) {
-  std::vector<std::string> arguments = {"appsync"};
+ToolRun::ToolRun(const std::vector<std::string>& words, const ToolOptions& options, const std::string& program) {
+  std::vector<std::string> arguments = {program};
   arguments.insert(arguments.end(), words.begin(), words.end());
   std::vector<std::string> environment = environmentWith(options.environment);
   const auto argumentPointers = pointersTo(arguments);
@@ -64,13 +65,13 @@ ToolRun::ToolRun(const std::vector<std::string>& words, const ToolOptions& optio
   const int input = ::open(folder_.path("in").c_str(), O_RDONLY | O_CLOEXEC);
   const int output = openOutput(options.output, folder_.path("out"));
   const int error = openOutput(OutputTo::file, folder_.path("err"));
-  const std::string tool = toolPath();
+  const std::string path = program == "appsync" ? binaryFolder() + "/appsync" : program;
   process_ = ::fork();
   if (process_ == 0) {
     ::dup2(input, STDIN_FILENO);
     ::dup2(output, STDOUT_FILENO);
     ::dup2(error, STDERR_FILENO);
-    ::execve(tool.c_str(), argumentPointers.data(), environmentPointers.data());
+    ::execvpe(path.c_str(), argumentPointers.data(), environmentPointers.data());
     ::_exit(127);
   }
   for (const int file : {input, output, error})
@@ -105,6 +106,12 @@ Finished ToolRun::wait() {
 
 Finished runTool(const std::vector<std::string>& words, const ToolOptions& options) {
   return ToolRun(words, options).wait();
+}
+
+Finished runProgram(const std::string& program, const std::vector<std::string>& words, const ToolOptions& options) {
+  ToolOptions withTool = options;
+  withTool.environment["PATH"] = binaryFolder() + ":" + std::getenv("PATH");
+  return ToolRun(words, withTool, program).wait();
 }
 
 }  // namespace appsync::test

@@ -27,10 +27,12 @@ struct ToolOptions {
   std::string input;  ///< what it reads on standard input
 };
 
-/// Runs `appsync` with these words. Killed and waited for at the latest when the object goes.
+/// Runs `appsync`, or another program of the PATH, with these words. Killed and waited for at the latest when the
+/// object goes.
 class ToolRun {
  public:
-  explicit ToolRun(const std::vector<std::string>& words, const ToolOptions& options = {});
+  explicit ToolRun(const std::vector<std::string>& words, const ToolOptions& options = {},
+                   const std::string& program = "appsync");
   ~ToolRun();
   ToolRun(const ToolRun&) = delete;
   ToolRun& operator=(const ToolRun&) = delete;
@@ -49,5 +51,8 @@ class ToolRun {
 
 /// Runs it to its end.
 [[nodiscard]] Finished runTool(const std::vector<std::string>& words, const ToolOptions& options = {});
+/// The same with another program, which finds the tool that is tested on its PATH. Status 127 when there is none.
+[[nodiscard]] Finished runProgram(const std::string& program, const std::vector<std::string>& words,
+                                  const ToolOptions& options = {});
 
 }  // namespace appsync::test
