@@ -1,6 +1,7 @@
 // appsync-port-daemon MODULE FOLDER: loads the plug-in into a daemon whose device is half a port: two services are real
 // and keep their files in FOLDER, all others are the kit's fakes. Replace these one by one until none is left.
 #include <exception>
+#include <filesystem>
 #include <fstream>
 #include <iostream>
 #include <string>
@@ -36,6 +37,7 @@ void tellLog(const FakePlatform& device) {
 }
 
 int run(const std::string& modulePath, const std::string& folder) {
+  std::filesystem::create_directories(folder);
   // Our own services outlive the platform that lends them to the plug-in, and the platform outlives the client.
   port::TextTransactionLog transactions(folder + "/transactions.txt");
   port::RemovedApps removedApps(folder + "/removed-apps.txt");
