@@ -39,7 +39,8 @@ class InstallCoordination {
 
   virtual ~InstallCoordination() = default;
 
-  /// Whether this device installs through coordinators. Asked once, when the plug-in starts.
+  /// Whether this device installs through coordinators. Asked once, when the plug-in starts; where the answer is no, a
+  /// connection is all that it asks for besides.
   [[nodiscard]] virtual bool coordinationIsEnabled() = 0;
 
   /// The app's coordinator of a kind, whichever client made it, or a new one made by `client`. With
@@ -52,7 +53,7 @@ class InstallCoordination {
                                                                               IfMissing ifMissing, bool* created,
                                                                               ErrorSlot error) = 0;
 
-  /// A placeholder of `client` that is nobody's yet; null when it cannot be made.
+  /// A placeholder of `client` that is nobody's yet; null when it cannot be made. `bundleName` may be empty.
   [[nodiscard]] virtual std::shared_ptr<Placeholder> initAppPlaceholder(std::string_view bundleName,
                                                                         std::string_view bundleIdentifier,
                                                                         TSInstallType installType,
@@ -65,18 +66,19 @@ class InstallCoordination {
   [[nodiscard]] virtual std::shared_ptr<PromisedOutOfBandTransfer> makePromisedOutOfBandTransfer(
       std::string_view name, ClientIdentity client, std::uint64_t diskSpaceNeeded) = 0;
 
-  /// Removes an app and returns at once. Coordinators of the app are cancelled first. `completion` is called exactly
-  /// once, on a thread of the service's, at the latest before the service ends; without an error when the app is gone.
-  /// A real app that is removed joins the uninstalled-apps list.
+  /// Removes an app and returns at once. Coordinators of the app are cancelled first, whoever made them, in the name of
+  /// `CXClientUser`. `completion` is called exactly once, on a thread of the service's, at the latest before the
+  /// service ends; without an error when the app is gone. A real app that is removed joins the uninstalled-apps list.
   virtual void uninstallApp(std::string_view bundleIdentifier, UserConfirmation confirmation,
                             UninstallCompletion completion) = 0;
 
-  /// An error that a person can be shown, made of one that says what went wrong underneath. `information` may be empty.
+  /// An error of the service's domain with that code, which a person can be shown; `underlying` says what went wrong,
+  /// and becomes its underlying error. `information` may be empty.
   [[nodiscard]] virtual Error createUserPresentableError(long code, const plist::Dictionary& information,
                                                          const Error& underlying) = 0;
 
-  /// Opens an observer connection under a service name. `delegate` stays the caller's and must outlive the connection;
-  /// null when it cannot be opened.
+  /// Opens a connection, under a service name, that reports to `delegate` the coordinators which `clients` made, and
+  /// those only. `delegate` stays the caller's and must outlive the connection; null when it cannot be opened.
   [[nodiscard]] virtual std::unique_ptr<InstallObserver> initWithMachServiceName(
       std::string_view serviceName, const std::set<ClientIdentity>& clients, InstallObserverDelegate& delegate) = 0;
 };

@@ -67,7 +67,8 @@ class InstallCoordinator {
   [[nodiscard]] virtual std::shared_ptr<PromisedTransferToPath> appAssetPromise() const = 0;
   [[nodiscard]] virtual Status setAppAssetPromise(std::shared_ptr<PromisedTransferToPath> promise) = 0;
 
-  /// Who is to make and fulfil the app-asset promise: the creator unless another client was named.
+  /// Who is to make and fulfil the app-asset promise: the creator unless another client was named, also when there is
+  /// an error because the service cannot tell.
   [[nodiscard]] virtual ClientIdentity appAssetPromiseResponsibleClient(ErrorSlot error) const = 0;
   [[nodiscard]] virtual Status setAppAssetPromiseResponsibleClient(ClientIdentity client) = 0;
 
@@ -75,7 +76,9 @@ class InstallCoordinator {
   [[nodiscard]] virtual bool hasUserDataPromise() const = 0;
   [[nodiscard]] virtual Status setUserDataPromise(std::shared_ptr<PromisedOutOfBandTransfer> promise) = 0;
 
-  /// Null is a failure. Once set the placeholder is the coordinator's.
+  /// Null is a failure. Once set the placeholder is the coordinator's, and shown if its configuration is complete.
+  /// Leave a moment before that is reported: a client counts the placeholder as awaited when this has returned, ignores
+  /// a report that came before, and then waits in vain.
   [[nodiscard]] virtual bool hasPlaceholderPromise() const = 0;
   [[nodiscard]] virtual Status setPlaceholderPromise(std::shared_ptr<Placeholder> placeholder) = 0;
 

@@ -46,7 +46,8 @@ class InstallPromise {
 /// file is read until its placeholder ends, and stays the client's.
 class PromisedTransferToPath : public InstallPromise {
  public:
-  /// A device path; none while it is not known. It is needed at the latest when the promise becomes complete.
+  /// A device path; none while it is not known. It is needed at the latest when the promise becomes complete: an app
+  /// whose package has none then, or one that leads to nothing, fails to install.
   [[nodiscard]] virtual std::optional<FileLocation> transferPath() const = 0;
   virtual void setTransferPath(const FileLocation& path) = 0;
 };

@@ -32,7 +32,8 @@ class ZTDeviceService {
   /// Sends this asset's package before all others whose turn has not come.
   virtual void prioritizeAsset(const std::shared_ptr<ZTAsset>& asset, Completion completion) = 0;
 
-  /// Stops sending a package. A transfer that was under way ends as a failed one, reported as such to the client.
+  /// Stops sending a package. A transfer that was under way ends as a failed one, reported as such to the client,
+  /// perhaps before this returns.
   virtual void cancelAssetTransferForFailedAsset(const std::shared_ptr<ZTAsset>& asset) = 0;
 };
 

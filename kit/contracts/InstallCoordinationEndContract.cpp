@@ -1,6 +1,7 @@
 // The part of the contract of coordinated installs that is about ending one early: cancelling and uninstalling.
 #include <thread>
 
+#include "kit/contracts/CoordinationListener.h"
 #include "kit/contracts/InstallCoordinationContract.h"
 #include "kit/contracts/Occurrences.h"
 
@@ -150,6 +151,18 @@ TEST_P(CoordinatedInstallContract, UninstallingCancelsTheAppsCoordinatorsFirst) 
   EXPECT_NE(foreign->coordinatorError(), std::nullopt);
   EXPECT_EQ(stateOf("com.a"), "absent");
   EXPECT_NE(find("com.b"), nullptr);
+}
+
+TEST_P(CoordinatedInstallContract, UninstallingIsToldAsACancellationByTheUser) {
+  CoordinationListener listener;
+  const auto connection = service().initWithMachServiceName("com.corvel.contract.observer", {kSync}, listener);
+  const Coordinator made = coordinator("com.a");
+  Uninstalled uninstalled;
+  service().uninstallApp("com.a", UserConfirmation::skip, uninstalled.completion());
+  ASSERT_TRUE(uninstalled.completions.waitFor(1));
+  subject().waitUntilIdle();
+  ASSERT_EQ(listener.heard().size(), 1U);
+  EXPECT_TRUE(listener.heard().front().starts_with("cancelled com.a by 2 for ")) << listener.heard().front();
 }
 
 TEST_P(CoordinatedInstallContract, AnAppThatWasOnlyAPlaceholderIsNotRememberedAsRemoved) {

@@ -193,6 +193,15 @@ TEST_P(CoordinatedInstallContract, APackageThatIsNotThereFailsTheInstall) {
   EXPECT_EQ(stateOf("com.a"), "absent");
 }
 
+TEST_P(CoordinatedInstallContract, ACompletePromiseWithoutAPathFailsTheInstall) {
+  const Coordinator made = coordinator("com.a");
+  prepare(*made)->setComplete(true);
+  subject().waitUntilIdle();
+  EXPECT_NE(made->coordinatorError(), std::nullopt);
+  EXPECT_EQ(find("com.a"), nullptr);
+  EXPECT_EQ(stateOf("com.a"), "absent");
+}
+
 TEST_P(CoordinatedInstallContract, OneBadAppDoesNotStopTheOthers) {
   const Coordinator bad = coordinator("com.bad");
   const Coordinator good = coordinator("com.good");

@@ -18,6 +18,16 @@ TEST_P(CoordinatedInstallContract, APlaceholderKeepsWhatItWasMadeWith) {
   EXPECT_FALSE(placeholder->description().empty());
 }
 
+TEST_P(CoordinatedInstallContract, APlaceholderMayBeWithoutAName) {
+  const AppPlaceholder placeholder = service().initAppPlaceholder("", "com.a", TSInstallType::Sync, kSync);
+  ASSERT_NE(placeholder, nullptr);
+  EXPECT_EQ(placeholder->bundleName(), "");
+  EXPECT_TRUE(placeholder->setConfigurationComplete());
+  EXPECT_TRUE(coordinator("com.a")->setPlaceholderPromise(placeholder));
+  subject().waitUntilIdle();
+  EXPECT_EQ(stateOf("com.a"), "placeholder");
+}
+
 TEST_P(CoordinatedInstallContract, APlaceholderIsConfiguredStepByStep) {
   const AppPlaceholder placeholder = makePlaceholder("com.a");
   const Asset icon = service().makePromisedTransferToPath("com.a-Icon", kSync, subject().makeIcon(), 9);
