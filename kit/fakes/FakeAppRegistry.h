@@ -31,7 +31,7 @@ enum class RegistryOperation { installApplication, uninstallApplication };
 /// "BundleVersion" these count, see `packageOf` in FakePackages.h; a placeholder's folder is judged by its
 /// "Info.plist". Journal lines: "registry.installApplication com.a /path", "registry.installPhaseFinishedForProgress
 /// com.a", "registry.recordForIdentifier com.a", "progress.setInstallState 1 com.a" and so on. Fails the test when it
-/// goes while somebody still observes it.
+/// goes while somebody still observes it, and when it is given a progress that is not its own.
 class FakeAppRegistry final : public platform::AppRegistry {
  public:
   struct Install {

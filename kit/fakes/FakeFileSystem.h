@@ -30,7 +30,8 @@ enum class FileOperation {
   touch
 };
 
-/// Begins with "/tmp" alone. Journal lines: "fileSystem.readFile /path", "fileSystem.moveItem /from /to".
+/// Begins with "/tmp" alone. Fails the test when the test puts something where nothing can be. Journal lines:
+/// "fileSystem.readFile /path", "fileSystem.moveItem /from /to".
 class FakeFileSystem : public platform::FileSystem {
  public:
   explicit FakeFileSystem(CallJournal& journal);

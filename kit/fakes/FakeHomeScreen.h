@@ -36,7 +36,8 @@ struct AssertionAnswer {
 
 /// Grants every assertion unless told otherwise. Journal lines: "homeScreen.setIconState", and so on;
 /// "homeScreen.terminationAssertionCreate com.a", and "homeScreen.release com.a" when an assertion goes.
-/// Fails the test when a port is not its own, when `reason` is not 0, and when it goes while an assertion is held.
+/// Fails the test when a port is not its own, when `format` is not 1 or `reason` not 0, and when it goes while an
+/// assertion is held.
 class FakeHomeScreen final : public platform::HomeScreenService {
  public:
   explicit FakeHomeScreen(CallJournal& journal) : journal_(journal) {}

@@ -29,7 +29,8 @@ class FakeIconRenderer final : public platform::IconRenderer {
 enum class EncoderFailure { none, creation, finalization };
 
 /// Journal lines: "pngEncoders.createEncoder", "pngEncoder.addImage", "pngEncoder.finalize".
-/// Fails the test when an encoder gets more images than it was made for, or is finished twice.
+/// Fails the test when an encoder gets more images than it was made for or one of another service, or is finished
+/// twice.
 class FakePNGEncoders final : public platform::PNGEncoders {
  public:
   explicit FakePNGEncoders(CallJournal& journal) : journal_(journal) {}

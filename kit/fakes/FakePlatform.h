@@ -32,7 +32,13 @@ namespace appsync::test {
 ///     platform.registry.add(FakeApp::placeholder("com.a"));
 ///     platform.use(myHomeScreen);
 ///
-/// Whoever uses the platform must be gone before it; the services fail the test when something of theirs is still held.
+/// Each fake's comment says what it does, what it notes in the journal and what misuse it catches; one that mentions no
+/// misuse catches none. Whoever uses the platform must be gone before it: the services fail the test when something of
+/// theirs is still held.
+///
+/// The fakes know each other, not what replaces them: registry, bundles, icons and coordination look for files in
+/// `files`, coordination installs into `registry`, and `registry` enters removals in `uninstalledList`. Whoever
+/// replaces one of these three replaces those that look there as well, or sees to it that nothing is missed.
 class FakePlatform final : public platform::Platform {
  public:
   CallJournal journal;

@@ -26,7 +26,7 @@ std::ostream& operator<<(std::ostream& out, const Post& post);
 
 /// Calls observers back on a thread of its own. Journal lines: "systemNotify.addObserver name",
 /// "systemNotify.registerCheck name", "systemNotify.setState name 1", "systemNotify.post name". Fails the test when it
-/// goes while it is observed, and when a state is set with a token that it did not give.
+/// goes while it is observed, when there is no callback, and when a state is set with a token that it did not give.
 class FakeSystemNotify final : public platform::SystemNotify {
  public:
   explicit FakeSystemNotify(CallJournal& journal) : journal_(journal) {}

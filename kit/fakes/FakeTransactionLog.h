@@ -59,7 +59,7 @@ struct StepEntry {
 std::ostream& operator<<(std::ostream& out, const StepEntry& entry);
 
 /// Journal lines: "transactionLog.initializeWithLog", "transactionLog.logScenario Harvo Sync com.a y Uninstall
-/// succeeded". Fails the test when an entry comes before a log to write to.
+/// succeeded". Fails the test when an entry comes before a log to write to, and when it is given none.
 class FakeTransactionLog final : public platform::TransactionLog {
  public:
   explicit FakeTransactionLog(CallJournal& journal) : journal_(journal) {}

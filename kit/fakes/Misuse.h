@@ -5,7 +5,7 @@
 
 namespace appsync::test {
 
-/// Fails the running test. May be called on any thread.
+/// Fails the running test; outside of tests, as in a daemon on fakes, it says so on standard output. Threads: any.
 void misuse(std::string_view what);
 
 }  // namespace appsync::test
