@@ -120,6 +120,10 @@ Result<FileDescriptor> openFolder(const std::string& path) {
 
 Result<FileDescriptor> makeDevice(const std::string& path, InstallMode mode) {
   const int made = sys::makeFolder(AT_FDCWD, path.c_str());
+  if (made == ENOENT) {
+    return deviceError(DeviceFailure::missing,
+                       path + " cannot be made: the folder around it is missing; make that first");
+  }
   if (made != 0 && made != EEXIST) return Error::fromErrno(made, path);
   const Result<FileDescriptor> folder = openFolder(path);
   if (!folder) return folder.error();

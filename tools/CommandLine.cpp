@@ -63,7 +63,7 @@ ExitStatus explain(const CLI::App& line, const CLI::ParseError& error) {
 ExitStatus showHelp(const CLI::App& line) {
   const auto named = line.get_subcommands();
   StandardOutput output;
-  output.write(named.empty() ? line.help() : named.front()->help());
+  output.write(named.empty() ? line.help() : named.front()->help(line.get_name()));
   return output.finish(ExitStatus::done);
 }
 

@@ -108,7 +108,9 @@ TEST_F(DeviceAtPath, IsNotMadeOfAFolderThatOnlyLooksLikeABeginning) {
 
 TEST_F(DeviceAtPath, IsNotMadeWhereTheParentIsMissing) {
   const auto device = Device::create(folder_.path("missing/device"));
-  EXPECT_EQ(refusal(device).code, static_cast<long>(DeviceFailure::missing));
+  EXPECT_EQ(refusal(device),
+            failure(DeviceFailure::missing, folder_.path("missing/device") +
+                                                " cannot be made: the folder around it is missing; make that first"));
 }
 
 TEST_F(DeviceAtPath, IsNotMadeOfAFile) {

@@ -72,9 +72,14 @@ TEST_P(Help, TeachesWithAnExample) {
   EXPECT_THAT(run.out, HasSubstr(std::string("appsync ") + GetParam()));
 }
 
+TEST_P(Help, SaysHowToCallIt) {
+  EXPECT_THAT(runTool({GetParam(), "--help"}).out,
+              HasSubstr(std::string("\nUsage: appsync ") + GetParam() + " [OPTIONS] "));
+}
+
 INSTANTIATE_TEST_SUITE_P(Commands, Help,
-                         testing::Values("init", "pack", "sync", "tap", "cancel", "apps", "screen", "history", "set",
-                                         "clear", "plist"),
+                         testing::Values("init", "pack", "sync", "backup", "restore", "tap", "cancel", "apps", "screen",
+                                         "history", "set", "clear", "plist"),
                          [](const auto& command) { return std::string(command.param); });
 
 TEST(Usage, TheHelpNamesEveryExitStatus) {
