@@ -57,6 +57,16 @@ TEST_P(HomeScreenContract, TheOrdersBytesAreTheCallersOwn) {
   EXPECT_EQ(orderOf(screen), std::vector<std::string>{"com.a"});
 }
 
+TEST_P(HomeScreenContract, AHostsLayoutIsTakenOver) {
+  const std::vector<std::string> wanted{"com.b", "com.c", "com.a"};
+  const std::optional<std::string> layout = subject().layoutOf(wanted);
+  if (!layout) GTEST_SKIP() << "no layouts";
+  for (const char* identifier : {"com.a", "com.b", "com.c"})
+    subject().addApp(identifier);
+  handOver(subject().homeScreen(), *layout);
+  EXPECT_EQ(orderOf(subject().homeScreen()), wanted);
+}
+
 TEST_P(HomeScreenContract, ALayoutThatCannotBeUsedIsIgnored) {
   subject().addApp("com.b");
   subject().addApp("com.a");

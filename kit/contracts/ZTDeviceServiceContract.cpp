@@ -30,6 +30,15 @@ TEST_P(ZTDeviceServiceContract, PrioritizingCompletesOnceAlsoWhenNothingIsToBeTr
   EXPECT_EQ(completions.count(), 2U);
 }
 
+TEST_P(ZTDeviceServiceContract, PrioritizingCompletesBeforeTheServiceEnds) {
+  if (!service().supports(Operation::prioritizeAsset)) GTEST_SKIP() << "not supported";
+  Occurrences completions;
+  auto another = GetParam().make();
+  another->service().prioritizeAsset(asset("com.a"), [&](const std::optional<Error>&) { completions.happened(); });
+  another.reset();
+  EXPECT_EQ(completions.count(), 1U);
+}
+
 TEST_P(ZTDeviceServiceContract, CancellingWhatIsNotToBeTransferredDoesNothing) {
   if (!service().supports(Operation::cancelAssetTransferForFailedAsset)) GTEST_SKIP() << "not supported";
   service().cancelAssetTransferForFailedAsset(asset("com.a"));

@@ -44,6 +44,13 @@ class DeviceHomeScreen final : public HomeScreenSubject {
     put(device_.files(), folder + "/Info.plist", bytesOf(info));
     EXPECT_TRUE(device_.registry().installApplication({folder, true}, TestDevice::placeholderOptions(identifier)));
   }
+  std::optional<std::string> layoutOf(const std::vector<std::string>& identifiers) override {
+    plist::Array page;
+    for (const std::string& identifier : identifiers)
+      page.emplace_back(identifier);
+    const Bytes layout = plist::writeBinary(plist::Array{plist::Array{std::move(page)}}).value();
+    return std::string(textOf(layout));
+  }
   bool denyAssertions(std::string_view identifier) override {
     return device_.services().settings().setAssertionAnswer(identifier, device::AssertionAnswer::denied).ok();
   }
