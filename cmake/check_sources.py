@@ -22,9 +22,8 @@ MAY_INCLUDE = {
     "bench": ALL,
     "fuzz": ALL,
 }
-# The plug-in's public headers, which the tool may include beside those: the object, and the files in which host and
-# plug-in meet.
-PUBLIC_HEADERS = {"core/AppsClient.h", "core/SyncFiles.h"}
+# What the tool may include of the plug-in, which it loads: the files in which host and plug-in meet.
+PUBLIC_HEADERS = {"core/SyncFiles.h"}
 
 # Written by CMake, for tests: where things are on this machine.
 GENERATED_HEADERS = {"generated/BuildPaths.h"}

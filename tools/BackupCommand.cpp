@@ -1,11 +1,11 @@
 #include <algorithm>
 #include <string>
 
-#include "core/AppsClient.h"
 #include "device/Demotion.h"
 #include "tools/BackupWriter.h"
 #include "tools/Commands.h"
 #include "tools/OpenDevice.h"
+#include "tools/PlugIn.h"
 #include "tools/Printable.h"
 #include "tools/StandardOutput.h"
 
@@ -38,7 +38,9 @@ std::string summaryOf(const Backup& backup) {
 }
 
 ExitStatus run(const BackupOptions& options, device::Device& device) {
-  AppsClient::create(device.platform())->prepareForBackup();
+  const auto client = makeClient(device.platform());
+  if (!client) return reportUnusable(client.error());
+  (*client)->prepareForBackup();
   const Status listed = device::recordDemotedApps(device.services().defaultRegistry(), device.services().fileSystem());
   if (!listed) return reportUnusable(listed.error());
   const Result<Backup> backup = writeBackup(device, options.backup);

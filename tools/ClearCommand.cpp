@@ -1,10 +1,10 @@
 #include <string>
 
-#include "core/AppsClient.h"
 #include "tools/Commands.h"
 #include "tools/HostState.h"
 #include "tools/Leftovers.h"
 #include "tools/OpenDevice.h"
+#include "tools/PlugIn.h"
 #include "tools/StagingArea.h"
 #include "tools/StandardOutput.h"
 
@@ -23,8 +23,10 @@ Example:
   appsync clear phone)";
 
 ExitStatus run(const ClearOptions& /*options*/, device::Device& device) {
+  const auto client = makeClient(device.platform());
+  if (!client) return reportUnusable(client.error());
   giveUpLeftovers(device);
-  AppsClient::create(device.platform())->clearSyncData();
+  (*client)->clearSyncData();
   clearStaging(device);
   const Status forgotten = removeHostState(device.path());
   return forgotten ? ExitStatus::done : reportUnusable(forgotten.error());

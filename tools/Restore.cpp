@@ -5,7 +5,6 @@
 #include <memory>
 #include <utility>
 
-#include "core/AppsClient.h"
 #include "device/AppData.h"
 #include "device/BackupManager.h"
 #include "device/Demotion.h"
@@ -158,15 +157,12 @@ Status Restore::keepData(const BackedUpApp& app) {
 }
 
 void Restore::makePlaceholders() {
-  // Not the daemon: this is the process that waits for placeholders.
-  device_.services().bundles().actAs(std::string(device::Bundles::kDataMigratorIdentifier));
-  const auto client = AppsClient::create(device_.platform());
   const Ticker ticker(kTimeBetweenLooks, [this] {
     for (const BackedUpApp& app : backup_.apps) {
       if (recordOf(device_, app.app.identifier) != nullptr) progress_.installing(app.app.identifier, 1);
     }
   });
-  client->reconcileRestoreOfType(platform::kRestoreTypeHost, nullptr);
+  client_.reconcileRestoreOfType(platform::kRestoreTypeHost, nullptr);
 }
 
 void Restore::finishApps() {

@@ -8,6 +8,7 @@
 #include "base/Error.h"
 #include "base/PropertyList.h"
 #include "device/Device.h"
+#include "platform/ZTClient.h"
 #include "tools/Backup.h"
 #include "tools/SyncProgress.h"
 
@@ -20,9 +21,9 @@ namespace appsync::tools {
 /// Cut off at any moment, the restore of the same backup is taken up again; the device remembers which one it is.
 class Restore {
  public:
-  /// All must outlive it.
-  Restore(device::Device& device, const Backup& backup, SyncProgress& progress)
-      : device_(device), backup_(backup), progress_(progress) {}
+  /// All must outlive it. `client` is not the daemon's: it waits for placeholders.
+  Restore(device::Device& device, const Backup& backup, platform::ZTClient& client, SyncProgress& progress)
+      : device_(device), backup_(backup), client_(client), progress_(progress) {}
 
   /// Whether the device can be restored: it has no apps, or a restore of this backup was cut off on it.
   [[nodiscard]] Status check() const;
@@ -44,6 +45,7 @@ class Restore {
 
   device::Device& device_;
   const Backup& backup_;
+  platform::ZTClient& client_;
   SyncProgress& progress_;
   std::set<std::string, std::less<>> refused_;
 };

@@ -6,6 +6,7 @@
 #include "tools/CommandReports.h"
 #include "tools/Commands.h"
 #include "tools/OpenDevice.h"
+#include "tools/PlugIn.h"
 #include "tools/Restore.h"
 #include "tools/StandardOutput.h"
 
@@ -45,10 +46,13 @@ ExitStatus run(const RestoreOptions& options, device::Device& device) {
   if (Status opened = openLog(options.report, device); !opened) return reportUnusable(opened.error());
   const Result<Backup> backup = readBackup(options.backup);
   if (!backup) return reportUnusable(backup.error());
+  device.services().bundles().actAs(std::string(device::Bundles::kDataMigratorIdentifier));
+  const auto client = makeClient(device.platform());
+  if (!client) return reportUnusable(client.error());
   StandardOutput output;
   const auto reporter = makeReporter(options.report, output, Course::restore);
   SyncProgress progress(*reporter);
-  Restore restore(device, *backup, progress);
+  Restore restore(device, *backup, **client, progress);
   if (Status checked = restore.check(); !checked) return reportUnusable(checked.error());
   const Status restored = restore.run();
   const AppOutcomes& outcomes = progress.summarise();

@@ -2,11 +2,11 @@
 #include <memory>
 #include <vector>
 
-#include "core/AppsClient.h"
 #include "tools/CommandReports.h"
 #include "tools/Commands.h"
 #include "tools/Daemon.h"
 #include "tools/OpenDevice.h"
+#include "tools/PlugIn.h"
 #include "tools/Printable.h"
 #include "tools/StandardOutput.h"
 
@@ -62,12 +62,13 @@ ExitStatus run(const SyncOptions& options, device::Device& device) {
   if (Status opened = openLog(options.report, device); !opened) return reportUnusable(opened.error());
   const Result<Library> library = readLibrary(options.library);
   if (!library) return reportUnusable(library.error());
+  const auto client = makeClient(device.platform());
+  if (!client) return reportUnusable(client.error());
   const Interruption interruption;
   StandardOutput output;
   const auto reporter = makeReporter(options.report, output, Course::sync);
   SyncProgress progress(*reporter);
-  const auto client = AppsClient::create(device.platform());
-  Daemon daemon(device, *client, progress, interruption);
+  Daemon daemon(device, **client, progress, interruption);
   const Status synced = daemon.sync(
       {*library, {options.only.begin(), options.only.end()}, {options.remove.begin(), options.remove.end()}});
   const AppOutcomes& outcomes = progress.summarise();

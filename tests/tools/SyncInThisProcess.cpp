@@ -5,9 +5,9 @@
 
 #include <gtest/gtest.h>
 
-#include "core/AppsClient.h"
 #include "device/Step.h"
 #include "tools/Daemon.h"
+#include "tools/PlugIn.h"
 
 namespace appsync::test {
 
@@ -58,8 +58,9 @@ SyncInThisProcess::SyncInThisProcess(const std::string& devicePath, const std::s
     ASSERT_TRUE(library.ok());
     const tools::Interruption interruption;
     tools::SyncProgress progress(reporter_);
-    const auto client = AppsClient::create(device_->platform());
-    EXPECT_TRUE(tools::Daemon(*device_, *client, progress, interruption).sync({*library, {}, {}}).ok());
+    const auto client = tools::makeClient(device_->platform());
+    ASSERT_TRUE(client.ok()) << client.error().text;
+    EXPECT_TRUE(tools::Daemon(*device_, **client, progress, interruption).sync({*library, {}, {}}).ok());
   });
 }
 

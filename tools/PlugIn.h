@@ -1,0 +1,24 @@
+// The sync plug-in, loaded as a daemon does it.
+#pragma once
+
+#include <memory>
+#include <string>
+
+#include "base/Error.h"
+#include "platform/Platform.h"
+#include "platform/ZTClient.h"
+
+namespace appsync::tools {
+
+/// The plug-in's file: what the environment variable APPSYNC_MODULE names, or else the one that is built and installed
+/// with this program.
+[[nodiscard]] std::string modulePath();
+
+/// A client of the plug-in in that file, which stays loaded. `platform` must outlive the client. Errors say what to do.
+[[nodiscard]] Result<std::shared_ptr<platform::ZTClient>> makeClient(platform::Platform& platform);
+
+/// The same of the plug-in in the file at `path`.
+[[nodiscard]] Result<std::shared_ptr<platform::ZTClient>> makeClient(platform::Platform& platform,
+                                                                     const std::string& path);
+
+}  // namespace appsync::tools
