@@ -8,7 +8,7 @@
 #include <fcntl.h>
 #include <unistd.h>
 
-#include "bench/device/InstallCorpus.h"
+#include "bench/tools/InstallCorpus.h"
 #include "device/Device.h"
 #include "tools/CommandLine.h"
 
@@ -60,13 +60,13 @@ BENCHMARK(measureUnpacking)
     ->Unit(benchmark::kMillisecond)
     ->UseRealTime()
     ->Iterations(1)
-    ->Repetitions(3);
-BENCHMARK(DirectSync)->Name("Sync/whole")->Unit(benchmark::kMillisecond)->UseRealTime()->Iterations(1)->Repetitions(3);
+    ->Repetitions(5);
+BENCHMARK(DirectSync)->Name("Sync/whole")->Unit(benchmark::kMillisecond)->UseRealTime()->Iterations(1)->Repetitions(5);
 BENCHMARK(CoordinatedSync)
     ->Name("Sync/coordinated")
     ->Unit(benchmark::kMillisecond)
     ->UseRealTime()
     ->Iterations(1)
-    ->Repetitions(3);
+    ->Repetitions(5);
 
 }  // namespace

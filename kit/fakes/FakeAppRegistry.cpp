@@ -146,7 +146,8 @@ void FakeAppRegistry::postToAll(const Report& report) {
 
 bool FakeAppRegistry::applicationIsInstalled(std::string_view bundleIdentifier) {
   if (journal_.beforeCall("registry.applicationIsInstalled", bundleIdentifier)) return false;
-  return app(bundleIdentifier).has_value();
+  const std::scoped_lock lock(mutex_);
+  return apps_.contains(bundleIdentifier);
 }
 
 std::shared_ptr<const platform::AppRecord> FakeAppRegistry::recordForIdentifier(
