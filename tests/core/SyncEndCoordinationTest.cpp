@@ -6,6 +6,7 @@
 #include <gtest/gtest.h>
 
 #include "kit/fakes/CallsInLog.h"
+#include "kit/fakes/TodoList.h"
 #include "tests/ClientFixture.h"
 
 namespace appsync::test {
@@ -61,6 +62,31 @@ TEST_F(TransferEndCoordination, WithNothingOutstandingTheServiceIsNotAsked) {
   AppsClient& client = sending({});
   client.assetTransferEndedWithSuccess(false);
   EXPECT_EQ(platform.journal.count("installCoordination."), 0U);
+}
+
+TEST_F(TransferEndCoordination, WithNothingOutstandingTheMarksOfUpdatesAreKept) {
+  platform.coordination.enable();
+  platform.registry.add(FakeApp::installed("com.a"));
+  platform.files.put(kTodoListPath, binaryForm(plist::Array{installEntry("com.a")}));
+  AppsClient& client = makeClient();
+  EXPECT_EQ(client.outstandingAssetTransfers().size(), 1U);
+  client.assetTransferEndedWithSuccess(false);
+  client.assetTransferSucceeded(asset("com.a"), true, std::nullopt);
+  EXPECT_TRUE(
+      platform.log.contains(logged("transfer for asset com.a ended with success y error (null) existingApp:1")));
+}
+
+TEST_F(TransferEndCoordination, TheMarksOfUpdatesGoWithWhatIsOutstanding) {
+  platform.coordination.enable();
+  platform.registry.add(FakeApp::installed("com.a"));
+  platform.files.put(kTodoListPath, binaryForm(plist::Array{installEntry("com.a")}));
+  AppsClient& client = makeClient();
+  EXPECT_EQ(client.outstandingAssetTransfers().size(), 1U);
+  client.assetTransferUpdatedProgress(asset("com.b"), 0.25);
+  client.assetTransferEndedWithSuccess(false);
+  client.assetTransferSucceeded(asset("com.a"), true, std::nullopt);
+  EXPECT_TRUE(
+      platform.log.contains(logged("transfer for asset com.a ended with success y error (null) existingApp:0")));
 }
 
 TEST_F(TransferEndCoordination, WithNothingOutstandingUserCancellationsAreKept) {

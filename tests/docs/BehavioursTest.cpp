@@ -1,4 +1,6 @@
-// docs/behaviours.md against the tests: every behaviour names a test, and every test named is there.
+// docs/behaviours.md against the tests: every behaviour names a test, every test named is there, and every test of the
+// plug-in and of the services' contracts is named.
+#include <array>
 #include <filesystem>
 #include <fstream>
 #include <functional>
@@ -100,6 +102,44 @@ TEST(Behaviours, EveryBehaviourNamesTestsThatExist) {
     return found != read.end() ? found->second : read.emplace(file, testsInRepository(file)).first->second;
   };
   EXPECT_EQ(findingsIn(document, testsIn), Strings());
+}
+
+/// Whose tests prove what is promised to others.
+constexpr std::array kFolders = {"tests/core",      "tests/transfer", "tests/coordination", "tests/restore",
+                                 "tests/reporting", "tests/faults",   "tests/integration",  "kit/contracts"};
+
+/// The tests in a source that the document does not name.
+Strings unnamedTestsIn(const std::string& source, const std::string& document) {
+  Strings unnamed;
+  for (const std::string& test : testsInSource(source)) {
+    if (document.find("`" + test + "`") == std::string::npos) unnamed.push_back(test);
+  }
+  return unnamed;
+}
+
+TEST(Behaviours, EveryTestOfThePlugInAndOfContractsIsNamed) {
+  const std::filesystem::path root = kSourceFolder;
+  const std::string document = fileContent(root / "docs/behaviours.md");
+  for (const char* folder : kFolders) {
+    std::size_t sources = 0;
+    for (const auto& entry : std::filesystem::directory_iterator(root / folder)) {
+      if (entry.path().extension() != ".cpp") continue;
+      ++sources;
+      EXPECT_EQ(unnamedTestsIn(fileContent(entry.path()), document), Strings()) << entry.path();
+    }
+    EXPECT_GT(sources, 0U) << folder;
+  }
+}
+
+TEST(Behaviours, ATestThatIsNotNamedIsFound) {
+  const std::string source = "TEST(A, Works) {}\nTEST_P(B,\n       WorksToo) {}\n";
+  EXPECT_EQ(unnamedTestsIn(source, "| It works | `tests/a/ATest.cpp` | `A.Works`, `B.Works` |"), Strings{"B.WorksToo"});
+  EXPECT_EQ(unnamedTestsIn(source, "`A.Works` `B.WorksToo`"), Strings());
+}
+
+TEST(Behaviours, ATestWithParametersIsFoundUnderItsSuite) {
+  EXPECT_EQ(testsInSource("TEST_P(Each, Works) {}\nINSTANTIATE_TEST_SUITE_P(All, Each, testing::Values(1));"),
+            std::set<std::string>{"Each.Works"});
 }
 
 TEST(Behaviours, ARowWithTestsThatExistIsInOrder) {

@@ -166,6 +166,19 @@ TEST_F(CoordinatedRestore, TheInstallTypeTellsHowAnAppWasDemoted) {
   client.dataMigratorCancelledCoordinatorForRestoreAppBundle("com.a");
 }
 
+TEST_F(CoordinatedRestore, AnAppWithoutAnIconIsRestoredAllTheSame) {
+  AppsClient& client = makeTracedClient();
+  for (const std::optional<ByteView>& none : {std::optional<ByteView>(), std::optional<ByteView>(ByteView())}) {
+    icon = none;
+    EXPECT_TRUE(prepare(client));
+    EXPECT_FALSE(coordinator().placeholder->icon);
+    EXPECT_EQ(coordinator().responsibleClient, kStore);
+    platform.coordination.complete("com.a");
+    platform.coordination.waitUntilIdle();
+  }
+  client.dataMigratorCancelledCoordinatorForRestoreAppBundle("com.a");
+}
+
 TEST_F(CoordinatedRestore, AnAppThatIsTheStoresAlreadyIsLeftToIt) {
   platform.coordination.add(FakeCoordinator::of("com.a", CoordinatorKind::restoring).withResponsibleClient(kStore));
   EXPECT_TRUE(prepare());
