@@ -262,6 +262,12 @@ class AppsClient final : public platform::ZTClient,
 
   // ---- reporting
 
+  /// installedAssetMetrics: how many user apps there are, and how many bytes they take.
+  [[nodiscard]] plist::Dictionary installedAssetMetrics() override;
+  /// corvelIDsForAssets: both identifiers of an app whose store metadata names two.
+  [[nodiscard]] std::set<std::string> corvelIDsForAssets() override;
+  /// accountsForAssets: of each account what the first of its apps says.
+  [[nodiscard]] platform::ZTAccountInfos accountsForAssets() override;
   /// prepareForBackup: brings the store metadata of installed apps up to date.
   void prepareForBackup() override;
   /// disabledAssetTypes: "Application" where apps may be neither installed nor removed.

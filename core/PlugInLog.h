@@ -12,7 +12,8 @@ namespace appsync {
 /// The bundle that holds the plug-in; every message begins with it.
 inline constexpr std::string_view kPlugInBundleIdentifier = "com.corvel.qor.Zephtra.AppSync";
 
-/// Writes messages, whose formats all begin "%s|", under the plug-in's name. A value: copies write to the same log.
+/// Writes messages, whose formats begin "%s|" but for those of `lookupError`, under the plug-in's name. A value: copies
+/// write to the same log.
 class PlugInLog {
  public:
   template <class... Args>
@@ -38,7 +39,15 @@ class PlugInLog {
     write<Args...>(kSummaryCategory, LogLevel::standard, format, args...);
   }
 
+  /// A value of another type than was looked for. It stands in the framework's general category, among those of other
+  /// clients, without the plug-in's name.
+  template <class... Args>
+  void lookupError(MessageFormat<std::type_identity_t<Args>...> format, const Args&... args) const {
+    log<Args...>(framework_->ZTGetLogCategory(kGeneralCategory), LogLevel::error, format, args...);
+  }
+
  private:
+  static constexpr int kGeneralCategory = 0;
   static constexpr int kCategory = 8;
   static constexpr int kSummaryCategory = 14;
 

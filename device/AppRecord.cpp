@@ -29,6 +29,10 @@ std::optional<std::string> AppRecord::bundlePath() const {
   return containerPath(*bundle()) + '/' + bundle()->folder;
 }
 
+std::uint64_t AppRecord::staticDiskUsage() const {
+  return bundle() == nullptr ? 0 : bundle()->bytes;
+}
+
 platform::TSInstallType AppRecord::installType() const {
   if (row_.placeholder) return row_.placeholder->installType;
   return row_.installed ? row_.installed->installType : platform::TSInstallType::None;
@@ -44,10 +48,6 @@ std::string AppRecord::description() const {
 
 std::string AppRecord::name() const {
   return bundle() == nullptr ? row_.identifier : bundle()->name;
-}
-
-std::uint64_t AppRecord::bytes() const {
-  return bundle() == nullptr ? 0 : bundle()->bytes;
 }
 
 std::optional<double> AppRecord::installedAt() const {

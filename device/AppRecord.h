@@ -28,6 +28,8 @@ class AppRecord final : public platform::AppRecord {
   [[nodiscard]] std::optional<std::string> bundleContainerPath() const override;
   [[nodiscard]] std::optional<std::string> bundlePath() const override;
   [[nodiscard]] std::string applicationType() const override { return row_.applicationType; }
+  /// Bytes of all files in the container.
+  [[nodiscard]] std::uint64_t staticDiskUsage() const override;
   [[nodiscard]] platform::TSInstallType installType() const override;
   [[nodiscard]] bool isInstalled() const override { return row_.installed.has_value(); }
   [[nodiscard]] bool isPlaceholder() const override { return row_.placeholder.has_value(); }
@@ -38,8 +40,6 @@ class AppRecord final : public platform::AppRecord {
 
   /// The name for people, or the identifier of an app that has no bundle yet.
   [[nodiscard]] std::string name() const;
-  /// Bytes of all files in the container.
-  [[nodiscard]] std::uint64_t bytes() const;
   /// Seconds since 1970; absent for an app that has no bundle yet.
   [[nodiscard]] std::optional<double> installedAt() const;
 

@@ -48,6 +48,9 @@ class AppRecord : public BundleRecord {
 
   /// `ApplicationTypeUser`, `ApplicationTypeSystem` or another word of the registry's.
   [[nodiscard]] virtual std::string applicationType() const = 0;
+  /// Bytes that its bundle takes, as the installer counted them: the installed one's where there are two. What an app
+  /// writes while it runs is not in it. Cheap: walks over all apps ask.
+  [[nodiscard]] virtual std::uint64_t staticDiskUsage() const = 0;
   /// Why it is, or was last, being installed.
   [[nodiscard]] virtual TSInstallType installType() const = 0;
   /// A package is installed and can be launched.

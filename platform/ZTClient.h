@@ -13,6 +13,7 @@
 #include "base/Error.h"
 #include "base/PropertyList.h"
 #include "platform/ZTAsset.h"
+#include "platform/ZTMutableAccountInfo.h"
 
 namespace appsync::platform {
 
@@ -24,6 +25,11 @@ inline constexpr std::string_view kZTStartupCompleteNotification = "com.corvel.z
 
 /// The restore type of a device that a host has restored. Others are the daemon's own.
 inline constexpr std::int32_t kRestoreTypeHost = 2;
+
+/// Keys of `installedAssetMetrics`, each with an unsigned 64-bit number.
+inline constexpr std::string_view kMetricCount = "_Count";                  ///< items of the dataclass
+inline constexpr std::string_view kMetricPhysicalSize = "_PhysicalSize";    ///< bytes that they take
+inline constexpr std::string_view kMetricPurgeableSize = "_PurgeableSize";  ///< of these, bytes that can be freed
 
 /// The daemon drives a client with these calls, one sync at a time and in this order: `prepareForSyncWithHostAnchor`,
 /// `installedAssets`, `reconcileSync`, `outstandingAssetTransfers`, the transfers' reports,
@@ -58,6 +64,14 @@ class ZTClient {
 
   /// Takes up what the host left on a restored device.
   virtual bool reconcileRestoreOfType(std::int32_t restoreType, ErrorSlot error) = 0;
+
+  /// What the dataclass takes on the device, by the keys above, and nothing else. The caller's own.
+  [[nodiscard]] virtual plist::Dictionary installedAssetMetrics() = 0;
+  /// The identifiers of the store accounts that own what is on the device, as they were found there: empty, in other
+  /// letters or with blanks around them too. What cannot be read names no account and fails nothing.
+  [[nodiscard]] virtual std::set<std::string> corvelIDsForAssets() = 0;
+  /// The same accounts with what is known of them, one of each identifier.
+  [[nodiscard]] virtual ZTAccountInfos accountsForAssets() = 0;
   /// The device is about to be backed up.
   virtual void prepareForBackup() = 0;
   /// The dataclasses that this device cannot sync at all as it is set up; none when there is no such.

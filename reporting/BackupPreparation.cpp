@@ -2,7 +2,8 @@
 #include "core/AppsClient.h"
 #include "core/PropertyListAccess.h"
 #include "core/PropertyListFile.h"
-#include "core/SyncFiles.h"
+#include "reporting/StoreMetadata.h"
+#include "reporting/UserApps.h"
 
 namespace appsync {
 
@@ -32,26 +33,21 @@ Change clearAutomaticDownload(plist::Dictionary& metadata, const AppRecord& app,
 }
 
 void prepareApp(platform::FileSystem& files, const AppRecord& app, const PlugInLog& log) {
-  const auto container = app.bundleContainerPath();
-  if (!container) return;
-  const std::string path = *container + "/" + std::string(kStoreMetadataName);
-  plist::Value root = readDictionary(files, path);
+  const auto path = storeMetadataPath(app);
+  plist::Value root = readStoreMetadata(files, path);
   plist::Dictionary* metadata = root.dictionary();
   if (metadata == nullptr) return;
   const Change licence = updateLicenceState(*metadata, app, log);
   const Change download = clearAutomaticDownload(*metadata, app, log);
-  if (licence == Change::made || download == Change::made) writePropertyList(files, path, root).ignore();
+  if (licence == Change::made || download == Change::made) writePropertyList(files, *path, root).ignore();
 }
 
 }  // namespace
 
 void AppsClient::prepareForBackup() {
   _log.message("%s|preparing for backup");
-  _platform.defaultRegistry().enumerateBundlesOfType(platform::BundleKind::User,
-                                                     [this](const platform::BundleRecord& bundle, bool&) {
-                                                       if (const AppRecord* app = bundle.asAppRecord())
-                                                         prepareApp(_platform.fileSystem(), *app, _log);
-                                                     });
+  visitUserApps(_platform.defaultRegistry(),
+                [this](const AppRecord& app) { prepareApp(_platform.fileSystem(), app, _log); });
   _log.message("%s|finished preparing for backup");
 }
 

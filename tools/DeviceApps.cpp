@@ -14,7 +14,7 @@ std::vector<DeviceApp> appsOn(device::Device& device) {
                     record->isInstalled(),
                     record->isPlaceholder(),
                     record->installType(),
-                    record->bytes()});
+                    record->staticDiskUsage()});
   };
   device.platform().defaultRegistry().enumerateBundlesOfType(platform::BundleKind::All, add);
   return apps;

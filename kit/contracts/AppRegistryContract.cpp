@@ -143,6 +143,18 @@ TEST_P(AppRegistryContract, ARecordIsASnapshot) {
   EXPECT_TRUE(before->isInstalled());
 }
 
+TEST_P(AppRegistryContract, ARecordKnowsTheBytesOfTheBundleThatCanBeUsed) {
+  install("com.a", "1.0");
+  const std::uint64_t installed = record("com.a")->staticDiskUsage();
+  EXPECT_GT(installed, 0U);
+  placeholder("com.a", "2.0.0.0.0");
+  EXPECT_EQ(record("com.a")->staticDiskUsage(), installed);
+  const auto before = record("com.a");
+  install("com.a", "2.0.0.0.0");
+  EXPECT_NE(record("com.a")->staticDiskUsage(), installed);
+  EXPECT_EQ(before->staticDiskUsage(), installed);
+}
+
 // Walks.
 
 TEST_P(AppRegistryContract, AWalkMeetsEveryUserBundle) {

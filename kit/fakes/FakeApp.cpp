@@ -59,6 +59,14 @@ FakeApp FakeApp::ofType(std::string_view type) const {
   return changed(*this, [&](FakeApp& app) { app.applicationType = type; });
 }
 
+FakeApp FakeApp::metByWalksOf(platform::BundleKind met) const {
+  return changed(*this, [&](FakeApp& app) { app.kind = met; });
+}
+
+FakeApp FakeApp::withStaticDiskUsage(std::uint64_t bytes) const {
+  return changed(*this, [&](FakeApp& app) { app.staticDiskUsage = bytes; });
+}
+
 FakeApp FakeApp::withInstallType(platform::TSInstallType type) const {
   return changed(*this, [&](FakeApp& app) { app.installType = type; });
 }

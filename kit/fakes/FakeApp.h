@@ -1,6 +1,7 @@
 // Apps as tests describe them, and as the fake registry reports them.
 #pragma once
 
+#include <cstdint>
 #include <memory>
 #include <optional>
 #include <string>
@@ -22,6 +23,9 @@ struct FakeApp {
   std::optional<std::string> containerPath;
   std::optional<std::string> bundlePath;
   std::string applicationType;
+  /// The walks that meet it; unless said otherwise what its type makes of it.
+  std::optional<platform::BundleKind> kind;
+  std::uint64_t staticDiskUsage = 0;
   platform::TSInstallType installType = platform::TSInstallType::None;
   bool isInstalled = false;
   bool isPlaceholder = false;
@@ -48,6 +52,9 @@ struct FakeApp {
   [[nodiscard]] FakeApp withContainerPath(std::optional<std::string> value) const;
   [[nodiscard]] FakeApp withBundlePath(std::optional<std::string> value) const;
   [[nodiscard]] FakeApp ofType(std::string_view type) const;
+  /// As registries may that know more types than kinds of bundles.
+  [[nodiscard]] FakeApp metByWalksOf(platform::BundleKind kind) const;
+  [[nodiscard]] FakeApp withStaticDiskUsage(std::uint64_t bytes) const;
   [[nodiscard]] FakeApp withInstallType(platform::TSInstallType type) const;
   [[nodiscard]] FakeApp withMIDBasedSINF() const;
   [[nodiscard]] FakeApp withProgress(platform::TSInstallState state, platform::TSInstallPhase phase) const;
@@ -66,6 +73,7 @@ class FakeAppRecord final : public platform::AppRecord {
   [[nodiscard]] std::optional<std::string> bundleContainerPath() const override { return app_.containerPath; }
   [[nodiscard]] std::optional<std::string> bundlePath() const override { return app_.bundlePath; }
   [[nodiscard]] std::string applicationType() const override { return app_.applicationType; }
+  [[nodiscard]] std::uint64_t staticDiskUsage() const override { return app_.staticDiskUsage; }
   [[nodiscard]] platform::TSInstallType installType() const override { return app_.installType; }
   [[nodiscard]] bool isInstalled() const override { return app_.isInstalled; }
   [[nodiscard]] bool isPlaceholder() const override { return app_.isPlaceholder; }

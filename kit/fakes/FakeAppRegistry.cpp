@@ -21,6 +21,7 @@ bool meets(BundleKind walked, BundleKind kind) {
 }
 
 BundleKind kindOf(const FakeApp& app) {
+  if (app.kind) return *app.kind;
   if (app.applicationType == platform::ApplicationTypeUser) return BundleKind::User;
   return app.applicationType == platform::ApplicationTypeSystem ? BundleKind::System : BundleKind::All;
 }
@@ -210,7 +211,7 @@ Status FakeAppRegistry::install(const platform::FileLocation& location, const pl
 }
 
 void FakeAppRegistry::showPlaceholder(const std::string& identifier, platform::TSInstallType type) {
-  apply(identifier, {PackageKind::placeholder, std::nullopt},
+  apply(identifier, {PackageKind::placeholder, std::nullopt, 0},
         {{platform::InstallTypeKey, static_cast<std::uint64_t>(type)}});
 }
 

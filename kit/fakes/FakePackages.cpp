@@ -53,12 +53,13 @@ Result<FakePackage> readPackage(FakeFileSystem& files, const platform::FileLocat
   if (isPlaceholder ? named != identifier : named && named != identifier) {
     return installerError(location.path + " does not hold " + identifier);
   }
-  return FakePackage{*kind, info ? text(info->find(platform::BundleVersionKey)) : std::nullopt};
+  return FakePackage{*kind, info ? text(info->find(platform::BundleVersionKey)) : std::nullopt, bytes->size()};
 }
 
 void applyPackage(FakeApp& app, const FakePackage& package, const plist::Dictionary& options) {
   const bool leavesTheApp = app.isInstalled && package.kind == PackageKind::placeholder;
   if (package.version && !leavesTheApp) app.version = package.version;
+  if (!leavesTheApp) app.staticDiskUsage = package.size;
   app.installOptions = options;
   const plist::Value* type = options.find(platform::InstallTypeKey);
   const std::optional<std::uint64_t> number = type == nullptr ? std::nullopt : type->uint64();

@@ -1,6 +1,7 @@
 // Packages as the fake registry understands them.
 #pragma once
 
+#include <cstdint>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -18,6 +19,7 @@ enum class PackageKind { app, placeholder };
 struct FakePackage {
   PackageKind kind = PackageKind::app;
   std::optional<std::string> version;  ///< none when the package does not tell
+  std::uint64_t size = 0;              ///< of the package, or of a placeholder's info dictionary, in bytes
 };
 
 /// The bytes of a package that tells its identifier and version. (Any other bytes are a package of any app.)

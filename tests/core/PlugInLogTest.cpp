@@ -45,6 +45,12 @@ TEST_F(PlugInLogTest, ASummaryGoesToACategoryOfItsOwnAtDefaultLevel) {
   EXPECT_TRUE(sameLines(expected, platform.log.lines()));
 }
 
+TEST_F(PlugInLogTest, ALookupThatFailsStandsInTheGeneralCategoryWithoutTheIdentifier) {
+  log.lookupError("unexpected type for %{public}@", "CorvelID");
+  const LogLines expected{{0, LogLevel::error, "unexpected type for CorvelID"}};
+  EXPECT_TRUE(sameLines(expected, platform.log.lines()));
+}
+
 TEST_F(PlugInLogTest, AMessageWhoseLevelIsOffIsNeitherFormattedNorWritten) {
   const Printed value;
   platform.log.disable(8, LogLevel::standard);

@@ -94,7 +94,7 @@ TEST_F(AppRegistryTest, KnowsNameSizeAndDateOfAnApp) {
   ASSERT_EQ(apps->size(), 1U);
   const device::AppRecord& app = *apps->front();
   EXPECT_EQ(app.name(), "Notes");
-  EXPECT_EQ(app.bytes(), 5000U + 9 + 10 + infoPlist("com.a", "2.0").size());
+  EXPECT_EQ(app.staticDiskUsage(), 5000U + 9 + 10 + infoPlist("com.a", "2.0").size());
   EXPECT_GT(app.installedAt().value_or(0), 1.7e9);
   EXPECT_EQ(app.description(), "com.a 2.0 (installed)");
   EXPECT_EQ(fs::path(*app.bundlePath()).filename(), "Notes.app");

@@ -1,0 +1,23 @@
+// What the store said of an installed app: a file beside the app's bundle.
+#pragma once
+
+#include <cstdint>
+#include <optional>
+#include <string>
+
+#include "base/PropertyList.h"
+#include "platform/AppRecord.h"
+#include "platform/FileSystem.h"
+
+namespace appsync {
+
+/// Larger files count as unreadable. No store writes one, and one app's must not take the memory of the daemon.
+inline constexpr std::uint64_t kMaximumStoreMetadataBytes = std::uint64_t{16} << 20;
+
+/// Device path of the app's file, which may be missing; none for an app without a container.
+[[nodiscard]] std::optional<std::string> storeMetadataPath(const platform::AppRecord& app);
+
+/// The dictionary in that file, read once and whole; null when there is no such file or nothing of the kind in it.
+[[nodiscard]] plist::Value readStoreMetadata(platform::FileSystem& files, const std::optional<std::string>& path);
+
+}  // namespace appsync
