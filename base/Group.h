@@ -3,6 +3,7 @@
 
 #include <condition_variable>
 #include <cstdint>
+#include <memory>
 #include <mutex>
 #include <utility>
 
@@ -42,12 +43,11 @@ class Group {
   std::uint64_t timesEmptied_ = 0;
 };
 
-/// Enters a group now and leaves it when destroyed. Moving hands the duty to leave on.
+/// Enters a group now, leaves it when destroyed, and keeps it until then. Moving hands the duty to leave on.
 class [[nodiscard]] GroupEntry {
  public:
-  /// `group` must outlive the entry.
-  explicit GroupEntry(Group& group) : group_(&group) { group.enter(); }
-  GroupEntry(GroupEntry&& other) noexcept : group_(std::exchange(other.group_, nullptr)) {}
+  explicit GroupEntry(std::shared_ptr<Group> group) : group_(std::move(group)) { group_->enter(); }
+  GroupEntry(GroupEntry&&) noexcept = default;
   GroupEntry& operator=(GroupEntry other) noexcept {
     std::swap(group_, other.group_);
     return *this;
@@ -57,7 +57,7 @@ class [[nodiscard]] GroupEntry {
   }
 
  private:
-  Group* group_;
+  std::shared_ptr<Group> group_;
 };
 
 }  // namespace appsync

@@ -345,8 +345,8 @@ class AppsClient final : public platform::ZTClient,
   std::atomic<std::uint32_t> _numAppInstallsAttempted = 0;
 
   // Synchronisation.
-  const std::shared_ptr<Group> _installGroup;  ///< installs queued, running or waiting to be tried again; left by those
-                                               ///< who have given up their shares of the object and of the asset
+  const std::shared_ptr<Group> _installGroup;  ///< installs queued, running or waiting to be tried again; left after
+                                               ///< their shares of the object and of the asset are given up
   Group _restorePlaceHoldersWaitGroup;         ///< restore placeholders still awaited
   SerialQueue _accessQueue{"com.corvel.qor.Zephtra.AppSync"};
   SerialQueue _restoreQueue{"com.corvel.qor.Zephtra.AppRestore"};

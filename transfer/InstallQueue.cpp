@@ -1,6 +1,7 @@
 // Installing received packages, ten at a time, each held by the home screen.
 #include <cerrno>
 #include <chrono>
+#include <utility>
 
 #include "core/AppsClient.h"
 #include "core/SyncFiles.h"
@@ -17,18 +18,12 @@ constexpr std::string_view kInstallScenario = "Asset install";
 constexpr std::string_view kRestoreScenario = "Nimbra restore";
 constexpr std::chrono::seconds kRetryDelay{30};
 
-/// What an install holds while it is queued, runs or waits to be tried again.
+/// What an install holds while it is queued, runs or waits to be tried again. The group is left last: whoever waits for
+/// it may then end the client, the assets and the platform.
 struct PendingInstall {
-  std::shared_ptr<AppsClient> client;
+  std::shared_ptr<const GroupEntry> groupEntry;
   std::shared_ptr<ZTAsset> asset;
-  std::shared_ptr<Group> group;  ///< entered for it
-
-  /// The group comes last: whoever waits for it may then end the client, the assets and the platform.
-  void end() {
-    client.reset();
-    asset.reset();
-    group->leave();
-  }
+  std::shared_ptr<AppsClient> client;
 };
 
 void logAssertion(const PlugInLog& log, TerminationAssertionOutcome outcome, const std::string& identifier) {
@@ -46,16 +41,15 @@ void logAssertion(const PlugInLog& log, TerminationAssertionOutcome outcome, con
 }  // namespace
 
 void AppsClient::_enqueueAssetInstall(const std::shared_ptr<ZTAsset>& asset) {
-  _installGroup->enter();
+  PendingInstall install{std::make_shared<GroupEntry>(_installGroup), asset, shared_from_this()};
   _log.message("%s|Enqueue install request for %{public}@", asset->identifier());
-  _installOperationQueue.add([install = PendingInstall{shared_from_this(), asset, _installGroup}]() mutable {
+  _installOperationQueue.add([install = std::move(install)] {
     AppsClient& client = *install.client;
     const std::string& identifier = install.asset->identifier();
     client._log.message("%s|Performing install for %{public}@", identifier);
     client._performAssetInstall(install.asset);
     client._log.message("%s|Finished install for %{public}@", identifier);
     client._accessQueue.sync([&] { client.cleanRestoreStateForIdentifier(identifier); });
-    install.end();
   });
 }
 
@@ -97,13 +91,11 @@ void AppsClient::_scheduleInstallRetry(const std::shared_ptr<ZTAsset>& asset) {
   _log.error("%s|Will retry installation of %{public}@ in %d seconds", identifier,
              static_cast<int>(kRetryDelay.count()));
   _platform.transactionLog().logScenario(kInstallScenario, 0, true, identifier, "retrying asset install");
-  _installGroup->enter();
-  _platform.scheduler().after(
-      kRetryDelay, [install = PendingInstall{shared_from_this(), asset, _installGroup}]() mutable {
-        install.client->_log.error("%s|Re-enqueue installation request for %{public}@", install.asset->identifier());
-        install.client->_enqueueAssetInstall(install.asset);
-        install.end();
-      });
+  PendingInstall install{std::make_shared<GroupEntry>(_installGroup), asset, shared_from_this()};
+  _platform.scheduler().after(kRetryDelay, [install = std::move(install)] {
+    install.client->_log.error("%s|Re-enqueue installation request for %{public}@", install.asset->identifier());
+    install.client->_enqueueAssetInstall(install.asset);
+  });
 }
 
 void AppsClient::assetInstallSucceeded(const ZTAsset& asset) {

@@ -119,31 +119,46 @@ TEST(Group, MayBeDestroyedRightAfterItsWait) {
   }
 }
 
-TEST_F(GroupTest, AnEntryEntersNowAndLeavesWhenDestroyed) {
+class GroupEntryTest : public testing::Test {
+ protected:
+  VirtualTime time;
+  std::shared_ptr<Group> group = std::make_shared<Group>(time);
+};
+
+TEST_F(GroupEntryTest, EntersNowAndLeavesWhenDestroyed) {
   {
     const GroupEntry entry(group);
-    EXPECT_EQ(group.count(), 1);
+    EXPECT_EQ(group->count(), 1);
   }
-  EXPECT_EQ(group.count(), 0);
+  EXPECT_EQ(group->count(), 0);
 }
 
-TEST_F(GroupTest, MovingAnEntryHandsTheLeaveOn) {
+TEST_F(GroupEntryTest, MovingHandsTheLeaveOn) {
   std::unique_ptr<GroupEntry> moved;
   {
     GroupEntry entry(group);
     moved = std::make_unique<GroupEntry>(std::move(entry));
   }
-  EXPECT_EQ(group.count(), 1);
+  EXPECT_EQ(group->count(), 1);
   moved.reset();
-  EXPECT_EQ(group.count(), 0);
+  EXPECT_EQ(group->count(), 0);
 }
 
-TEST_F(GroupTest, AssigningAnEntryLeavesTheGroupThatItStoodFor) {
-  Group other(time);
+TEST_F(GroupEntryTest, AssigningLeavesTheGroupThatItStoodFor) {
+  const auto other = std::make_shared<Group>(time);
   GroupEntry entry(group);
   entry = GroupEntry(other);
-  EXPECT_EQ(group.count(), 0);
-  EXPECT_EQ(other.count(), 1);
+  EXPECT_EQ(group->count(), 0);
+  EXPECT_EQ(other->count(), 1);
+}
+
+TEST_F(GroupEntryTest, KeepsItsGroup) {
+  const std::weak_ptr<Group> kept = group;
+  {
+    const GroupEntry entry(std::exchange(group, nullptr));
+    EXPECT_FALSE(kept.expired());
+  }
+  EXPECT_TRUE(kept.expired());
 }
 
 static_assert(!std::is_copy_constructible_v<GroupEntry> && std::is_nothrow_move_constructible_v<GroupEntry>);

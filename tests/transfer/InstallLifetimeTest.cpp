@@ -1,9 +1,9 @@
 // What queued installs keep alive, and for how long.
 #include <condition_variable>
 #include <functional>
-#include <future>
 #include <memory>
 #include <mutex>
+#include <optional>
 #include <string>
 #include <utility>
 
@@ -29,24 +29,23 @@ class LingeringAsset final : public ZTAsset {
   Gate& gate_;
 };
 
-/// Tells whether the first one to wait on it had anything to wait for.
-class WatchedClock final : public Clock {
+/// Never blocks, but tells whether the first one to wait on it would have been.
+class WaitProbe final : public Clock {
  public:
-  explicit WatchedClock(Clock& clock) : clock_(clock) {}
-  TimePoint now() const override { return clock_.now(); }
-  bool wait(std::condition_variable& condition, std::unique_lock<std::mutex>& lock, TimePoint deadline,
+  TimePoint now() const override { return {}; }
+  bool wait(std::condition_variable&, std::unique_lock<std::mutex>&, TimePoint,
             const std::function<bool()>& ready) override {
-    std::call_once(first_, [&] { firstWait_.set_value(!ready()); });
-    return clock_.wait(condition, lock, deadline, ready);
+    const bool isReady = ready();
+    if (!firstWaitBlocks) firstWaitBlocks = !isReady;
+    return isReady;
   }
 
-  /// Blocks until somebody waits.
-  [[nodiscard]] bool firstWaitWasNeeded() { return firstWait_.get_future().get(); }
+  std::optional<bool> firstWaitBlocks;
+};
 
- private:
-  Clock& clock_;
-  std::once_flag first_;
-  std::promise<bool> firstWait_;
+/// Drops every task, as a scheduler does that ends before they are due.
+struct EndingScheduler final : Scheduler {
+  void after(Duration, std::function<void()>) override {}
 };
 
 class InstallLifetime : public ClientFixture {
@@ -63,7 +62,7 @@ class InstallLifetime : public ClientFixture {
 TEST_F(InstallLifetime, OnceTheTransfersHaveEndedNoInstallOwnsTheClientOrTheAsset) {
   Gate gate;
   gate.close();
-  WatchedClock clock(platform.time);
+  WaitProbe clock;
   platform.use(clock);
   AppsClient& client = makeClient();
   std::shared_ptr<ZTAsset> asset = received(std::make_shared<LingeringAsset>("com.a", gate));
@@ -72,13 +71,24 @@ TEST_F(InstallLifetime, OnceTheTransfersHaveEndedNoInstallOwnsTheClientOrTheAsse
   asset.reset();  // The install is its last owner now.
   platform.registry.installGate.open();
   gate.waitUntilStopped(1);
+
+  client.assetTransferEndedWithSuccess(true);
+  EXPECT_EQ(clock.firstWaitBlocks, true) << "the transfers may end before the asset";
   const auto last = takeClient();
   EXPECT_EQ(last.use_count(), 1);
-
-  auto ended = std::async(std::launch::async, [&client] { client.assetTransferEndedWithSuccess(true); });
-  EXPECT_TRUE(clock.firstWaitWasNeeded()) << "the transfers ended before the asset";
   gate.open();
-  ended.get();
+}
+
+TEST_F(InstallLifetime, ARetryThatIsDroppedIsNotWaitedFor) {
+  WaitProbe clock;
+  EndingScheduler scheduler;
+  platform.use(clock);
+  platform.use(scheduler);
+  platform.screen.answerNext("com.a", {AssertionAnswer::denied()});
+  AppsClient& client = makeClient();
+  client._performAssetInstall(received(std::make_shared<ZTAsset>("com.a", "Application", "A")));
+  client.assetTransferEndedWithSuccess(true);
+  EXPECT_EQ(clock.firstWaitBlocks, false);
 }
 
 TEST_F(InstallLifetime, QueuedInstallsKeepTheClientAliveAndItEndsOnTheirThread) {
