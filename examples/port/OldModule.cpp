@@ -1,0 +1,7 @@
+// A plug-in of some other release, for the test that the daemon refuses it.
+#include "platform/Module.h"
+
+void appsync::platform::appsyncMakeClient(std::uint32_t, Platform*, std::shared_ptr<ZTClient>*,
+                                          ModuleAnswer* answer) noexcept {
+  *answer = {kModuleInterfaceVersion + 1, "of another release"};
+}
