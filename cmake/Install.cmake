@@ -39,6 +39,16 @@ function(appsync_install_pkgconfig name)
   install(FILES "${CMAKE_BINARY_DIR}/${name}.pc" DESTINATION "${APPSYNC_INSTALL_PKGCONFIGDIR}")
 endfunction()
 
+# Installs man pages and completions, which the tool's users find without looking for them.
+function(appsync_install_help)
+  file(GLOB pages CONFIGURE_DEPENDS "${CMAKE_SOURCE_DIR}/docs/man/*.1")
+  install(FILES ${pages} DESTINATION "${CMAKE_INSTALL_MANDIR}/man1")
+  set(completions "${CMAKE_SOURCE_DIR}/tools/completions")
+  install(FILES "${completions}/appsync.bash" RENAME appsync DESTINATION "${CMAKE_INSTALL_DATADIR}/bash-completion/completions")
+  install(FILES "${completions}/_appsync" DESTINATION "${CMAKE_INSTALL_DATADIR}/zsh/site-functions")
+  install(FILES "${completions}/appsync.fish" DESTINATION "${CMAKE_INSTALL_DATADIR}/fish/vendor_completions.d")
+endfunction()
+
 # Installs the CMake package of all parts. To be called last.
 function(appsync_install_package)
   get_property(parts GLOBAL PROPERTY APPSYNC_INSTALLED_PARTS)

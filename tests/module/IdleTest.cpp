@@ -1,0 +1,63 @@
+// What a plug-in costs that has nothing to do.
+#include <algorithm>
+#include <filesystem>
+#include <string_view>
+
+#include <gtest/gtest.h>
+#include <link.h>
+
+#include "kit/fakes/FakePlatform.h"
+#include "tests/module/HeapInUse.h"
+#include "tests/module/LoadedModule.h"
+
+namespace appsync::test {
+
+namespace {
+
+constexpr std::size_t kMostOfItsOwn = 2 * 1024 * 1024;
+
+/// What the loaded module's variables take: the parts of its file that are its own in each process.
+std::size_t writableBytes() {
+  std::size_t bytes = 0;
+  ::dl_iterate_phdr(
+      [](dl_phdr_info* object, std::size_t, void* sum) {
+        if (!std::string_view(object->dlpi_name).ends_with("/AppsClient.so")) return 0;
+        for (const ElfW(Phdr)* part = object->dlpi_phdr; part != object->dlpi_phdr + object->dlpi_phnum; ++part) {
+          if (part->p_type == PT_LOAD && (part->p_flags & PF_W) != 0) *static_cast<std::size_t*>(sum) += part->p_memsz;
+        }
+        return 1;
+      },
+      &bytes);
+  return bytes;
+}
+
+std::ptrdiff_t threads() {
+  const std::filesystem::directory_iterator tasks("/proc/self/task");
+  return std::distance(begin(tasks), end(tasks));
+}
+
+class Idle : public testing::Test {
+ protected:
+  FakePlatform platform;
+  /// The fakes keep memory and threads of their own from their first client on; what another takes is the plug-in's.
+  const std::shared_ptr<platform::ZTClient> first = makeModuleClient(platform);
+};
+
+TEST_F(Idle, AClientHoldsLittleMemory) {
+  const std::size_t before = heapInUse();
+  const auto client = makeModuleClient(platform);
+  const std::size_t held = heapInUse() - before;
+  EXPECT_GT(held, sizeof(platform::ZTClient)) << "the module's memory is not counted";
+  EXPECT_GT(writableBytes(), 0);
+  EXPECT_LT(held + writableBytes(), kMostOfItsOwn);
+}
+
+TEST_F(Idle, AClientStartsNoThread) {
+  const std::ptrdiff_t before = threads();
+  const auto client = makeModuleClient(platform);
+  EXPECT_EQ(threads(), before);
+}
+
+}  // namespace
+
+}  // namespace appsync::test
