@@ -2,6 +2,7 @@
 #include <algorithm>
 #include <cmath>
 #include <limits>
+#include <utility>
 
 #include "core/AppsClient.h"
 #include "core/PropertyListAccess.h"
@@ -20,6 +21,7 @@ using platform::ZTAsset;
 /// A transfer's progress is always shown out of this many units.
 constexpr std::int64_t kTransferUnits = 1000;
 
+/// Whatever a daemon calls a fraction: a number that no integer holds must not reach the cast.
 std::int64_t completedUnits(double fraction) {
   const double units = fraction * static_cast<double>(kTransferUnits);
   const auto largest = static_cast<double>(std::numeric_limits<std::int32_t>::max());
@@ -91,9 +93,10 @@ void AppsClient::_handleReceivedAsset(const std::shared_ptr<ZTAsset>& asset, Tra
     _platform.defaultRegistry().installPhaseFinishedForProgress(*progress);
   }
 
-  const auto path = _receivedPath(*asset);
-  if (const auto text = stringIn(path ? &*path : nullptr)) asset->setPath(std::string(*text));
-  if (!isValidBundleIdentifier(path ? &*path : nullptr)) {
+  const auto received = _receivedPath(*asset);
+  const plist::Value* path = received ? &*received : nullptr;
+  if (auto text = ownedStringIn(path)) asset->setPath(std::move(text));
+  if (!isValidBundleIdentifier(path)) {
     _log.message("%s|Ignoring invalid path: %{public}@", path);
     return;
   }

@@ -22,6 +22,7 @@ class WantedEntry {
   /// For an entry of the host's todo list whose identifier is `identifier`.
   [[nodiscard]] static WantedEntry fromTodoEntry(const plist::Value& entry, std::string_view identifier);
 
+  /// Empty when a placeholder's record has none.
   [[nodiscard]] std::string identifier() const;
   /// As the host or the registry gave it; null when there is none.
   [[nodiscard]] const plist::Value* version() const;
