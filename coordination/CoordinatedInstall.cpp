@@ -3,6 +3,7 @@
 #include "coordination/SyncError.h"
 #include "coordination/TransactionSteps.h"
 #include "core/AppsClient.h"
+#include "core/PropertyListFile.h"
 
 namespace appsync {
 
@@ -38,9 +39,9 @@ bool provideInstallOptions(InstallPreparation& preparation) {
   options.setStoreMetadata(preparation.storeMetadata);
   options.setInstallType(TSInstallType::Sync);
   options.setInstallTargetType(kInstallTargetType);
-  return preparation.concluded(preparation.coordinator->setInstallOptions(options),
-                               "%s|set install options on coordinator for %{public}@",
-                               "%s|Error %{public}@ setting install options on coordinator for '%{public}@'");
+  return preparation.report(preparation.coordinator->setInstallOptions(options),
+                            "%s|set install options on coordinator for %{public}@",
+                            "%s|Error %{public}@ setting install options on coordinator for '%{public}@'");
 }
 
 /// There are none: everything that the app needs comes in its package.
@@ -49,9 +50,9 @@ bool provideOnDemandResources(InstallPreparation& preparation) {
     preparation.log.message("%s|coordinator for %{public}@ has an ODR app asset promise", preparation.identifier);
     return true;
   }
-  return preparation.concluded(preparation.coordinator->setInitialODRAssetPromises({}),
-                               "%s|set ODR asset promise to install coordinator for %{public}@",
-                               "%s|Error %{public}@ setting ODR asset promise for '%{public}@'");
+  return preparation.report(preparation.coordinator->setInitialODRAssetPromises({}),
+                            "%s|set ODR asset promise to install coordinator for %{public}@",
+                            "%s|Error %{public}@ setting ODR asset promise for '%{public}@'");
 }
 
 /// The promise has no path yet: the package is still to come.
@@ -74,11 +75,15 @@ void giveUp(const InstallPreparation& preparation) {
 }  // namespace
 
 bool AppsClient::prepareAppForInstallUsingCoordination(const ZTAsset& asset, bool existingApp) {
-  InstallPreparation preparation{{*this, _platform, _log, asset.identifier()}, asset};
+  platform::FileSystem& files = _platform.fileSystem();
+  InstallPreparation preparation{{*this, _platform, _log, asset.identifier()},
+                                 asset,
+                                 readDictionary(files, asset.infoPlist()),
+                                 readDictionary(files, asset.storePlist())};
   const std::string& identifier = asset.identifier();
   _log.summary(
       "%s|processing app install for bundle '%{public}@', title %{public}@ assetplist %{public}@, version %{public}@ with install coordination",
-      identifier, asset.prettyName(), preparation.info, preparation.version);
+      identifier, asset.prettyName(), preparation.info, asset.version());
   beginStep(_platform.transactionLog(), TransactionStep::installApp, identifier,
             existingApp ? "Update app" : "Install App");
 

@@ -65,7 +65,7 @@ void configurePlaceholder(InstallPreparation& preparation) {
   const plist::Dictionary* info = preparation.info.dictionary();
   auto attributes = platform::PlaceholderAttributes::initWithInfoPlistDictionary(info ? *info : plist::Dictionary{});
   attributes.setLaunchProhibited(booleanIn(preparation.info.find(kLaunchProhibitedKey)));
-  attributes.setBundleVersion(ownedStringIn(preparation.version));
+  attributes.setBundleVersion(ownedStringIn(preparation.asset.version()));
   if (const Status set = placeholder.setPlaceholderAttributes(attributes); !set) {
     preparation.error = set.error();
     preparation.log.error("%s|Error %{public}@ setting attributes on placeholder for '%{public}@'", set.error(),
@@ -74,14 +74,14 @@ void configurePlaceholder(InstallPreparation& preparation) {
   }
   preparation.log.message("%s|set %{public}@ attributes on placeholder for %{public}@", attributes,
                           preparation.identifier);
-  if (!preparation.concluded(placeholder.setMetadata(preparation.storeMetadata),
-                             "%s|set store metadata on placeholder for %{public}@",
-                             "%s|Error %{public}@ setting store metadata on placeholder for '%{public}@'")) {
+  if (!preparation.report(placeholder.setMetadata(preparation.storeMetadata),
+                          "%s|set store metadata on placeholder for %{public}@",
+                          "%s|Error %{public}@ setting store metadata on placeholder for '%{public}@'")) {
     return;
   }
-  preparation.concluded(placeholder.setConfigurationComplete(),
-                        "%s|set placeholder configuration as complete for %{public}@",
-                        "%s|Error %{public}@ setting placeholder configuration as complete for '%{public}@'");
+  preparation.report(placeholder.setConfigurationComplete(),
+                     "%s|set placeholder configuration as complete for %{public}@",
+                     "%s|Error %{public}@ setting placeholder configuration as complete for '%{public}@'");
 }
 
 }  // namespace
@@ -97,9 +97,9 @@ bool providePlaceholder(InstallPreparation& preparation) {
   // With an icon that cannot be attached the placeholder stays unconfigured, and so unseen.
   if (preparation.placeholder && attachIcon(preparation, icon)) configurePlaceholder(preparation);
   const bool handedOver =
-      preparation.concluded(preparation.coordinator->setPlaceholderPromise(preparation.placeholder),
-                            "%s|added placeholder promise to coordinator for %{public}@",
-                            "%s|Error %{public}@ adding placeholder promise to coordinator for '%{public}@'");
+      preparation.report(preparation.coordinator->setPlaceholderPromise(preparation.placeholder),
+                         "%s|added placeholder promise to coordinator for %{public}@",
+                         "%s|Error %{public}@ adding placeholder promise to coordinator for '%{public}@'");
   if (handedOver) preparation.placeholder.reset();
   return handedOver;
 }

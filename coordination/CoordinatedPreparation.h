@@ -25,8 +25,8 @@ struct CoordinatedPreparation {
   std::optional<Error> error = {};                               ///< the last one
 
   /// Notes how a step went, and says it. Returns whether it went well.
-  bool concluded(const Status& outcome, PlugInLog::Format<std::string> done,
-                 PlugInLog::Format<Error, std::string> failed) {
+  bool report(const Status& outcome, PlugInLog::Format<std::string> done,
+              PlugInLog::Format<Error, std::string> failed) {
     if (outcome) {
       log.message(done, identifier);
     } else {

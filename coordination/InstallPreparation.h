@@ -5,16 +5,15 @@
 
 #include "base/PropertyList.h"
 #include "coordination/CoordinatedPreparation.h"
-#include "core/PropertyListFile.h"
 #include "platform/ZTAsset.h"
 
 namespace appsync {
 
 struct InstallPreparation : CoordinatedPreparation {
   const platform::ZTAsset& asset;
-  const plist::Value* version = asset.variantOptions().find(platform::kAssetVersionKey);
-  plist::Value info = readDictionary(platform.fileSystem(), asset.infoPlist());
-  plist::Value store = readDictionary(platform.fileSystem(), asset.storePlist());
+  // What the host says of the app, each null when it does not.
+  plist::Value info;
+  plist::Value store;
 
   std::optional<platform::StoreMetadata> storeMetadata = {};  ///< none when the coordinator had its options before
 };

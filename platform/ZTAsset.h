@@ -57,6 +57,8 @@ class ZTAsset {
   /// "Version" and "AssetParts".
   [[nodiscard]] const plist::Dictionary& variantOptions() const { return variantOptions_; }
   void setVariantOptions(plist::Dictionary options) { variantOptions_ = std::move(options); }
+  /// The first of them, of whichever type it was given; null when there is none.
+  [[nodiscard]] const plist::Value* version() const { return variantOptions_.find(kAssetVersionKey); }
 
   /// The parts that have arrived.
   [[nodiscard]] std::uint32_t completedAssetParts() const { return completedAssetParts_; }

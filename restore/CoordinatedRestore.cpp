@@ -97,9 +97,9 @@ bool provideUserData(RestorePreparation& preparation) {
   }
   const auto promise = preparation.client._userDataPromiseForBundleIdentifier(preparation.identifier);
   if (!promise) return true;
-  const bool isAttached = preparation.concluded(preparation.coordinator->setUserDataPromise(promise),
-                                                "%s|Added out of band user data promise for for %{public}@",
-                                                "%s|Error %{public}@ adding out of band data promise for '%{public}@'");
+  const bool isAttached = preparation.report(preparation.coordinator->setUserDataPromise(promise),
+                                             "%s|Added out of band user data promise for for %{public}@",
+                                             "%s|Error %{public}@ adding out of band data promise for '%{public}@'");
   if (!isAttached) {
     promise->cancelForReason(syncError(SyncFailure::restoreGivenUp), ClientIdentity::CXClientSync).ignore();
   }
@@ -116,8 +116,8 @@ bool providePlaceholder(RestorePreparation& preparation) {
   if (!preparation.placeholder) return false;
   const Status set = preparation.coordinator->setPlaceholderPromise(preparation.placeholder);
   if (set) preparation.client.dataMigratorSetPlaceHolderPromiseForRestoreAppBundle(preparation.identifier);
-  if (!preparation.concluded(set, "%s|added placeholder promise for %{public}@",
-                             "%s|Error %{public}@ setting placeholder promise for '%{public}@'")) {
+  if (!preparation.report(set, "%s|added placeholder promise for %{public}@",
+                          "%s|Error %{public}@ setting placeholder promise for '%{public}@'")) {
     return false;
   }
   preparation.placeholder.reset();
@@ -126,7 +126,7 @@ bool providePlaceholder(RestorePreparation& preparation) {
 
 bool handPackageToStore(RestorePreparation& preparation) {
   return preparation.flow.package == Package::none ||
-         preparation.concluded(
+         preparation.report(
              preparation.coordinator->setAppAssetPromiseResponsibleClient(ClientIdentity::CXClientBazaarly),
              "%s|set CXClientBazaarly to satisfy app asset promise for %{public}@",
              "%s|Error %{public}@ setting CXClientBazaarly to satisfy app data promise for '%{public}@'");

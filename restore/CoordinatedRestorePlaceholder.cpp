@@ -41,23 +41,22 @@ bool setAttributes(CoordinatedPreparation& preparation, const RestoreMetadata& m
 }
 
 bool setStoreMetadata(CoordinatedPreparation& preparation, const plist::Dictionary& metadata) {
-  return preparation.concluded(
-      preparation.placeholder->setMetadata(platform::StoreMetadata::initWithDictionary(metadata)),
-      "%s|set store metadata on placeholder for %{public}@",
-      "%s|Error %{public}@ setting store metadata for '%{public}@'");
+  return preparation.report(preparation.placeholder->setMetadata(platform::StoreMetadata::initWithDictionary(metadata)),
+                            "%s|set store metadata on placeholder for %{public}@",
+                            "%s|Error %{public}@ setting store metadata for '%{public}@'");
 }
 
 /// True without one too.
 bool setLicence(CoordinatedPreparation& preparation, const std::optional<ByteView>& sinf) {
-  return !sinf || preparation.concluded(preparation.placeholder->setSinfData(*sinf),
-                                        "%s|set SINF data on placeholder for %{public}@",
-                                        "%s|Error %{public}@ setting SINF data for '%{public}@'");
+  return !sinf || preparation.report(preparation.placeholder->setSinfData(*sinf),
+                                     "%s|set SINF data on placeholder for %{public}@",
+                                     "%s|Error %{public}@ setting SINF data for '%{public}@'");
 }
 
 bool completeConfiguration(CoordinatedPreparation& preparation) {
-  return preparation.concluded(preparation.placeholder->setConfigurationComplete(),
-                               "%s|set placeholder configuration complete for %{public}@",
-                               "%s|Error %{public}@ setting placeholder configuration as complete for '%{public}@'");
+  return preparation.report(preparation.placeholder->setConfigurationComplete(),
+                            "%s|set placeholder configuration complete for %{public}@",
+                            "%s|Error %{public}@ setting placeholder configuration as complete for '%{public}@'");
 }
 
 }  // namespace

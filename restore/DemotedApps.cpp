@@ -12,10 +12,10 @@ DemotedApps::DemotedApps(std::optional<plist::Dictionary> lists)
       automatically_(identifiersUnder("AutomaticDowngrades")),
       intentionally_(identifiersUnder("IntentionalDowngrades")) {}
 
-DemotedApps::Identifiers DemotedApps::identifiersUnder(std::string_view key) const {
+DemotedApps::IdentifierViews DemotedApps::identifiersUnder(std::string_view key) const {
   const plist::Value* list = lists_ ? lists_->find(key) : nullptr;
   const plist::Array* entries = list == nullptr ? nullptr : list->array();
-  Identifiers identifiers;
+  IdentifierViews identifiers;
   if (entries == nullptr) return identifiers;
   identifiers.reserve(entries->size());
   for (const plist::Value& entry : *entries) {

@@ -28,14 +28,14 @@ class DemotedApps {
   [[nodiscard]] const std::optional<plist::Dictionary>& lists() const { return lists_; }
 
  private:
-  using Identifiers = std::unordered_set<std::string_view>;
+  using IdentifierViews = std::unordered_set<std::string_view>;
 
-  [[nodiscard]] Identifiers identifiersUnder(std::string_view key) const;
+  [[nodiscard]] IdentifierViews identifiersUnder(std::string_view key) const;
 
   const std::optional<plist::Dictionary> lists_;
   // Refer to the lists.
-  const Identifiers automatically_;
-  const Identifiers intentionally_;
+  const IdentifierViews automatically_;
+  const IdentifierViews intentionally_;
 };
 
 }  // namespace appsync

@@ -22,7 +22,8 @@ bool AppsClient::_placeholderExistsForApplication(std::string_view bundleIdentif
   bool found = userBundles != nullptr && userBundles->contains(bundleIdentifier);
   if (userBundles == nullptr) {
     _platform.defaultRegistry().enumerateBundlesOfType(BundleKind::User, [&](const BundleRecord& bundle, bool& stop) {
-      found = stop = bundle.applicationIdentifier() == bundleIdentifier;
+      found = bundle.applicationIdentifier() == bundleIdentifier;
+      stop = found;
     });
   }
   if (found) _log.message("%s|Found placeholder for bundle %{public}@", bundleIdentifier);

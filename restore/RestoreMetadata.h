@@ -18,6 +18,7 @@ inline constexpr PlugInLog::Format<std::string_view, Error> kRestoreMetadataUnre
 class RestoreMetadata {
  public:
   explicit RestoreMetadata(const plist::Dictionary& metadata) : metadata_(metadata) {}
+  explicit RestoreMetadata(plist::Dictionary&&) = delete;
 
   [[nodiscard]] std::optional<std::string> displayName() const;
   /// A string, or null.

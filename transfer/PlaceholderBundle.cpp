@@ -16,7 +16,7 @@ using platform::TSInstallType;
 PlaceholderInfo describePlaceholder(const platform::ZTAsset& asset, const plist::Value& hostInfo) {
   const plist::Value* isPeriodical = hostInfo.find(kPeriodicalKey);
   return {.bundleIdentifier = asset.identifier(),
-          .version = asset.variantOptions().find(platform::kAssetVersionKey),
+          .version = asset.version(),
           .displayName = asset.prettyName(),
           .isPeriodical = isPeriodical == nullptr ? plist::Value(false) : *isPeriodical,
           .isLaunchProhibited = booleanIn(hostInfo.find(kLaunchProhibitedKey))};

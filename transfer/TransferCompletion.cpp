@@ -34,10 +34,6 @@ void showTransfer(InstallProgress& progress, double fraction) {
   progress.setCompletedUnitCount(completedUnits(fraction));
 }
 
-const plist::Value* versionOf(const ZTAsset& asset) {
-  return asset.variantOptions().find(platform::kAssetVersionKey);
-}
-
 }  // namespace
 
 std::shared_ptr<InstallProgress> AppsClient::_progressForAssetIdentifier(std::string_view identifier) {
@@ -122,7 +118,7 @@ void AppsClient::_handleReceivedAsset(const std::shared_ptr<ZTAsset>& asset, Tra
 std::optional<plist::Value> AppsClient::_receivedPath(const ZTAsset& asset) {
   if (asset.path().value_or("").empty()) {
     return _accessQueue.sync(
-        [&] { return _restoreStatePropertyForKey(kRestoreStatePathKey, asset.identifier(), versionOf(asset)); });
+        [&] { return _restoreStatePropertyForKey(kRestoreStatePathKey, asset.identifier(), asset.version()); });
   }
   if (asset.path()->starts_with('/')) return *asset.path();
   return std::string(kPublicStaging) + "/" + *asset.path();
@@ -153,7 +149,7 @@ void AppsClient::_handleReceivedRestoreAsset(const std::shared_ptr<ZTAsset>& ass
   _log.message("%s|Restore data exists for %{public}@", identifier);
   if (progress != nullptr) progress->setInstallPhase(TSInstallPhase::RestoringData);
   _accessQueue.sync(
-      [&] { _setRestoreStatePropertyValue(*asset->path(), kRestoreStatePathKey, identifier, versionOf(*asset)); });
+      [&] { _setRestoreStatePropertyValue(*asset->path(), kRestoreStatePathKey, identifier, asset->version()); });
 }
 
 void AppsClient::_handleFailedTransfer(const ZTAsset& asset, const std::optional<Error>& error, TransferMarks marks,

@@ -46,7 +46,8 @@ TEST(RestoreMetadata, APeriodicalIsOneOnlyWhenItSaysSo) {
   const plist::Dictionary no{{"UIPeriodixApp", plist::Dictionary{{"a", true}}}};
   EXPECT_TRUE(RestoreMetadata(yes).isPeriodical());
   EXPECT_FALSE(RestoreMetadata(no).isPeriodical());
-  EXPECT_FALSE(RestoreMetadata({}).isPeriodical());
+  const plist::Dictionary empty;
+  EXPECT_FALSE(RestoreMetadata(empty).isPeriodical());
 }
 
 }  // namespace
