@@ -27,7 +27,8 @@ constexpr const char* kExamples = R"(Examples:
   appsync apps phone                    what is on it now
   appsync screen phone -o screen.png    what its home screen looks like
 
-Exit status: 0 done, 1 some app failed, 2 wrong usage, 3 the device, library, backup or file cannot be used.
+Exit status: 0 done, 1 some app failed, 2 wrong usage, 3 the device, library, backup, file or plug-in cannot be used.
+Environment: APPSYNC_MODULE is the file of the plug-in to load, instead of the one installed with this program.
 `appsync COMMAND --help` tells more about a command.)";
 
 void addCommands(CLI::App& line, Invocation& invocation) {

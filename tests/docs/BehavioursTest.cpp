@@ -105,8 +105,9 @@ TEST(Behaviours, EveryBehaviourNamesTestsThatExist) {
 }
 
 /// Whose tests prove what is promised to others.
-constexpr std::array kFolders = {"tests/core",      "tests/transfer", "tests/coordination", "tests/restore",
-                                 "tests/reporting", "tests/faults",   "tests/integration",  "kit/contracts"};
+constexpr std::array kFolders = {"tests/core",        "tests/transfer",  "tests/coordination",
+                                 "tests/restore",     "tests/reporting", "tests/faults",
+                                 "tests/integration", "tests/module",    "kit/contracts"};
 
 /// The tests in a source that the document does not name.
 Strings unnamedTestsIn(const std::string& source, const std::string& document) {
