@@ -1,6 +1,7 @@
 // Suites come out of an archive: that each one is run, and is not empty, is no matter of course.
 #include <filesystem>
 #include <fstream>
+#include <iterator>
 #include <map>
 #include <regex>
 #include <string>
@@ -47,6 +48,13 @@ TEST(Suites, EachIsRunOverTheFakesAndTheEmbeddedDevice) {
     EXPECT_GT(tests["Fakes/" + suite], 0) << suite;
     EXPECT_GT(tests["Device/" + suite], 0) << suite;
   }
+}
+
+TEST(Suites, EachIsNamedInThePortingGuide) {
+  std::ifstream file(std::string(kSourceFolder) + "/docs/porting.md");
+  const std::string guide{std::istreambuf_iterator<char>(file), {}};
+  for (const std::string& suite : suitesInHeaders())
+    EXPECT_NE(guide.find('`' + suite + '`'), std::string::npos) << suite;
 }
 
 }  // namespace appsync::test
