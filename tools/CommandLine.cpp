@@ -47,6 +47,10 @@ void addCommands(CLI::App& line, Invocation& invocation) {
   addPlistCommand(line, invocation);
 }
 
+bool isCommand(const CLI::App& line, const std::string& word) {
+  return !line.get_subcommands([&](const CLI::App* command) { return command->get_name() == word; }).empty();
+}
+
 /// The command that was recognised before parsing went wrong, for the hint at its help.
 std::string namedCommand(const CLI::App& line) {
   const auto named = line.get_subcommands();
@@ -79,6 +83,10 @@ ExitStatus runCommandLine(int count, const char* const* words) {
   addCommands(line, invocation);
   if (count <= 1) {
     printError("a command is missing; `appsync --help` shows them");
+    return ExitStatus::wrongUsage;
+  }
+  if (const std::string first = words[1]; !first.starts_with('-') && !isCommand(line, first)) {
+    printError("there is no command \"" + first + "\"; `appsync --help` shows them");
     return ExitStatus::wrongUsage;
   }
   try {

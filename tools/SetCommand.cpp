@@ -68,10 +68,21 @@ Examples:
   appsync set phone app-removal=unset app-installation=unset
   appsync set phone coordination=off)";
 
+/// Sets a setting. Who names none hears of the deeds as well.
+Status assignSetting(device::Settings& settings, const std::string& assignment) {
+  Status set = settings.assign(assignment);
+  const bool isKnown = set || set.error().code != static_cast<long>(device::SettingsFailure::unknownKey);
+  if (isKnown) return set;
+  Error unknown = set.error();
+  for (const Deed& deed : kDeeds)
+    unknown.text.append(", ").append(deed.key);
+  return unknown;
+}
+
 Status assign(device::Device& device, const std::string& assignment) {
   const std::size_t equals = assignment.find('=');
   const auto deed = std::ranges::find(kDeeds, std::string_view(assignment).substr(0, equals), &Deed::key);
-  if (equals == assignment.npos || deed == kDeeds.end()) return device.services().settings().assign(assignment);
+  if (equals == assignment.npos || deed == kDeeds.end()) return assignSetting(device.services().settings(), assignment);
   return deed->perform(device, assignment.substr(equals + 1));
 }
 
