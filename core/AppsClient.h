@@ -255,6 +255,10 @@ class AppsClient final : public platform::ZTClient,
 
   /// dataMigratorSetPlaceHolderPromiseForRestoreAppBundle: that app's placeholder is awaited from now on.
   void dataMigratorSetPlaceHolderPromiseForRestoreAppBundle(std::string_view bundleIdentifier);
+  /// The same once `setPromise` has succeeded; no report of the placeholder is taken up between the two. Returns what
+  /// `setPromise` does.
+  [[nodiscard]] Status dataMigratorSetPlaceHolderPromiseForRestoreAppBundle(std::string_view bundleIdentifier,
+                                                                            const std::function<Status()>& setPromise);
   /// dataMigratorCancelledCoordinatorForRestoreAppBundle: it is not awaited any more.
   void dataMigratorCancelledCoordinatorForRestoreAppBundle(std::string_view bundleIdentifier);
   /// cnDidInstallPlaceHolderForAppBundle: it has come.
@@ -292,6 +296,7 @@ class AppsClient final : public platform::ZTClient,
   [[nodiscard]] Identifiers _userBundles();
   [[nodiscard]] bool _buildRestorePlaceholder(const std::string& folder, const PlaceholderInfo& placeholder,
                                               const std::optional<ByteView>& icon);
+  void _awaitPlaceholder(std::string_view bundleIdentifier);
   [[nodiscard]] bool _stopAwaitingPlaceholder(std::string_view bundleIdentifier);
   [[nodiscard]] std::shared_ptr<platform::ZTAsset> _makeAsset(const WantedEntry& entry,
                                                               const std::optional<std::string>& displayName,

@@ -77,8 +77,6 @@ class InstallCoordinator {
   [[nodiscard]] virtual Status setUserDataPromise(std::shared_ptr<PromisedOutOfBandTransfer> promise) = 0;
 
   /// Null is a failure. Once set the placeholder is the coordinator's, and shown if its configuration is complete.
-  /// Leave a moment before that is reported: a client counts the placeholder as awaited when this has returned, ignores
-  /// a report that came before, and then waits in vain.
   [[nodiscard]] virtual bool hasPlaceholderPromise() const = 0;
   [[nodiscard]] virtual Status setPlaceholderPromise(std::shared_ptr<Placeholder> placeholder) = 0;
 

@@ -114,8 +114,9 @@ bool providePlaceholder(RestorePreparation& preparation) {
   preparation.placeholder = preparation.client._placeHolderForBundleIdentifierWithHarvoMetadata(
       preparation.identifier, preparation.metadata, preparation.sinf, preparation.icon, preparation.status);
   if (!preparation.placeholder) return false;
-  const Status set = preparation.coordinator->setPlaceholderPromise(preparation.placeholder);
-  if (set) preparation.client.dataMigratorSetPlaceHolderPromiseForRestoreAppBundle(preparation.identifier);
+  // In one: the service may report the placeholder before this call returns, and then it must be awaited already.
+  const Status set = preparation.client.dataMigratorSetPlaceHolderPromiseForRestoreAppBundle(
+      preparation.identifier, [&] { return preparation.coordinator->setPlaceholderPromise(preparation.placeholder); });
   if (!preparation.report(set, "%s|added placeholder promise for %{public}@",
                           "%s|Error %{public}@ setting placeholder promise for '%{public}@'")) {
     return false;

@@ -4,13 +4,15 @@
 namespace appsync {
 
 void AppsClient::dataMigratorSetPlaceHolderPromiseForRestoreAppBundle(std::string_view bundleIdentifier) {
-  _restoreQueue.sync([&] {
-    if (!_placeholdersForRestoringApps.emplace(bundleIdentifier).second) return;
-    _restorePlaceHoldersWaitGroup.enter();
-    ++_restoringPlaceholderCount;
-    _log.message(
-        "%s|DataMigrator will wait for CN to install placeholder for %{public}@, _restoringPlaceholderCount %lld",
-        bundleIdentifier, _restoringPlaceholderCount.load());
+  _restoreQueue.sync([&] { _awaitPlaceholder(bundleIdentifier); });
+}
+
+Status AppsClient::dataMigratorSetPlaceHolderPromiseForRestoreAppBundle(std::string_view bundleIdentifier,
+                                                                        const std::function<Status()>& setPromise) {
+  return _restoreQueue.sync([&] {
+    Status set = setPromise();
+    if (set) _awaitPlaceholder(bundleIdentifier);
+    return set;
   });
 }
 
@@ -33,6 +35,16 @@ void AppsClient::cnDidInstallPlaceHolderForAppBundle(std::string_view bundleIden
       _log.error("%s|Ignoring notification from CN about installing placeholder for %{public}@", bundleIdentifier);
     }
   });
+}
+
+/// On `_restoreQueue`. Once for each app.
+void AppsClient::_awaitPlaceholder(std::string_view bundleIdentifier) {
+  if (!_placeholdersForRestoringApps.emplace(bundleIdentifier).second) return;
+  _restorePlaceHoldersWaitGroup.enter();
+  ++_restoringPlaceholderCount;
+  _log.message(
+      "%s|DataMigrator will wait for CN to install placeholder for %{public}@, _restoringPlaceholderCount %lld",
+      bundleIdentifier, _restoringPlaceholderCount.load());
 }
 
 /// On `_restoreQueue`. False when it was not awaited.

@@ -286,6 +286,20 @@ TEST_F(CoordinatedRestore, TheCoordinatorReportsToTheClient) {
   EXPECT_TRUE(said("CN finished installing placeholder for com.a, _restoringPlaceholderCount 0"));
 }
 
+/// The service may show it, and report that on its own thread, before the call that hands it over has returned.
+TEST_F(CoordinatedRestore, APlaceholderIsAwaitedBeforeTheServiceCanReportIt) {
+  constexpr int kRounds = 200;
+  platform.coordination.installAutomatically();
+  AppsClient& client = makeClient();
+  for (int round = 0; round < kRounds; ++round) {
+    const std::string identifier = "com.round" + std::to_string(round);
+    EXPECT_TRUE(client.prepareAppForRestoreUsingCoordination(identifier, metadata, sinf, icon,
+                                                             DemotionStatus::intentionallyDemoted));
+    platform.coordination.waitUntilIdle();
+    ASSERT_TRUE(said("CN finished installing placeholder for " + identifier + ", _restoringPlaceholderCount 0"));
+  }
+}
+
 TEST_F(CoordinatedRestore, ACoordinatorDoesNotKeepTheClientAlive) {
   EXPECT_TRUE(prepare());
   platform.coordination.didInstallPlaceholder("com.a");
