@@ -94,6 +94,8 @@ class SameFileEverywhere final : public FakeFileSystem {
     return {};
   }
 
+  [[nodiscard]] std::size_t size() const { return content_.size(); }
+
   std::int64_t reads = 0;
   std::int64_t writes = 0;
 

@@ -25,6 +25,7 @@ constexpr const char* kExamples = R"(Examples:
   appsync backup phone phone-backup     what its apps need to come back
   appsync restore new-phone phone-backup
   appsync apps phone                    what is on it now
+  appsync report phone                  how many they are, and whose
   appsync screen phone -o screen.png    what its home screen looks like
 
 Exit status: 0 done, 1 some app failed, 2 wrong usage, 3 the device, library, backup, file or plug-in cannot be used.
@@ -40,6 +41,7 @@ void addCommands(CLI::App& line, Invocation& invocation) {
   addTapCommand(line, invocation);
   addCancelCommand(line, invocation);
   addAppsCommand(line, invocation);
+  addReportCommand(line, invocation);
   addScreenCommand(line, invocation);
   addHistoryCommand(line, invocation);
   addSetCommand(line, invocation);

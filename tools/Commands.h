@@ -22,6 +22,7 @@ void addRestoreCommand(CLI::App& line, Invocation& invocation);
 void addTapCommand(CLI::App& line, Invocation& invocation);
 void addCancelCommand(CLI::App& line, Invocation& invocation);
 void addAppsCommand(CLI::App& line, Invocation& invocation);
+void addReportCommand(CLI::App& line, Invocation& invocation);
 void addScreenCommand(CLI::App& line, Invocation& invocation);
 void addHistoryCommand(CLI::App& line, Invocation& invocation);
 void addSetCommand(CLI::App& line, Invocation& invocation);

@@ -1,11 +1,9 @@
 // What a restore costs when the backup held many apps: the time must grow with their number and no faster, and memory
 // not beyond the host's file and a few of its apps.
 #include <algorithm>
-#include <atomic>
 #include <cerrno>
-#include <cstdlib>
+#include <functional>
 #include <memory>
-#include <new>
 #include <string>
 #include <utility>
 
@@ -15,37 +13,8 @@
 #include "core/AppsClient.h"
 #include "kit/fakes/FakePlatform.h"
 #include "kit/fakes/TodoList.h"
-
-namespace {
-
-std::atomic<std::size_t> held = 0;
-std::atomic<std::size_t> mostHeld = 0;
-
-}  // namespace
-
-// Every allocation of this program is counted. Not inlined: where both ends are seen, a compiler takes them for a
-// mismatch.
-// NOLINTBEGIN(cppcoreguidelines-no-malloc): this is the allocator.
-[[gnu::noinline]] void* operator new(std::size_t size) {
-  void* memory = std::malloc(size);
-  if (memory == nullptr) throw std::bad_alloc();
-  const std::size_t now = held += malloc_usable_size(memory);
-  std::size_t most = mostHeld;
-  while (now > most && !mostHeld.compare_exchange_weak(most, now)) {
-  }
-  return memory;
-}
-
-[[gnu::noinline]] void operator delete(void* memory) noexcept {
-  held -= malloc_usable_size(memory);
-  std::free(memory);
-}
-
-void operator delete(void* memory, std::size_t) noexcept {
-  operator delete(memory);
-}
-
-// NOLINTEND(cppcoreguidelines-no-malloc)
+#include "tests/HeldMemory.h"
+#include "tests/ManyApps.h"
 
 namespace appsync::bench {
 namespace {
@@ -106,15 +75,8 @@ class Files final : public test::FakeFileSystem {
   [[nodiscard]] std::string temporaryDirectory() override { return "/tmp"; }
 };
 
-class Registry final : public platform::AppRegistry {
+class Registry final : public test::NoApps {
  public:
-  void addObserver(platform::AppRegistryObserver&) override {}
-  void removeObserver(platform::AppRegistryObserver&) override {}
-  [[nodiscard]] bool applicationIsInstalled(std::string_view) override { return false; }
-  [[nodiscard]] std::shared_ptr<const platform::AppRecord> recordForIdentifier(std::string_view,
-                                                                               platform::PlaceholderLookup) override {
-    return nullptr;
-  }
   /// Meets every placeholder that was installed.
   void enumerateBundlesOfType(
       platform::BundleKind,
@@ -127,12 +89,6 @@ class Registry final : public platform::AppRegistry {
     ++installed;
     return {};
   }
-  [[nodiscard]] Status uninstallApplication(std::string_view, const plist::Dictionary&) override { return {}; }
-  [[nodiscard]] std::shared_ptr<platform::InstallProgress> installProgressForApplication(
-      const platform::AppRecord&, platform::TSInstallPhase) override {
-    return nullptr;
-  }
-  void installPhaseFinishedForProgress(platform::InstallProgress&) override {}
 
   std::int64_t installed = 0;
 };
@@ -178,12 +134,11 @@ void processRestoreInfo(benchmark::State& state) {
   for (auto _ : state) {
     state.PauseTiming();
     registry.installed = 0;
-    const std::size_t before = held;
-    files.document = document;
-    mostHeld = before;
-    state.ResumeTiming();
-    client->_processHarvoRestoreInfo();
-    most = mostHeld - before;
+    most = test::memory::mostHeldDuring([&] {
+      files.document = document;
+      state.ResumeTiming();
+      client->_processHarvoRestoreInfo();
+    });
     if (registry.installed != state.range(0)) return state.SkipWithError("not every app got its placeholder");
     if (most > allowedMemory(document, state.range(0))) return state.SkipWithError("it took too much memory");
   }

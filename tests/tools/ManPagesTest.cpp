@@ -166,6 +166,19 @@ TEST_F(JsonInManPages, OfHistoryNamesEveryKeyAndNoOther) {
   EXPECT_EQ(caughtIn(jsonOf("history"), "\\.It Ql (.*)"), keysOf(events.at(0)));
 }
 
+TEST_F(JsonInManPages, OfAReportNamesEveryKeyAndNoOther) {
+  publish("org.b", "1.0", {{"HarvoMetadata.plist", "{corvelId = x;}"}});
+  ASSERT_EQ(sync().status, 1);
+  const tools::Json report = tools::Json::parse(runTool({"report", device(), "--json"}).out);
+  Names seen = {"yes", "no", "unset"};
+  for (const tools::Json& object :
+       {report, report.at("metrics"), report.at("accounts").at(0), report.at("restrictions")}) {
+    const Names keys = keysOf(object);
+    seen.insert(keys.begin(), keys.end());
+  }
+  EXPECT_EQ(caughtIn(jsonOf("report"), "\\.(?:It )?Ql ([A-Za-z-]+)"), seen);
+}
+
 TEST_F(JsonInManPages, OfASyncNamesEveryEventAndKey) {
   Names seen = {"event"};
   for (const std::vector<std::string>& words : {std::vector<std::string>{}, {"--remove", "org.a"}}) {

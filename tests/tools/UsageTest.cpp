@@ -87,8 +87,8 @@ TEST_P(Help, SaysHowToCallIt) {
 }
 
 INSTANTIATE_TEST_SUITE_P(Commands, Help,
-                         testing::Values("init", "pack", "sync", "backup", "restore", "tap", "cancel", "apps", "screen",
-                                         "history", "set", "clear", "plist"),
+                         testing::Values("init", "pack", "sync", "backup", "restore", "tap", "cancel", "apps", "report",
+                                         "screen", "history", "set", "clear", "plist"),
                          [](const auto& command) { return std::string(command.param); });
 
 TEST(Usage, TheHelpNamesEveryExitStatus) {

@@ -84,7 +84,7 @@ _appsync_options() {
     pack | screen) options+=(-o --output) ;;
     sync) options+=(--remove --only --json --log) ;;
     restore) options+=(--json --log) ;;
-    apps | history) options+=(--json) ;;
+    apps | report | history) options+=(--json) ;;
     plist) options+=(--to -o --output) ;;
   esac
   _appsync_offer '' "${options[@]}"
@@ -103,7 +103,7 @@ _appsync() {
   kept="${typed%"$piece"}"
   if [[ ${#words[@]} -le 2 ]]; then
     [[ "$typed" == -* ]] && _appsync_offer '' -h --help && return
-    _appsync_offer '' init pack sync backup restore tap cancel apps screen history set clear plist
+    _appsync_offer '' init pack sync backup restore tap cancel apps report screen history set clear plist
     return
   fi
 

@@ -90,6 +90,7 @@ for command in \
     'tap:Have a running sync bring an app before the others' \
     'cancel:Have a running sync leave an app out' \
     'apps:List the apps on a device' \
+    'report:Tell how many apps a device holds, and whose they are' \
     "screen:Draw the device's home screen" \
     'history:Show what was installed and removed, and how that went' \
     "set:Change a device's settings" \
@@ -99,7 +100,7 @@ for command in \
     complete -c appsync -n 'test (count (commandline -opc)) -eq 1' -a $parts[1] -d $parts[2]
 end
 
-for command in init sync backup restore tap cancel apps screen history set clear
+for command in init sync backup restore tap cancel apps report screen history set clear
     complete -c appsync -n "__appsync_expects $command 0" -a '(__fish_complete_directories (commandline -ct) "")'
 end
 for command in sync backup restore
@@ -121,7 +122,7 @@ for command in sync restore
     complete -c appsync -n "__appsync_expects $command" -l json -d 'write JSON Lines'
     complete -c appsync -n "__appsync_expects $command" -l log -rF -d "append the sync framework's log to this file"
 end
-for command in apps history
+for command in apps report history
     complete -c appsync -n "__appsync_expects $command" -l json -d 'write JSON'
 end
 complete -c appsync -n '__appsync_expects screen' -s o -l output -rF -d 'the PNG file to write'
