@@ -11,9 +11,9 @@ namespace appsync::platform {
 class InstallCoordinator;
 
 /// Hears of coordinators, on threads of the service's own: one callback at a time to each delegate, in the order in
-/// which things happened, and none with a lock of the service held, so that a callback may call the service. No operation
-/// of the service waits for a callback: a callback may wait until its client's operation has returned. A coordinator is
-/// the service's and valid during the callback. Each is optional.
+/// which things happened, and none with a lock of the service held, so that a callback may call the service. No
+/// operation of the service waits for a callback: a callback may wait until its client's operation has returned. A
+/// coordinator is the service's and valid during the callback. Each is optional.
 class InstallObserverDelegate {
  public:
   virtual ~InstallObserverDelegate() = default;
