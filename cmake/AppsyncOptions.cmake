@@ -55,10 +55,12 @@ if(APPSYNC_SANITIZE)
   endif()
   target_compile_options(appsync_options INTERFACE ${compile_flags})
   target_link_options(appsync_options INTERFACE ${link_flags})
+  set(APPSYNC_INSTRUMENTATION ${link_flags}) # what a program must be linked with beside our libraries
 endif()
 
 if(APPSYNC_COVERAGE)
   # Atomic counters: the tests run many threads. Absolute paths: headers are found through symbolic links.
   target_compile_options(appsync_options INTERFACE --coverage -fprofile-update=atomic -fprofile-abs-path)
   target_link_options(appsync_options INTERFACE --coverage)
+  set(APPSYNC_INSTRUMENTATION --coverage)
 endif()

@@ -9,8 +9,8 @@
 
 namespace appsync::platform {
 
-/// Goes up with every change to base/ or platform/ after which daemon and module only fit when both are compiled anew:
-/// a virtual function, a field, what an inline function does.
+/// Goes up with every change of base/ or platform/ after which both sides must be compiled anew: a virtual function, a
+/// field, what an inline function does.
 inline constexpr std::uint32_t kModuleInterfaceVersion = 1;
 
 /// The only symbol of a module, for `dlsym`. Its type is `ModuleEntryPoint`.
@@ -25,21 +25,18 @@ struct ModuleAnswer {
 
 extern "C" {
 
-/// What a module defines. `interfaceVersion` is the daemon's `kModuleInterfaceVersion`. With another than its own the
-/// module looks at nothing but `answer` and refuses; a daemon, for its part, uses no client of a module whose answer
-/// names another version than its own. Either way the two must be of one release.
+/// What a module defines: makes a new client at each call, or says why not in `answer`, which it always fills. Throws
+/// nothing. Threads: any.
 ///
-/// Ownership: `*client`, empty before, becomes one share of a new client, or stays empty. Queued work and callbacks
-/// keep shares of their own, so the client may outlive the daemon's. `platform` outlives all of them. `answer` is the
-/// caller's.
+/// Versions: `interfaceVersion` is the daemon's. A module of another one looks at nothing but `answer`, and refuses; a
+/// daemon uses no client of a module whose answer names another one. The two must be of one release and built with the
+/// same C++ standard library and ABI, whose objects and memory pass between them.
 ///
-/// Threads: any, and each call makes a client of its own. Errors: it throws nothing and fills `answer` in every case.
+/// Ownership: `*client`, empty before, becomes a share of the client. Queued work and callbacks have shares too, so the
+/// client may outlive the daemon's, but never `platform`.
 ///
-/// Loading: `dlopen` with RTLD_NOW | RTLD_LOCAL; a module needs no symbol of the daemon. Objects of standard types, and
-/// memory, cross the border, so both must be built with the same C++ standard library and its same ABI.
-///
-/// Unloading: `dlclose` may be called at any time and frees nothing: a module's code stays until the process ends,
-/// because threads, and values that it made, may outlive every client.
+/// Loading: `dlopen` with RTLD_NOW | RTLD_LOCAL. `dlclose` may come at any time and frees nothing: threads and values
+/// of a module may outlive its clients, so its code stays until the process ends.
 [[gnu::visibility("default")]] void appsyncMakeClient(std::uint32_t interfaceVersion, Platform* platform,
                                                       std::shared_ptr<ZTClient>* client, ModuleAnswer* answer) noexcept;
 }

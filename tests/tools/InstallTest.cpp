@@ -68,7 +68,7 @@ TEST_F(Install, EveryHeaderFindsTheOthersThatItIncludes) {
 TEST_F(Install, ThePublicHeadersNeedOneIncludeRootAndTheStandardLibrary) {
   write(path("user.cpp"),
         "#include \"core/AppsClient.h\"\n#include \"core/SyncFiles.h\"\n#include \"platform/Module.h\"\n");
-  const Finished compiled = run("c++", {"-std=c++20", "-fsyntax-only", "-I" + headers(), path("user.cpp")});
+  const Finished compiled = run(kCompiler, {"-std=c++20", "-fsyntax-only", "-I" + headers(), path("user.cpp")});
   EXPECT_EQ(compiled.status, 0) << compiled.err;
 }
 
@@ -91,8 +91,10 @@ TEST_F(Install, PkgConfigFindsLibrariesAndModule) {
   write(path("user.cpp"),
         "#include \"core/AppsClient.h\"\nint main() { return &appsync::AppsClient::create == nullptr; }\n");
   const std::string flags = run("pkg-config", {"--cflags", "--libs", "appsync"}, there).out;
-  const std::string command = "c++ -std=c++20 -o '" + path("user") + "' '" + path("user.cpp") + "' " + flags;
-  EXPECT_EQ(run("sh", {"-c", command}).status, 0);
+  const std::string compiler = std::string(kCompiler) + " " + kInstrumentation;
+  const std::string command = compiler + " -std=c++20 -o '" + path("user") + "' '" + path("user.cpp") + "' " + flags;
+  const Finished linked = run("sh", {"-c", command});
+  EXPECT_EQ(linked.status, 0) << linked.err;
 }
 
 TEST_F(Install, ThereIsHelpInEachForm) {
