@@ -26,8 +26,8 @@ struct Shell {
   const char* script;
 };
 
-void PrintTo(const Shell& shell, std::ostream* out) {
-  *out << shell.name;
+std::ostream& operator<<(std::ostream& out, const Shell& shell) {
+  return out << shell.name;
 }
 
 std::string nameOf(const testing::TestParamInfo<Shell>& shell) {
@@ -196,7 +196,7 @@ TEST_P(Completions, CommandsAndOptionsAreDescribedAsInTheHelp) {
   std::ifstream file(scriptsFolder() + "/" + GetParam().script);
   std::string script{std::istreambuf_iterator<char>(file), {}};
   for (const auto& [command, purpose] : helpOf().commands) {
-    EXPECT_THAT(script, HasSubstr(command + ":" + purpose));
+    EXPECT_THAT(script, HasSubstr(std::string(command).append(":").append(purpose)));
     for (const auto& [option, description] : helpOf(command).options)
       EXPECT_THAT(script, HasSubstr(description)) << command << " " << option;
   }

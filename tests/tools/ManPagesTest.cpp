@@ -108,7 +108,8 @@ TEST(ManPages, TellTheSamePurposeAsTheHelp) {
     std::string small = purpose;
     small[0] = static_cast<char>(std::tolower(static_cast<unsigned char>(small[0])));
     EXPECT_THAT(pageOf(command), HasSubstr("\n.Nd " + small + "\n"));
-    EXPECT_THAT(pageOf(""), HasSubstr(".It Xr appsync-" + command + " 1\n" + small + "\n"));
+    EXPECT_THAT(pageOf(""),
+                HasSubstr(std::string(".It Xr appsync-").append(command).append(" 1\n").append(small).append("\n")));
     EXPECT_EQ(helpOf(command).purpose, purpose);
   }
 }
