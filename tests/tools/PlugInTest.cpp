@@ -102,6 +102,13 @@ TEST_F(PlugIn, CommandsThatNeedNoneDoWithoutIt) {
     EXPECT_EQ(runTool({command, device()}, withModule(path("none.so"))).status, 0) << command;
 }
 
+TEST_F(PlugIn, WithoutItNothingIsReported) {
+  const Finished run = runTool({"report", device()}, withModule(path("none.so")));
+  EXPECT_EQ(run.status, 3);
+  EXPECT_EQ(run.out, "");
+  EXPECT_THAT(run.err, HasSubstr(kWhatToDo));
+}
+
 TEST_F(PlugIn, WithoutItABackupIsNotBegun) {
   const Finished run = runTool({"backup", device(), path("backup")}, withModule(path("none.so")));
   EXPECT_EQ(run.status, 3);
