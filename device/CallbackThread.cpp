@@ -19,11 +19,11 @@ void CallbackThread::stop() {
   if (thread_.joinable()) thread_.join();
 }
 
-void CallbackThread::post(const void* receiver, std::function<void()> callback, Clock::time_point due) {
+void CallbackThread::post(const void* receiver, std::function<void()> callback) {
   {
     const std::lock_guard lock(mutex_);
     if (stopping_) return;
-    queued_.push_back({receiver, std::move(callback), due});
+    queued_.push_back({receiver, std::move(callback)});
     if (!thread_.joinable()) thread_ = std::thread([this] { run(); });
   }
   changed_.notify_all();
@@ -44,11 +44,6 @@ void CallbackThread::run() {
   for (;;) {
     changed_.wait(lock, [this] { return stopping_ || !queued_.empty(); });
     if (stopping_) return;
-    // It may be forgotten meanwhile.
-    if (const auto due = queued_.front().due; due > Clock::now()) {
-      changed_.wait_until(lock, due);
-      continue;
-    }
     Callback callback = std::move(queued_.front());
     queued_.pop_front();
     running_ = callback.receiver;

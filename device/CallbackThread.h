@@ -1,7 +1,6 @@
 // A thread of a service's own, on which observers are called back.
 #pragma once
 
-#include <chrono>
 #include <condition_variable>
 #include <deque>
 #include <functional>
@@ -20,11 +19,8 @@ class CallbackThread {
   CallbackThread(const CallbackThread&) = delete;
   CallbackThread& operator=(const CallbackThread&) = delete;
 
-  using Clock = std::chrono::steady_clock;
-
-  /// Queues a callback to `receiver`, which is compared only, never followed, and not null. It does not run before
-  /// `due`, and neither does what is queued after it.
-  void post(const void* receiver, std::function<void()> callback, Clock::time_point due = {});
+  /// Queues a callback to `receiver`, which is compared only, never followed, and not null.
+  void post(const void* receiver, std::function<void()> callback);
 
   /// Drops what is queued for `receiver`. When this returns no callback to it runs on another thread and, until the
   /// next `post` for it, none will begin; on the callback thread itself it does not wait.
@@ -38,7 +34,6 @@ class CallbackThread {
   struct Callback {
     const void* receiver;
     std::function<void()> function;
-    Clock::time_point due;
   };
 
   void run();

@@ -42,29 +42,22 @@ void CoordinatorObservers::disconnect(const Connection& connection) {
   callbacks_.forget(&connection);
 }
 
-void CoordinatorObservers::tell(ClientIdentity creator, const Observer& observer, const Report& report,
-                                std::chrono::milliseconds delay) {
-  const auto due = CallbackThread::Clock::now() + delay;
+void CoordinatorObservers::tell(ClientIdentity creator, const Observer& observer, const Report& report) {
   const std::lock_guard lock(mutex_);
   std::vector<const void*> told;
   for (const Connection* connection : connections_) {
     InstallObserverDelegate* delegate = &connection->delegate();
     if (!connection->wants(creator) || std::ranges::find(told, delegate) != told.end()) continue;
     told.push_back(delegate);
-    post(
-        connection, [report, delegate] { report(*delegate); }, due);
+    post(connection, [report, delegate] { report(*delegate); });
   }
   if (observer.address == nullptr || std::ranges::find(told, observer.address) != told.end()) return;
-  post(
-      this,
-      [report, weak = observer.delegate] {
-        if (const auto delegate = weak.lock()) report(*delegate);
-      },
-      due);
+  post(this, [report, weak = observer.delegate] {
+    if (const auto delegate = weak.lock()) report(*delegate);
+  });
 }
 
-void CoordinatorObservers::post(const void* receiver, std::function<void()> callback,
-                                CallbackThread::Clock::time_point due) {
+void CoordinatorObservers::post(const void* receiver, std::function<void()> callback) {
   {
     const std::lock_guard lock(pendingMutex_);
     ++pending_;
@@ -75,8 +68,7 @@ void CoordinatorObservers::post(const void* receiver, std::function<void()> call
     const std::lock_guard lock(self->pendingMutex_);
     if (--self->pending_ == 0) self->told_.notify_all();
   });
-  callbacks_.post(
-      receiver, [callback = std::move(callback), pending] { callback(); }, due);
+  callbacks_.post(receiver, [callback = std::move(callback), pending] { callback(); });
 }
 
 bool CoordinatorObservers::waitUntilTold(std::chrono::steady_clock::time_point deadline) {

@@ -30,10 +30,8 @@ class CoordinatorObservers : public std::enable_shared_from_this<CoordinatorObse
   [[nodiscard]] std::unique_ptr<platform::InstallObserver> connect(const std::set<platform::ClientIdentity>& clients,
                                                                    platform::InstallObserverDelegate& delegate);
 
-  /// Tells all connections that want to hear of `creator`'s coordinators, and `observer`, each delegate once, after
-  /// `delay` and in the order of the calls.
-  void tell(platform::ClientIdentity creator, const Observer& observer, const Report& report,
-            std::chrono::milliseconds delay = {});
+  /// Tells all connections that want to hear of `creator`'s coordinators, and `observer`, each delegate once.
+  void tell(platform::ClientIdentity creator, const Observer& observer, const Report& report);
 
   /// False when not everybody has been told everything by then. Not on the callbacks' thread.
   [[nodiscard]] bool waitUntilTold(std::chrono::steady_clock::time_point deadline);
@@ -45,7 +43,7 @@ class CoordinatorObservers : public std::enable_shared_from_this<CoordinatorObse
   class Connection;
 
   void disconnect(const Connection& connection);
-  void post(const void* receiver, std::function<void()> callback, CallbackThread::Clock::time_point due);
+  void post(const void* receiver, std::function<void()> callback);
 
   std::mutex mutex_;
   std::vector<const Connection*> connections_;

@@ -122,7 +122,7 @@ Status Coordinators::configure(const std::shared_ptr<PlaceholderState>& placehol
   }
   static_cast<PlaceholderConfiguration&>(*placeholder) = std::move(copy);
   if (!isToShow) return {};
-  tellPlaceholder(coordinator);
+  tell(coordinator, &InstallObserverDelegate::coordinatorDidInstallPlaceholder);
   followPromise(*coordinator);
   endIfDemoted(coordinator);
   return {};

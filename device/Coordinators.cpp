@@ -16,9 +16,6 @@ using platform::InstallObserverDelegate;
 
 namespace {
 
-/// A client that counts the placeholders that it has yet to hear of begins to do so once one is set.
-constexpr std::chrono::milliseconds kTimeToShow{25};
-
 Status checkPromise(const std::shared_ptr<PromiseState>& promise) {
   if (promise == nullptr) {
     return coordinationError(CoordinationFailure::notUsable, "this is no promise of the service");
@@ -198,7 +195,7 @@ Status Coordinators::setPlaceholder(const Coordinator& coordinator, ClientIdenti
   placeholder->isAttached = true;
   placeholder->coordinator = coordinator;
   if (placeholder->icon) placeholder->icon->coordinator = coordinator;
-  if (placeholder->isConfigured) tellPlaceholder(coordinator);
+  if (placeholder->isConfigured) tell(coordinator, &InstallObserverDelegate::coordinatorDidInstallPlaceholder);
   followPromise(*coordinator);
   advance(coordinator);
   endIfDemoted(coordinator);
@@ -304,15 +301,11 @@ void Coordinators::close(const Coordinator& coordinator, std::optional<Error> er
   if (ofApp->second.empty()) coordinators_.erase(ofApp);
 }
 
-void Coordinators::tell(const Coordinator& coordinator, Report report, std::chrono::milliseconds delay) {
+void Coordinators::tell(const Coordinator& coordinator, Report report) {
   const auto handle = std::make_shared<CoordinatorHandle>(shared_from_this(), coordinator, coordinator->creator);
   observers_->tell(
       coordinator->creator, coordinator->observer,
-      [handle, report = std::move(report)](InstallObserverDelegate& delegate) { report(delegate, *handle); }, delay);
-}
-
-void Coordinators::tellPlaceholder(const Coordinator& coordinator) {
-  tell(coordinator, &InstallObserverDelegate::coordinatorDidInstallPlaceholder, kTimeToShow);
+      [handle, report = std::move(report)](InstallObserverDelegate& delegate) { report(delegate, *handle); });
 }
 
 }  // namespace appsync::device

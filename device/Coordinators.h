@@ -133,8 +133,7 @@ class Coordinators : public std::enable_shared_from_this<Coordinators> {
   void endIfDemoted(const Coordinator& coordinator);
   /// Shows the placeholder again if nothing does.
   void keepShown(const CoordinatorState& coordinator);
-  void tell(const Coordinator& coordinator, Report report, std::chrono::milliseconds delay = {});
-  void tellPlaceholder(const Coordinator& coordinator);
+  void tell(const Coordinator& coordinator, Report report);
 
   // With it or without.
 

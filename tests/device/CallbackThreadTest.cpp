@@ -25,36 +25,6 @@ class CallbackThreadTest : public testing::Test {
   CallbackThread thread;
 };
 
-TEST_F(CallbackThreadTest, WhatIsNotDueYetHoldsUpWhatCameAfterIt) {
-  std::vector<int> order;
-  const auto due = CallbackThread::Clock::now() + std::chrono::milliseconds(5);
-  bool wasDue = false;
-  thread.post(
-      &first,
-      [&] {
-        wasDue = CallbackThread::Clock::now() >= due;
-        order.push_back(1);
-      },
-      due);
-  thread.post(&first, [&] {
-    order.push_back(2);
-    done.signal();
-  });
-  done.wait();
-  EXPECT_TRUE(wasDue);
-  EXPECT_EQ(order, (std::vector<int>{1, 2}));
-}
-
-TEST_F(CallbackThreadTest, WhatIsNotDueYetCanBeForgotten) {
-  bool called = false;
-  thread.post(
-      &first, [&] { called = true; }, CallbackThread::Clock::now() + std::chrono::hours(1));
-  thread.post(&second, [&] { done.signal(); });
-  thread.forget(&first);
-  done.wait();
-  EXPECT_FALSE(called);
-}
-
 TEST_F(CallbackThreadTest, CallsBackInTheOrderOfThePostsOnOneOtherThread) {
   std::vector<int> order;
   std::vector<std::thread::id> threads;

@@ -1,9 +1,7 @@
 #include "tests/faults/WholeSync.h"
 
 #include <array>
-#include <chrono>
 #include <optional>
-#include <thread>
 
 #include <gtest/gtest.h>
 
@@ -16,12 +14,9 @@ namespace appsync::test {
 namespace {
 
 using platform::TSInstallType;
-using platform::ZTAsset;
 
 constexpr std::string_view kRestoreStatePath = "/var/mobile/Library/ApplicationSync/RestoreState.plist";
 constexpr std::string_view kParkedPackage = "/var/mobile/Media/PublicStaging/parked.zip";
-
-constexpr std::string_view kStartupCompleteNotification = "com.corvel.zeph.ZTStartupCompleteNotification";
 
 /// What the host wants on the device.
 const std::map<std::string, std::string> kLibrary{
@@ -40,9 +35,6 @@ bool isRestored(std::string_view identifier) {
 const Error kLostForGood{"ZTError", 7, "the host has lost the package", nullptr};
 const Error kLostForNow{"ZTError", 8, "the host went away", nullptr};
 
-/// More attempts than any single failure can cost.
-constexpr int kMostAttempts = 10;
-
 }  // namespace
 
 std::ostream& operator<<(std::ostream& out, const AppState& state) {
@@ -51,11 +43,7 @@ std::ostream& operator<<(std::ostream& out, const AppState& state) {
 }
 
 WholeSync::WholeSync(Mode mode) : mode_(mode) {
-  if (mode == Mode::coordinated) {
-    platform.coordination.enable();
-    platform.coordination.installAutomatically();
-    platform.coordination.gate.close();
-  }
+  setMode(platform, mode);
   for (const char* identifier : {"com.gone", "com.keep", "com.update"})
     platform.registry.add(FakeApp::installed(identifier));
   for (const char* identifier : {"com.parked", "com.restored"}) {
@@ -70,32 +58,20 @@ WholeSync::WholeSync(Mode mode) : mode_(mode) {
   platform.uninstalledList.add("com.deleted");
   platform.screen.setFlattenedIconState({"com.update", "com.denied"});
   platform.screen.answerNext("com.denied", {AssertionAnswer::denied(), AssertionAnswer::denied()});
-  platform.bundleFolders.setMainBundleIdentifier("com.corvel.zeph");
   platform.framework.judgeErrorsBy([](const Error& error) { return error == kLostForNow; });
 }
 
 void WholeSync::run(Transfers transfers) {
   stage();
-  client_ = AppsClient::create(platform);
-  platform.notify.deliver(kStartupCompleteNotification);
-  client_->prepareForSyncWithHostAnchor(client_->currentSyncAnchor(), {}, nullptr);
-  static_cast<void>(client_->installedAssets());
-  std::optional<Error> error;
-  if (client_->reconcileSync({}, "anchor", {}, &error)) {
-    waitForInstalls();
-    const auto outstanding = client_->outstandingAssetTransfers();
-    waitForInstalls();
-    for (const Asset& asset : outstanding)
-      transfer(asset, transfers);
-    client_->assetTransferEndedWithSuccess(true);
-    waitForInstalls();
-    client_->syncEndedWithSuccess(true);
-  } else {
-    EXPECT_TRUE(error) << "a refused sync must say why";
-    client_->syncEndedWithSuccess(false);
-  }
-  EXPECT_EQ(client_.use_count(), 1) << "work of the plug-in outlives the sync";
-  client_.reset();
+  const auto packageFor = [](const std::string& identifier) {
+    return packageOf(identifier == "com.bad" ? "com.other" : identifier, "2.0");
+  };
+  const auto failureOf = [transfers](const std::string& identifier) -> std::optional<Error> {
+    if (transfers == Transfers::allArrive) return std::nullopt;
+    if (identifier == "com.broken") return kLostForGood;
+    return identifier == "com.flaky" ? std::optional(kLostForNow) : std::nullopt;
+  };
+  DaemonSync(platform, mode_, {packageFor, failureOf}).run();
 }
 
 void WholeSync::restartDevice() {
@@ -158,65 +134,6 @@ bool WholeSync::isWanted(const std::string& identifier, const std::string& versi
   if (mode_ == Mode::coordinated && isRestored(identifier)) return false;
   const auto app = platform.registry.app(identifier);
   return !app || !app->isInstalled || app->version != version;
-}
-
-void WholeSync::transfer(const Asset& asset, Transfers transfers) {
-  const std::string& identifier = asset->identifier();
-  const plist::Value* parts = asset->variantOptions().find(platform::kAssetPartsKey);
-  ASSERT_NE(parts, nullptr);
-  client_->assetTransferUpdatedProgress(asset, 0.5);
-  if (transfers == Transfers::someFail && (identifier == "com.broken" || identifier == "com.flaky")) {
-    client_->assetTransferSucceeded(asset, false, identifier == "com.broken" ? kLostForGood : kLostForNow);
-    waitForInstalls();
-    return;
-  }
-  client_->assetTransferUpdatedProgress(asset, 1.0);
-  if (*parts != plist::Value(platform::kZTAssetPartApplicationData)) send(asset);
-  if (asset->isRestore()) sendData(asset);
-}
-
-void WholeSync::send(const Asset& asset) {
-  const std::string& identifier = asset->identifier();
-  platform.files.put(std::string(kPublicStaging) + "/" + identifier + ".zip",
-                     packageOf(identifier == "com.bad" ? "com.other" : identifier, "2.0"));
-  asset->setPath(identifier + ".zip");
-  asset->setCompletedAssetParts(platform::kZTAssetPartApplication);
-  client_->assetTransferSucceeded(asset, true, std::nullopt);
-  waitForInstalls();
-}
-
-/// The data part is a transfer of its own: an asset whose transfer has ended belongs to the plug-in.
-void WholeSync::sendData(const Asset& asset) {
-  const auto data = std::make_shared<ZTAsset>(asset->identifier(), asset->dataclass(), asset->prettyName());
-  data->setIsDownload(true);
-  data->setIsRestore(true);
-  data->setVariantOptions(asset->variantOptions());
-  data->setCompletedAssetParts(platform::kZTAssetPartApplicationData);
-  client_->assetTransferSucceeded(data, true, std::nullopt);
-  waitForInstalls();
-}
-
-/// While the daemon calls the client the service's thread stands still: all calls come in one order.
-void WholeSync::waitForInstalls() {
-  if (mode_ == Mode::coordinated) {
-    platform.coordination.runUntilIdle();
-  } else {
-    waitForDirectInstalls();
-  }
-}
-
-/// Installs own a share of the client until their last call is over, and so do those that wait to be tried again.
-void WholeSync::waitForDirectInstalls() {
-  for (int attempt = 0; attempt < kMostAttempts; ++attempt) {
-    while (true) {
-      const std::size_t waiting = platform.time.pendingTasks();
-      if (client_.use_count() == static_cast<long>(1 + waiting)) break;
-      std::this_thread::yield();
-    }
-    if (platform.time.pendingTasks() == 0) return;
-    platform.time.advance(std::chrono::seconds(30));
-  }
-  ADD_FAILURE() << "an install is tried again without end";
 }
 
 }  // namespace appsync::test

@@ -3,14 +3,12 @@
 
 #include <cstddef>
 #include <map>
-#include <memory>
 #include <ostream>
 #include <string>
 #include <string_view>
 #include <vector>
 
-#include "core/AppsClient.h"
-#include "kit/fakes/FakePlatform.h"
+#include "tests/faults/DaemonSync.h"
 
 namespace appsync::test {
 
@@ -25,9 +23,6 @@ struct AppState {
 std::ostream& operator<<(std::ostream& out, const AppState& state);
 
 using DeviceState = std::vector<AppState>;
-
-/// How a device installs.
-enum class Mode { direct, coordinated };
 
 /// A device on which everything happens that a sync knows: new apps, an update, a removal, a denied assertion, a
 /// package that no installer takes, transfers that fail for now and for good, a restore whose data follows its package
@@ -54,18 +49,10 @@ class WholeSync {
   FakePlatform platform;
 
  private:
-  using Asset = std::shared_ptr<platform::ZTAsset>;
-
   void stage();
   [[nodiscard]] bool isWanted(const std::string& identifier, const std::string& version) const;
-  void transfer(const Asset& asset, Transfers transfers);
-  void send(const Asset& asset);
-  void sendData(const Asset& asset);
-  void waitForInstalls();
-  void waitForDirectInstalls();
 
   const Mode mode_;
-  std::shared_ptr<AppsClient> client_;
   std::map<std::string, std::string> asked_;
 };
 

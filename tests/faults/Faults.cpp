@@ -1,0 +1,69 @@
+#include "tests/faults/Faults.h"
+
+#include <chrono>
+#include <cstdlib>
+#include <future>
+#include <iostream>
+#include <optional>
+
+#include <gtest/gtest.h>
+
+#include "kit/fakes/TodoList.h"
+
+namespace appsync::test {
+
+namespace {
+
+/// Real time: the end of a test that hangs, never a pace.
+constexpr std::chrono::seconds kPatience(60);
+
+const Error kInjected{"POSIX", 5, "Input/output error", nullptr};
+
+}  // namespace
+
+Fault::Fault(std::size_t number, Extent extent) : number_(number), extent_(extent) {}
+
+CallJournal::Hook Fault::hook() const {
+  return [self = *this](std::string_view operation, std::string_view arguments) -> std::optional<Error> {
+    const std::scoped_lock lock(self.state_->mutex);
+    const std::size_t call = ++self.state_->calls;
+    if (call == self.number_) self.state_->failed = std::string(operation) + " " + std::string(arguments);
+    // What kind of device it is no call changes.
+    if (operation == "installCoordination.coordinationIsEnabled") return std::nullopt;
+    const bool fails = self.extent_ == Extent::once ? call == self.number_ : call >= self.number_;
+    return fails ? std::optional(kInjected) : std::nullopt;
+  };
+}
+
+bool Fault::hasHappened() const {
+  return !call().empty();
+}
+
+std::string Fault::call() const {
+  const std::scoped_lock lock(state_->mutex);
+  return state_->failed;
+}
+
+void expectInOrder(FakePlatform& platform) {
+  EXPECT_EQ(platform.time.pendingTasks(), 0U);
+  EXPECT_TRUE(platform.screen.held().empty()) << "an app stays held";
+  EXPECT_EQ(platform.registry.observerCount(), 0U);
+  EXPECT_EQ(platform.notify.observerCount("com.corvel.zeph.ZTStartupCompleteNotification"), 0U);
+  EXPECT_EQ(platform.backups.connections(), 0U);
+  EXPECT_EQ(platform.store.connections(), 0U);
+  for (const auto& connection : platform.coordination.connections())
+    EXPECT_FALSE(connection.isOpen);
+  for (const std::string& path : platform.files.paths()) {
+    if (!path.ends_with(".plist")) continue;
+    EXPECT_TRUE(propertyListAt(platform.files, path)) << path << " is half written";
+  }
+}
+
+void runWithinPatience(std::size_t number, const std::function<void()>& run) {
+  const auto done = std::async(std::launch::async, run);
+  if (done.wait_for(kPatience) == std::future_status::ready) return;
+  std::cerr << "it hangs when call " << number << " fails\n";
+  std::abort();
+}
+
+}  // namespace appsync::test

@@ -1,0 +1,33 @@
+// The time of a restore's wait.
+#pragma once
+
+#include "kit/fakes/FakePlatform.h"
+
+namespace appsync::test {
+
+/// Virtual time in which nobody waits but for the install-coordination service: it does what it has to do, and if that
+/// was not what the waiter waits for, the deadline is reached. So all calls come in one order.
+class RestoreClock final : public Clock {
+ public:
+  explicit RestoreClock(FakePlatform& platform) : platform_(platform) {}
+
+  [[nodiscard]] TimePoint now() const override { return platform_.time.now(); }
+
+  bool wait(std::condition_variable& condition, std::unique_lock<std::mutex>& lock, TimePoint deadline,
+            const std::function<bool()>& ready) override {
+    if (deadline == kForever) return platform_.time.wait(condition, lock, deadline, ready);
+    lock.unlock();
+    platform_.coordination.runUntilIdle();
+    lock.lock();
+    if (ready()) return true;
+    lock.unlock();
+    if (deadline > now()) platform_.time.advance(deadline - now());
+    lock.lock();
+    return ready();
+  }
+
+ private:
+  FakePlatform& platform_;
+};
+
+}  // namespace appsync::test
