@@ -69,6 +69,7 @@ inline bool BinaryReader::wasSeen(std::uint64_t number) noexcept {
   const std::uint64_t bit = std::uint64_t{1} << number % 64;
   const bool before = (word & bit) != 0;
   word |= bit;
+  if (forgets_ && !before) met_.push_back(number);
   return before;
 }
 
@@ -99,15 +100,22 @@ inline bool BinaryReader::readShortASCII(std::size_t start, std::size_t size, Va
   return true;
 }
 
-void BinaryReader::readObject(std::uint64_t number, int depth, Value& place) {
-  if (number >= objectCount_) return failMissing(number);
+bool BinaryReader::locate(std::uint64_t number, std::size_t& at) {
+  if (number >= objectCount_) {
+    failMissing(number);
+    return false;
+  }
   const std::size_t entry = table_ + static_cast<std::size_t>(number) * offsetSize_;
   const std::uint64_t offset = loadBigEndian(begin_ + entry, offsetSize_);
-  if (offset < kMagic.size() || offset >= table_) {
-    fail(Failure::outOfRange, "An offset outside the objects", entry);
-    return;
-  }
-  const auto at = static_cast<std::size_t>(offset);
+  at = static_cast<std::size_t>(offset);
+  if (offset >= kMagic.size() && offset < table_) return true;
+  fail(Failure::outOfRange, "An offset outside the objects", entry);
+  return false;
+}
+
+void BinaryReader::readObject(std::uint64_t number, int depth, Value& place) {
+  std::size_t at;
+  if (!locate(number, at)) return;
   // Most objects are short strings. Everything before the trailer can be read in whole blocks.
   const unsigned marker = std::to_integer<unsigned>(begin_[at]);
   if (marker >= 0x50 && marker < 0x5F) {

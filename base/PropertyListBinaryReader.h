@@ -42,6 +42,18 @@ class BinaryReader {
     return root;
   }
 
+  // One by one, for a root that is a dictionary.
+
+  /// False when it is none or cannot be read; `read` tells which.
+  [[nodiscard]] bool beginEntries();
+  /// Reads all entries once. Their places, in the order of their keys, without those that a later one replaces.
+  [[nodiscard]] Result<std::vector<std::size_t>> checkEntries();
+  /// What follows reads them once more.
+  void startAgain() noexcept { units_ = 1; }
+  // Null when it cannot be read.
+  [[nodiscard]] Value entryKey(std::size_t place);
+  [[nodiscard]] Value entryValue(std::size_t place);
+
  private:
   /// Where an object's content lies and how many bytes or elements it has.
   struct Extent {
@@ -69,6 +81,10 @@ class BinaryReader {
   void failMissing(std::uint64_t number);
 
   void readTrailer();
+  /// Where an object begins.
+  bool locate(std::uint64_t number, std::size_t& at);
+  void sortByKey(std::vector<std::size_t>& places);
+  void forgetWhatWasShared();
   // Each reads an object into `place`, which holds a null; a null that stays means failure.
   void readObject(std::uint64_t number, int depth, Value& place);
   void readOther(std::uint64_t number, std::size_t at, int depth, Value& place);
@@ -127,6 +143,11 @@ class BinaryReader {
   /// Which long or nested objects were met, a bit for each.
   std::vector<std::uint64_t> seen_;
   std::unordered_map<std::uint64_t, Shared> shared_;
+  /// Whether what was met is forgotten from one entry to the next, and what there is to forget.
+  bool forgets_ = false;
+  std::vector<std::uint64_t> met_;
+  /// The root's, when they are read one by one.
+  Extent entries_{};
   std::array<KnownKeys, 32> knownKeys_;
   /// Text that had to be converted.
   std::string text_;

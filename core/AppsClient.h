@@ -24,6 +24,10 @@
 #include "platform/Platform.h"
 #include "platform/ZTClient.h"
 
+namespace appsync::plist {
+class DocumentEntries;
+}
+
 namespace appsync {
 
 class WantedEntry;
@@ -290,7 +294,7 @@ class AppsClient final : public platform::ZTClient,
                                                                                  bool existingApp);
   void _satisfyAppAssetPromise(const platform::ZTAsset& asset,
                                const std::shared_ptr<platform::InstallCoordinator>& coordinator);
-  [[nodiscard]] bool _restoreApps(const plist::Dictionary& info);
+  [[nodiscard]] bool _restoreApps(plist::DocumentEntries& info);
   void _waitForRestorePlaceholders();
   /// The identifiers of installed apps and placeholders.
   [[nodiscard]] Identifiers _userBundles();

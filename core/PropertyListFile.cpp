@@ -2,14 +2,15 @@
 
 #include <utility>
 
+#include "base/PropertyListEntries.h"
+
 namespace appsync {
 
 Result<plist::Dictionary> dictionaryOf(Result<plist::Value> read) {
   if (!read) return std::move(read).error();
   plist::Dictionary* dictionary = read->dictionary();
   if (dictionary != nullptr) return std::move(*dictionary);
-  return Error{std::string(domains::kPropertyList), static_cast<long>(plist::Failure::malformed),
-               "The root is no dictionary", nullptr};
+  return plist::rootIsNoDictionary();
 }
 
 plist::Value readDictionary(platform::FileSystem& files, const std::optional<std::string>& path) {

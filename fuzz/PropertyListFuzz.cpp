@@ -5,7 +5,7 @@
 #include <span>
 #include <string>
 
-#include "base/PropertyList.h"
+#include "base/PropertyListEntries.h"
 
 namespace {
 
@@ -41,6 +41,20 @@ void check(const Result<plist::Value>& value) {
   require(description.find('\n') == std::string::npos);
 }
 
+/// Read entry by entry a document holds what it holds as a whole.
+void checkEntries(ByteView document, const Result<plist::Value>& whole) {
+  auto entries = plist::DocumentEntries::open(Bytes(document.begin(), document.end()));
+  const plist::Dictionary* expected = whole ? whole->dictionary() : nullptr;
+  require(entries.ok() == (expected != nullptr));
+  if (!entries) return;
+  plist::Dictionary found;
+  entries->visit([&](std::string_view key, const plist::Value& value) {
+    require(!found.contains(key));
+    found.set(key, value);
+  });
+  require(found == *expected);
+}
+
 }  // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
@@ -48,6 +62,8 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   check(plist::readBinary(document));
   check(plist::readXML(document));
   check(plist::readText(document));
-  check(plist::read(document));
+  const auto whole = plist::read(document);
+  check(whole);
+  checkEntries(document, whole);
   return 0;
 }

@@ -2,9 +2,9 @@
 #include <chrono>
 #include <utility>
 
+#include "base/PropertyListEntries.h"
 #include "core/AppsClient.h"
 #include "core/PropertyListAccess.h"
-#include "core/PropertyListFile.h"
 #include "core/SyncFiles.h"
 #include "restore/DemotedApps.h"
 
@@ -16,14 +16,15 @@ constexpr std::string_view kRestoreInfoPath = "/var/mobile/Media/HarvoRestore/Re
 /// Where it ends, for whoever has to find out what was restored.
 constexpr std::string_view kFiledRestoreInfoPath = "/var/mobile/Library/Logs/MediaServices/RestoreApplications.plist";
 
-std::optional<plist::Dictionary> readRestoreInfo(platform::FileSystem& files, const PlugInLog& log) {
+/// A host's file may hold thousands of apps with their icons: only one is in memory beside it at a time.
+std::optional<plist::DocumentEntries> readRestoreInfo(platform::FileSystem& files, const PlugInLog& log) {
   auto bytes = files.readFile(kRestoreInfoPath);
   if (!bytes) {
     log.message("%s|failed to read harvo app restore info. err=%{public}@", bytes.error());
     return std::nullopt;
   }
   log.message("%s|processing harvo restore info");
-  auto info = dictionaryOf(plist::read(std::move(bytes).value()));
+  auto info = plist::DocumentEntries::open(std::move(bytes).value());
   if (!info) {
     log.message("%s|failed to parse harvo app restore info. err=%{public}@", info.error());
     return std::nullopt;
@@ -67,7 +68,8 @@ bool AppsClient::_processHarvoRestoreInfo() {
   }
   bool result = false;
   if (auto info = readRestoreInfo(files, _log)) {
-    result = _restoreApps(*std::exchange(info, std::nullopt));
+    result = _restoreApps(*info);
+    info.reset();
     _waitForRestorePlaceholders();
   }
   fileRestoreInfoAway(files, _log);
@@ -75,30 +77,30 @@ bool AppsClient::_processHarvoRestoreInfo() {
 }
 
 /// What came of the last app that there was something to do for.
-bool AppsClient::_restoreApps(const plist::Dictionary& info) {
+bool AppsClient::_restoreApps(plist::DocumentEntries& info) {
   const DemotedApps demotedApps(_loadDemotedAppsPlist(_platform, kDemotedAppsPath, nullptr));
   _log.summary("%s|Demoted Apps: %{public}@", demotedApps.lists());
   const Identifiers userBundles = _useInstallCoordinator ? Identifiers{} : _userBundles();
   bool result = false;
-  for (const auto& [identifier, entry] : info) {
+  info.visit([&](std::string_view identifier, const plist::Value& entry) {
     if (!isValidBundleIdentifier(identifier)) {
       _log.message("%s|Ignoring invalid path: %{public}@", identifier);
-      continue;
+      return;
     }
     const DemotionStatus status = demotedApps.statusOf(identifier);
     _log.message("%s|processing harvo restore info for '%{public}@' demotionStatus :%lu", identifier,
                  static_cast<std::uint64_t>(status));
     if (_placeholderExistsForApplication(identifier, &userBundles)) {
       _log.message("%s|placeholder already exists for '%{public}@' - skiping'", identifier);
-      continue;
+      return;
     }
     const auto metadata = usableMetadata(entry, identifier, _log);
-    if (!metadata) continue;
+    if (!metadata) return;
     const auto sinf = dataIn(entry.find("ApplicationSINF"));
     const auto icon = dataIn(entry.find("PlaceholderIcon"));
     result = _useInstallCoordinator ? prepareAppForRestoreUsingCoordination(identifier, *metadata, sinf, icon, status)
                                     : _processHarvoRestoreInfoForApp(identifier, *metadata, sinf, icon);
-  }
+  });
   return result;
 }
 

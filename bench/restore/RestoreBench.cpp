@@ -101,11 +101,9 @@ class Transactions final : public platform::TransactionLog {
   void logScenario(std::string_view, std::uint32_t, bool, std::string_view, std::string_view) override {}
 };
 
-/// The host's file, three times its largest app, and what it takes to find the apps in it.
-std::size_t allowedMemory(const Bytes& document, std::int64_t count) {
-  constexpr std::size_t kApp = kIconSize + kLicenceSize + 1'000;
-  constexpr std::size_t kIndexEntry = 700;
-  return document.size() + 3 * kApp + static_cast<std::size_t>(count) * kIndexEntry;
+/// The host's file and three times its largest app.
+std::size_t allowedMemory(const Bytes& document) {
+  return document.size() + 3 * (kIconSize + kLicenceSize);
 }
 
 /// So that the size of a file decides about nothing but its bytes.
@@ -140,7 +138,7 @@ void processRestoreInfo(benchmark::State& state) {
       client->_processHarvoRestoreInfo();
     });
     if (registry.installed != state.range(0)) return state.SkipWithError("not every app got its placeholder");
-    if (most > allowedMemory(document, state.range(0))) return state.SkipWithError("it took too much memory");
+    if (most > allowedMemory(document)) return state.SkipWithError("it took too much memory");
   }
   state.counters["file"] = static_cast<double>(document.size());
   state.counters["memory"] = static_cast<double>(most);

@@ -41,6 +41,17 @@ TEST_F(HostileRestoreFile, ADocumentThatIsNoneMakesNoPlaceholderAndIsFiledAway) 
   }
 }
 
+TEST_F(HostileRestoreFile, ALastAppThatCannotBeReadKeepsTheOthersFromBeingTakenToo) {
+  std::string document(textOf(binaryForm(plist::Dictionary{{"com.a", restoredApp()}, {"com.b", "marked"}})));
+  const std::size_t marked = document.find("Vmarked");
+  ASSERT_NE(marked, std::string::npos);
+  document[marked] = '\x07';
+  EXPECT_FALSE(process(bytesOf(document)));
+  EXPECT_TRUE(platform.registry.identifiers().empty());
+  EXPECT_TRUE(platform.log.messages().back().starts_with("failed to parse harvo app restore info. err=PropertyList"));
+  expectFiledAway();
+}
+
 TEST_F(HostileRestoreFile, ARootOfAnotherTypeIsAsADocumentThatDoesNotParse) {
   for (const plist::Value& root : {plist::Value(plist::Array{"com.a"}), plist::Value("com.a"), plist::Value(7)}) {
     EXPECT_FALSE(processRoot(root));
