@@ -9,7 +9,7 @@ namespace appsync::device {
 std::shared_ptr<PlaceholderState> stateOf(const Coordinators& coordinators,
                                           const std::shared_ptr<platform::Placeholder>& placeholder) {
   const auto* own = dynamic_cast<const AppPlaceholder*>(placeholder.get());
-  return own != nullptr && own->isOf(coordinators) ? own->state() : nullptr;
+  return own == nullptr ? nullptr : own->stateIn(coordinators);
 }
 
 Status AppPlaceholder::setIconPromise(std::shared_ptr<platform::PromisedTransferToPath> promise) {

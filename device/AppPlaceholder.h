@@ -3,19 +3,16 @@
 
 #include <memory>
 #include <string>
-#include <utility>
 
 #include "device/CoordinatorState.h"
+#include "device/ServiceHandle.h"
 #include "platform/Placeholder.h"
 
 namespace appsync::device {
 
-class Coordinators;
-
-class AppPlaceholder final : public platform::Placeholder {
+class AppPlaceholder final : public ServiceHandle<platform::Placeholder, PlaceholderState> {
  public:
-  AppPlaceholder(std::shared_ptr<Coordinators> coordinators, std::shared_ptr<PlaceholderState> state)
-      : coordinators_(std::move(coordinators)), state_(std::move(state)) {}
+  using ServiceHandle::ServiceHandle;
 
   [[nodiscard]] std::string bundleName() const override { return state_->bundleName; }
   [[nodiscard]] std::string bundleID() const override { return state_->identifier; }
@@ -30,15 +27,6 @@ class AppPlaceholder final : public platform::Placeholder {
   Status cancelForReason(const Error& reason, platform::ClientIdentity client) override;
   /// "<placeholder com.example.notes>"
   [[nodiscard]] std::string description() const override { return "<placeholder " + state_->identifier + '>'; }
-
-  [[nodiscard]] const std::shared_ptr<PlaceholderState>& state() const noexcept { return state_; }
-  [[nodiscard]] bool isOf(const Coordinators& coordinators) const noexcept {
-    return coordinators_.get() == &coordinators;
-  }
-
- private:
-  const std::shared_ptr<Coordinators> coordinators_;
-  const std::shared_ptr<PlaceholderState> state_;
 };
 
 /// The state behind a placeholder that `coordinators` made; null for every other.

@@ -8,18 +8,17 @@
 #include <vector>
 
 #include "device/CoordinatorState.h"
+#include "device/ServiceHandle.h"
 #include "platform/InstallCoordinator.h"
 
 namespace appsync::device {
 
-class Coordinators;
-
-class CoordinatorHandle final : public platform::InstallCoordinator {
+class CoordinatorHandle final : public ServiceHandle<platform::InstallCoordinator, CoordinatorState> {
  public:
   /// `client` is who holds it, and drives the coordinator if it is its creator.
   CoordinatorHandle(std::shared_ptr<Coordinators> coordinators, std::shared_ptr<CoordinatorState> state,
                     platform::ClientIdentity client)
-      : coordinators_(std::move(coordinators)), state_(std::move(state)), client_(client) {}
+      : ServiceHandle(std::move(coordinators), std::move(state)), client_(client) {}
 
   [[nodiscard]] std::optional<std::string> bundleID() const override { return state_->identifier; }
   [[nodiscard]] platform::CoordinatorKind kind() const override { return state_->kind; }
@@ -45,8 +44,6 @@ class CoordinatorHandle final : public platform::InstallCoordinator {
   [[nodiscard]] std::string description() const override;
 
  private:
-  const std::shared_ptr<Coordinators> coordinators_;
-  const std::shared_ptr<CoordinatorState> state_;
   const platform::ClientIdentity client_;
 };
 

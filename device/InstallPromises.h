@@ -3,21 +3,20 @@
 
 #include <memory>
 #include <string>
-#include <utility>
 
 #include "device/CoordinatorState.h"
 #include "device/Coordinators.h"
+#include "device/ServiceHandle.h"
 #include "platform/InstallPromise.h"
 
 namespace appsync::device {
 
-/// A handle on a promise. Handles on one promise see the same state. They may outlive the service; changes then do
-/// nothing.
 template <class Interface>
-class PromiseHandle : public Interface {
+class PromiseHandle : public ServiceHandle<Interface, PromiseState> {
+  using Handle = ServiceHandle<Interface, PromiseState>;
+
  public:
-  PromiseHandle(std::shared_ptr<Coordinators> coordinators, std::shared_ptr<PromiseState> state)
-      : coordinators_(std::move(coordinators)), state_(std::move(state)) {}
+  using Handle::Handle;
 
   [[nodiscard]] std::string name() const override { return state_->name; }
   [[nodiscard]] platform::ClientIdentity client() const override { return state_->client; }
@@ -38,15 +37,9 @@ class PromiseHandle : public Interface {
   /// "<promise com.example.notes-Asset 0.5>"
   [[nodiscard]] std::string description() const override { return coordinators_->describe(*state_); }
 
-  [[nodiscard]] const std::shared_ptr<PromiseState>& state() const noexcept { return state_; }
-  /// Whether it was made by that service.
-  [[nodiscard]] bool isOf(const Coordinators& coordinators) const noexcept {
-    return coordinators_.get() == &coordinators;
-  }
-
  protected:
-  const std::shared_ptr<Coordinators> coordinators_;
-  const std::shared_ptr<PromiseState> state_;
+  using Handle::coordinators_;
+  using Handle::state_;
 };
 
 class TransferToPathPromise final : public PromiseHandle<platform::PromisedTransferToPath> {

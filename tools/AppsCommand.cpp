@@ -85,9 +85,7 @@ ExitStatus run(const AppsOptions& options, device::Device& device) {
 }  // namespace
 
 void addAppsCommand(CLI::App& line, Invocation& invocation) {
-  const CommandText text = {"apps", "List the apps on a device.", kExamples};
-  const auto added = addDeviceCommand(line, invocation, text, device::Access::readOnly, run);
-  added.command.add_flag("--json", added.options->json, "write JSON");
+  addListingCommand(line, invocation, {"apps", "List the apps on a device.", kExamples}, run);
 }
 
 }  // namespace appsync::tools

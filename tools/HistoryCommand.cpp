@@ -69,9 +69,8 @@ ExitStatus run(const HistoryOptions& options, device::Device& device) {
 }  // namespace
 
 void addHistoryCommand(CLI::App& line, Invocation& invocation) {
-  const CommandText text = {"history", "Show what was installed and removed, and how that went.", kExamples};
-  const auto added = addDeviceCommand(line, invocation, text, device::Access::readOnly, run);
-  added.command.add_flag("--json", added.options->json, "write JSON");
+  addListingCommand(line, invocation, {"history", "Show what was installed and removed, and how that went.", kExamples},
+                    run);
 }
 
 }  // namespace appsync::tools

@@ -51,4 +51,12 @@ AddedCommand<Options> addDeviceCommand(CLI::App& line, Invocation& invocation, c
   return {*command, options};
 }
 
+/// The same for a command that shows what is on a device, to people or, with the option `json`, to machines.
+template <class Options>
+void addListingCommand(CLI::App& line, Invocation& invocation, const CommandText& text,
+                       ExitStatus (*run)(const Options&, device::Device&)) {
+  const auto added = addDeviceCommand(line, invocation, text, device::Access::readOnly, run);
+  added.command.add_flag("--json", added.options->json, "write JSON");
+}
+
 }  // namespace appsync::tools

@@ -1,59 +1,28 @@
 // Each call of a preparation fails in turn: what is given up, in which order, for which reason.
-#include <algorithm>
 #include <string>
-#include <vector>
 
 #include <gtest/gtest.h>
 
 #include "tests/coordination/CoordinationFixture.h"
+#include "tests/coordination/FatalCall.h"
 
 namespace appsync::test {
 namespace {
 
 using platform::TransactionPhase;
 using platform::TransactionStep;
-using Strings = std::vector<std::string>;
-
-/// A call whose failure fails the preparation.
-struct FatalCall {
-  const char* operation;
-  const char* subject;
-  /// What is logged as an error; "%" stands for the service's error.
-  Strings complaints;
-  /// Whether the service's error is the one that the preparation ends with.
-  bool endsWithError;
-  /// What is cancelled, in order, as journal lines.
-  Strings cancelled;
-};
 
 const std::string kCoordinatorGoes = "coordinator.cancelForReason com.a ZTError 1 3";
-
-std::string nameOf(const testing::TestParamInfo<FatalCall>& info) {
-  std::string name = info.param.operation;
-  return name.substr(name.find('.') + 1);
-}
 
 class PreparationFailure : public CoordinationFixture, public testing::WithParamInterface<FatalCall> {};
 
 TEST_P(PreparationFailure, NothingOfThePlugInsOwnIsLeft) {
   const FatalCall& call = GetParam();
-  platform.coordination.failures.failNext(call.operation, call.subject, error);
+  call.failNext(platform, error);
   EXPECT_FALSE(makeTracedClient().prepareAppForInstallUsingCoordination(asset, false));
 
-  Strings complaints;
-  for (const LogLine& line : platform.log.lines()) {
-    if (line.level == LogLevel::error) complaints.push_back(line.text.substr(line.text.find('|') + 1));
-  }
-  Strings expected = call.complaints;
-  for (std::string& complaint : expected) {
-    const auto at = complaint.find('%');
-    if (at != std::string::npos) complaint.replace(at, 1, description(error));
-  }
-  EXPECT_EQ(complaints, expected);
-
-  EXPECT_EQ(
-      platform.journal.lines({"coordinator.cancelForReason", "placeholder.cancelForReason", "promise.cancelForReason"}),
-      call.cancelled);
+  call.expectComplaints(platform.log, error);
+  call.expectCancellations(platform.journal);
   EXPECT_TRUE(platform.coordination.coordinators().empty());
   EXPECT_TRUE(platform.coordination.abandoned().empty());
   for (const FakePromise& promise : platform.coordination.promises())
@@ -68,7 +37,7 @@ TEST_P(PreparationFailure, NothingOfThePlugInsOwnIsLeft) {
 /// The end is said and recorded before anything is cancelled, the placeholder before the coordinator.
 TEST_P(PreparationFailure, TheEndIsSaidBeforeAnythingIsCancelled) {
   const FatalCall& call = GetParam();
-  platform.coordination.failures.failNext(call.operation, call.subject, error);
+  call.failNext(platform, error);
   EXPECT_FALSE(makeTracedClient().prepareAppForInstallUsingCoordination(asset, false));
   LogLines expected{logged("processing app install for bundle com.a finished with status 0 error " +
                            (call.endsWithError ? description(error) : "(null)")),
@@ -80,9 +49,7 @@ TEST_P(PreparationFailure, TheEndIsSaidBeforeAnythingIsCancelled) {
                               " for appBundleIdentifier:com.a"));
     expected.push_back(called(line));
   }
-  const LogLines lines = platform.log.lines();
-  ASSERT_GE(lines.size(), expected.size());
-  EXPECT_TRUE(sameLines(expected, {lines.end() - static_cast<std::ptrdiff_t>(expected.size()), lines.end()}));
+  expectEnd(expected, platform.log.lines());
 }
 
 INSTANTIATE_TEST_SUITE_P(
@@ -114,7 +81,7 @@ INSTANTIATE_TEST_SUITE_P(
                               {"Error % adding placeholder promise to coordinator for 'com.a'"},
                               true,
                               {"placeholder.cancelForReason com.a ZTError 1 3", kCoordinatorGoes}}),
-    nameOf);
+    nameOfCall);
 
 class PreparationFaults : public CoordinationFixture {};
 

@@ -91,6 +91,7 @@ TEST_P(RestoreFault, UndisturbedOneRestoreAndOneSyncBringEveryAppBack) {
   runAll(whole);
   EXPECT_EQ(whole.apps(), WholeRestore::everyAppButTheUnreadable());
   EXPECT_EQ(whole.filesFiledAway(), 1U);
+  EXPECT_EQ(whole.device().time.now(), TimePoint()) << "who waits for placeholders does so until the last one";
 }
 
 INSTANTIATE_TEST_SUITE_P(Modes, RestoreFault,

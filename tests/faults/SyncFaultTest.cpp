@@ -2,7 +2,6 @@
 #include <cstddef>
 #include <iostream>
 #include <string>
-#include <string_view>
 #include <tuple>
 
 #include <gtest/gtest.h>
@@ -15,7 +14,6 @@ namespace {
 
 using Transfers = WholeSync::Transfers;
 
-constexpr std::string_view kRestoreStatePath = "/var/mobile/Library/ApplicationSync/RestoreState.plist";
 /// Whether the sync framework calls the injected failure one that may pass.
 enum class Judgement { unrecoverable, recoverable };
 using Conditions = std::tuple<Mode, Judgement, Extent>;

@@ -1,6 +1,5 @@
 #include "tests/faults/WholeSync.h"
 
-#include <array>
 #include <optional>
 
 #include <gtest/gtest.h>
@@ -15,7 +14,6 @@ namespace {
 
 using platform::TSInstallType;
 
-constexpr std::string_view kRestoreStatePath = "/var/mobile/Library/ApplicationSync/RestoreState.plist";
 constexpr std::string_view kParkedPackage = "/var/mobile/Media/PublicStaging/parked.zip";
 
 /// What the host wants on the device.

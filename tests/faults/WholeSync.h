@@ -1,7 +1,6 @@
 // A host and a daemon that sync a device of fakes, one asset at a time.
 #pragma once
 
-#include <cstddef>
 #include <map>
 #include <ostream>
 #include <string>
@@ -11,6 +10,9 @@
 #include "tests/faults/DaemonSync.h"
 
 namespace appsync::test {
+
+/// Where packages that wait for their data are noted.
+inline constexpr std::string_view kRestoreStatePath = "/var/mobile/Library/ApplicationSync/RestoreState.plist";
 
 /// One app of the device as a person would see it.
 struct AppState {

@@ -1,9 +1,9 @@
 // Each call of a coordinated restore fails in turn: what is given up, in which order, for which reason.
 #include <string>
-#include <vector>
 
 #include <gtest/gtest.h>
 
+#include "tests/coordination/FatalCall.h"
 #include "tests/restore/RestoreFixture.h"
 
 namespace appsync::test {
@@ -12,47 +12,14 @@ namespace {
 using platform::CoordinatorKind;
 using platform::TransactionPhase;
 using platform::TransactionStep;
-using Strings = std::vector<std::string>;
-
-/// A call whose failure fails the restore.
-struct FatalCall {
-  const char* operation;
-  const char* subject;
-  /// What is logged as an error; "%" stands for the service's error.
-  Strings complaints;
-  /// Whether the service's error is the one that the restore ends with.
-  bool endsWithError;
-  /// What is cancelled, in order, as journal lines.
-  Strings cancelled;
-  /// Whether the app was awaited by then.
-  bool wasAwaited = false;
-};
 
 const std::string kCoordinatorGoes = "coordinator.cancelForReason com.a ZTError 29 3";
 const std::string kPlaceholderGoes = "placeholder.cancelForReason com.a ZTError 29 3";
 const std::string kIconGoes = "promise.cancelForReason com.a-Icon ZTError 29 3";
 const std::string kUserDataGoes = "promise.cancelForReason com.a-UserData ZTError 29 3";
 
-std::string nameOf(const testing::TestParamInfo<FatalCall>& info) {
-  std::string name = info.param.operation;
-  return name.substr(name.find('.') + 1) + (std::string(info.param.subject) == "com.a-Icon" ? "Icon" : "");
-}
-
 class RestoreFailure : public CoordinatedRestoreFixture, public testing::WithParamInterface<FatalCall> {
  protected:
-  [[nodiscard]] Strings complaints() const {
-    Strings complaints;
-    for (const LogLine& line : platform.log.lines()) {
-      if (line.level == LogLevel::error) complaints.push_back(line.text.substr(line.text.find('|') + 1));
-    }
-    return complaints;
-  }
-
-  [[nodiscard]] Strings cancellations() const {
-    return platform.journal.lines(
-        {"coordinator.cancelForReason", "placeholder.cancelForReason", "promise.cancelForReason"});
-  }
-
   /// The lines with which a failed restore ends.
   [[nodiscard]] LogLines ending() const {
     const FatalCall& call = GetParam();
@@ -76,21 +43,13 @@ class RestoreFailure : public CoordinatedRestoreFixture, public testing::WithPar
 
 TEST_P(RestoreFailure, NothingOfThePlugInsOwnIsLeftAndNobodyWaits) {
   const FatalCall& call = GetParam();
-  platform.coordination.failures.failNext(call.operation, call.subject, error);
+  call.failNext(platform, error);
   AppsClient& client = makeTracedClient();
   EXPECT_FALSE(prepare(client));
 
-  Strings expected = call.complaints;
-  for (std::string& complaint : expected) {
-    const auto at = complaint.find('%');
-    if (at != std::string::npos) complaint.replace(at, 1, description(error));
-  }
-  EXPECT_EQ(complaints(), expected);
-  EXPECT_EQ(cancellations(), call.cancelled);
-  const LogLines lines = platform.log.lines();
-  const LogLines end = ending();
-  ASSERT_GE(lines.size(), end.size());
-  EXPECT_TRUE(sameLines(end, {lines.end() - static_cast<std::ptrdiff_t>(end.size()), lines.end()}));
+  call.expectComplaints(platform.log, error);
+  call.expectCancellations(platform.journal);
+  expectEnd(ending(), platform.log.lines());
 
   EXPECT_TRUE(platform.coordination.coordinators().empty());
   EXPECT_TRUE(platform.coordination.abandoned().empty());
@@ -156,7 +115,7 @@ INSTANTIATE_TEST_SUITE_P(
                               true,
                               {kCoordinatorGoes},
                               true}),
-    nameOf);
+    nameOfCall);
 
 class RestoreFaults : public CoordinatedRestoreFixture {};
 
