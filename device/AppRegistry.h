@@ -51,6 +51,12 @@ class AppRegistry final : public platform::AppRegistry {
   /// Takes a placeholder's mark away; an unknown app fails.
   [[nodiscard]] Status removePlaceholder(std::string_view bundleIdentifier, const Alongside& alongside);
   [[nodiscard]] RunningInstalls& runningInstalls() noexcept { return *running_; }
+  /// Whether what is left of a demoted app is on the home screen.
+  [[nodiscard]] bool isDemoted(std::string_view bundleIdentifier) { return installer_.isDemoted(bundleIdentifier); }
+  /// Begins the install of a demoted app, whose own placeholder stands for it.
+  [[nodiscard]] Status beginReturn(std::string_view bundleIdentifier, const Alongside& alongside) {
+    return installer_.beginReturn(bundleIdentifier, alongside);
+  }
 
   /// `installApplication` for an app, or its placeholder, that is part of the system.
   [[nodiscard]] Status installSystemApplication(const platform::FileLocation& location,
@@ -67,6 +73,11 @@ class AppRegistry final : public platform::AppRegistry {
   /// package, a restored app's does.
   [[nodiscard]] Status setPlaceholderType(std::string_view bundleIdentifier, platform::TSInstallType type) {
     return installer_.setPlaceholderType(bundleIdentifier, type);
+  }
+
+  /// Gives the placeholder of an app that is not installed another name on the home screen.
+  [[nodiscard]] Status renamePlaceholder(std::string_view bundleIdentifier, std::string_view name) {
+    return installer_.renamePlaceholder(bundleIdentifier, name);
   }
 
   /// A running install of the app comes before all others.

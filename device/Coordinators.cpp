@@ -214,7 +214,12 @@ void Coordinators::endIfDemoted(const Coordinator& coordinator) {
   if (transaction.commit()) close(coordinator, std::nullopt);
 }
 
+bool Coordinators::bringsBack(const PlaceholderState& placeholder) const {
+  return !isDemotion(placeholder.installType) && registry_.isDemoted(placeholder.identifier);
+}
+
 Status Coordinators::show(const PlaceholderState& placeholder, const Store& store) {
+  if (bringsBack(placeholder)) return registry_.beginReturn(placeholder.identifier, store);
   Result<PlaceholderContainer> made = makePlaceholder(files_, placeholder);
   if (!made) return made.error();
   InstallRequest request;
@@ -272,7 +277,9 @@ Status Coordinators::erase(const CoordinatorState& coordinator) {
   const CoordinatorList coordinators = ofApp(coordinator.identifier);
   const bool isShownByAnother = std::ranges::any_of(
       coordinators, [&](const Coordinator& other) { return other.get() != &coordinator && other->showsPlaceholder(); });
-  if (coordinator.showsPlaceholder() && !isShownByAnother) {
+  if (coordinator.showsPlaceholder() && !isShownByAnother && bringsBack(*coordinator.placeholder)) {
+    registry_.runningInstalls().end(coordinator.identifier, platform::TSInstallState::Canceled);
+  } else if (coordinator.showsPlaceholder() && !isShownByAnother) {
     Status removed = registry_.removePlaceholder(coordinator.identifier, remove);
     const bool isGone = !removed && removed.error().domain == platform::InstallerErrorDomain;
     if (!isGone) return removed;

@@ -119,6 +119,8 @@ class Coordinators : public std::enable_shared_from_this<Coordinators> {
   [[nodiscard]] Status store(const CoordinatorState& coordinator, const Store& store);
   [[nodiscard]] Status choose(const Coordinator& coordinator, CoordinatorChoices choices);
   [[nodiscard]] Status show(const PlaceholderState& placeholder, const Store& store);
+  /// Whether it is a demoted app's, whose own placeholder stays: it is what is left if the install comes to nothing.
+  [[nodiscard]] bool bringsBack(const PlaceholderState& placeholder) const;
   void followPromise(const CoordinatorState& coordinator);
   /// Installs the app if all conditions are met.
   void advance(const Coordinator& coordinator);

@@ -118,6 +118,41 @@ Status Installer::setPlaceholderType(std::string_view bundleIdentifier, TSInstal
   return {};
 }
 
+Status Installer::renamePlaceholder(std::string_view bundleIdentifier, std::string_view name) {
+  const AppRow app = known(bundleIdentifier);
+  if (!app.placeholder || app.installed) return unknownApp(bundleIdentifier, "rename the placeholder of");
+  if (app.placeholder->name == name) return {};
+  const std::string path = containerOf(*app.placeholder) + '/' + app.placeholder->folder + '/' + std::string(kInfoFile);
+  Result<Bytes> document = files_.readFile(path);
+  if (!document) return document.error();
+  Result<BundleInfo> info = readBundleInfo(*document);
+  if (!info) return info.error();
+  info->dictionary.set(platform::BundleDisplayNameKey, name);
+  document = plist::writeXML(info->dictionary);
+  if (!document) return document.error();
+  if (Status written = files_.writeFileAtomically(path, *document); !written) return written;
+  Database::Session session(database_);
+  Status set = session.run("update bundles set name = ? where app = ? and role = ?", name, app.position,
+                           BundleRole::placeholder);
+  if (!set) return asSystemError(set.error());
+  return {};
+}
+
+bool Installer::isDemoted(std::string_view bundleIdentifier) {
+  const AppRow app = known(bundleIdentifier);
+  return app.placeholder && !app.installed && isDemotion(app.placeholder->installType);
+}
+
+Status Installer::beginReturn(std::string_view bundleIdentifier, const Alongside& alongside) {
+  {
+    Database::Transaction transaction(database_);
+    alongside(transaction);
+    if (Status committed = transaction.commit(); !committed) return asSystemError(committed.error());
+  }
+  running_.begin(known(bundleIdentifier), {});
+  return {};
+}
+
 Result<plist::Dictionary> demotedApps(AppRegistry& registry) {
   const auto apps = registry.apps();
   if (!apps) return apps.error();

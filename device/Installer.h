@@ -34,9 +34,12 @@ class Installer {
   [[nodiscard]] Status recordPlaceholder(NewContainer& container, const InstallRequest& request,
                                          std::string_view applicationType, StoredBundle bundle);
 
-  /// As `AppRegistry::demote` and `AppRegistry::setPlaceholderType`.
+  // Of demoted apps, as in `AppRegistry`.
   [[nodiscard]] Status demote(std::string_view bundleIdentifier, platform::TSInstallType type);
   [[nodiscard]] Status setPlaceholderType(std::string_view bundleIdentifier, platform::TSInstallType type);
+  [[nodiscard]] Status renamePlaceholder(std::string_view bundleIdentifier, std::string_view name);
+  [[nodiscard]] bool isDemoted(std::string_view bundleIdentifier);
+  [[nodiscard]] Status beginReturn(std::string_view bundleIdentifier, const Alongside& alongside);
 
   /// As `platform::AppRegistry::uninstallApplication`.
   [[nodiscard]] Status uninstall(std::string_view bundleIdentifier, const plist::Dictionary& options,

@@ -74,6 +74,7 @@ for mode in coordinated direct; do
   run appsync screen "phone-$mode" -o "$mode-3-after.png"
   content_of "phone-$mode" >"$mode-after.txt"
   run diff "$mode-before.txt" "$mode-after.txt"
+  run cmp "$mode-1-before.png" "$mode-3-after.png"
   run appsync backup "phone-$mode" "backup-$mode-after"
   run cmp {"backup-$mode","backup-$mode-after"}/Apps/org.example.tides/ApplicationSINF
   say "Apps, versions, files, data, licence and demotion are as they were ($mode)"

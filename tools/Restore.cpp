@@ -182,13 +182,16 @@ void Restore::finishApps() {
   if (document && !layout.empty()) homeScreen.setIconState(homeScreen.blockableServerPort(), *document);
 }
 
-/// Without coordination the sync client makes all placeholders alike. No package comes at which the data would be given
-/// back.
+/// Without coordination the sync client makes all placeholders alike. No package comes that would bring the app's own
+/// name, where the store has another, nor one at which the data would be given back.
 Status Restore::demote(const BackedUpApp& app) {
   const std::string& identifier = app.app.identifier;
   const auto record = recordOf(device_, identifier);
-  if (record->isPlaceholder() && record->installType() != app.demotion) {
-    Status set = device_.services().defaultRegistry().setPlaceholderType(identifier, app.demotion);
+  if (record->isPlaceholder() && !record->isInstalled()) {
+    device::AppRegistry& registry = device_.services().defaultRegistry();
+    Status set =
+        record->installType() == app.demotion ? Status() : registry.setPlaceholderType(identifier, app.demotion);
+    if (set && !app.app.name.empty()) set = registry.renamePlaceholder(identifier, app.app.name);
     if (!set) return set;
   }
   device::BackupManager manager(device_.services().database(), device_.services().fileSystem());

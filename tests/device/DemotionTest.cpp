@@ -71,6 +71,19 @@ TEST_F(Demotion, LeavesIconNameVersionMetadataArtworkAndLicence) {
   EXPECT_EQ(device_.containers(), 1);
 }
 
+TEST_F(Demotion, WhatItLeavesCanBeRenamed) {
+  EXPECT_FALSE(device_.registry().renamePlaceholder("com.a", "Other").ok()) << "it is installed";
+  ASSERT_TRUE(demote("com.a").ok());
+  ASSERT_TRUE(device_.registry().renamePlaceholder("com.a", "Other").ok());
+  device_.reopen();
+  const auto app = device_.record("com.a");
+  const auto bundle = device_.services().bundles().openBundle({*app->bundlePath(), true});
+  EXPECT_EQ(bundle->infoDictionaryValue("BundleDisplayName")->string(), "Other");
+  EXPECT_EQ(bundle->infoDictionaryValue("BundleVersion")->string(), "3.1");
+  EXPECT_EQ(device_.registry().apps()->front()->name(), "Other");
+  EXPECT_FALSE(device_.registry().renamePlaceholder("com.none", "Other").ok());
+}
+
 TEST_F(Demotion, LeavesTheDataAndSurvivesARestart) {
   std::filesystem::create_directories(device_.host(device::dataContainerOf("com.a")));
   ASSERT_TRUE(demote("com.a").ok());

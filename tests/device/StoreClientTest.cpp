@@ -228,6 +228,41 @@ TEST_F(DemotedCoordinator, TheAppIsInstalledWhenTheHostSendsIt) {
   EXPECT_EQ(state("com.a"), "2.0");
 }
 
+class DemotedAppThatIsSent : public DemotedCoordinator {
+ protected:
+  void SetUp() override {
+    DemotedCoordinator::SetUp();
+    prepareRestore(client_, "com.a", Kind::restoringDemoted, TSInstallType::IntentionalDowngrade);
+    coordinator_ = client_.prepare("com.a");
+    ASSERT_NE(device_.record("com.a")->installProgress(), nullptr);
+  }
+  void expectDemoted() {
+    EXPECT_TRUE(device_.record("com.a")->isPlaceholder());
+    EXPECT_EQ(device_.record("com.a")->installType(), TSInstallType::IntentionalDowngrade);
+    EXPECT_EQ(device_.record("com.a")->installProgress(), nullptr);
+  }
+
+  std::shared_ptr<platform::InstallCoordinator> coordinator_;
+};
+
+TEST_F(DemotedAppThatIsSent, IsDemotedStillWhenThatIsCancelled) {
+  ASSERT_TRUE(service().cancelByUser("com.a").ok());
+  expectDemoted();
+}
+
+TEST_F(DemotedAppThatIsSent, IsDemotedStillWhenItIsCancelledAfterARestart) {
+  coordinator_.reset();
+  device_.reopen();
+  ASSERT_TRUE(service().cancelByUser("com.a").ok());
+  expectDemoted();
+}
+
+TEST_F(DemotedAppThatIsSent, IsDemotedStillWhenItsPackageCannotBeInstalled) {
+  CoordinationClient::deliver(coordinator_, stage("com.b", "2.0"));
+  client_.settle();
+  expectDemoted();
+}
+
 TEST(StoreClientKill, WhatWasNotDeliveredComesNextTime) {
   StoreFolder store;
   store.publish("com.a");

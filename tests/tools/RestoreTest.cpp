@@ -225,6 +225,21 @@ TEST_P(Restore, AnInterruptedOneIsCompletedOnlyWithTheSameBackup) {
   EXPECT_EQ(runTool({"restore", newDevice(), backup()}).status, 3);
 }
 
+TEST_P(Restore, ADemotedAppKeepsItsNameWhateverTheStoreCallsIt) {
+  publish("org.wished", "1.0", {{"HarvoMetadata.plist", "{title = \"The Best of Wishes\";}"}});
+  ASSERT_EQ(sync().status, 0);
+  run({"set", device(), "demote=org.wished"});
+  const auto nameOn = [](const std::string& device) {
+    return std::string(tools::Json::parse(run({"apps", device, "--json"}).out).at(0).at("name"));
+  };
+  const std::string name = nameOn(device());
+  makeBackup();
+  makeNewDevice();
+  ASSERT_EQ(restore().status, 0);
+  EXPECT_EQ(nameOn(newDevice()), name);
+  EXPECT_NE(name, "The Best of Wishes");
+}
+
 /// With APPSYNC_EVERY_STEP in the environment at really every one.
 long strideOr(long usual) {
   return std::getenv("APPSYNC_EVERY_STEP") == nullptr ? usual : 1;
