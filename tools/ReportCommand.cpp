@@ -143,8 +143,7 @@ ExitStatus run(const DeviceReportOptions& options, device::Device& device) {
 
 void addReportCommand(CLI::App& line, Invocation& invocation) {
   const CommandText text = {"report", "Tell how many apps a device holds, and whose they are.", kExamples};
-  const auto added = addDeviceCommand(line, invocation, text, device::Access::readOnly, run);
-  added.command.add_flag("--json", added.options->json, "write JSON");
+  addListingCommand(line, invocation, text, run);
 }
 
 }  // namespace appsync::tools
