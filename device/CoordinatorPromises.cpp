@@ -8,6 +8,7 @@
 namespace appsync::device {
 
 using platform::ClientIdentity;
+using platform::InstallObserverDelegate;
 using platform::TSInstallState;
 
 namespace {
