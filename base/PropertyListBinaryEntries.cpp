@@ -41,9 +41,9 @@ void BinaryReader::sortByKey(std::vector<std::size_t>& places) {
   if (std::ranges::adjacent_find(places, isNotBefore) == places.end()) return;
   std::ranges::stable_sort(places, isBefore);
   // Of equal keys the last one stays: in reverse it comes first.
-  const auto doubles = std::ranges::unique(places.rbegin(), places.rend(),
-                                           [&](std::size_t one, std::size_t other) { return !isBefore(other, one); });
-  places.erase(places.begin(), places.begin() + static_cast<std::ptrdiff_t>(doubles.size()));
+  const auto kept = std::unique(places.rbegin(), places.rend(),
+                                [&](std::size_t one, std::size_t other) { return !isBefore(other, one); });
+  places.erase(places.begin(), kept.base());
 }
 
 Value BinaryReader::entryKey(std::size_t place) {
