@@ -20,7 +20,9 @@ inline constexpr const char* kModuleEntryPointName = "appsyncMakeClient";
 /// on anything else.
 struct ModuleAnswer {
   std::uint32_t interfaceVersion = 0;  ///< the one that the module was built for, whatever the daemon's
-  char refusal[252] = {};              ///< why there is no client, in UTF-8 with a null behind; empty when there is one
+  /// Why there is no client, in UTF-8 with a null behind; empty when there is one. A long text may be cut anywhere,
+  /// also in the middle of a character.
+  char refusal[252] = {};
 };
 
 extern "C" {

@@ -1,7 +1,6 @@
 // The sync framework's record of one store account.
 #pragma once
 
-#include <functional>
 #include <optional>
 #include <set>
 #include <string>

@@ -14,7 +14,9 @@ namespace appsync::tools {
 /// with this program.
 [[nodiscard]] std::string modulePath();
 
-/// A client of the plug-in in that file, which stays loaded. `platform` must outlive the client. Errors say what to do.
+/// A client of the plug-in in that file, which stays loaded. `platform` must outlive the client. Of a file that cannot
+/// be loaded or does not fit this program the error says what to do; why a module makes no client it says in the
+/// module's own words.
 [[nodiscard]] Result<std::shared_ptr<platform::ZTClient>> makeClient(platform::Platform& platform);
 
 /// The same of the plug-in in the file at `path`.

@@ -2,6 +2,7 @@
 #include <set>
 #include <string>
 #include <string_view>
+#include <utility>
 
 #include "tools/Commands.h"
 #include "tools/Json.h"

@@ -53,18 +53,21 @@ void transfer(FakePlatform& device, ZTClient& client, const std::shared_ptr<ZTAs
   client.assetTransferSucceeded(asset, true, std::nullopt);
 }
 
+/// Ends a sync that the plug-in refuses. False, for `sync` to answer.
+bool endRefused(ZTClient& client, const std::optional<appsync::Error>& error) {
+  std::cout << "the plug-in refused the sync: " << (error ? error->text : "it does not say why") << "\n";
+  client.syncEndedWithSuccess(false);
+  return false;
+}
+
 }  // namespace
 
 bool sync(FakePlatform& device, ZTClient& client, const std::vector<WantedApp>& library) {
   stage(device, library);
-  client.prepareForSyncWithHostAnchor(client.currentSyncAnchor(), {}, nullptr);
-  tellRemovedApps(client.installedAssets());
   std::optional<appsync::Error> error;
-  if (!client.reconcileSync({}, client.currentSyncAnchor(), {}, &error)) {
-    std::cout << "the plug-in refused the sync: " << (error ? error->text : "it does not say why") << "\n";
-    client.syncEndedWithSuccess(false);
-    return false;
-  }
+  if (!client.prepareForSyncWithHostAnchor(client.currentSyncAnchor(), {}, &error)) return endRefused(client, error);
+  tellRemovedApps(client.installedAssets());
+  if (!client.reconcileSync({}, client.currentSyncAnchor(), {}, &error)) return endRefused(client, error);
   for (const auto& asset : client.outstandingAssetTransfers())
     transfer(device, client, asset);
   client.assetTransferEndedWithSuccess(true);  // Returns when every package is installed, or has failed.

@@ -1,11 +1,13 @@
 // The installer's memory of removed apps, in a plain file.
 #pragma once
 
+#include <functional>
 #include <mutex>
 #include <optional>
 #include <set>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 #include "platform/UninstalledAppsList.h"

@@ -45,7 +45,8 @@ TEST_F(EntryPoint, RefusesADaemonOfAnotherVersionAndLooksAtNothingOfIts) {
   for (const std::uint32_t version : {0U, kModuleInterfaceVersion + 1}) {
     ask(version, nullptr);
     EXPECT_EQ(answer.interfaceVersion, kModuleInterfaceVersion);
-    EXPECT_EQ(answer.refusal, "its interface version is 1 and the daemon's " + std::to_string(version));
+    EXPECT_EQ(answer.refusal, "its interface version is " + std::to_string(kModuleInterfaceVersion) +
+                                  " and the daemon's " + std::to_string(version));
     EXPECT_EQ(client, nullptr);
   }
 }

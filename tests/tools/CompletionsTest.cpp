@@ -66,8 +66,10 @@ class Completions : public ToolFixture, public testing::WithParamInterface<Shell
     std::string input;
     for (const std::string& line : lines)
       input += line + "\n";
-    const std::map<std::string, std::string> environment = {
-        {"HOME", home_.path()}, {"XDG_CONFIG_HOME", home_.path()}, {"XDG_DATA_HOME", home_.path()}};
+    const std::map<std::string, std::string> environment = {{"LC_ALL", "C.UTF-8"},
+                                                            {"HOME", home_.path()},
+                                                            {"XDG_CONFIG_HOME", home_.path()},
+                                                            {"XDG_DATA_HOME", home_.path()}};
     const Finished run =
         runProgram(shell.name, words, {.environment = environment, .output = OutputTo::file, .input = input});
     EXPECT_EQ(run.status, 0) << run.err;

@@ -7,6 +7,7 @@
 #include <gtest/gtest.h>
 
 #include "generated/BuildPaths.h"
+#include "platform/Module.h"
 #include "tests/tools/ToolFixture.h"
 
 namespace appsync::test {
@@ -61,7 +62,8 @@ TEST_F(PlugIn, AModuleWithoutTheEntryPointIsRefused) {
 
 TEST_F(PlugIn, AModuleOfAnotherVersionIsRefused) {
   expectRefused(brokenModule("OfAnotherVersion"),
-                std::string("its interface version is 2 and this program's 1") + kWhatToDo);
+                "its interface version is " + std::to_string(platform::kModuleInterfaceVersion + 1) +
+                    " and this program's " + std::to_string(platform::kModuleInterfaceVersion) + kWhatToDo);
 }
 
 TEST_F(PlugIn, AModuleThatGivesNothingIsRefused) {
