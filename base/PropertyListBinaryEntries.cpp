@@ -26,16 +26,17 @@ Result<std::vector<std::size_t>> BinaryReader::checkEntries() {
   for (const std::size_t place : places) {
     if (entryValue(place).type() == Type::null) return *std::move(failure_);
   }
+  startAgain();  // so that sorting has a bound of its own
   sortByKey(places);
+  if (failure_) return *std::move(failure_);
   return places;
 }
 
 void BinaryReader::sortByKey(std::vector<std::size_t>& places) {
   const auto isBefore = [this](std::size_t one, std::size_t other) {
-    startAgain();
     const Value left = entryKey(one);
     const Value right = entryKey(other);
-    return *left.string() < *right.string();
+    return !failure_ && *left.string() < *right.string();  // without an order, sorting comes to an end
   };
   const auto isNotBefore = [&](std::size_t one, std::size_t other) { return !isBefore(one, other); };
   if (std::ranges::adjacent_find(places, isNotBefore) == places.end()) return;

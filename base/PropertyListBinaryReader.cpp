@@ -64,7 +64,7 @@ void BinaryReader::readTrailer() {
   seen_.resize(static_cast<std::size_t>(objectCount_ / 64 + 1));
 }
 
-inline bool BinaryReader::wasSeen(std::uint64_t number) noexcept {
+inline bool BinaryReader::wasSeen(std::uint64_t number) {
   std::uint64_t& word = seen_[static_cast<std::size_t>(number / 64)];
   const std::uint64_t bit = std::uint64_t{1} << number % 64;
   const bool before = (word & bit) != 0;

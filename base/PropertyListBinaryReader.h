@@ -126,7 +126,7 @@ class BinaryReader {
   [[nodiscard]] std::uint64_t reference(std::size_t at) const noexcept {
     return loadBigEndian(begin_ + at, referenceSize_);
   }
-  [[nodiscard]] bool wasSeen(std::uint64_t number) noexcept;
+  [[nodiscard]] bool wasSeen(std::uint64_t number);
 
   const std::byte* begin_;
   std::size_t size_;

@@ -24,6 +24,7 @@ class DocumentEntries {
   using Visit = std::function<void(std::string_view key, const Value& value)>;
 
   /// Reads everything once, to be sure that it can be read: fails where `read` does, or when the root is no dictionary.
+  /// (How far a hostile document may unfold is counted for each entry anew.)
   [[nodiscard]] static Result<DocumentEntries> open(Bytes&& document);
 
   DocumentEntries(DocumentEntries&&) noexcept;

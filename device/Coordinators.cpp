@@ -277,16 +277,19 @@ Status Coordinators::erase(const CoordinatorState& coordinator) {
   const CoordinatorList coordinators = ofApp(coordinator.identifier);
   const bool isShownByAnother = std::ranges::any_of(
       coordinators, [&](const Coordinator& other) { return other.get() != &coordinator && other->showsPlaceholder(); });
-  if (coordinator.showsPlaceholder() && !isShownByAnother && bringsBack(*coordinator.placeholder)) {
-    registry_.runningInstalls().end(coordinator.identifier, platform::TSInstallState::Canceled);
-  } else if (coordinator.showsPlaceholder() && !isShownByAnother) {
+  const bool goesAlone = coordinator.showsPlaceholder() && !isShownByAnother;
+  const bool staysDemoted = goesAlone && bringsBack(*coordinator.placeholder);
+  if (goesAlone && !staysDemoted) {
     Status removed = registry_.removePlaceholder(coordinator.identifier, remove);
     const bool isGone = !removed && removed.error().domain == platform::InstallerErrorDomain;
     if (!isGone) return removed;
   }
-  Database::Transaction transaction(database_);
-  remove(transaction);
-  if (Status committed = transaction.commit(); !committed) return asSystemError(committed.error());
+  {
+    Database::Transaction transaction(database_);
+    remove(transaction);
+    if (Status committed = transaction.commit(); !committed) return asSystemError(committed.error());
+  }
+  if (staysDemoted) registry_.runningInstalls().end(coordinator.identifier, platform::TSInstallState::Canceled);
   return {};
 }
 

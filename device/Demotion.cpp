@@ -128,7 +128,7 @@ Status Installer::renamePlaceholder(std::string_view bundleIdentifier, std::stri
   Result<BundleInfo> info = readBundleInfo(*document);
   if (!info) return info.error();
   info->dictionary.set(platform::BundleDisplayNameKey, name);
-  document = plist::writeXML(info->dictionary);
+  document = plist::writeBinary(info->dictionary);  // which, unlike XML, has a form for every name
   if (!document) return document.error();
   if (Status written = files_.writeFileAtomically(path, *document); !written) return written;
   Database::Session session(database_);
@@ -144,12 +144,17 @@ bool Installer::isDemoted(std::string_view bundleIdentifier) {
 }
 
 Status Installer::beginReturn(std::string_view bundleIdentifier, const Alongside& alongside) {
+  AppRow app;
   {
     Database::Transaction transaction(database_);
+    Result<std::optional<AppRow>> found = app_table::find(transaction, bundleIdentifier);
+    if (!found) return asSystemError(found.error());
+    if (!*found || !(*found)->placeholder) return unknownApp(bundleIdentifier, "bring back");
+    app = **std::move(found);
     alongside(transaction);
     if (Status committed = transaction.commit(); !committed) return asSystemError(committed.error());
   }
-  running_.begin(known(bundleIdentifier), {});
+  running_.begin(std::move(app), {});
   return {};
 }
 

@@ -73,13 +73,16 @@ bool stays(int containers, const AppRow& app, BundleRole role, const Coordinated
   if (!containerExists(containers, bundle)) return false;
   if (role == BundleRole::installed) return true;
   if (coordinated.owned.contains(app.identifier)) return hasInfo(containers, bundle);
-  return bundle.installType != TSInstallType::Sync && !coordinated.orphaned.contains(app.identifier);
+  if (bundle.installType == TSInstallType::Sync) return false;
+  // A demoted app's placeholder is its own, whoever was about to bring its package.
+  return isDemotion(bundle.installType) || !coordinated.orphaned.contains(app.identifier);
 }
 
-/// An install that nobody drives any more waits; what was being unpacked must come again, what was parked has not
-/// moved.
-std::optional<ProgressValues> resumed(const AppRow& app, bool hasPlaceholder) {
+/// An install that nobody drives any more waits, but for a demoted app's, which has ended; what was being unpacked must
+/// come again, what was parked has not moved.
+std::optional<ProgressValues> resumed(const AppRow& app, bool hasPlaceholder, bool hasCoordinator) {
   if (!hasPlaceholder || !app.progress) return std::nullopt;
+  if (isDemotion(app.placeholder->installType) && !hasCoordinator) return std::nullopt;
   ProgressValues values = *app.progress;
   if (values.state == TSInstallState::Active) values.state = TSInstallState::Waiting;
   if (values.phase == TSInstallPhase::Installing) values.phase = TSInstallPhase::Loading;
@@ -108,7 +111,8 @@ Status reconcileRecords(Database& database, int containers, bool coordinationIsO
         return removed;
       }
     }
-    const std::optional<ProgressValues> progress = resumed(app, hasPlaceholder);
+    const std::optional<ProgressValues> progress =
+        resumed(app, hasPlaceholder, coordinated->owned.contains(app.identifier));
     if (progress == app.progress) continue;
     if (Status stored = app_table::storeProgress(transaction, app.identifier, progress); !stored) return stored;
   }

@@ -42,8 +42,17 @@ void check(const Result<plist::Value>& value) {
 }
 
 /// Read entry by entry a document holds what it holds as a whole.
+template <class T>
+bool isTooMuch(const Result<T>& result) {
+  using plist::Failure;
+  return !result && (result.error().code == static_cast<long>(Failure::tooLarge) ||
+                     result.error().code == static_cast<long>(Failure::tooDeep));
+}
+
+/// What entries have in common is counted for each of them: the bounds may be met in one way of reading only.
 void checkEntries(ByteView document, const Result<plist::Value>& whole) {
   auto entries = plist::DocumentEntries::open(Bytes(document.begin(), document.end()));
+  if (isTooMuch(whole) || isTooMuch(entries)) return;
   const plist::Dictionary* expected = whole ? whole->dictionary() : nullptr;
   require(entries.ok() == (expected != nullptr));
   if (!entries) return;

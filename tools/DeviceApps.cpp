@@ -13,6 +13,7 @@ std::vector<DeviceApp> appsOn(device::Device& device) {
                     record->applicationType(),
                     record->isInstalled(),
                     record->isPlaceholder(),
+                    record->installProgress() != nullptr,
                     record->installType(),
                     record->staticDiskUsage()});
   };

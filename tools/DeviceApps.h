@@ -16,6 +16,7 @@ struct DeviceApp {
   std::string type;  ///< "User" or "System"
   bool isInstalled = false;
   bool isPlaceholder = false;
+  bool isUnderWay = false;  ///< an install of it has begun and not ended
   platform::TSInstallType installType = platform::TSInstallType::None;
   std::uint64_t bytes = 0;
 };

@@ -25,8 +25,9 @@ PlannedApp planUpdate(const LibraryPackage& package, const DeviceApp& present) {
           "the device has the newer version " + present.app.version + ", the library " + package.app.version};
 }
 
+/// Once it was asked for, and until that has ended, it is sent as any other.
 bool isDemoted(const DeviceApp& app) {
-  return !app.isInstalled && device::isDemotion(app.installType);
+  return !app.isInstalled && !app.isUnderWay && device::isDemotion(app.installType);
 }
 
 PlannedApp planPackage(const LibraryPackage& package, const PlanInput& input) {

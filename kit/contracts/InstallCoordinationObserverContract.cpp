@@ -1,5 +1,6 @@
 // The part of the contract of coordinated installs that is about who hears of them.
 #include <atomic>
+#include <future>
 #include <memory>
 #include <set>
 #include <thread>
@@ -51,6 +52,17 @@ TEST_P(CoordinatedInstallContract, AnInstallThatFailsIsToldAsCompleteWithAnError
   deliver(*asset, subject().makeDamagedPackage("com.a"));
   subject().waitUntilIdle();
   EXPECT_EQ(listener.heard(), (Lines{"placeholder com.a", "complete com.a with error"}));
+}
+
+TEST_P(CoordinatedInstallContract, NoOperationWaitsForACallback) {
+  std::promise<void> done;
+  const std::shared_future<void> end = done.get_future().share();
+  CoordinationListener listener([&end](InstallCoordinator&) { end.wait(); });
+  const Connection connection = connect(service(), listener);
+  const Asset asset = prepare(*coordinator("com.a"));
+  done.set_value();
+  subject().waitUntilIdle();
+  EXPECT_EQ(listener.heard(), Lines{"placeholder com.a"});
 }
 
 TEST_P(CoordinatedInstallContract, WhatTheUserWantsIsTold) {

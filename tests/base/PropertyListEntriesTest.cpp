@@ -115,11 +115,15 @@ TEST(PropertyListEntries, AnEntryThatCannotBeReadIsFoundBeforeAnyIsHandedOut) {
 }
 
 TEST(PropertyListEntries, AKeyThatIsNoStringIsRefused) {
-  expectAsWhole(binaryDocument({dictionaryOf("\1\2"), "\x10\1", "\x10\1"}));
+  const std::string document = binaryDocument({dictionaryOf("\1\2"), "\x10\1", "\x10\1"});
+  expectAsWhole(document);
+  EXPECT_FALSE(DocumentEntries::open(bytesOfText(document)));
 }
 
 TEST(PropertyListEntries, ARootInsideItselfIsRefused) {
-  expectAsWhole(binaryDocument({dictionaryOf(std::string_view("\1\0", 2)), "Qa"}));
+  const std::string document = binaryDocument({dictionaryOf(std::string_view("\1\0", 2)), "Qa"});
+  expectAsWhole(document);
+  EXPECT_FALSE(DocumentEntries::open(bytesOfText(document)));
 }
 
 TEST(PropertyListEntries, WhatUnfoldsTooFarIsRefused) {
@@ -136,7 +140,13 @@ TEST(PropertyListEntries, WhatUnfoldsTooFarIsRefused) {
 }
 
 TEST(PropertyListEntries, WhatEntriesShareIsInEachOfThem) {
-  expectAsWhole(binaryDocument({dictionaryOf("\1\2\3\3"), "Qa", "Qb", "\xA2\4\4", "\xA2\5\5", "\x10\1"}));
+  const std::string document = binaryDocument({dictionaryOf("\1\2\3\3"), "Qa", "Qb", "\xA2\4\4", "\xA2\5\5", "\x10\1"});
+  expectAsWhole(document);
+  auto entries = DocumentEntries::open(bytesOfText(document));
+  ASSERT_TRUE(entries);
+  const plist::Array pair{1, 1};
+  const Value both(plist::Array{pair, pair});
+  EXPECT_EQ(entriesOf(*entries), (Entries{{"a", both}, {"b", both}}));
 }
 
 TEST(PropertyListEntries, OfDamagedDocumentsTheyAreWhatTheWholeIs) {

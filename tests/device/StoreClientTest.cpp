@@ -257,6 +257,13 @@ TEST_F(DemotedAppThatIsSent, IsDemotedStillWhenItIsCancelledAfterARestart) {
   expectDemoted();
 }
 
+TEST_F(DemotedAppThatIsSent, IsDemotedStillWhenCoordinationIsSwitchedOff) {
+  coordinator_.reset();
+  ASSERT_TRUE(device_.services().settings().assign("coordination=off").ok());
+  device_.reopen();
+  expectDemoted();
+}
+
 TEST_F(DemotedAppThatIsSent, IsDemotedStillWhenItsPackageCannotBeInstalled) {
   CoordinationClient::deliver(coordinator_, stage("com.b", "2.0"));
   client_.settle();

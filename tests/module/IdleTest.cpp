@@ -32,6 +32,10 @@ std::size_t writableBytes() {
   return bytes;
 }
 
+bool isInstrumented() {
+  return *kInstrumentation != '\0';
+}
+
 std::ptrdiff_t threads() {
   const std::filesystem::directory_iterator tasks("/proc/self/task");
   return std::distance(begin(tasks), end(tasks));
@@ -51,7 +55,7 @@ TEST_F(Idle, AClientHoldsLittleMemory) {
   EXPECT_GT(held, sizeof(platform::ZTClient)) << "the module's memory is not counted";
   EXPECT_GT(writableBytes(), 0);
   // What instrumentation counts and remembers is not the plug-in's.
-  const std::size_t variables = *kInstrumentation == '\0' ? writableBytes() : 0;
+  const std::size_t variables = isInstrumented() ? 0 : writableBytes();
   EXPECT_LT(held + variables, kMostOfItsOwn);
 }
 

@@ -154,6 +154,14 @@ TEST_F(SyncPlan, ADemotedAppIsLeftAloneUnlessItIsAskedFor) {
   EXPECT_EQ(planOfOne().work, PlannedWork::install);
 }
 
+TEST_F(SyncPlan, ADemotedAppThatWasBeingSentIsSentOn) {
+  libraryHas("org.a", "1.0");
+  deviceAwaits("org.a");
+  apps_["org.a"].installType = platform::TSInstallType::Downgrade;
+  apps_["org.a"].isUnderWay = true;
+  EXPECT_EQ(planOfOne().work, PlannedWork::install);
+}
+
 TEST_F(SyncPlan, ARestoredAppThatTheStoreBringsIsNotTheLibrarys) {
   libraryHas("org.a", "1.0");
   deviceAwaits("org.a");
