@@ -73,11 +73,13 @@ void WholeRestore::makeNewDevice() {
   device_->files.putFolder(kLogFolder);
   device_->files.putFolder("/var/mobile/Media/HarvoRestore");
   device_->journal.setHook([this](std::string_view operation, std::string_view arguments) {
-    return hook_ && !isMuted_ ? hook_(operation, arguments) : std::nullopt;
+    const std::scoped_lock lock(hookMutex_);
+    return hook_ && mutedThread_ != std::this_thread::get_id() ? hook_(operation, arguments) : std::nullopt;
   });
 }
 
 void WholeRestore::setHook(CallJournal::Hook hook) {
+  const std::scoped_lock lock(hookMutex_);
   hook_ = std::move(hook);
 }
 
@@ -99,7 +101,7 @@ void WholeRestore::backUp() {
 }
 
 void WholeRestore::wipe() {
-  isMuted_ = true;
+  mutedThread_ = std::this_thread::get_id();
   prepareForBackup();
   for (const auto& [identifier, type] : kApps) {
     const bool isInstalled = !isDemoted(type) && identifier != kUnreadable;
@@ -107,7 +109,7 @@ void WholeRestore::wipe() {
     EXPECT_EQ(description(propertyListAt(device_->files, metadataPath(identifier))),
               description(plist::Value(preparedMetadataOf(identifier))));
   }
-  isMuted_ = false;
+  mutedThread_ = std::thread::id();
   makeNewDevice();
   device_->backups.addRestoreData(std::string(kWithData));
   const plist::Array automatic{"com.auto"};
@@ -150,7 +152,7 @@ void WholeRestore::noteWhereTheFileIs() {
 
 /// Once all that may still be awaited has been withdrawn the next one is the only one.
 void WholeRestore::expectBalance(AppsClient& client) {
-  isMuted_ = true;
+  mutedThread_ = std::this_thread::get_id();
   for (const auto& [identifier, type] : kApps)
     client.dataMigratorCancelledCoordinatorForRestoreAppBundle(identifier);
   client.dataMigratorSetPlaceHolderPromiseForRestoreAppBundle("com.counted");
@@ -159,7 +161,7 @@ void WholeRestore::expectBalance(AppsClient& client) {
   client.dataMigratorCancelledCoordinatorForRestoreAppBundle("com.counted");
   EXPECT_TRUE(device_->log.contains(
       logged("DataMigrator cancelled coordinator for restoring app bundle com.counted _restoringPlaceholderCount 0")));
-  isMuted_ = false;
+  mutedThread_ = std::thread::id();
 }
 
 /// The host's part: without coordination the plug-in makes all placeholders alike.
@@ -180,7 +182,7 @@ void WholeRestore::sync() {
 /// A client of the service's like the plug-in, and none of whose calls are the plug-in's.
 void WholeRestore::deliverFromStore() {
   constexpr ClientIdentity kStore = ClientIdentity::CXClientBazaarly;
-  isMuted_ = true;
+  mutedThread_ = std::this_thread::get_id();
   FakeInstallCoordination& service = device_->coordination;
   for (const FakeCoordinator& waiting : service.coordinators()) {
     if (waiting.responsibleClient != kStore || waiting.appAsset) continue;
@@ -192,7 +194,7 @@ void WholeRestore::deliverFromStore() {
     EXPECT_TRUE(coordinator->setAppAssetPromise(package));
     package->setComplete(true);
   }
-  isMuted_ = false;
+  mutedThread_ = std::thread::id();
 }
 
 void WholeRestore::giveUpWhatHangs() {

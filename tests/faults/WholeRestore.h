@@ -1,10 +1,13 @@
 // A device that is backed up and wiped, the new one that its backup is restored to, and the syncs that follow.
 #pragma once
 
+#include <atomic>
 #include <cstddef>
 #include <map>
 #include <memory>
+#include <mutex>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include "tests/faults/DaemonSync.h"
@@ -20,7 +23,7 @@ class WholeRestore {
 
   explicit WholeRestore(Mode mode);
 
-  /// Hears of each platform call that the plug-in makes from now on, on whichever device.
+  /// Hears of each platform call that the plug-in makes from now on, on whichever device: one at a time, on any thread.
   void setHook(CallJournal::Hook hook);
 
   /// What is the plug-in's of a backup, and the host's.
@@ -55,9 +58,10 @@ class WholeRestore {
   void deliverFromStore();
 
   const Mode mode_;
+  std::mutex hookMutex_;
   CallJournal::Hook hook_;
-  /// Of calls that are not heard of.
-  bool isMuted_ = false;
+  /// Whose calls are not the plug-in's.
+  std::atomic<std::thread::id> mutedThread_;
   std::unique_ptr<FakePlatform> device_;
   /// The host's backup: what the restore file will hold.
   Bytes backup_;
