@@ -41,7 +41,7 @@ void tellRemovedApps(const plist::Dictionary& report) {
 
 /// The host sends one package. Here it comes out of thin air; a daemon copies bytes, and reports as they arrive.
 void transfer(FakePlatform& device, ZTClient& client, const std::shared_ptr<ZTAsset>& asset) {
-  const plist::Value* version = asset->variantOptions().find(appsync::platform::kAssetVersionKey);
+  const plist::Value* version = asset->version();
   const std::string wanted(version == nullptr ? "" : version->string().value_or(""));
   std::cout << "sending: " << asset->identifier() << " " << wanted << "\n";
   client.assetTransferUpdatedProgress(asset, 0.5);

@@ -6,7 +6,8 @@
 
 namespace port {
 
-/// Replaces the file at `path`, or makes it. Returns 0, or the system's error number, and then nothing has changed.
+/// Replaces the file at `path`, or makes it. Returns 0, or the system's error number, and then nothing has changed. The
+/// file that power is lost after may be the old one: where the folder cannot be written through, that is not told.
 [[nodiscard]] int replaceFile(const std::string& path, std::string_view text);
 
 }  // namespace port
