@@ -8,7 +8,7 @@
 
 #include "generated/BuildPaths.h"
 #include "kit/fakes/FakePlatform.h"
-#include "tests/module/HeapInUse.h"
+#include "tests/HeldMemory.h"
 #include "tests/module/LoadedModule.h"
 
 namespace appsync::test {
@@ -49,9 +49,9 @@ class Idle : public testing::Test {
 };
 
 TEST_F(Idle, AClientHoldsLittleMemory) {
-  const std::size_t before = heapInUse();
+  const std::ptrdiff_t before = memory::held;
   const auto client = makeModuleClient(platform);
-  const std::size_t held = heapInUse() - before;
+  const auto held = static_cast<std::size_t>(memory::held - before);
   EXPECT_GT(held, sizeof(platform::ZTClient)) << "the module's memory is not counted";
   EXPECT_GT(writableBytes(), 0);
   // What instrumentation counts and remembers is not the plug-in's.
