@@ -14,8 +14,6 @@ namespace {
 
 using platform::ZTAsset;
 
-constexpr std::string_view kStartupCompleteNotification = "com.corvel.zeph.ZTStartupCompleteNotification";
-
 /// More attempts than any single failure can cost.
 constexpr int kMostAttempts = 10;
 
@@ -31,7 +29,7 @@ void setMode(FakePlatform& platform, Mode mode) {
 void DaemonSync::run(const std::function<void()>& meanwhile) {
   platform_.bundleFolders.setMainBundleIdentifier(std::string(kDaemonIdentifier));
   client_ = AppsClient::create(platform_);
-  platform_.notify.deliver(kStartupCompleteNotification);
+  platform_.notify.deliver(platform::kZTStartupCompleteNotification);
   client_->prepareForSyncWithHostAnchor(client_->currentSyncAnchor(), {}, nullptr);
   static_cast<void>(client_->installedAssets());
   std::optional<Error> error;

@@ -9,6 +9,7 @@
 #include <gtest/gtest.h>
 
 #include "kit/fakes/TodoList.h"
+#include "platform/ZTClient.h"
 
 namespace appsync::test {
 
@@ -48,7 +49,7 @@ void expectInOrder(FakePlatform& platform) {
   EXPECT_EQ(platform.time.pendingTasks(), 0U);
   EXPECT_TRUE(platform.screen.held().empty()) << "an app stays held";
   EXPECT_EQ(platform.registry.observerCount(), 0U);
-  EXPECT_EQ(platform.notify.observerCount("com.corvel.zeph.ZTStartupCompleteNotification"), 0U);
+  EXPECT_EQ(platform.notify.observerCount(platform::kZTStartupCompleteNotification), 0U);
   EXPECT_EQ(platform.backups.connections(), 0U);
   EXPECT_EQ(platform.store.connections(), 0U);
   for (const auto& connection : platform.coordination.connections())
