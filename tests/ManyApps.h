@@ -9,6 +9,7 @@
 #include <utility>
 
 #include "kit/fakes/FakeFileSystem.h"
+#include "kit/fakes/FakePlatform.h"
 #include "platform/AppRegistry.h"
 #include "platform/Keys.h"
 
@@ -101,6 +102,19 @@ class SameFileEverywhere final : public FakeFileSystem {
 
  private:
   const Bytes content_;
+};
+
+/// A device of that many apps, whose files all hold the same and whose log nobody reads.
+struct DeviceOfManyApps {
+  DeviceOfManyApps(std::int64_t apps, Bytes everyFile) : registry(apps), files(platform.journal, std::move(everyFile)) {
+    platform.use(registry);
+    platform.use(files);
+    platform.log.disable(8);
+  }
+
+  FakePlatform platform;
+  ManyApps registry;
+  SameFileEverywhere files;
 };
 
 }  // namespace appsync::test

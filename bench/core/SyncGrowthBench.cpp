@@ -47,10 +47,8 @@ void prepare(FakePlatform& platform, std::int64_t count) {
   }
   platform.files.put(test::kTodoListPath, test::binaryForm(todoEntries(count)));
   platform.screen.setFlattenedIconState(icons);
-  for (const int category : {8, 14}) {
-    platform.log.disable(category, LogLevel::standard);
-    platform.log.disable(category, LogLevel::error);
-  }
+  for (const int category : {8, 14})
+    platform.log.disable(category);
 }
 
 /// The same on an embedded device, from which as many apps have been removed.

@@ -2,7 +2,6 @@
 #include <benchmark/benchmark.h>
 
 #include "core/AppsClient.h"
-#include "kit/fakes/FakePlatform.h"
 #include "kit/fakes/TodoList.h"
 #include "tests/ManyApps.h"
 
@@ -19,18 +18,12 @@ Bytes metadata() {
 }
 
 void prepareForBackup(benchmark::State& state) {
-  test::FakePlatform platform;
-  test::ManyApps registry(state.range(0));
-  test::SameFileEverywhere files(platform.journal, metadata());
-  platform.use(registry);
-  platform.use(files);
-  for (const LogLevel level : {LogLevel::standard, LogLevel::error})
-    platform.log.disable(8, level);
-  const auto client = AppsClient::create(platform);
+  test::DeviceOfManyApps device(state.range(0), metadata());
+  const auto client = AppsClient::create(device.platform);
   for (auto _ : state) {
-    files.writes = 0;
+    device.files.writes = 0;
     client->prepareForBackup();
-    if (files.writes != state.range(0)) return state.SkipWithError("not every file was rewritten");
+    if (device.files.writes != state.range(0)) return state.SkipWithError("not every file was rewritten");
   }
 }
 BENCHMARK(prepareForBackup)->Arg(kFew)->Arg(kMany)->Unit(benchmark::kMillisecond);

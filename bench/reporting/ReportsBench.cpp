@@ -7,7 +7,6 @@
 #include <benchmark/benchmark.h>
 
 #include "core/AppsClient.h"
-#include "kit/fakes/FakePlatform.h"
 #include "kit/fakes/TodoList.h"
 #include "tests/HeldMemory.h"
 #include "tests/ManyApps.h"
@@ -39,20 +38,14 @@ std::size_t allowedMemory(const test::SameFileEverywhere& files) {
 
 template <class Operation>
 void measure(benchmark::State& state, std::int64_t readsPerApp, const Operation& operation) {
-  test::FakePlatform platform;
-  test::ManyApps registry(state.range(0));
-  test::SameFileEverywhere files(platform.journal, metadata());
-  platform.use(registry);
-  platform.use(files);
-  for (const LogLevel level : {LogLevel::standard, LogLevel::error})
-    platform.log.disable(8, level);
-  const auto client = AppsClient::create(platform);
+  test::DeviceOfManyApps device(state.range(0), metadata());
+  const auto client = AppsClient::create(device.platform);
   std::size_t most = 0;
   for (auto _ : state) {
-    files.reads = 0;
+    device.files.reads = 0;
     most = test::memory::mostHeldDuring([&] { operation(*client, state.range(0)); });
-    if (files.reads != readsPerApp * state.range(0)) return state.SkipWithError("not every file was read once");
-    if (most > allowedMemory(files)) return state.SkipWithError("it took too much memory");
+    if (device.files.reads != readsPerApp * state.range(0)) return state.SkipWithError("not every file was read once");
+    if (most > allowedMemory(device.files)) return state.SkipWithError("it took too much memory");
   }
   state.counters["memory"] = static_cast<double>(most);
 }

@@ -123,10 +123,8 @@ void processRestoreInfo(benchmark::State& state) {
   platform.use(files);
   platform.use(registry);
   platform.use(transactions);
-  for (const int category : {8, 14}) {
-    platform.log.disable(category, LogLevel::standard);
-    platform.log.disable(category, LogLevel::error);
-  }
+  for (const int category : {8, 14})
+    platform.log.disable(category);
   const auto client = AppsClient::create(platform);
   std::size_t most = 0;
   for (auto _ : state) {

@@ -75,6 +75,11 @@ void RecordingLog::disable(int category, LogLevel level) {
   disabled_.insert({category, level});
 }
 
+void RecordingLog::disable(int category) {
+  for (const LogLevel level : {LogLevel::standard, LogLevel::error})
+    disable(category, level);
+}
+
 bool RecordingLog::isEnabled(int category, LogLevel level) const {
   const std::scoped_lock lock(mutex_);
   return !disabled_.contains({category, level});

@@ -41,6 +41,7 @@ class RecordingLog {
 
   void enable(int category, LogLevel level);
   void disable(int category, LogLevel level);
+  void disable(int category);  ///< on all levels
 
   /// All lines, or those of a category, in order.
   [[nodiscard]] LogLines lines() const;

@@ -6,7 +6,6 @@
 #include <gtest/gtest.h>
 
 #include "core/AppsClient.h"
-#include "kit/fakes/FakePlatform.h"
 #include "kit/fakes/TodoList.h"
 #include "tests/HeldMemory.h"
 #include "tests/ManyApps.h"
@@ -26,14 +25,8 @@ Bytes largeMetadata() {
 
 /// The peak of one operation over that many apps.
 std::size_t mostHeldBy(const Operation& operation, std::int64_t apps) {
-  FakePlatform platform;
-  ManyApps registry(apps);
-  SameFileEverywhere files(platform.journal, largeMetadata());
-  platform.use(registry);
-  platform.use(files);
-  for (const LogLevel level : {LogLevel::standard, LogLevel::error})
-    platform.log.disable(8, level);
-  const auto client = AppsClient::create(platform);
+  DeviceOfManyApps device(apps, largeMetadata());
+  const auto client = AppsClient::create(device.platform);
   return memory::mostHeldDuring([&] { operation(*client); });
 }
 

@@ -19,10 +19,8 @@ constexpr std::string_view kPlaceholders = "/tmp/com.corvel.zeph.Apps/";
 /// Calls of the platform that a todo list of so many apps costs.
 std::size_t callsFor(std::size_t apps) {
   FakePlatform platform;
-  for (const int category : {8, 14}) {
-    platform.log.disable(category, LogLevel::standard);
-    platform.log.disable(category, LogLevel::error);
-  }
+  for (const int category : {8, 14})
+    platform.log.disable(category);
   plist::Array entries;
   entries.reserve(apps);
   for (std::size_t number = 0; number < apps; ++number)
