@@ -45,7 +45,7 @@ void AppsClient::coordinatorShouldPrioritize(InstallCoordinator& coordinator) {
   const auto identifier = coordinator.bundleID();
   if (!identifier) return;
   _log.message("%s|Prioritize %{public}@", *identifier);
-  ZTDeviceService& service = _platform.sharedDeviceService();
+  ZTDeviceService& service = _platform.sharedInstance();
   if (!service.supports(ZTDeviceService::Operation::prioritizeAsset)) {
     _log.error("%s|Cannot prioritize %{public}@ as it's not supported", *identifier);
     return;
@@ -61,7 +61,7 @@ void AppsClient::coordinatorCanceledWithReason(InstallCoordinator& coordinator, 
   const auto identifier = coordinator.bundleID();
   if (!identifier) return;
   const bool wasCancelled = _accessQueue.sync([&] { return !_userCancelledApps.insert(*identifier).second; });
-  ZTDeviceService& service = _platform.sharedDeviceService();
+  ZTDeviceService& service = _platform.sharedInstance();
   if (wasCancelled || !service.supports(ZTDeviceService::Operation::cancelAssetTransferForFailedAsset)) {
     _log.error("%s|Cannot cancel %{public}@ as it's already cancelled %d OR the call is not supported", *identifier,
                wasCancelled);

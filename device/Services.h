@@ -52,7 +52,7 @@ class Services final : public platform::Platform {
         installCoordination_(database, files, registry_, settings_, access) {}
 
   [[nodiscard]] SyncFramework& syncFramework() override { return syncFramework_; }
-  [[nodiscard]] DeviceService& sharedDeviceService() override { return deviceService_; }
+  [[nodiscard]] DeviceService& sharedInstance() override { return deviceService_; }
   [[nodiscard]] AppRegistry& defaultRegistry() override { return registry_; }
   [[nodiscard]] UninstalledApps& uninstalledApps() override { return uninstalledApps_; }
   [[nodiscard]] InstallCoordination& installCoordination() override { return installCoordination_; }

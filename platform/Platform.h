@@ -31,8 +31,8 @@ class Platform {
   virtual ~Platform() = default;
 
   [[nodiscard]] virtual SyncFramework& syncFramework() = 0;
-  /// The daemon's `sharedInstance`.
-  [[nodiscard]] virtual ZTDeviceService& sharedDeviceService() = 0;
+  /// The one device service of the running daemon.
+  [[nodiscard]] virtual ZTDeviceService& sharedInstance() = 0;
   [[nodiscard]] virtual AppRegistry& defaultRegistry() = 0;
   [[nodiscard]] virtual UninstalledAppsList& uninstalledApps() = 0;
   [[nodiscard]] virtual InstallCoordination& installCoordination() = 0;

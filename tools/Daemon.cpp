@@ -77,7 +77,7 @@ std::unique_ptr<InstallWatcher> makeWatcher(device::Device& device, SyncProgress
 class ServiceConnection {
  public:
   ServiceConnection(device::Device& device, platform::ZTDeviceService& daemon)
-      : service_(device.services().sharedDeviceService()) {
+      : service_(device.services().sharedInstance()) {
     service_.connect(&daemon);
   }
   ~ServiceConnection() { service_.connect(nullptr); }

@@ -13,7 +13,7 @@ namespace {
 
 std::array<const void*, 16> servicesOf(platform::Platform& platform) {
   return {&platform.syncFramework(),
-          &platform.sharedDeviceService(),
+          &platform.sharedInstance(),
           &platform.defaultRegistry(),
           &platform.uninstalledApps(),
           &platform.installCoordination(),

@@ -65,7 +65,7 @@ class FakePlatform final : public platform::Platform {
 
   // The replacement stays the caller's and must outlive the platform.
   void use(platform::SyncFramework& service) { syncFramework_ = &service; }
-  void use(platform::ZTDeviceService& service) { sharedDeviceService_ = &service; }
+  void use(platform::ZTDeviceService& service) { sharedInstance_ = &service; }
   void use(platform::AppRegistry& service) { defaultRegistry_ = &service; }
   void use(platform::UninstalledAppsList& service) { uninstalledApps_ = &service; }
   void use(platform::InstallCoordination& service) { installCoordination_ = &service; }
@@ -88,7 +88,7 @@ class FakePlatform final : public platform::Platform {
   }
 
   [[nodiscard]] platform::SyncFramework& syncFramework() override { return *syncFramework_; }
-  [[nodiscard]] platform::ZTDeviceService& sharedDeviceService() override { return *sharedDeviceService_; }
+  [[nodiscard]] platform::ZTDeviceService& sharedInstance() override { return *sharedInstance_; }
   [[nodiscard]] platform::AppRegistry& defaultRegistry() override { return *defaultRegistry_; }
   [[nodiscard]] platform::UninstalledAppsList& uninstalledApps() override { return *uninstalledApps_; }
   [[nodiscard]] platform::InstallCoordination& installCoordination() override { return *installCoordination_; }
@@ -110,7 +110,7 @@ class FakePlatform final : public platform::Platform {
 
  private:
   platform::SyncFramework* syncFramework_ = &framework;
-  platform::ZTDeviceService* sharedDeviceService_ = &deviceService;
+  platform::ZTDeviceService* sharedInstance_ = &deviceService;
   platform::AppRegistry* defaultRegistry_ = &registry;
   platform::UninstalledAppsList* uninstalledApps_ = &uninstalledList;
   platform::InstallCoordination* installCoordination_ = &coordination;
