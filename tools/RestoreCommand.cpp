@@ -46,6 +46,7 @@ ExitStatus run(const RestoreOptions& options, device::Device& device) {
   if (Status opened = openLog(options.report, device); !opened) return reportUnusable(opened.error());
   const Result<Backup> backup = readBackup(options.backup);
   if (!backup) return reportUnusable(backup.error());
+  // Not the daemon: outside it the plug-in itself waits until the placeholders are there.
   device.services().bundles().actAs(std::string(device::Bundles::kDataMigratorIdentifier));
   const auto client = makeClient(device.platform());
   if (!client) return reportUnusable(client.error());
