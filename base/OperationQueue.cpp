@@ -5,6 +5,7 @@
 #include <deque>
 #include <mutex>
 #include <stdexcept>
+#include <system_error>
 #include <thread>
 #include <utility>
 #include <vector>
@@ -21,7 +22,7 @@ class OperationQueue::Workers : public std::enable_shared_from_this<Workers> {
 
   void add(std::function<void()> operation) {
     const std::lock_guard lock(mutex_);
-    if (needsThread()) threads_.emplace_back([self = shared_from_this()] { self->run(); });
+    if (needsThread()) startThread();
     operations_.push_back(std::move(operation));
     added_.notify_one();
   }
@@ -43,6 +44,14 @@ class OperationQueue::Workers : public std::enable_shared_from_this<Workers> {
   bool needsThread() const {
     const bool idleThreadIsLeft = idle_ > operations_.size();
     return !idleThreadIsLeft && threads_.size() < maximum_ && !closed_;
+  }
+
+  void startThread() {
+    try {
+      threads_.emplace_back([self = shared_from_this()] { self->run(); });
+    } catch (const std::system_error&) {
+      if (threads_.empty()) throw;  // Else those that there are take the operation in their turn.
+    }
   }
 
   void run() {

@@ -24,8 +24,8 @@ class OperationQueue {
 
   std::size_t maxConcurrentOperations() const noexcept;
 
-  /// May be called on any thread, from operations too. Throws std::system_error, and does not add `operation`, if a
-  /// thread is needed and cannot be started.
+  /// May be called on any thread, from operations too. Throws std::system_error, and does not add `operation`, if no
+  /// thread runs yet and none can be started.
   void add(std::function<void()> operation);
 
  private:

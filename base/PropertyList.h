@@ -63,8 +63,9 @@ inline constexpr int kMaximumDepth = 512;
 [[nodiscard]] std::optional<bool> truth(const Value& value) noexcept;
 
 /// Appends `value` on one line in the style of the old text form, for logs. Dictionaries keep their order,
-/// long data is cut short and followed by its length, deep nesting is cut to "…".
+/// long data is cut short and followed by its length, deep nesting and what is longer than a megabyte are cut to "…".
 void appendDescription(std::string& out, const Value& value);
+void appendDescription(std::string& out, const Array& array);
 inline void appendDescription(std::string& out, const Dictionary& dictionary) {
   appendDescription(out, Value(dictionary));
 }

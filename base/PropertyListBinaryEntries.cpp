@@ -14,7 +14,8 @@ bool BinaryReader::beginEntries() {
   if (failure_ || !locate(top_, at)) return false;
   const unsigned marker = std::to_integer<unsigned>(begin_[at]);
   return marker >> 4 == 0xD && readExtent(at, marker & 0xFU, entries_) &&
-         fits(at, entries_, std::uint64_t{2} * referenceSize_) && spend(2 * entries_.count, at);
+         fits(at, entries_, std::uint64_t{2} * referenceSize_) &&
+         isApart(top_, at, entries_.count * 2 * referenceSize_) && spend(2 * entries_.count, at);
 }
 
 Result<std::vector<std::size_t>> BinaryReader::checkEntries() {
@@ -66,7 +67,7 @@ Value BinaryReader::entryValue(std::size_t place) {
 /// What entries have in common is read for each again, and counted as often as where it is shared.
 void BinaryReader::forgetWhatWasShared() {
   for (const std::uint64_t number : met_)
-    seen_[static_cast<std::size_t>(number / 64)] &= ~(std::uint64_t{1} << number % 64);
+    seen_.erase(number);
   met_.clear();
   if (!shared_.empty()) shared_ = {};
 }

@@ -24,6 +24,20 @@ constexpr auto kMask = [] {
   return mask;
 }();
 
+/// Of data, text in either form, arrays and dictionaries.
+constexpr std::uint64_t bytesPerElement(unsigned type, unsigned referenceSize) {
+  switch (type) {
+    case 0x6:
+      return 2;
+    case 0xA:
+      return referenceSize;
+    case 0xD:
+      return std::uint64_t{2} * referenceSize;
+    default:
+      return 1;
+  }
+}
+
 }  // namespace
 
 Value BinaryReader::fail(Failure kind, std::string_view what, std::size_t at) {
@@ -61,16 +75,24 @@ void BinaryReader::readTrailer() {
   }
   if (failure_) return;
   table_ = static_cast<std::size_t>(table);
-  seen_.resize(static_cast<std::size_t>(objectCount_ / 64 + 1));
+  measured_.resize(objectCount_);
+  seen_.resize(objectCount_);
 }
 
 inline bool BinaryReader::wasSeen(std::uint64_t number) {
-  std::uint64_t& word = seen_[static_cast<std::size_t>(number / 64)];
-  const std::uint64_t bit = std::uint64_t{1} << number % 64;
-  const bool before = (word & bit) != 0;
-  word |= bit;
-  if (forgets_ && !before) met_.push_back(number);
-  return before;
+  const bool isNew = seen_.insert(number);
+  if (forgets_ && isNew) met_.push_back(number);
+  return !isNew;
+}
+
+/// Objects that lie in each other would unfold without being referred to twice. Together they cannot be longer than
+/// the document unless they do.
+bool BinaryReader::isApart(std::uint64_t number, std::size_t at, std::uint64_t bytes) {
+  if (!measured_.insert(number)) return true;
+  content_ += bytes;
+  if (content_ <= table_) return true;
+  fail(Failure::malformed, "Objects that lie in each other, met", at);
+  return false;
 }
 
 bool BinaryReader::readLongExtent(std::size_t at, Extent& extent) {
@@ -186,19 +208,22 @@ void BinaryReader::readOther(std::uint64_t number, std::size_t at, int depth, Va
   }
 }
 
-inline void BinaryReader::readContent(std::size_t at, unsigned marker, int depth, Value& place) {
+inline void BinaryReader::readContent(std::uint64_t number, std::size_t at, unsigned marker, int depth, Value& place) {
   Extent extent{};
   if (!readExtent(at, marker & 0xFU, extent)) return;
-  switch (marker >> 4) {
+  const unsigned type = marker >> 4;
+  const std::uint64_t bytesEach = bytesPerElement(type, referenceSize_);
+  if (!fits(at, extent, bytesEach) || !isApart(number, at, extent.count * bytesEach) || !spend(extent.count, at))
+    return;
+  switch (type) {
     case 0x4:
-      if (!fits(at, extent, 1) || !spend(extent.count / kBytesPerUnit, at)) return;
       place = readData({begin_ + extent.start, static_cast<std::size_t>(extent.count)});
       return;
     case 0x5:
       place = readASCII(at, extent);
       return;
     case 0x6:
-      place = readUTF16(at, extent);
+      place = readUTF16(extent);
       return;
     case 0xA:
       return readArray(at, extent, depth + 1, place);
@@ -216,12 +241,11 @@ void BinaryReader::readLong(std::uint64_t number, std::size_t at, unsigned marke
     }
   }
   const std::uint64_t before = units_;
-  readContent(at, marker, depth, place);
+  readContent(number, at, marker, depth, place);
   if (again && !failure_) shared_.try_emplace(number, Shared{place, units_ - before});
 }
 
 void BinaryReader::readArray(std::size_t at, Extent extent, int depth, Value& place) {
-  if (!fits(at, extent, referenceSize_) || !spend(extent.count, at)) return;
   if (depth > kMaximumDepth) {
     fail(Failure::tooDeep, "Containers nested too deep", at);
     return;
@@ -243,14 +267,12 @@ BinaryReader::KnownKeys* BinaryReader::keysOf(Extent extent, int depth) {
   const std::uint64_t last = loadBigEndian(references + size - referenceSize_, referenceSize_);
   KnownKeys& known = knownKeys_[(reference(extent.start) * 7 + last + extent.count) % knownKeys_.size()];
   if (known.size == size && std::memcmp(known.references, references, size) == 0) {
-    return spend(known.units, extent.start) ? &known : nullptr;
+    return spend(extent.count, extent.start) ? &known : nullptr;
   }
-  const std::uint64_t before = units_;
   known = KnownKeys{};
   if (!learnKeys(known, extent, depth)) return nullptr;
   known.references = references;
   known.size = size;
-  known.units = units_ - before;
   return &known;
 }
 
@@ -275,7 +297,6 @@ bool BinaryReader::learnKeys(KnownKeys& known, Extent extent, int depth) {
 }
 
 void BinaryReader::readDictionary(std::size_t at, Extent extent, int depth, Value& place) {
-  if (!fits(at, extent, std::uint64_t{2} * referenceSize_) || !spend(extent.count, at)) return;
   if (depth > kMaximumDepth) {
     fail(Failure::tooDeep, "Containers nested too deep", at);
     return;

@@ -17,13 +17,29 @@
 
 namespace appsync::plist {
 
-/// Every so many bytes of text or data count like another value: see `spend`.
-inline constexpr std::uint64_t kBytesPerUnit = 16;
+/// How much one byte of input may unfold to when objects are referred to again and again, and how much more even a tiny
+/// document may. Each value counts as one, and so does each byte of long text or data: whoever reads may copy it all.
+inline constexpr std::uint64_t kUnitsPerByte = 32;
+inline constexpr std::uint64_t kFreeUnits = 262144;
 
-/// How many values one byte of input may unfold to when objects are referred to again and again, and how much more
-/// even a tiny document may.
-inline constexpr std::uint64_t kUnitsPerByte = 64;
-inline constexpr std::uint64_t kFreeUnits = 65536;
+/// Numbers of objects, a bit for each.
+class ObjectNumbers {
+ public:
+  void resize(std::uint64_t count) { words_.resize(static_cast<std::size_t>(count / 64 + 1)); }
+  /// False when it was there.
+  bool insert(std::uint64_t number) {
+    std::uint64_t& word = words_[static_cast<std::size_t>(number / 64)];
+    const std::uint64_t before = word;
+    word |= bitOf(number);
+    return word != before;
+  }
+  void erase(std::uint64_t number) { words_[static_cast<std::size_t>(number / 64)] &= ~bitOf(number); }
+
+ private:
+  [[nodiscard]] static std::uint64_t bitOf(std::uint64_t number) { return std::uint64_t{1} << number % 64; }
+
+  std::vector<std::uint64_t> words_;
+};
 
 /// Reads one document.
 class BinaryReader {
@@ -71,7 +87,6 @@ class BinaryReader {
   struct KnownKeys {
     const std::byte* references = nullptr;
     std::size_t size = 0;
-    std::uint64_t units = 0;
     DictionaryMaker maker;
     /// For each key as written, its place in the shape. Null when they are in order.
     std::shared_ptr<const std::vector<std::uint32_t>> places;
@@ -91,7 +106,7 @@ class BinaryReader {
   bool readShortASCII(std::size_t start, std::size_t size, Value& place);
   bool readShortUTF16(std::size_t start, std::size_t count, Value& place);
   void readLong(std::uint64_t number, std::size_t at, unsigned marker, int depth, Value& place);
-  void readContent(std::size_t at, unsigned marker, int depth, Value& place);
+  void readContent(std::uint64_t number, std::size_t at, unsigned marker, int depth, Value& place);
   void readArray(std::size_t at, Extent extent, int depth, Value& place);
   void readDictionary(std::size_t at, Extent extent, int depth, Value& place);
   void readRepeatingDictionary(Extent extent, int depth, Value& place);
@@ -101,7 +116,7 @@ class BinaryReader {
   Value readDate(std::size_t at, unsigned low);
   Value readUid(std::size_t at, unsigned size);
   Value readASCII(std::size_t at, Extent extent);
-  Value readUTF16(std::size_t at, Extent extent);
+  Value readUTF16(Extent extent);
   KnownKeys* keysOf(Extent extent, int depth);
   bool learnKeys(KnownKeys& known, Extent extent, int depth);
 
@@ -117,6 +132,7 @@ class BinaryReader {
     fail(Failure::outOfRange, "An object longer than the document", at);
     return false;
   }
+  bool isApart(std::uint64_t number, std::size_t at, std::uint64_t bytes);
   bool spend(std::uint64_t units, std::size_t at) {
     units_ += units;
     if (units_ <= kUnitsPerByte * size_ + kFreeUnits) return true;
@@ -140,8 +156,11 @@ class BinaryReader {
   std::size_t table_ = 0;
 
   std::uint64_t units_ = 1;
-  /// Which long or nested objects were met, a bit for each.
-  std::vector<std::uint64_t> seen_;
+  /// The long or nested objects that were ever met, and how many bytes of content they have.
+  ObjectNumbers measured_;
+  std::uint64_t content_ = 0;
+  /// Those that were met and not forgotten.
+  ObjectNumbers seen_;
   std::unordered_map<std::uint64_t, Shared> shared_;
   /// Whether what was met is forgotten from one entry to the next, and what there is to forget.
   bool forgets_ = false;

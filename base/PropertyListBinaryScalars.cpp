@@ -50,14 +50,12 @@ Value BinaryReader::readData(ByteView bytes) const {
 }
 
 Value BinaryReader::readASCII(std::size_t at, Extent extent) {
-  if (!fits(at, extent, 1) || !spend(extent.count / kBytesPerUnit, at)) return {};
   const std::string_view text = textOf({begin_ + extent.start, static_cast<std::size_t>(extent.count)});
   if (!isASCII(text)) return fail(Failure::badText, "A string that should be ASCII and is not", at);
   return text;
 }
 
-Value BinaryReader::readUTF16(std::size_t at, Extent extent) {
-  if (!fits(at, extent, 2) || !spend(extent.count / kBytesPerUnit, at)) return {};
+Value BinaryReader::readUTF16(Extent extent) {
   const ByteView units{begin_ + extent.start, static_cast<std::size_t>(extent.count) * 2};
   text_.clear();
   if (const auto bad = appendUTF16(text_, units, ByteOrder::big)) {

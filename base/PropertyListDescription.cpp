@@ -78,10 +78,10 @@ class Describer {
   explicit Describer(std::string& out) noexcept : out_(out), limit_(out.size() + kLongest) {}
 
   void describe(const Value& value, int depth);
+  void describe(const Array& array, int depth);
 
  private:
   void describeScalar(const Value& value);
-  void describe(const Array& array, int depth);
   void describe(const Dictionary& dictionary, int depth);
   [[nodiscard]] bool isFull() {
     if (out_.size() < limit_) return false;
@@ -157,6 +157,10 @@ void Describer::describeScalar(const Value& value) {
 void appendDescription(std::string& out, const Value& value) {
   if (const auto text = value.string()) return appendEscaped(out, *text, {});
   Describer(out).describe(value, 0);
+}
+
+void appendDescription(std::string& out, const Array& array) {
+  Describer(out).describe(array, 1);
 }
 
 }  // namespace appsync::plist

@@ -16,22 +16,6 @@ constexpr std::size_t kMostSpareSlots = 90000;
 
 }  // namespace
 
-std::uint64_t detail::hashLong(const Value& value, std::uint64_t seed) noexcept {
-  const auto hashBlock = [](const void* from, std::uint64_t start) {
-    Internals::Words words;
-    std::memcpy(&words, from, sizeof words);
-    return hashWords(words, start);
-  };
-  std::string_view bytes = Internals::text(value);
-  std::uint64_t hash = mix(bytes.size() ^ seed, kFactors[2]);
-  for (; bytes.size() > sizeof(Value); bytes.remove_prefix(sizeof(Value))) {
-    hash = mix(hashBlock(bytes.data(), hash), kFactors[3]);
-  }
-  char rest[sizeof(Value)] = {};
-  std::memcpy(rest, bytes.data(), bytes.size());
-  return hashBlock(rest, hash);
-}
-
 thread_local ObjectTable::Memory ObjectTable::spare;
 
 ObjectTable::ObjectTable() : memory_(std::exchange(spare, {})) {}
@@ -44,8 +28,6 @@ void ObjectTable::clear(std::size_t expected) {
   count_ = 0;
   used_ = 0;
   beginTable(0, std::bit_ceil(std::clamp(expected, kFewestSlots, kMostFirstSlots)));
-  // The slots' own address differs from process to process: nobody can prepare scalars that all meet in one slot.
-  seed_ = detail::mix(reinterpret_cast<std::uintptr_t>(slots_), detail::kFactors[1]);
 }
 
 bool ObjectTable::isSameLong(const Value& one, const Value& other) noexcept {

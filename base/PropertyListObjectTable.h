@@ -8,6 +8,7 @@
 #include <vector>
 
 #include "base/PropertyListStorage.h"
+#include "base/SecretHash.h"
 
 namespace appsync::plist {
 
@@ -75,37 +76,13 @@ class ObjectTable {
   Slot* slots_ = nullptr;
   std::size_t mask_ = 0;
   std::size_t used_ = 0;
-  std::uint64_t seed_ = 0;
+  const std::uint64_t secret_ = secretOfProcess();
   static thread_local Memory spare;
 };
 
-namespace detail {
-
-inline constexpr std::uint64_t kFactors[] = {0xA0761D6478BD642FU, 0xE7037ED1A0B428DBU, 0x8EBC6AF09C88C6E3U,
-                                             0x589965CC75374CC3U};
-
-// NOLINTNEXTLINE(modernize-use-using): only a typedef can be marked as an extension.
-__extension__ typedef unsigned __int128 Wide;
-
-/// Multiplies and folds the product: every bit of both factors reaches the result.
-[[nodiscard]] inline std::uint64_t mix(std::uint64_t one, std::uint64_t other) noexcept {
-  const Wide product = static_cast<Wide>(one) * other;
-  return static_cast<std::uint64_t>(product) ^ static_cast<std::uint64_t>(product >> 64);
-}
-
-[[nodiscard]] inline std::uint64_t hashWords(const Internals::Words& words, std::uint64_t seed) noexcept {
-  return mix(words[0] ^ kFactors[0] ^ seed, words[1] ^ kFactors[1]) ^
-         mix(words[2] ^ kFactors[2] ^ seed, words[3] ^ kFactors[3]);
-}
-
-/// Of a string or data that is not held inline.
-[[nodiscard]] std::uint64_t hashLong(const Value& value, std::uint64_t seed) noexcept;
-
-}  // namespace detail
-
 inline std::uint32_t ObjectTable::tagOf(const Value& scalar) const noexcept {
-  const std::uint64_t hash = Internals::isInline(scalar) ? detail::hashWords(Internals::words(scalar), seed_)
-                                                         : detail::hashLong(scalar, seed_);
+  const std::uint64_t hash = Internals::isInline(scalar) ? hashBlock(Internals::words(scalar), secret_)
+                                                         : hashText(Internals::text(scalar), secret_);
   return static_cast<std::uint32_t>(hash >> 32);
 }
 

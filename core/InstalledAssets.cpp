@@ -1,5 +1,6 @@
 #include <unordered_set>
 
+#include "base/SecretHash.h"
 #include "core/AppsClient.h"
 #include "core/PropertyListAccess.h"
 #include "core/SyncFiles.h"
@@ -22,7 +23,7 @@ class CandidateSet {
   [[nodiscard]] auto end() const { return inOrder_.end(); }
 
  private:
-  std::unordered_set<std::string_view> seen_;
+  std::unordered_set<std::string_view, SecretHash> seen_;
   std::vector<std::string_view> inOrder_;
 };
 

@@ -6,6 +6,7 @@
 #include <unordered_map>
 
 #include "base/PropertyList.h"
+#include "base/SecretHash.h"
 
 namespace appsync {
 
@@ -23,7 +24,7 @@ class TodoIndex {
   [[nodiscard]] const plist::Value* firstEntry(std::string_view identifier) const;
 
  private:
-  std::unordered_map<std::string_view, const plist::Value*> first_;
+  std::unordered_map<std::string_view, const plist::Value*, SecretHash> first_;
 };
 
 }  // namespace appsync

@@ -6,6 +6,7 @@
 #include <unordered_set>
 
 #include "base/PropertyList.h"
+#include "base/SecretHash.h"
 #include "restore/DemotionStatus.h"
 
 namespace appsync {
@@ -28,7 +29,7 @@ class DemotedApps {
   [[nodiscard]] const std::optional<plist::Dictionary>& lists() const { return lists_; }
 
  private:
-  using IdentifierViews = std::unordered_set<std::string_view>;
+  using IdentifierViews = std::unordered_set<std::string_view, SecretHash>;
 
   [[nodiscard]] IdentifierViews identifiersUnder(std::string_view key) const;
 

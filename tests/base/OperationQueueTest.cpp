@@ -6,6 +6,7 @@
 #include <memory>
 #include <set>
 #include <stdexcept>
+#include <system_error>
 #include <thread>
 #include <utility>
 #include <vector>
@@ -17,6 +18,7 @@
 #include "base/Semaphore.h"
 #include "base/SystemClock.h"
 #include "kit/fakes/Gate.h"
+#include "tests/NoMoreThreads.h"
 #include "tests/base/AtEnd.h"
 
 namespace appsync::test {
@@ -95,6 +97,37 @@ TEST_F(OperationQueueTest, StartsThreadsOnDemand) {
   gate.waitUntilStopped(2);
   EXPECT_LE(threadsOfThisProcess(), before + 2);
   gate.open();
+}
+
+TEST_F(OperationQueueTest, WithoutAnotherThreadThoseThatRunTakeEveryOperation) {
+  if (!NoMoreThreads::arePossible()) GTEST_SKIP() << "this build starts threads in its own way";
+  std::atomic<int> ran = 0;
+  Gate gate;
+  gate.close();
+  {
+    OperationQueue queue(10);
+    queue.add([&] { gate.pass(); });
+    gate.waitUntilStopped(1);
+    const NoMoreThreads none;
+    for (int i = 0; i < 5; ++i)
+      queue.add([&] { ++ran; });
+    gate.open();
+  }
+  EXPECT_EQ(ran, 5);
+}
+
+TEST_F(OperationQueueTest, WithoutAnyThreadNothingIsAdded) {
+  if (!NoMoreThreads::arePossible()) GTEST_SKIP() << "this build starts threads in its own way";
+  bool ran = false;
+  {
+    OperationQueue queue(10);
+    {
+      const NoMoreThreads none;
+      EXPECT_THROW(queue.add([&] { ran = true; }), std::system_error);
+    }
+    queue.add([] {});
+  }
+  EXPECT_FALSE(ran);
 }
 
 TEST_F(OperationQueueTest, UsesIdleThreadsAgain) {

@@ -120,12 +120,13 @@ TEST(PropertyListHostile, LongTextReferredToCountlessTimes) {
   }
   offsets.push_back(document.size());
   document += text;
-  const std::size_t table = document.size();
-  for (const std::size_t offset : offsets)
-    document += {static_cast<char>(offset >> 8), static_cast<char>(offset)};
-  document += std::string(6, '\0') + "\x02\x01" + std::string(7, '\0') + "\x05" + std::string(8, '\0') +
-              std::string(6, '\0') + static_cast<char>(table >> 8) + static_cast<char>(table);
-  EXPECT_EQ(failureOf(readExactly(document)), Failure::tooLarge);
+  EXPECT_EQ(failureOf(readExactly(withTable(document, offsets))), Failure::tooLarge);
+}
+
+TEST(PropertyListHostile, ObjectsThatLieInEachOther) {
+  for (const OverlappingObjects what :
+       {OverlappingObjects::arrays, OverlappingObjects::texts, OverlappingObjects::same})
+    EXPECT_EQ(failureOf(readExactly(overlappingDocument(what))), Failure::malformed);
 }
 
 TEST(PropertyListHostile, SharedContentThatIsNotTooMuchIsFine) {

@@ -1,10 +1,12 @@
 // Documents that several tests read.
 #pragma once
 
+#include <algorithm>
 #include <cstddef>
 #include <cstdint>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 #include "base/PropertyList.h"
@@ -48,6 +50,39 @@ inline std::string binaryDocument(const std::vector<std::string>& objects) {
     document += std::string(7, '\0') + static_cast<char>(number);
   }
   return document;
+}
+
+/// Ends a document that is longer than `binaryDocument` makes: the root is object 0, references are one byte.
+inline std::string withTable(std::string document, const std::vector<std::size_t>& offsets) {
+  const std::size_t table = document.size();
+  for (const std::size_t offset : offsets)
+    document += {static_cast<char>(offset >> 8), static_cast<char>(offset)};
+  document += std::string(6, '\0') + "\x02\x01";
+  for (const std::size_t number : {offsets.size(), std::size_t{0}, table})
+    document += std::string(6, '\0') + static_cast<char>(number >> 8) + static_cast<char>(number);
+  return document;
+}
+
+/// A document of many long objects, the content of each of which begins with the objects after it, or is that of all.
+enum class OverlappingObjects { arrays, texts, same };
+inline std::string overlappingDocument(OverlappingObjects what) {
+  constexpr std::size_t kFirst = 100;
+  constexpr std::size_t kEnd = 164;
+  // Taken for references, its bytes are those of other objects than these.
+  const std::string header = what == OverlappingObjects::texts ? "\x5F\x11\x60\x60" : "\xAF\x11\x60\x60";
+  std::string document = "bplist00\xAF\x10" + std::string(1, static_cast<char>(kEnd - kFirst));
+  for (std::size_t number = kFirst; number < kEnd; ++number)
+    document += static_cast<char>(number);
+  std::vector<std::size_t> offsets(256, document.size());
+  offsets[0] = std::string_view("bplist00").size();
+  document += '\x09';
+  for (std::size_t number = kFirst; number < kEnd; ++number) {
+    offsets[number] = document.size();
+    document += header;
+  }
+  if (what == OverlappingObjects::same) std::fill(&offsets[kFirst], &offsets[kEnd], offsets[kEnd - 1]);
+  document += std::string(0x6060, '\x01');
+  return withTable(std::move(document), offsets);
 }
 
 /// What became of reading a document, for messages of tests: "value" or the error's text.

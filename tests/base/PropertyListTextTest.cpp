@@ -95,6 +95,15 @@ TEST(PropertyListDescription, CutsLongDataAndDeepNesting) {
   EXPECT_EQ(described(deep), std::string(32, '(') + "…" + std::string(32, ')'));
 }
 
+TEST(PropertyListDescription, OfAnArrayIsThatOfItsValue) {
+  for (const Array& array :
+       {Array{}, Array{1, "two words", Array{"x"}, Dictionary{{"a", "b"}}}, Array(1'000'000, "text")}) {
+    std::string text;
+    plist::appendDescription(text, array);
+    EXPECT_EQ(text, described(array));
+  }
+}
+
 TEST(PropertyListDescription, OfSharedContentStaysShort) {
   Value value = "text";
   for (int i = 0; i < 60; ++i)

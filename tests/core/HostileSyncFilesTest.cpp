@@ -1,4 +1,5 @@
 // Lists from the host and from disk that nobody should have written.
+#include <algorithm>
 #include <cstddef>
 #include <functional>
 #include <map>
@@ -135,6 +136,22 @@ TEST_P(HostileSyncFiles, AsATodoListDoNotHideDeletedApps) {
   platform.files.put(kTodoListPath, contents);
   EXPECT_EQ(client.installedAssets(),
             (plist::Dictionary{{"_Deleted", plist::Array{plist::Dictionary{{"BundleIdentifier", "com.b"}}}}}));
+}
+
+/// One long text that is referred to as often as a list may.
+TEST_F(OddIdentifiers, AListThatPrintsFarLongerThanItIsIsCutInTheLog) {
+  constexpr std::size_t kLongText = 200'000;
+  const plist::Array list(30, plist::Dictionary{{"identifier", "com.a"}, {"name", std::string(kLongText, 'x')}});
+  const Bytes document = binaryForm(list);
+  EXPECT_LT(document.size(), 2 * kLongText);
+  platform.files.put(kTodoListPath, document);
+  static_cast<void>(client.installedAssets());
+  static_cast<void>(client.outstandingAssetTransfers());
+  std::size_t longest = 0;
+  for (const std::string& message : platform.log.messages())
+    longest = std::max(longest, message.size());
+  EXPECT_GT(longest, kLongText);
+  EXPECT_LT(longest, 10 * kLongText);
 }
 
 TEST_P(HostileSyncFiles, AsLastSyncStateReportNoAppThatIsThere) {

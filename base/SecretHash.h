@@ -1,0 +1,51 @@
+// Hashes that nobody outside the process can foresee: keys from outside cannot be made to meet in one place.
+#pragma once
+
+#include <array>
+#include <bit>
+#include <cstddef>
+#include <cstdint>
+#include <string_view>
+
+namespace appsync {
+
+/// So many bytes are hashed at a time.
+using HashedBlock = std::array<std::uint64_t, 4>;
+
+namespace detail {
+
+inline constexpr HashedBlock kHashFactors = {0xA0761D6478BD642FU, 0xE7037ED1A0B428DBU, 0x8EBC6AF09C88C6E3U,
+                                             0x589965CC75374CC3U};
+
+// NOLINTNEXTLINE(modernize-use-using): only a typedef can be marked as an extension.
+__extension__ typedef unsigned __int128 Wide;
+
+/// Multiplies and folds the product: every bit of both factors reaches the result.
+[[nodiscard]] inline std::uint64_t mix(std::uint64_t one, std::uint64_t other) noexcept {
+  const Wide product = static_cast<Wide>(one) * other;
+  return static_cast<std::uint64_t>(product) ^ static_cast<std::uint64_t>(product >> 64);
+}
+
+}  // namespace detail
+
+/// The secret is in both factors of each product: else a block could make one of them zero, whatever the other.
+[[nodiscard]] inline std::uint64_t hashBlock(const HashedBlock& block, std::uint64_t secret) noexcept {
+  using detail::kHashFactors;
+  const std::uint64_t turned = std::rotl(secret, 32);
+  return detail::mix(block[0] ^ kHashFactors[0] ^ secret, block[1] ^ kHashFactors[1] ^ turned) ^
+         detail::mix(block[2] ^ kHashFactors[2] ^ secret, block[3] ^ kHashFactors[3] ^ turned);
+}
+
+[[nodiscard]] std::uint64_t hashText(std::string_view text, std::uint64_t secret) noexcept;
+
+/// The same number throughout the life of the process.
+[[nodiscard]] std::uint64_t secretOfProcess() noexcept;
+
+/// For the standard library's containers of texts.
+struct SecretHash {
+  [[nodiscard]] std::size_t operator()(std::string_view text) const noexcept {
+    return static_cast<std::size_t>(hashText(text, secretOfProcess()));
+  }
+};
+
+}  // namespace appsync
