@@ -1,6 +1,7 @@
 // Installing received packages, ten at a time, each held by the home screen.
 #include <cerrno>
 #include <chrono>
+#include <system_error>
 #include <utility>
 
 #include "core/AppsClient.h"
@@ -43,14 +44,18 @@ void logAssertion(const PlugInLog& log, TerminationAssertionOutcome outcome, con
 void AppsClient::_enqueueAssetInstall(const std::shared_ptr<ZTAsset>& asset) {
   PendingInstall install{std::make_shared<GroupEntry>(_installGroup), asset, shared_from_this()};
   _log.message("%s|Enqueue install request for %{public}@", asset->identifier());
-  _installOperationQueue.add([install = std::move(install)] {
-    AppsClient& client = *install.client;
-    const std::string& identifier = install.asset->identifier();
-    client._log.message("%s|Performing install for %{public}@", identifier);
-    client._performAssetInstall(install.asset);
-    client._log.message("%s|Finished install for %{public}@", identifier);
-    client._accessQueue.sync([&] { client.cleanRestoreStateForIdentifier(identifier); });
-  });
+  try {
+    _installOperationQueue.add([install = std::move(install)] {
+      AppsClient& client = *install.client;
+      const std::string& identifier = install.asset->identifier();
+      client._log.message("%s|Performing install for %{public}@", identifier);
+      client._performAssetInstall(install.asset);
+      client._log.message("%s|Finished install for %{public}@", identifier);
+      client._accessQueue.sync([&] { client.cleanRestoreStateForIdentifier(identifier); });
+    });
+  } catch (const std::system_error& noThread) {  // It has failed like any install: the daemon is not to know threads.
+    assetInstallFailed(*asset, {std::string(domains::kPOSIX), noThread.code().value(), noThread.what(), {}});
+  }
 }
 
 void AppsClient::_performAssetInstall(const std::shared_ptr<ZTAsset>& asset) {

@@ -12,6 +12,7 @@
 #include "kit/fakes/FakePackages.h"
 #include "kit/fakes/TodoList.h"
 #include "tests/ClientFixture.h"
+#include "tests/NoMoreThreads.h"
 
 namespace appsync::test {
 namespace {
@@ -134,6 +135,20 @@ TEST_F(InstallQueue, AnAppUnknownToTheHomeScreenIsInstalledAnywayAndTheStepIsASu
   EXPECT_EQ(transactionsOf("com.a"), Strings{"Asset install: assertion not found y"});
   EXPECT_TRUE(platform.registry.app("com.a")->isInstalled);
   EXPECT_EQ(client._getAndResetNumAppInstallsAttempted(), 1);
+}
+
+TEST_F(InstallQueue, AnInstallForWhichTheSystemHasNoThreadHasFailed) {
+  if (!NoMoreThreads::arePossible()) GTEST_SKIP() << "this build starts threads in its own way";
+  AppsClient& client = makeClient();
+  const auto asset = receive("com.a");
+  {
+    const NoMoreThreads none;
+    client._enqueueAssetInstall(asset);
+  }
+  client.assetTransferEndedWithSuccess(true);
+  const Error none{"POSIX", EAGAIN, "Resource temporarily unavailable", nullptr};
+  EXPECT_TRUE(platform.log.contains(logged("com.a install failed unrecoverably: " + description(none))));
+  EXPECT_TRUE(platform.registry.installs().empty());
 }
 
 TEST_F(InstallQueue, ADeniedAssertionLeavesThePackageCleansTheRestoreStateAndCountsNoAttempt) {
