@@ -1,4 +1,6 @@
 // Placeholder apps: bundles on disk with a name, a version and an icon, but no code.
+#include <cerrno>
+
 #include "core/AppsClient.h"
 #include "core/PropertyListAccess.h"
 #include "core/PropertyListFile.h"
@@ -31,8 +33,11 @@ std::string AppsClient::placeholderAppPathForBundleIdentifier(std::string_view b
 
 bool AppsClient::createPlaceHolderPath(std::string_view path, std::string_view bundleIdentifier,
                                        const platform::OwnerAttributes& attributes) {
-  const Status created =
-      _platform.fileSystem().createDirectory(path, platform::IntermediateDirectories::create, attributes);
+  // An identifier may begin with "../": what lies beside the placeholders' folder is not the plug-in's.
+  const bool leavesItsFolder = path.find("/../") != std::string_view::npos;
+  const Status created = leavesItsFolder ? Error::fromErrno(EINVAL)
+                                         : _platform.fileSystem().createDirectory(
+                                               path, platform::IntermediateDirectories::create, attributes);
   if (!created) {
     // The scenario names a restore whoever asks: readers of the log look for it there.
     _platform.transactionLog().logScenario("Harvo App Restore", 0, false, bundleIdentifier,

@@ -93,6 +93,12 @@ TEST_F(ClearSyncData, PlaceholdersAreRemovedByTheirBundleIdentifierWithoutOption
   EXPECT_TRUE(platform.log.contains(logged("Uninstall com.other = n")));
 }
 
+TEST_F(ClearSyncData, APlaceholderWithoutABundleIdentifierIsRemovedByItsApps) {
+  platform.registry.add(FakeApp::placeholder("com.a").withBundleIdentifier(std::nullopt));
+  client.clearSyncData();
+  EXPECT_EQ(platform.registry.uninstalls(), (std::vector<FakeAppRegistry::Uninstall>{{"com.a", {}}}));
+}
+
 TEST_F(ClearSyncData, AnUninstalledListThatCannotBeHadIsLogged) {
   platform.uninstalledList.loseAnswers();
   client.clearSyncData();

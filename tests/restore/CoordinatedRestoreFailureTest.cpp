@@ -119,6 +119,16 @@ INSTANTIATE_TEST_SUITE_P(
 
 class RestoreFaults : public CoordinatedRestoreFixture {};
 
+TEST_F(RestoreFaults, ADemotedAppsFailureIsToldAsOne) {
+  platform.coordination.failures.failNext("coordinator.setPlaceholderPromise", "com.a", error);
+  EXPECT_FALSE(prepare(DemotionStatus::automaticallyDemoted));
+  expectEnd({logged("processing app restore for demoted app com.a finished with status 0 error " + description(error)),
+             called("transactionLog.logStep 2 com.a n Restore demoted app"),
+             logged("Cancelling coordinator for appBundleIdentifier:com.a"), called(kCoordinatorGoes),
+             logged("Cancelling placeholder for appBundleIdentifier:com.a"), called(kPlaceholderGoes)},
+            platform.log.lines());
+}
+
 /// An app that another run has announced is withdrawn by whatever fails now.
 TEST_F(RestoreFaults, AFailureAfterAnEarlierAnnouncementWithdrawsTheApp) {
   AppsClient& client = makeTracedClient();

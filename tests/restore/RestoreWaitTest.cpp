@@ -105,17 +105,33 @@ TEST_F(RestoreWait, LaterReportsAreIgnoredAndWithdrawalsStillCount) {
       "<AppsClient> getting dealloc'd with (com.b, com.c)pending placeholder install complete notifications"));
 }
 
-TEST_F(RestoreWait, InsideTheDaemonOnlyTheDeadlineOrAWithdrawalEndsIt) {
+TEST_F(RestoreWait, InsideTheDaemonPlaceholdersDoNotEndIt) {
   AppsClient& client = makeDaemonClient();
+  const TimePoint start = platform.time.now();
   std::thread daemon = restore(client);
   for (const char* identifier : {"com.a", "com.b", "com.c"})
     platform.coordination.didInstallPlaceholder(identifier);
   platform.coordination.waitUntilIdle();
-  EXPECT_FALSE(said("Finished waiting for placeholder installs"));
-  platform.time.advance(seconds(15));
+  for (const std::string& message : platform.log.messages())
+    EXPECT_EQ(message.find("CN finished installing placeholder"), std::string::npos) << message;
+  platform.time.advance(seconds(15) - milliseconds(1));
+  platform.time.waitUntilWaiting(1);
+  platform.time.advance(milliseconds(1));
   daemon.join();
+  EXPECT_EQ(platform.time.now() - start, seconds(15));
   EXPECT_TRUE(said("Finished waiting for placeholder installs"));
   release();
+}
+
+TEST_F(RestoreWait, InsideTheDaemonWithdrawalsEndIt) {
+  AppsClient& client = makeDaemonClient();
+  const TimePoint start = platform.time.now();
+  std::thread daemon = restore(client);
+  for (const char* identifier : {"com.a", "com.b", "com.c"})
+    client.dataMigratorCancelledCoordinatorForRestoreAppBundle(identifier);
+  daemon.join();
+  EXPECT_EQ(platform.time.now(), start);
+  EXPECT_TRUE(said("Finished waiting for placeholder installs"));
 }
 
 TEST_F(RestoreWait, WithoutCoordinationThereIsNothingToWaitFor) {

@@ -1,5 +1,6 @@
 // Todo lists that no well-meaning host writes.
 #include <algorithm>
+#include <cerrno>
 #include <cstddef>
 #include <string>
 #include <vector>
@@ -86,12 +87,26 @@ TEST_F(HostileTodoList, AnEmptyIdentifierIsNoAppsPlaceholder) {
 }
 
 TEST_F(HostileTodoList, IdentifiersMadeOfDotsStayInThePlugInsFolders) {
-  platform.files.put("/tmp/Other.app/Info.plist", "another process's");
-  platform.files.putFolder(kPlaceholders);
-  std::vector<std::string> before = foreignPaths();
+  const std::vector<std::string> before = foreignPaths();
   const auto assets = outstandingFor(plist::Array{installEntry(".."), installEntry("."), installEntry("...")});
   EXPECT_EQ(assets.size(), 3U);
   EXPECT_EQ(foreignPaths(), before);
+}
+
+TEST_F(HostileTodoList, AnIdentifierThatLeadsOutOfThePlaceholdersFolderHasNone) {
+  constexpr std::string_view kForeign = "another process's";
+  platform.files.put("/tmp/Other.app/Info.plist", kForeign);
+  platform.files.put("/tmp/Other.app/Icon.png", kForeign);
+  const std::vector<std::string> before = foreignPaths();
+  EXPECT_EQ(outstandingFor(plist::Array{installEntry("../Other"), installEntry("com.b")}).size(), 2U);
+  EXPECT_EQ(foreignPaths(), before);
+  EXPECT_EQ(platform.files.text("/tmp/Other.app/Info.plist"), kForeign);
+  EXPECT_EQ(platform.files.text("/tmp/Other.app/Icon.png"), kForeign);
+  EXPECT_EQ(platform.registry.identifiers(), std::vector<std::string>{"com.b"});
+  EXPECT_TRUE(
+      platform.log.contains(logged("Created app directory for '../Other' at /tmp/com.corvel.zeph.Apps/../Other.app "
+                                   "with err=" +
+                                   description(Error::fromErrno(EINVAL)))));
 }
 
 TEST_F(HostileTodoList, AVeryLongIdentifierIsWantedLikeAnyOther) {

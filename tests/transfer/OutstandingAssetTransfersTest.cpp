@@ -269,6 +269,14 @@ TEST_F(OutstandingAssetTransfers, AnIconFolderThatCannotBeMadeIsLoggedAndTheWork
   EXPECT_TRUE(platform.log.contains(loggedError("Can't create icon scratch dir! " + description(full))));
 }
 
+TEST_F(OutstandingAssetTransfers, TheIconFolderIsNotMadeWithoutTheSyncFolderAroundIt) {
+  platform.files.erase("/var/mobile/Library/ApplicationSync");
+  EXPECT_EQ(outstandingIdentifiers(), Strings());
+  EXPECT_FALSE(platform.files.hasFolder(kIcons));
+  ASSERT_FALSE(platform.log.messages().empty());
+  EXPECT_TRUE(platform.log.messages().back().starts_with("Can't create icon scratch dir! POSIX 2 "));
+}
+
 TEST_F(OutstandingAssetTransfers, ATodoListThatCannotBeReadStillLetsPlaceholdersBeConsidered) {
   platform.files.put(kTodoListPath, "no property list {");
   platform.registry.add(FakeApp::placeholder("com.a", TSInstallType::Restore));

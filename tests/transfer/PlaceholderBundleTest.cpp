@@ -135,6 +135,7 @@ TEST_F(PlaceholderBundle, APlaceholderIsBuiltInstalledAndRecorded) {
   EXPECT_EQ(platform.transactions.scenarios(),
             (std::vector{ScenarioEntry{"Install placeholder", Success::yes, "com.a", "Installed placeholder"}}));
   EXPECT_TRUE(platform.files.hasFolder(folder));
+  EXPECT_EQ(platform.files.owners(folder), (platform::OwnerAttributes{"mobile", "mobile"}));
 }
 
 TEST_F(PlaceholderBundle, AFailedInstallIsLoggedAndRecordedAndLeavesTheFolder) {
