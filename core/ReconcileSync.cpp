@@ -32,8 +32,9 @@ Takeover takeOverStagingFolder(platform::FileSystem& files, const PlugInLog& log
   return Takeover::taken;
 }
 
-std::vector<std::string> identifiersToRemove(const plist::Array& todoList, const PlugInLog& log) {
-  std::vector<std::string> identifiers;
+/// Refer to the list.
+std::vector<std::string_view> identifiersToRemove(const plist::Array& todoList, const PlugInLog& log) {
+  std::vector<std::string_view> identifiers;
   identifiers.reserve(8);
   for (const plist::Value& entry : todoList) {
     const plist::Value* identifier = entry.find(todo::kIdentifier);
@@ -44,7 +45,7 @@ std::vector<std::string> identifiersToRemove(const plist::Array& todoList, const
   return identifiers;
 }
 
-void uninstall(platform::Platform& platform, const std::string& identifier, const PlugInLog& log) {
+void uninstall(platform::Platform& platform, std::string_view identifier, const PlugInLog& log) {
   constexpr std::string_view kScenario = "Harvo Sync";
   const Status uninstalled = platform.defaultRegistry().uninstallApplication(identifier);
   if (!uninstalled) log.error("%s|Uninstall of %{public}@ failed.", identifier);
@@ -99,7 +100,7 @@ void AppsClient::_removeApps(const plist::Array& todoList, bool removalAllowed) 
   const auto identifiers = identifiersToRemove(todoList, _log);
   if (identifiers.empty()) return;
   _log.message("%s|performing %llu deletions", identifiers.size());
-  for (const std::string& identifier : identifiers) {
+  for (const std::string_view identifier : identifiers) {
     if (_useInstallCoordinator) {
       uninstallAppUsingCoordination(identifier);
     } else {
