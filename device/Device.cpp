@@ -9,6 +9,7 @@
 #include <sys/stat.h>
 
 #include "device/DeviceFolder.h"
+#include "device/HostFile.h"
 #include "device/Recovery.h"
 #include "device/Step.h"
 #include "device/SystemCalls.h"
@@ -174,6 +175,7 @@ Result<std::unique_ptr<Device>> Device::open(const std::string& path, Access acc
     if (!folder) return folder.error();
     if (access == Access::readOnly) return openFileSystem(path, folder->get(), access);
     if (Status made = makeDeviceFolders(folder->get()); !made) return made.error();
+    removeHostFileDrafts(folder->get());
     Result<DeviceFileSystem> files = openFileSystem(path, folder->get(), access);
     if (!files) return files;
     Settings settings(**database);

@@ -41,8 +41,17 @@ void appendMessage(std::string& line, std::string_view message) {
 }  // namespace
 
 Result<std::unique_ptr<FileLogSink>> FileLogSink::open(const std::string& hostPath) {
-  FileDescriptor file(::open(hostPath.c_str(), O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC, 0644));
-  if (!file.valid()) return Error::fromErrno(errno, "cannot open log file \"" + hostPath + "\"");
+  // A pipe would wait for its reader; once there is one it is written to like a file.
+  FileDescriptor file(
+      ::open(hostPath.c_str(), O_WRONLY | O_APPEND | O_CREAT | O_NONBLOCK | O_NOCTTY | O_CLOEXEC, 0644));
+  if (!file.valid() && errno == ENXIO) {
+    return Error{std::string(domains::kPOSIX), ENXIO,
+                 "cannot open log file \"" + hostPath + "\": nobody reads from this pipe; start its reader first",
+                 nullptr};
+  }
+  if (!file.valid() || ::fcntl(file.get(), F_SETFL, O_APPEND) != 0) {
+    return Error::fromErrno(errno, "cannot open log file \"" + hostPath + "\"");
+  }
   return std::unique_ptr<FileLogSink>(new FileLogSink(std::move(file)));
 }
 

@@ -32,7 +32,7 @@ class LogSink {
 /// another process.
 class FileLogSink final : public LogSink {
  public:
-  /// Opens the file for appending, or makes it. `hostPath` is a path of this machine.
+  /// Opens the file for appending, or makes it. `hostPath` is a path of this machine. A pipe needs a reader already.
   [[nodiscard]] static Result<std::unique_ptr<FileLogSink>> open(const std::string& hostPath);
 
   void write(std::chrono::system_clock::time_point time, int category, LogLevel level,

@@ -13,8 +13,8 @@
 #include <unistd.h>
 
 #include "device/FileDescriptor.h"
+#include "device/HostFile.h"
 #include "device/Package.h"
-#include "device/SystemCalls.h"
 
 namespace appsync::device {
 namespace {
@@ -119,7 +119,8 @@ Status writeItems(const std::vector<Item>& items, int file, const std::string& p
 }
 
 /// What a device would refuse, for its names or its size, is better known now.
-Status check(const std::string& draft, const std::string& package) {
+Status check(int file, const std::string& package) {
+  const std::string draft = "/proc/self/fd/" + std::to_string(file);
   const Result<PackageInfo> info = readPackageInfo(draft);
   if (info) return {};
   Error error = info.error();
@@ -136,19 +137,10 @@ Status writePackage(const std::vector<std::string>& items, const std::string& pa
     if (Status added = collect(path, path.filename().string(), all); !added) return added;
   }
   std::sort(all.begin(), all.end());
-  const std::string draft = package + "." + sys::temporaryName();
-  FileDescriptor file;
-  int failure = sys::createFile(AT_FDCWD, draft.c_str(), sys::kFileMode, file);
-  if (failure != 0) return Error::fromErrno(failure, package + " cannot be written");
-  Status written = writeItems(all, file.get(), package);
-  if (written) written = check(draft, package);
-  if (written) failure = sys::writeOut(file.get());
-  if (written && failure == 0) {
-    failure = sys::rename(AT_FDCWD, draft.c_str(), AT_FDCWD, package.c_str(), sys::Replace::yes);
-  }
-  if (failure != 0) written = Error::fromErrno(failure, package + " cannot be written");
-  if (!written) static_cast<void>(sys::removeFile(AT_FDCWD, draft.c_str()));
-  return written;
+  return writeHostFile(package, [&](int file) {
+    Status written = writeItems(all, file, package);
+    return written ? check(file, package) : written;
+  });
 }
 
 }  // namespace appsync::device

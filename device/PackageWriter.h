@@ -13,8 +13,8 @@ namespace appsync::device {
 ///
 /// Equal content gives equal bytes: entries are sorted, carry no times and no owners, and of permissions only whether a
 /// file may be executed. Memory does not grow with the files. Links and special files, which no device installs, and
-/// names that are no UTF-8 are refused. The package is replaced in one step; after a failure it is as it was. Errors:
-/// "POSIX", the text says what is wrong with which file.
+/// names that are no UTF-8 are refused. `package` is a place as `writeHostFile` takes it; after a failure it is as it
+/// was. Errors: "POSIX", the text says what is wrong with which file.
 [[nodiscard]] Status writePackage(const std::vector<std::string>& items, const std::string& package);
 
 }  // namespace appsync::device

@@ -192,7 +192,7 @@ Status drawScreen(const ScreenServices& services, const std::string& hostPath) {
     return Error{std::string(kDrawingDomain), static_cast<long>(drawn),
                  std::string("cannot draw the screen: ") + cairo_status_to_string(drawn), nullptr};
   }
-  return replaceHostFile(hostPath, png);
+  return writeHostFile(hostPath, png);
 }
 
 }  // namespace appsync::device

@@ -26,7 +26,7 @@ inline constexpr std::string_view kDrawingDomain = "Drawing";
 /// Draws every app, placeholders with their progress, in on-screen order to a PNG file: pages of 4 by 6 icons side by
 /// side, made smaller when there are many of them. An app without an icon gets its first letter on a colour of its own.
 ///
-/// `hostPath` is a path of this machine. The file is replaced in one step; after a failure it is as it was.
+/// `hostPath` is a place as `writeHostFile` takes it; after a failure it is as it was.
 [[nodiscard]] Status drawScreen(const ScreenServices& services, const std::string& hostPath);
 
 }  // namespace appsync::device

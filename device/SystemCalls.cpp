@@ -1,10 +1,11 @@
 #include "device/SystemCalls.h"
 
-#include <atomic>
 #include <cerrno>
+#include <cinttypes>
 #include <cstdio>
 
 #include <fcntl.h>
+#include <sys/random.h>
 #include <sys/stat.h>
 
 #include "device/Step.h"
@@ -126,9 +127,11 @@ int copyContents(int from, int to, std::uint64_t& bytes) {
 }
 
 std::string temporaryName() {
-  static std::atomic<unsigned long> counter{0};
-  char name[48];
-  std::snprintf(name, sizeof name, "%lx-%lx", static_cast<unsigned long>(getpid()), ++counter);
+  std::uint64_t number = 0;
+  while (getrandom(&number, sizeof number, 0) != static_cast<ssize_t>(sizeof number)) {
+  }
+  char name[kTemporaryNameDigits + 1];
+  std::snprintf(name, sizeof name, "%016" PRIx64, number);
   return name;
 }
 

@@ -41,7 +41,9 @@ enum class Replace { no, yes };
 /// Copies what is left of one file to the end of another, sharing blocks where the file system can; adds to `bytes`.
 [[nodiscard]] int copyContents(int from, int to, std::uint64_t& bytes);
 
-/// A name in no use in this process, for something half done.
+inline constexpr std::size_t kTemporaryNameDigits = 16;
+/// A random name for something half done, of hexadecimal digits: no process makes it twice, nor another one, though
+/// processes that do not see each other may have one number.
 [[nodiscard]] std::string temporaryName();
 
 }  // namespace appsync::device::sys

@@ -4,7 +4,7 @@
 #include <set>
 
 #include "device/BundleIdentifier.h"
-#include "tools/HostFile.h"
+#include "device/HostFile.h"
 
 namespace appsync::tools {
 namespace {
@@ -82,7 +82,7 @@ plist::Dictionary manifestOf(const Backup& backup) {
 }
 
 Result<Backup> readBackup(const std::string& path) {
-  const Result<Bytes> document = readHostFile(path + "/" + std::string(backup_files::kManifest));
+  const Result<Bytes> document = device::readHostFile(path + "/" + std::string(backup_files::kManifest));
   if (!document) return notABackup(path, document.error().text);
   const Result<plist::Value> root = plist::read(*document);
   if (!root) return notABackup(path, "its manifest is damaged (" + root.error().text + ")");
@@ -114,7 +114,7 @@ Result<Backup> readBackup(const std::string& path) {
 Result<Bytes> readBackupFile(const Backup& backup, const BackedUpApp& app, std::string_view name, std::uint64_t size) {
   const std::string path =
       backup.path + "/" + std::string(backup_files::kApps) + "/" + app.app.identifier + "/" + std::string(name);
-  Result<Bytes> bytes = readHostFile(path);
+  Result<Bytes> bytes = device::readHostFile(path);
   if (!bytes || bytes->size() == size) return bytes;
   return Error{
       std::string(domains::kPOSIX), EINVAL,

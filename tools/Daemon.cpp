@@ -96,10 +96,12 @@ Daemon::Daemon(device::Device& device, platform::ZTClient& client, SyncProgress&
       client_(client),
       progress_(progress),
       interruption_(interruption),
-      sender_(device.services().fileSystem()),
-      state_(loadHostState(device.path())) {}
+      sender_(device.services().fileSystem()) {}
 
 Status Daemon::sync(const SyncRequest& request) {
+  Result<HostState> state = loadHostState(device_.path());
+  if (!state) return state.error();
+  state_ = std::move(state).value();
   const ServiceConnection connection(device_, queue_);
   const auto control = openSyncControl(device_);
   auto watcher = makeWatcher(device_, progress_, interruption_);

@@ -35,7 +35,7 @@ class Daemon {
   Daemon(device::Device& device, platform::ZTClient& client, SyncProgress& progress, const Interruption& interruption);
 
   /// Runs the sync. Every app concerned has its outcome in the progress when it returns. Fails when the device cannot
-  /// be synced at all; what was to be done is then told as failed.
+  /// be synced at all; what was to be done, if that is known, is then told as failed.
   [[nodiscard]] Status sync(const SyncRequest& request);
 
  private:

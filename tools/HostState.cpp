@@ -1,10 +1,11 @@
 #include "tools/HostState.h"
 
+#include <cerrno>
 #include <filesystem>
+#include <utility>
 
 #include "base/PropertyList.h"
 #include "device/HostFile.h"
-#include "tools/HostFile.h"
 
 namespace appsync::tools {
 namespace {
@@ -16,13 +17,23 @@ std::string pathIn(const std::string& devicePath) {
   return devicePath + "/host-state.plist";
 }
 
-IdentifierSet identifiersIn(const plist::Value* value) {
-  IdentifierSet identifiers;
-  if (value == nullptr || value->array() == nullptr) return identifiers;
+Error damaged(const std::string& path, const std::string& why) {
+  return {std::string(domains::kPOSIX), EINVAL,
+          path + " is damaged (" + why +
+              "); put a good copy in its place, or remove it: then apps that were deleted are sent again",
+          nullptr};
+}
+
+/// False when it is not the array of identifiers that it must be; none at all is an empty one.
+bool readIdentifiers(const plist::Value* value, IdentifierSet& identifiers) {
+  if (value == nullptr) return true;
+  if (value->array() == nullptr) return false;
   for (const plist::Value& element : *value->array()) {
-    if (const auto text = element.string()) identifiers.emplace(*text);
+    const auto text = element.string();
+    if (!text) return false;
+    identifiers.emplace(*text);
   }
-  return identifiers;
+  return true;
 }
 
 plist::Array arrayOf(const IdentifierSet& identifiers) {
@@ -37,12 +48,17 @@ void HostState::learnDeleted(const IdentifierSet& deleted) {
   }
 }
 
-HostState loadHostState(const std::string& devicePath) {
-  const Result<Bytes> bytes = readHostFile(pathIn(devicePath));
-  if (!bytes) return {};
+Result<HostState> loadHostState(const std::string& devicePath) {
+  const std::string path = pathIn(devicePath);
+  const Result<Bytes> bytes = device::readHostFile(path);
+  if (!bytes && bytes.error().code == ENOENT) return HostState{};
+  if (!bytes) return bytes.error();
   const Result<plist::Value> root = plist::read(*bytes);
-  if (!root) return {};
-  return {identifiersIn(root->find(kDeclined)), identifiersIn(root->find(kOffered))};
+  if (!root) return damaged(path, root.error().text);
+  HostState state;
+  const bool isWhole = root->dictionary() != nullptr && readIdentifiers(root->find(kDeclined), state.declined) &&
+                       readIdentifiers(root->find(kOffered), state.offered);
+  return isWhole ? Result<HostState>(std::move(state)) : damaged(path, "it is no dictionary of lists of identifiers");
 }
 
 Status saveHostState(const std::string& devicePath, const HostState& state) {

@@ -26,8 +26,9 @@ struct HostState {
   bool operator==(const HostState&) const = default;
 };
 
-/// The state kept in a device's folder; an empty one when there is none, or none that can be read.
-[[nodiscard]] HostState loadHostState(const std::string& devicePath);
+/// The state kept in a device's folder; an empty one when there is none. One that cannot be read or understood is an
+/// error: who went on without it would bring back what was removed. The text names the file and says what to do.
+[[nodiscard]] Result<HostState> loadHostState(const std::string& devicePath);
 /// Replaces it in one step.
 [[nodiscard]] Status saveHostState(const std::string& devicePath, const HostState& state);
 /// Forgets everything. Nothing kept is a success.

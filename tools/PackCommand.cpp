@@ -7,11 +7,11 @@
 #include <CLI/CLI.hpp>
 
 #include "device/BundleInfo.h"
+#include "device/HostFile.h"
 #include "device/PackageReader.h"
 #include "device/PackageWriter.h"
 #include "platform/Keys.h"
 #include "tools/Commands.h"
-#include "tools/HostFile.h"
 #include "tools/Printable.h"
 #include "tools/StandardOutput.h"
 
@@ -96,7 +96,7 @@ Status requireFile(const plist::Dictionary& info, std::string_view key, const fs
 
 Result<device::BundleInfo> checkedInfo(const fs::path& app) {
   const fs::path path = app / device::kInfoFile;
-  const Result<Bytes> bytes = readHostFile(path.string());
+  const Result<Bytes> bytes = device::readHostFile(path.string());
   if (!bytes) return bytes.error();
   Result<device::BundleInfo> info = device::readBundleInfo(*bytes);
   if (!info) return info.error().in(path.string());
@@ -118,12 +118,14 @@ std::string defaultName(const fs::path& app, const device::BundleInfo& info) {
 }
 
 ExitStatus run(const PackOptions& options) {
+  if (isForTerminal(options.output, "a package")) return ExitStatus::wrongUsage;
   const Result<AppFolder> folder = findApp(options.folder);
   if (!folder) return reportUnusable(folder.error());
   const Result<device::BundleInfo> info = checkedInfo(folder->app);
   if (!info) return reportUnusable(info.error());
   const std::string output = options.output.empty() ? defaultName(folder->app, *info) : options.output;
   if (Status packed = device::writePackage(folder->items, output); !packed) return reportUnusable(packed.error());
+  if (output == device::kStandardStream) return ExitStatus::done;
   StandardOutput standardOutput;
   standardOutput.writeLine("Packed " + printable(info->displayName.value_or("")) + " " +
                            printable(info->version.value_or("")) + " as " + printable(output) + ".");
@@ -136,7 +138,7 @@ void addPackCommand(CLI::App& line, Invocation& invocation) {
   const auto options = std::make_shared<PackOptions>();
   CLI::App* command = line.add_subcommand("pack", "Turn an app's folder into a package.");
   command->add_option("APP-FOLDER", options->folder, "the app")->required();
-  command->add_option("-o,--output", options->output, "the package to write");
+  command->add_option("-o,--output", options->output, "the package to write; - is standard output");
   command->footer(kExamples);
   command->callback([options, &invocation] { invocation = [options] { return run(*options); }; });
 }

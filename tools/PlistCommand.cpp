@@ -2,11 +2,10 @@
 #include <string>
 
 #include <CLI/CLI.hpp>
-#include <unistd.h>
 
 #include "base/PropertyList.h"
+#include "device/HostFile.h"
 #include "tools/Commands.h"
-#include "tools/HostFile.h"
 #include "tools/PropertyListJson.h"
 #include "tools/StandardOutput.h"
 
@@ -16,7 +15,7 @@ namespace {
 struct PlistOptions {
   std::string file;
   std::string form = "xml";
-  std::string output = kStandardStream;
+  std::string output = device::kStandardStream;
 };
 
 constexpr const char* kExamples =
@@ -37,17 +36,14 @@ Result<Bytes> converted(const plist::Value& value, const std::string& form) {
 }
 
 ExitStatus run(const PlistOptions& options) {
-  if (options.form == "binary" && options.output == kStandardStream && ::isatty(STDOUT_FILENO) == 1) {
-    printError("a terminal cannot show the binary form; name a file with -o");
-    return ExitStatus::wrongUsage;
-  }
-  const Result<Bytes> document = readHostFile(options.file);
+  if (options.form == "binary" && isForTerminal(options.output, "the binary form")) return ExitStatus::wrongUsage;
+  const Result<Bytes> document = device::readHostStream(options.file);
   if (!document) return reportUnusable(document.error());
   const Result<plist::Value> value = plist::read(*document);
   if (!value) return reportUnusable(value.error().in(options.file + " is not a property list that can be read"));
   const Result<Bytes> output = converted(*value, options.form);
   if (!output) return reportUnusable(output.error().in(options.file + " has no " + options.form + " form"));
-  const Status written = writeHostFile(options.output, *output);
+  const Status written = device::writeHostFile(options.output, *output);
   return written ? ExitStatus::done : reportUnusable(written.error());
 }
 

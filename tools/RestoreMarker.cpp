@@ -7,7 +7,6 @@
 #include "base/PropertyList.h"
 #include "device/HostFile.h"
 #include "device/SystemCalls.h"
-#include "tools/HostFile.h"
 
 namespace appsync::tools {
 namespace {
@@ -21,7 +20,7 @@ std::string pathIn(const std::string& devicePath) {
 }  // namespace
 
 std::optional<std::string> restoreUnderWay(const std::string& devicePath) {
-  const Result<Bytes> bytes = readHostFile(pathIn(devicePath));
+  const Result<Bytes> bytes = device::readHostFile(pathIn(devicePath));
   if (!bytes) return std::nullopt;
   const Result<plist::Value> root = plist::read(*bytes);
   const plist::Value* backup = root ? root->find(kBackup) : nullptr;

@@ -1,3 +1,4 @@
+#include "device/HostFile.h"
 #include "device/ScreenPicture.h"
 #include "tools/Commands.h"
 #include "tools/OpenDevice.h"
@@ -18,11 +19,13 @@ Example:
   appsync screen phone -o screen.png)";
 
 ExitStatus run(const ScreenOptions& options, device::Device& device) {
+  if (isForTerminal(options.picture, "a picture")) return ExitStatus::wrongUsage;
   device::Services& services = device.services();
   const Status drawn = device::drawScreen(
       {services.homeScreen(), services.defaultRegistry(), services.bundles(), services.iconRenderer()},
       options.picture);
   if (!drawn) return reportUnusable(drawn.error());
+  if (options.picture == device::kStandardStream) return ExitStatus::done;
   StandardOutput output;
   output.writeLine("Drew the home screen as " + printable(options.picture) + ".");
   return output.finish(ExitStatus::done);
@@ -33,7 +36,8 @@ ExitStatus run(const ScreenOptions& options, device::Device& device) {
 void addScreenCommand(CLI::App& line, Invocation& invocation) {
   const CommandText text = {"screen", "Draw the device's home screen.", kExamples};
   const auto added = addDeviceCommand(line, invocation, text, device::Access::readOnly, run);
-  added.command.add_option("-o,--output", added.options->picture, "the PNG file to write")->required();
+  added.command.add_option("-o,--output", added.options->picture, "the PNG file to write; - is standard output")
+      ->required();
 }
 
 }  // namespace appsync::tools

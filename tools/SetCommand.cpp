@@ -1,13 +1,14 @@
 #include <algorithm>
 #include <array>
+#include <cstdint>
 #include <string>
 #include <string_view>
 #include <vector>
 
 #include "device/Demotion.h"
+#include "device/HostFile.h"
 #include "device/InstallerError.h"
 #include "tools/Commands.h"
-#include "tools/HostFile.h"
 #include "tools/OpenDevice.h"
 #include "tools/StandardOutput.h"
 
@@ -34,13 +35,15 @@ Status demote(device::Device& device, const std::string& identifier) {
   return device::demote(services.defaultRegistry(), services.fileSystem(), identifier, kType);
 }
 
+constexpr std::uint64_t kLargestLicence = 16'000'000;
+
 /// "ID:FILE"
 Status giveLicence(device::Device& device, const std::string& value) {
   const std::size_t colon = value.find(':');
   if (colon == value.npos) {
     return device::installerError(InstallerFailure::badOptions, "setting licence takes ID:FILE");
   }
-  const Result<Bytes> licence = readHostFile(value.substr(colon + 1));
+  const Result<Bytes> licence = device::readHostFile(value.substr(colon + 1), kLargestLicence);
   if (!licence) return licence.error();
   return device.services().defaultRegistry().setLicenceData(value.substr(0, colon), *licence);
 }

@@ -4,6 +4,7 @@
 
 #include <unistd.h>
 
+#include "device/HostFile.h"
 #include "tools/Printable.h"
 
 namespace appsync::tools {
@@ -43,6 +44,12 @@ ExitStatus StandardOutput::finish(ExitStatus status) {
   flush();
   if (failure_ == 0 || failure_ == EPIPE) return status;
   return reportUnusable(Error::fromErrno(failure_, "standard output cannot be written"));
+}
+
+bool isForTerminal(const std::string& path, std::string_view what) {
+  if (path != device::kStandardStream || ::isatty(STDOUT_FILENO) != 1) return false;
+  printError("a terminal cannot show " + std::string(what) + "; name a file with -o");
+  return true;
 }
 
 void printError(std::string_view sentence) {

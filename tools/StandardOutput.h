@@ -32,6 +32,10 @@ class StandardOutput {
   int failure_ = 0;  // errno of the first write that failed; nothing is written after it
 };
 
+/// Whether bytes that only programs read, named `what`, would go to a terminal when `path` is where they are written.
+/// Then what to do instead is told on standard error.
+[[nodiscard]] bool isForTerminal(const std::string& path, std::string_view what);
+
 /// Writes "appsync: " and the sentence to standard error. `sentence` may hold names from outside.
 void printError(std::string_view sentence);
 

@@ -239,6 +239,16 @@ TEST_F(DeviceAtPath, ThatIsReadDoesNotChange) {
   EXPECT_EQ(contents(device.path()), before);
 }
 
+TEST_F(DeviceAtPath, OpenedForWritingLosesFilesThatAKillLeftHalfWritten) {
+  make();
+  const std::string left = path() + "/host-state.plist.draft-0123456789abcdef";
+  writeHostFile(left, "half");
+  ASSERT_TRUE(open(Access::readOnly).ok());
+  EXPECT_TRUE(fs::exists(left));
+  ASSERT_TRUE(open().ok());
+  EXPECT_FALSE(fs::exists(left));
+}
+
 TEST_F(DeviceAtPath, ShowsStoredProgressToReaders) {
   TestDevice device;
   device.placeholder("com.a");

@@ -1,4 +1,5 @@
 #include <algorithm>
+#include <cerrno>
 #include <chrono>
 #include <fstream>
 #include <string>
@@ -9,6 +10,7 @@
 
 #include "device/LogSink.h"
 #include "kit/fakes/TemporaryFolder.h"
+#include "tests/device/NamedPipe.h"
 
 namespace appsync::test {
 namespace {
@@ -83,6 +85,23 @@ TEST_F(FileLogSinkTest, LinesOfManyThreadsNeverMix) {
         "2026-02-03T04:05:06.007089Z 8 default " + std::string(500, static_cast<char>('a' + number));
     EXPECT_EQ(std::ranges::count(written, line), 100);
   }
+}
+
+TEST_F(FileLogSinkTest, APipeThatIsReadTakesLines) {
+  const NamedPipe pipe(path);
+  const auto sink = open();
+  sink->write(kTime, 8, LogLevel::standard, "message");
+  EXPECT_EQ(pipe.contents(), "2026-02-03T04:05:06.007089Z 8 default message\n");
+}
+
+TEST_F(FileLogSinkTest, APipeThatNobodyReadsIsAClearError) {
+  makePipe(path);
+  const auto opened = FileLogSink::open(path);
+  ASSERT_FALSE(opened);
+  EXPECT_EQ(
+      opened.error(),
+      (Error{std::string(domains::kPOSIX), ENXIO,
+             "cannot open log file \"" + path + "\": nobody reads from this pipe; start its reader first", nullptr}));
 }
 
 TEST_F(FileLogSinkTest, AFileThatCannotBeOpenedIsAClearError) {

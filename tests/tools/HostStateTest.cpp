@@ -1,3 +1,4 @@
+#include <cerrno>
 #include <filesystem>
 #include <fstream>
 
@@ -11,28 +12,42 @@ namespace {
 
 TEST(HostState, IsEmptyWhereNoneIsKept) {
   const test::TemporaryFolder folder;
-  EXPECT_EQ(loadHostState(folder.path()), HostState{});
+  EXPECT_EQ(loadHostState(folder.path()).value(), HostState{});
 }
 
-TEST(HostState, IsEmptyWhereItCannotBeRead) {
+TEST(HostState, ThatCannotBeUnderstoodIsAnErrorThatSaysWhatToDo) {
   const test::TemporaryFolder folder;
-  std::ofstream(folder.path("host-state.plist")) << "no property list <";
-  EXPECT_EQ(loadHostState(folder.path()), HostState{});
+  for (const char* document :
+       {"", "no property list <", "(Declined)", "{Declined = org.a;}",
+        "<plist><dict><key>Offered</key><array><string>org.a</string><true/></array></dict></plist>"}) {
+    std::ofstream(folder.path("host-state.plist")) << document;
+    const auto state = loadHostState(folder.path());
+    ASSERT_FALSE(state.ok()) << document;
+    EXPECT_TRUE(state.error().text.starts_with(folder.path("host-state.plist") + " is damaged (")) << document;
+    EXPECT_TRUE(state.error().text.ends_with(
+        "); put a good copy in its place, or remove it: then apps that were deleted are sent again"))
+        << document;
+  }
 }
 
-TEST(HostState, IgnoresWhatIsNoIdentifier) {
+TEST(HostState, ThatCannotBeReadIsAnError) {
   const test::TemporaryFolder folder;
-  std::ofstream(folder.path("host-state.plist"))
-      << "<plist><dict><key>Declined</key><array><integer>1</integer>"
-         "<string>org.a</string></array><key>Offered</key><true/></dict></plist>";
-  EXPECT_EQ(loadHostState(folder.path()), (HostState{{"org.a"}, {}}));
+  std::filesystem::create_directory(folder.path("host-state.plist"));
+  EXPECT_EQ(loadHostState(folder.path()).error(),
+            Error::fromErrno(EISDIR, folder.path("host-state.plist") + " cannot be read"));
+}
+
+TEST(HostState, ListsThatAreNotThereAreEmpty) {
+  const test::TemporaryFolder folder;
+  std::ofstream(folder.path("host-state.plist")) << "{Declined = (org.a);}";
+  EXPECT_EQ(loadHostState(folder.path()).value(), (HostState{{"org.a"}, {}}));
 }
 
 TEST(HostState, IsReadAsItWasSaved) {
   const test::TemporaryFolder folder;
   const HostState state = {{"org.a", "org.b"}, {"org.c"}};
   ASSERT_TRUE(saveHostState(folder.path(), state).ok());
-  EXPECT_EQ(loadHostState(folder.path()), state);
+  EXPECT_EQ(loadHostState(folder.path()).value(), state);
 }
 
 TEST(HostState, ThatCannotBeSavedIsAnError) {
@@ -45,7 +60,7 @@ TEST(HostState, RemovedIsEmpty) {
   const test::TemporaryFolder folder;
   ASSERT_TRUE(saveHostState(folder.path(), {{"org.a"}, {}}).ok());
   EXPECT_TRUE(removeHostState(folder.path()).ok());
-  EXPECT_EQ(loadHostState(folder.path()), HostState{});
+  EXPECT_EQ(loadHostState(folder.path()).value(), HostState{});
   EXPECT_TRUE(removeHostState(folder.path()).ok());
 }
 

@@ -5,6 +5,7 @@
 
 #include <gmock/gmock.h>
 
+#include "tests/device/NamedPipe.h"
 #include "tests/tools/ToolFixture.h"
 
 namespace appsync::test {
@@ -105,7 +106,57 @@ TEST_F(Pack, ALinkIsRefused) {
   expectRefused(path("Notes.app"), "is a link");
 }
 
+TEST_F(Pack, AnInfoThatIsAPipeIsRefusedAndNotWaitedFor) {
+  std::filesystem::remove(path("Notes.app/Info.plist"));
+  makePipe(path("Notes.app/Info.plist"));
+  expectRefused(path("Notes.app"), "Info.plist cannot be read: it is a pipe or a device; put a file in its place");
+}
+
+TEST_F(Pack, APipeIsWrittenIntoAndStays) {
+  const NamedPipe pipe(path("pipe"));
+  EXPECT_EQ(runTool({"pack", path("Notes.app"), "-o", path("pipe")}).out,
+            "Packed Notes 1.2 as " + path("pipe") + ".\n");
+  ASSERT_EQ(runTool({"pack", path("Notes.app"), "-o", path("file")}).status, 0);
+  EXPECT_EQ(pipe.contents(), contentOf(path("file")));
+  EXPECT_TRUE(pipe.isThere());
+}
+
+TEST_F(Pack, StandardOutputGetsThePackageAndNothingElse) {
+  const Finished run = runTool({"pack", path("Notes.app"), "-o", "-"});
+  EXPECT_EQ(run.status, 0);
+  EXPECT_EQ(run.err, "");
+  ASSERT_EQ(runTool({"pack", path("Notes.app"), "-o", path("file")}).status, 0);
+  EXPECT_EQ(run.out, contentOf(path("file")));
+  EXPECT_FALSE(std::filesystem::exists("-"));
+}
+
+TEST_F(Pack, StandardOutputThatIsFullIsTold) {
+  const Finished run =
+      runTool({"pack", path("Notes.app"), "-o", "-"}, {.environment = {}, .output = OutputTo::full, .input = {}});
+  EXPECT_EQ(run.status, 3);
+  EXPECT_EQ(run.err, "appsync: standard output cannot be written: No space left on device\n");
+}
+
+TEST_F(Pack, AScreenGoesIntoAPipeOrToStandardOutputAlike) {
+  const NamedPipe pipe(path("pipe"));
+  const Finished toPipe = runTool({"screen", device(), "-o", path("pipe")});
+  EXPECT_EQ(toPipe.out, "Drew the home screen as " + path("pipe") + ".\n");
+  const Finished toOutput = runTool({"screen", device(), "-o", "-"});
+  EXPECT_EQ(toOutput.status, 0);
+  EXPECT_TRUE(toOutput.out.starts_with("\x89PNG"));
+  EXPECT_EQ(pipe.contents(), toOutput.out);
+  EXPECT_TRUE(pipe.isThere());
+}
+
 class Plist : public Pack {};
+
+TEST_F(Plist, AFileThatIsConvertedInPlaceKeepsItsMode) {
+  write(path("in"), "{ a = b; }");
+  std::filesystem::permissions(path("in"), std::filesystem::perms::owner_read | std::filesystem::perms::owner_write);
+  ASSERT_EQ(runTool({"plist", path("in"), "-o", path("in")}).status, 0);
+  EXPECT_EQ(std::filesystem::status(path("in")).permissions(),
+            std::filesystem::perms::owner_read | std::filesystem::perms::owner_write);
+}
 
 TEST_F(Plist, ConvertsBetweenAllForms) {
   const std::string xml = infoPlist("org.notes", "1.2");

@@ -114,7 +114,7 @@ complete -c appsync -n '__appsync_expects set; and not __appsync_expects set 0' 
 
 complete -c appsync -n '__appsync_expects init' -l coordinated -d 'install through coordinators, also when not said'
 complete -c appsync -n '__appsync_expects init' -l direct -d 'let the sync install packages itself'
-complete -c appsync -n '__appsync_expects pack' -s o -l output -rF -d 'the package to write'
+complete -c appsync -n '__appsync_expects pack' -s o -l output -rF -d 'the package to write; - is standard output'
 complete -c appsync -n '__appsync_expects sync' -l remove -x -a '(__appsync_apps)' -d 'remove this app from the device'
 complete -c appsync -n '__appsync_expects sync' -l only -x -a '(__appsync_apps)' \
     -d 'install or update this app only, even if it was deleted before'
@@ -125,7 +125,7 @@ end
 for command in apps report history
     complete -c appsync -n "__appsync_expects $command" -l json -d 'write JSON'
 end
-complete -c appsync -n '__appsync_expects screen' -s o -l output -rF -d 'the PNG file to write'
+complete -c appsync -n '__appsync_expects screen' -s o -l output -rF -d 'the PNG file to write; - is standard output'
 complete -c appsync -n '__appsync_expects plist' -l to -x -a 'xml binary json' \
     -d 'the form to write: xml (when not said), binary or json'
 complete -c appsync -n '__appsync_expects plist' -s o -l output -rF -d 'write to this file instead of standard output'
