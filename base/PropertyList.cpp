@@ -1,8 +1,6 @@
 // What may be asked of a value.
 #include "base/PropertyList.h"
 
-#include <charconv>
-
 #include "base/PropertyListStorage.h"
 
 namespace appsync::plist {

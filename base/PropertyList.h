@@ -58,6 +58,17 @@ inline constexpr int kMaximumDepth = 512;
   return value == nullptr ? nullptr : value->find(key);
 }
 
+/// The text of `value`, which may be null; none for any other type.
+[[nodiscard]] inline std::optional<std::string_view> stringIn(const Value* value) noexcept {
+  return value == nullptr ? std::nullopt : value->string();
+}
+
+/// The same as a string of one's own.
+[[nodiscard]] inline std::optional<std::string> ownedStringIn(const Value* value) {
+  const auto text = stringIn(value);
+  return text ? std::optional<std::string>(*text) : std::nullopt;
+}
+
 /// What gives a boolean: booleans, numbers (not zero) and strings: true for those that start with Y, y, T, t or a
 /// number that is not zero, false for all others. Nothing else does.
 [[nodiscard]] std::optional<bool> truth(const Value& value) noexcept;

@@ -10,17 +10,6 @@
 
 namespace appsync {
 
-/// The text of `value`, which may be null; none for any other type.
-[[nodiscard]] inline std::optional<std::string_view> stringIn(const plist::Value* value) {
-  return value == nullptr ? std::nullopt : value->string();
-}
-
-/// The same as a string of one's own.
-[[nodiscard]] inline std::optional<std::string> ownedStringIn(const plist::Value* value) {
-  const auto text = stringIn(value);
-  return text ? std::optional<std::string>(*text) : std::nullopt;
-}
-
 /// The bytes of data that `value`, which may be null, holds; none for any other type.
 [[nodiscard]] inline std::optional<ByteView> dataIn(const plist::Value* value) {
   return value == nullptr ? std::nullopt : value->data();

@@ -74,9 +74,8 @@ void AppRegistry::enumerateBundlesOfType(
 
 Status AppRegistry::installApplication(const platform::FileLocation& location, const plist::Dictionary& options) {
   Status installed = installer_.install(location, options, platform::ApplicationTypeUser);
-  const plist::Value* identifier = options.find(platform::BundleIdentifierKey);
-  const auto text = identifier == nullptr ? std::nullopt : identifier->string();
-  if (text) noteOutcome(*text, installed);
+  if (const auto identifier = stringIn(options.find(platform::BundleIdentifierKey)))
+    noteOutcome(*identifier, installed);
   return installed;
 }
 

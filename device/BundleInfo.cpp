@@ -9,13 +9,6 @@ namespace {
 
 constexpr std::string_view kAppExtension = ".app";
 
-std::optional<std::string> textUnder(const plist::Dictionary& dictionary, std::string_view key) {
-  const plist::Value* value = dictionary.find(key);
-  const auto text = value == nullptr ? std::nullopt : value->string();
-  if (!text) return std::nullopt;
-  return std::string(*text);
-}
-
 }  // namespace
 
 bool isAppFolder(std::string_view folder) {
@@ -51,7 +44,7 @@ Result<BundleInfo> readBundleInfo(ByteView document) {
   if (dictionary == nullptr) {
     return installerError(InstallerFailure::badInfo, "the app's Info.plist is no dictionary; write it again");
   }
-  std::optional<std::string> identifier = textUnder(*dictionary, platform::BundleIdentifierKey);
+  std::optional<std::string> identifier = ownedStringIn(dictionary->find(platform::BundleIdentifierKey));
   if (!identifier) {
     return installerError(InstallerFailure::badInfo,
                           "the app's Info.plist names no " + std::string(platform::BundleIdentifierKey) + "; add one");
@@ -62,8 +55,8 @@ Result<BundleInfo> readBundleInfo(ByteView document) {
         "the app's bundle identifier \"" + *identifier +
             "\" may have only letters, digits, '-', '.' and '_', at most 200 and no dot first; choose another");
   }
-  return BundleInfo{*std::move(identifier), textUnder(*dictionary, platform::BundleVersionKey),
-                    textUnder(*dictionary, platform::BundleDisplayNameKey), *dictionary};
+  return BundleInfo{*std::move(identifier), ownedStringIn(dictionary->find(platform::BundleVersionKey)),
+                    ownedStringIn(dictionary->find(platform::BundleDisplayNameKey)), *dictionary};
 }
 
 }  // namespace appsync::device

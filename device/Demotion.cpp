@@ -36,11 +36,10 @@ std::optional<Bytes> readIfThere(DeviceFileSystem& files, const std::string& pat
 
 /// The picture that an app names as its icon, as a promise that is fulfilled.
 std::shared_ptr<PromiseState> iconOf(const plist::Dictionary& info, const std::string& appPath) {
-  const plist::Value* name = info.find(platform::BundleIconFileKey);
-  const auto text = name == nullptr ? std::nullopt : name->string();
-  if (!text) return nullptr;
+  const auto name = stringIn(info.find(platform::BundleIconFileKey));
+  if (!name) return nullptr;
   auto icon = std::make_shared<PromiseState>();
-  icon->transferPath = platform::FileLocation{appPath + '/' + std::string(*text), false};
+  icon->transferPath = platform::FileLocation{appPath + '/' + std::string(*name), false};
   icon->isComplete = true;
   return icon;
 }

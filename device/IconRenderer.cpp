@@ -12,8 +12,7 @@ namespace {
 
 /// Where the bundle says its icon is; none when it names no file inside itself.
 std::optional<std::string> iconPath(const platform::Bundle& bundle) {
-  const plist::Value* named = bundle.infoDictionaryValue(platform::BundleIconFileKey);
-  const auto name = named == nullptr ? std::nullopt : named->string();
+  const auto name = stringIn(bundle.infoDictionaryValue(platform::BundleIconFileKey));
   if (!name || name->empty() || name->find('\0') != name->npos) return std::nullopt;
   std::string path = bundle.location().path + '/';
   path += *name;

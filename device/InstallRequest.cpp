@@ -24,23 +24,21 @@ Result<std::optional<Bytes>> bytesUnder(const plist::Dictionary& options, std::s
 
 Result<InstallRequest> readInstallOptions(const plist::Dictionary& options) {
   InstallRequest request;
-  const plist::Value* type = options.find(platform::PackageTypeKey);
-  const auto typeName = type == nullptr ? std::nullopt : type->string();
+  const auto typeName = stringIn(options.find(platform::PackageTypeKey));
   if (typeName != platform::PackageTypeCustomer && typeName != platform::PackageTypePlaceholder) {
     return badOption(platform::PackageTypeKey, "must be \"Customer\" or \"Placeholder\"");
   }
   request.role = typeName == platform::PackageTypeCustomer ? BundleRole::installed : BundleRole::placeholder;
 
-  const plist::Value* identifier = options.find(platform::BundleIdentifierKey);
-  const auto identifierText = identifier == nullptr ? std::nullopt : identifier->string();
-  if (!identifierText) return badOption(platform::BundleIdentifierKey, "must name the app");
-  if (!isBundleIdentifier(*identifierText)) {
+  const auto identifier = stringIn(options.find(platform::BundleIdentifierKey));
+  if (!identifier) return badOption(platform::BundleIdentifierKey, "must name the app");
+  if (!isBundleIdentifier(*identifier)) {
     return installerError(InstallerFailure::badIdentifier,
-                          "\"" + std::string(*identifierText) +
+                          "\"" + std::string(*identifier) +
                               "\" is no bundle identifier: it may have only letters, "
                               "digits, '-', '.' and '_', at most 200 and no dot first");
   }
-  request.identifier = *identifierText;
+  request.identifier = *identifier;
 
   if (const plist::Value* installType = options.find(platform::InstallTypeKey)) {
     const auto number = installType->uint64();

@@ -7,8 +7,7 @@ namespace appsync::device {
 bool isDeviceBound(ByteView licence) {
   if (licence.empty()) return false;
   const auto document = plist::read(licence);
-  const plist::Value* device = document ? document->find("DeviceIdentifier") : nullptr;
-  return device != nullptr && device->string();
+  return document && stringIn(document->find("DeviceIdentifier"));
 }
 
 }  // namespace appsync::device

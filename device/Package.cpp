@@ -59,8 +59,7 @@ Result<PackageInfo> readInfo(const std::string& hostPath, PackageLimits limits) 
   info.name = bundle->displayName ? *std::move(bundle->displayName) : std::string(appFolderStem(package->appFolder()));
   info.info = std::move(bundle->dictionary);
   info.packageBytes = package->packageBytes();
-  const plist::Value* icon = info.info.find(platform::BundleIconFileKey);
-  const auto iconName = icon == nullptr ? std::nullopt : icon->string();
+  const auto iconName = stringIn(info.info.find(platform::BundleIconFileKey));
   if (!iconName || iconName->empty()) return info;
   const Status read = readIcon(hostPath, package->appFolder() + '/' + std::string(*iconName), limits, info);
   if (!read) return read.error();

@@ -37,9 +37,7 @@ const std::string& shownName(const PlaceholderState& placeholder) {
 
 std::optional<std::string> versionOf(const PlaceholderState& placeholder) {
   if (placeholder.attributes.bundleVersion()) return placeholder.attributes.bundleVersion();
-  const plist::Value* value = placeholder.attributes.infoDictionary().find(platform::BundleVersionKey);
-  const auto text = value == nullptr ? std::nullopt : value->string();
-  return text ? std::optional(std::string(*text)) : std::nullopt;
+  return ownedStringIn(placeholder.attributes.infoDictionary().find(platform::BundleVersionKey));
 }
 
 /// The app's own info dictionary, with what the placeholder says of it.

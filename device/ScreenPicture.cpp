@@ -125,7 +125,7 @@ double fractionOf(const platform::InstallProgress* progress) {
 
 std::string nameOf(const platform::AppRecord& app, const platform::Bundle* bundle) {
   const plist::Value* name = bundle == nullptr ? nullptr : bundle->infoDictionaryValue(platform::BundleDisplayNameKey);
-  const auto text = name == nullptr ? std::nullopt : name->string();
+  const auto text = stringIn(name);
   return text && !text->empty() ? std::string(*text) : app.applicationIdentifier();
 }
 

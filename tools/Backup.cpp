@@ -23,9 +23,7 @@ constexpr std::string_view kAppVersionKey = "AppVersion";
 constexpr std::string_view kDemotionKey = "InstallType";
 
 std::string textIn(const plist::Value& entry, std::string_view key) {
-  const plist::Value* value = entry.find(key);
-  const auto text = value == nullptr ? std::nullopt : value->string();
-  return text ? std::string(*text) : std::string();
+  return ownedStringIn(entry.find(key)).value_or("");
 }
 
 std::optional<std::uint64_t> numberIn(const plist::Value& entry, std::string_view key) {

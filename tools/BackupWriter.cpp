@@ -47,7 +47,7 @@ std::optional<Bytes> iconOf(device::Device& device, const platform::AppRecord& r
   const auto path = record.bundlePath();
   const auto bundle = path ? device.platform().bundles().openBundle({*path, true}) : nullptr;
   const plist::Value* name = bundle ? bundle->infoDictionaryValue(platform::BundleIconFileKey) : nullptr;
-  const auto text = name == nullptr ? std::nullopt : name->string();
+  const auto text = stringIn(name);
   if (!text) return std::nullopt;
   Result<Bytes> bytes = device.platform().fileSystem().readFile(*path + "/" + std::string(*text));
   return bytes ? std::optional(std::move(bytes).value()) : std::nullopt;

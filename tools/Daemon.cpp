@@ -46,8 +46,7 @@ IdentifierSet deletedIn(const plist::Dictionary& report) {
   const plist::Value* deleted = report.find("_Deleted");
   if (deleted == nullptr || deleted->array() == nullptr) return identifiers;
   for (const plist::Value& app : *deleted->array()) {
-    const plist::Value* identifier = app.find(platform::BundleIdentifierKey);
-    if (identifier != nullptr && identifier->string()) identifiers.emplace(*identifier->string());
+    if (const auto identifier = stringIn(app.find(platform::BundleIdentifierKey))) identifiers.emplace(*identifier);
   }
   return identifiers;
 }

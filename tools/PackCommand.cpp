@@ -78,8 +78,7 @@ Result<AppFolder> findApp(const std::string& given) {
 
 /// A text that the info dictionary must have.
 Status requireText(const plist::Dictionary& info, std::string_view key, const fs::path& path) {
-  const plist::Value* value = info.find(key);
-  const auto text = value == nullptr ? std::nullopt : value->string();
+  const auto text = stringIn(info.find(key));
   if (text && !text->empty()) return {};
   return wrong(path, "has no text under " + std::string(key) + "; add it");
 }

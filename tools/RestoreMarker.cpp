@@ -23,9 +23,7 @@ std::optional<std::string> restoreUnderWay(const std::string& devicePath) {
   const Result<Bytes> bytes = device::readHostFile(pathIn(devicePath));
   if (!bytes) return std::nullopt;
   const Result<plist::Value> root = plist::read(*bytes);
-  const plist::Value* backup = root ? root->find(kBackup) : nullptr;
-  const auto text = backup == nullptr ? std::nullopt : backup->string();
-  return text ? std::optional(std::string(*text)) : std::nullopt;
+  return root ? ownedStringIn(root->find(kBackup)) : std::nullopt;
 }
 
 Status beginRestore(const std::string& devicePath, const std::string& backupIdentifier) {

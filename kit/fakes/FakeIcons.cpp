@@ -56,9 +56,9 @@ class FakePNGEncoder final : public platform::PNGEncoder {
 std::unique_ptr<platform::Image> FakeIconRenderer::createHomeScreenIconImage(const platform::Bundle& bundle) {
   const std::string& folder = bundle.location().path;
   if (journal_.beforeCall("iconRenderer.createHomeScreenIconImage", folder)) return nullptr;
-  const plist::Value* name = bundle.infoDictionaryValue(platform::BundleIconFileKey);
-  if (name == nullptr || !name->string()) return nullptr;
-  const std::optional<std::string> icon = files_.text(folder + "/" + std::string(*name->string()));
+  const auto name = stringIn(bundle.infoDictionaryValue(platform::BundleIconFileKey));
+  if (!name) return nullptr;
+  const std::optional<std::string> icon = files_.text(folder + "/" + std::string(*name));
   if (!icon || icon->empty()) return nullptr;
   return std::make_unique<FakeImage>(*icon);
 }

@@ -12,13 +12,8 @@ using platform::TSInstallType;
 
 constexpr long kInstallerFailure = 1;
 
-std::optional<std::string> text(const plist::Value* value) {
-  const std::optional<std::string_view> view = value == nullptr ? std::nullopt : value->string();
-  return view ? std::optional<std::string>(*view) : std::nullopt;
-}
-
 std::optional<PackageKind> kindIn(const plist::Dictionary& options) {
-  const std::optional<std::string> word = text(options.find(platform::PackageTypeKey));
+  const std::optional<std::string> word = ownedStringIn(options.find(platform::PackageTypeKey));
   if (word == platform::PackageTypeCustomer) return PackageKind::app;
   if (word == platform::PackageTypePlaceholder) return PackageKind::placeholder;
   return std::nullopt;
@@ -36,7 +31,7 @@ Error installerError(std::string text) {
 }
 
 std::string identifierIn(const plist::Dictionary& options) {
-  return text(options.find(platform::BundleIdentifierKey)).value_or("");
+  return ownedStringIn(options.find(platform::BundleIdentifierKey)).value_or("");
 }
 
 Result<FakePackage> readPackage(FakeFileSystem& files, const platform::FileLocation& location,
@@ -49,11 +44,11 @@ Result<FakePackage> readPackage(FakeFileSystem& files, const platform::FileLocat
   if (!bytes || bytes->empty()) return installerError("no package at " + location.path);
   const Result<plist::Value> info = plist::read(*bytes);
   const std::optional<std::string> named =
-      info ? text(info->find(platform::BundleIdentifierKey)) : std::optional<std::string>();
+      info ? ownedStringIn(info->find(platform::BundleIdentifierKey)) : std::optional<std::string>();
   if (isPlaceholder ? named != identifier : named && named != identifier) {
     return installerError(location.path + " does not hold " + identifier);
   }
-  return FakePackage{*kind, info ? text(info->find(platform::BundleVersionKey)) : std::nullopt, bytes->size()};
+  return FakePackage{*kind, info ? ownedStringIn(info->find(platform::BundleVersionKey)) : std::nullopt, bytes->size()};
 }
 
 void applyPackage(FakeApp& app, const FakePackage& package, const plist::Dictionary& options) {

@@ -44,11 +44,7 @@ std::optional<std::string> operationWord(FakeFileSystem& files, std::string_view
   const plist::Array* entries = list ? list->array() : nullptr;
   if (entries == nullptr) return std::nullopt;
   for (const plist::Value& candidate : *entries) {
-    const plist::Value* named = candidate.find("identifier");
-    const plist::Value* word = candidate.find("operation");
-    if (named == nullptr || named->string() != identifier) continue;
-    if (word == nullptr || !word->string()) return std::nullopt;
-    return std::string(*word->string());
+    if (stringIn(candidate.find("identifier")) == identifier) return ownedStringIn(candidate.find("operation"));
   }
   return std::nullopt;
 }

@@ -184,6 +184,18 @@ TEST(PropertyListFind, ToleratesNothing) {
   EXPECT_EQ(plist::find(nullptr, "b"), nullptr);
 }
 
+TEST(PropertyListStringIn, OnlyAStringGivesText) {
+  const Value text("com.a");
+  EXPECT_EQ(plist::stringIn(&text), "com.a");
+  EXPECT_EQ(plist::ownedStringIn(&text), "com.a");
+  EXPECT_EQ(plist::stringIn(nullptr), std::nullopt);
+  EXPECT_EQ(plist::ownedStringIn(nullptr), std::nullopt);
+  for (const Value& other : {Value(), Value(7), Value(Array{"com.a"})}) {
+    EXPECT_EQ(plist::stringIn(&other), std::nullopt);
+    EXPECT_EQ(plist::ownedStringIn(&other), std::nullopt);
+  }
+}
+
 struct TruthCase {
   Value value;
   std::optional<bool> truth;

@@ -1,5 +1,4 @@
 // Small questions to property lists that come from outside.
-#include <optional>
 #include <string>
 #include <vector>
 
@@ -8,18 +7,6 @@
 #include "core/PropertyListAccess.h"
 
 namespace appsync::test {
-
-TEST(PropertyListAccess, OnlyAStringGivesText) {
-  const plist::Value text("com.a");
-  EXPECT_EQ(stringIn(&text), "com.a");
-  EXPECT_EQ(ownedStringIn(&text), "com.a");
-  EXPECT_EQ(stringIn(nullptr), std::nullopt);
-  EXPECT_EQ(ownedStringIn(nullptr), std::nullopt);
-  for (const plist::Value& other : {plist::Value(), plist::Value(7), plist::Value(plist::Array{"com.a"})}) {
-    EXPECT_EQ(stringIn(&other), std::nullopt);
-    EXPECT_EQ(ownedStringIn(&other), std::nullopt);
-  }
-}
 
 TEST(PropertyListAccess, BooleansNumbersAndTrueWordsAreTrue) {
   for (const plist::Value& value : {plist::Value(true), plist::Value(1), plist::Value(-0.5), plist::Value("yes"),
