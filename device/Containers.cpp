@@ -1,39 +1,20 @@
 #include "device/Containers.h"
 
-#include <array>
 #include <cerrno>
-#include <cstdio>
 #include <utility>
 
 #include <fcntl.h>
-#include <sys/random.h>
 
 #include "device/AppRecord.h"
 #include "device/FileTree.h"
 #include "device/SystemCalls.h"
+#include "device/UUID.h"
 
 namespace appsync::device {
 
 namespace {
 
 constexpr std::string_view kUnsettled = ".tmp";
-
-/// A random UUID, version 4.
-std::string newName() {
-  std::array<unsigned char, 16> bytes{};
-  while (getrandom(bytes.data(), bytes.size(), 0) != static_cast<ssize_t>(bytes.size())) {
-  }
-  bytes[6] = static_cast<unsigned char>((bytes[6] & 0x0F) | 0x40);
-  bytes[8] = static_cast<unsigned char>((bytes[8] & 0x3F) | 0x80);
-  std::string name;
-  for (std::size_t index = 0; index < bytes.size(); ++index) {
-    if (index == 4 || index == 6 || index == 8 || index == 10) name += '-';
-    constexpr std::string_view kDigits = "0123456789ABCDEF";
-    name += kDigits[bytes[index] >> 4];
-    name += kDigits[bytes[index] & 0x0F];
-  }
-  return name;
-}
 
 Status outcome(int number, std::string_view what) {
   if (number == 0) return {};
@@ -43,7 +24,7 @@ Status outcome(int number, std::string_view what) {
 }  // namespace
 
 NewContainer::NewContainer(DeviceFileSystem& files, FileDescriptor parent)
-    : files_(&files), parent_(std::move(parent)), name_(newName()), nameNow_(name_ + std::string(kUnsettled)) {}
+    : files_(&files), parent_(std::move(parent)), name_(newUUID()), nameNow_(name_ + std::string(kUnsettled)) {}
 
 Result<NewContainer> NewContainer::make(DeviceFileSystem& files) {
   Result<FileDescriptor> parent = files.root().open(kContainersPath, O_PATH | O_DIRECTORY);

@@ -1,16 +1,15 @@
 #include "tools/BackupWriter.h"
 
-#include <array>
 #include <cerrno>
 #include <utility>
 
 #include <fcntl.h>
-#include <sys/random.h>
 
 #include "device/AppData.h"
 #include "device/Demotion.h"
 #include "device/FileTree.h"
 #include "device/SystemCalls.h"
+#include "device/UUID.h"
 #include "platform/Keys.h"
 #include "tools/DeviceApps.h"
 #include "tools/FolderDraft.h"
@@ -20,19 +19,6 @@ namespace {
 
 using device::FileDescriptor;
 using platform::TSInstallType;
-
-std::string newIdentifier() {
-  std::array<unsigned char, 16> bytes{};
-  while (getrandom(bytes.data(), bytes.size(), 0) != static_cast<ssize_t>(bytes.size())) {
-  }
-  std::string text;
-  for (const unsigned char byte : bytes) {
-    constexpr std::string_view kDigits = "0123456789abcdef";
-    text += kDigits[byte >> 4];
-    text += kDigits[byte & 0x0F];
-  }
-  return text;
-}
 
 Result<FileDescriptor> makeFolder(int parent, const std::string& name) {
   const int made = device::sys::makeFolder(parent, name.c_str());
@@ -138,7 +124,7 @@ Status fill(const FolderDraft& draft, device::Device& device, Backup& backup) {
 Result<Backup> writeBackup(device::Device& device, const std::string& path) {
   Result<FolderDraft> draft = FolderDraft::make(path);
   if (!draft) return draft.error();
-  Backup backup{path, newIdentifier(), {}, {}};
+  Backup backup{path, device::newUUID(), {}, {}};
   const auto order = device.services().homeScreen().iconOrder();
   if (order) backup.iconOrder = *order;
   if (Status filled = fill(*draft, device, backup); !filled) {
