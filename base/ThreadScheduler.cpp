@@ -76,6 +76,10 @@ class ThreadScheduler::Agenda : public std::enable_shared_from_this<Agenda> {
 ThreadScheduler::ThreadScheduler(Clock& clock) : agenda_(std::make_shared<Agenda>(clock)) {}
 
 ThreadScheduler::~ThreadScheduler() {
+  close();
+}
+
+void ThreadScheduler::close() {
   agenda_->close();
 }
 

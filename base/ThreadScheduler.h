@@ -2,7 +2,6 @@
 #pragma once
 
 #include <memory>
-#include <thread>
 
 #include "base/Scheduler.h"
 
@@ -23,6 +22,9 @@ class ThreadScheduler final : public Scheduler {
 
   /// Throws std::system_error if the thread cannot be started.
   void after(Duration delay, std::function<void()> task) override;
+
+  /// Does already what destruction does. Of the tasks that come after it none runs; each is dropped as it comes.
+  void close();
 
  private:
   class Agenda;

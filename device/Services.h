@@ -66,7 +66,7 @@ class Services final : public platform::Platform {
   [[nodiscard]] PNGEncoders& pngEncoders() override { return pngEncoders_; }
   [[nodiscard]] DeviceFileSystem& fileSystem() override { return files_; }
   [[nodiscard]] Clock& clock() override { return clock_; }
-  [[nodiscard]] Scheduler& scheduler() override { return scheduler_; }
+  [[nodiscard]] ThreadScheduler& scheduler() override { return scheduler_; }
 
   [[nodiscard]] std::unique_ptr<platform::BackupManager> makeBackupManager() override {
     return std::make_unique<BackupManager>(database_, files_);

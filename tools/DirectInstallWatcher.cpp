@@ -33,12 +33,19 @@ class DirectInstallWatcher final : public InstallWatcher {
 
  private:
   void look() {
-    if (interruption_.requested()) progress_.interrupted();
+    if (interruption_.requested()) end();
     settle();
     if (++looks_ % kLooksBetweenProgress != 0) return;
     for (const SentPackage& package : packages_.first(kShownInstalls)) {
       if (!showsWait(package)) showInstall(device_, package.app.identifier, progress_);
     }
+  }
+
+  /// What the home screen does not let go of would be tried again without an end. It is dropped and not made to fail: of
+  /// an update that fails the plug-in removes the app.
+  void end() {
+    progress_.interrupted();
+    device_.services().scheduler().close();
   }
 
   void settle() {

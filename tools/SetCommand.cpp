@@ -58,7 +58,8 @@ constexpr const char* kExamples = R"(Keys and their values:
   coordination       on, off or unset: whether apps are installed through coordinators, which can be tapped and
                      cancelled while a sync runs; from the next sync on
   assertion          ID:granted, ID:denied, ID:unknown, ID:failing or ID:unset: what the home screen
-                     answers when app ID is about to be replaced
+                     answers when app ID is about to be replaced; only a device that installs directly asks, so
+                     it has no effect through coordinators
   store              a folder of packages, or unset: where an app that was restored through coordinators gets its
                      package from
   demote             ID: leaves of an installed app the icon and the data, as a person wishes it

@@ -129,6 +129,19 @@ TEST_F(ThreadSchedulerTest, DropsWhatIsNotYetDueWhenDestroyed) {
   EXPECT_TRUE(watch.expired());
 }
 
+TEST_F(ThreadSchedulerTest, ClosedItDropsWhatIsNotYetDueAndWhatComesLater) {
+  auto captured = std::make_shared<int>();
+  const std::weak_ptr<int> watch = captured;
+  scheduler->after(1s, [captured = std::move(captured)] { ADD_FAILURE() << "ran"; });
+  scheduler->close();
+  EXPECT_TRUE(watch.expired());
+  auto late = std::make_shared<int>();
+  const std::weak_ptr<int> watchLate = late;
+  scheduler->after(0s, [late = std::move(late)] { ADD_FAILURE() << "ran"; });
+  EXPECT_TRUE(watchLate.expired());
+  scheduler->close();
+}
+
 TEST_F(ThreadSchedulerTest, DestroyedFromOutsideItWaitsForTheRunningTaskAndThoseThatAreDue) {
   Gate gate;
   gate.close();

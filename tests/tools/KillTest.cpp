@@ -4,7 +4,6 @@
 #include <fstream>
 #include <iterator>
 #include <memory>
-#include <thread>
 
 #include <gmock/gmock.h>
 
@@ -14,7 +13,7 @@ namespace appsync::test {
 
 namespace {
 
-using namespace std::chrono_literals;
+using testing::AnyOf;
 using testing::Contains;
 using testing::ElementsAre;
 using testing::HasSubstr;
@@ -83,35 +82,63 @@ class Interrupt : public ToolFixture {
   [[nodiscard]] std::unique_ptr<ToolRun> startSync() const {
     return std::make_unique<ToolRun>(std::vector<std::string>{"sync", device(), library(), "--json"});
   }
-  static void waitForOutput(const ToolRun& run, const std::string& text) {
-    while (run.outputSoFar().find(text) == std::string::npos)
-      std::this_thread::sleep_for(1ms);
-  }
-  /// A sync that does not come to its end: the home screen does not let go of the app.
-  [[nodiscard]] std::unique_ptr<ToolRun> endlessSync() {
-    publish("org.held");
+  /// A sync that does not come to its end by itself: the home screen does not let go of the app.
+  [[nodiscard]] std::unique_ptr<ToolRun> endlessSync(const std::string& version = "1.0") {
+    publish("org.held", version);
     EXPECT_EQ(runTool({"set", device(), "assertion=org.held:denied"}).status, 0);
     auto run = startSync();
-    waitForOutput(*run, "\"event\"");
+    EXPECT_TRUE(run->writes("\"event\""));
     return run;
   }
+  /// Interrupts it once, when the install is surely waiting to be tried again.
+  void interruptWhileItWaits(ToolRun& run) {
+    ASSERT_TRUE(run.writes(kWaits));
+    run.signal(SIGINT);
+    ASSERT_TRUE(run.ends());
+    const Finished ended = run.wait();
+    EXPECT_EQ(ended.status, 1);
+    EXPECT_THAT(ended.err, HasSubstr("interrupted; finishing what was sent already"));
+    EXPECT_THAT(endsIn(ended.out), ElementsAre("failed org.held"));
+    EXPECT_THAT(ended.out, HasSubstr("the sync was interrupted; the app is offered again at the next sync"));
+  }
+  void letGoOfTheApp() const { ASSERT_EQ(runTool({"set", device(), "assertion=org.held:unset"}).status, 0); }
+  void expectTheNextSyncBrings(const std::string& app) const {
+    EXPECT_EQ(sync().status, 0);
+    EXPECT_THAT(apps(), ElementsAre(app));
+  }
+
+  static constexpr std::string_view kWaits = R"({"event":"waiting","identifier":"org.held")";
 };
+
+TEST_F(Interrupt, OnceEndsASyncThatWaitsForTheHomeScreen) {
+  interruptWhileItWaits(*endlessSync());
+  letGoOfTheApp();
+  expectTheNextSyncBrings("org.held 1.0");
+}
+
+TEST_F(Interrupt, OnceLeavesTheAppWhoseUpdateWaitsForTheHomeScreen) {
+  publish("org.held");
+  ASSERT_EQ(sync().status, 0);
+  interruptWhileItWaits(*endlessSync("2.0"));
+  letGoOfTheApp();
+  EXPECT_THAT(apps(), ElementsAre("org.held 1.0"));
+  expectTheNextSyncBrings("org.held 2.0");
+}
 
 TEST_F(Interrupt, TwiceEndsItAtOnce) {
   const auto run = endlessSync();
-  run->signal(SIGTERM);
-  while (run->errorsSoFar().find("interrupted; finishing what was sent already") == std::string::npos)
-    std::this_thread::sleep_for(1ms);
-  run->signal(SIGINT);
-  EXPECT_EQ(run->wait().status, -SIGINT);
-  ASSERT_EQ(runTool({"set", device(), "assertion=org.held:unset"}).status, 0);
-  EXPECT_EQ(sync().status, 0);
-  EXPECT_THAT(apps(), ElementsAre("org.held 1.0"));
+  // Both while it stands still: one would let it come to its end. Which of them comes second is the system's choice.
+  for (const int signal : {SIGSTOP, SIGTERM, SIGINT, SIGCONT})
+    run->signal(signal);
+  ASSERT_TRUE(run->ends());
+  EXPECT_THAT(run->wait().status, AnyOf(-SIGINT, -SIGTERM));
+  letGoOfTheApp();
+  expectTheNextSyncBrings("org.held 1.0");
 }
 
 TEST_F(Interrupt, ASyncThatWaitsForTheHomeScreenSaysSo) {
   const auto run = endlessSync();
-  waitForOutput(*run, R"({"event":"waiting","identifier":"org.held")");
+  EXPECT_TRUE(run->writes(kWaits));
 }
 
 TEST_F(Interrupt, ASecondProcessIsToldThatTheDeviceIsHeld) {

@@ -7,12 +7,24 @@
 #include <iterator>
 
 #include <fcntl.h>
+#include <poll.h>
+#include <sys/inotify.h>
+#include <sys/syscall.h>
 #include <sys/wait.h>
 #include <unistd.h>
+
+#include "device/FileDescriptor.h"
 
 namespace appsync::test {
 
 namespace {
+
+constexpr int kLongestWait = 60'000;  // milliseconds
+
+/// Becomes readable at the process's end. By number: the C library declares the call for C alone.
+device::FileDescriptor handleOf(pid_t process) {
+  return device::FileDescriptor(static_cast<int>(::syscall(SYS_pidfd_open, process, 0)));
+}
 
 /// Where the tests are built, and the tool.
 std::string binaryFolder() {
@@ -88,12 +100,26 @@ void ToolRun::signal(int number) const {
   ::kill(process_, number);
 }
 
-std::string ToolRun::outputSoFar() const {
-  return contentOf(folder_.path("out"));
+bool ToolRun::ends() const {
+  const device::FileDescriptor end = handleOf(process_);
+  pollfd waited{end.get(), POLLIN, 0};
+  return ::poll(&waited, 1, kLongestWait) == 1;
 }
 
-std::string ToolRun::errorsSoFar() const {
-  return contentOf(folder_.path("err"));
+bool ToolRun::writes(std::string_view text) const {
+  const std::string path = folder_.path("out");
+  const device::FileDescriptor end = handleOf(process_);
+  const device::FileDescriptor writing(::inotify_init1(IN_CLOEXEC | IN_NONBLOCK));
+  ::inotify_add_watch(writing.get(), path.c_str(), IN_MODIFY);
+  pollfd waited[] = {{writing.get(), POLLIN, 0}, {end.get(), POLLIN, 0}};
+  for (bool goesOn = true;;) {
+    if (contentOf(path).find(text) != std::string::npos) return true;
+    if (!goesOn) return false;
+    goesOn = ::poll(waited, 2, kLongestWait) > 0 && waited[1].revents == 0;
+    char events[4096];
+    while (::read(writing.get(), events, sizeof events) > 0) {
+    }
+  }
 }
 
 Finished ToolRun::wait() {

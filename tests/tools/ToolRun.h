@@ -3,6 +3,7 @@
 
 #include <map>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include <sys/types.h>
@@ -38,11 +39,14 @@ class ToolRun {
   ToolRun& operator=(const ToolRun&) = delete;
 
   void signal(int number) const;
-  /// Everything it has written so far to standard output.
-  [[nodiscard]] std::string outputSoFar() const;
-  /// The same of standard error.
-  [[nodiscard]] std::string errorsSoFar() const;
   [[nodiscard]] Finished wait();
+
+  // These block. False when it has ended without, or neither wrote nor ended for a minute.
+
+  /// Until `text` is in what it has written to standard output.
+  [[nodiscard]] bool writes(std::string_view text) const;
+  /// Until it has ended. It still is to be waited for.
+  [[nodiscard]] bool ends() const;
 
  private:
   TemporaryFolder folder_;
