@@ -22,11 +22,16 @@ enum class AppEvent : std::uint8_t {
 /// Why an app is skipped that somebody on the device did not want.
 inline constexpr std::string_view kCancelledOnDevice = "cancelled on the device";
 
-/// An app as people and machines are told of it. Texts are as they came from outside.
+/// What is named: a file of the library may be called as an app is.
+enum class NameKind : std::uint8_t { app, packageFile };
+
+/// An app, or a package that does not say whose it is, as people and machines are told of it. Texts are as they came
+/// from outside.
 struct AppName {
-  std::string identifier;  ///< of a package that does not say it: the package's file name
+  std::string identifier;  ///< of a package file its name
   std::string name;        ///< empty when it is not known
   std::string version;     ///< empty when it is not known
+  NameKind kind = NameKind::app;
 };
 
 struct AppOutcome {

@@ -81,7 +81,7 @@ std::vector<PlannedApp> makePlan(const PlanInput& input) {
   }
   if (!input.only.empty()) return plan;
   for (const BrokenPackage& broken : input.library.broken) {
-    plan.push_back({{broken.fileName, {}, {}}, PlannedWork::refuse, nullptr, broken.reason});
+    plan.push_back({{broken.fileName, {}, {}, NameKind::packageFile}, PlannedWork::refuse, nullptr, broken.reason});
   }
   return plan;
 }

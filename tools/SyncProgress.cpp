@@ -17,7 +17,7 @@ constexpr auto kShortestTimeBetweenReports = std::chrono::milliseconds(50);
 
 void SyncProgress::expect(const AppName& app, std::uint64_t bytes) {
   const std::lock_guard lock(mutex_);
-  if (finished_.contains(app.identifier)) return;
+  if (finished_.contains({app.kind, app.identifier})) return;
   const auto [place, isNew] = running_.try_emplace(app.identifier);
   if (!isNew) return;
   place->second.app = app;
@@ -50,8 +50,10 @@ void SyncProgress::interrupted() {
 
 bool SyncProgress::finish(const AppOutcome& outcome) {
   const std::lock_guard lock(mutex_);
-  if (!finished_.emplace(outcome.app.identifier, true).second) return false;
-  if (const auto found = running_.find(outcome.app.identifier); found != running_.end()) {
+  const AppName& app = outcome.app;
+  if (!finished_.emplace(app.kind, app.identifier).second) return false;
+  const auto found = app.kind == NameKind::app ? running_.find(app.identifier) : running_.end();
+  if (found != running_.end()) {
     moveTo(found->second, 1);
     ++arrived_;
     if (isSuccess(outcome.event)) report(found->second);
@@ -71,11 +73,6 @@ void SyncProgress::finishExpected(std::string_view identifier, AppEvent event, s
     outcome.app = found->second.app;
   }
   finish(outcome);
-}
-
-bool SyncProgress::isFinished(std::string_view identifier) {
-  const std::lock_guard lock(mutex_);
-  return finished_.find(identifier) != finished_.end();
 }
 
 const AppOutcomes& SyncProgress::summarise() {

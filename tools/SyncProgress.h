@@ -4,8 +4,10 @@
 #include <chrono>
 #include <map>
 #include <mutex>
+#include <set>
 #include <string>
 #include <string_view>
+#include <utility>
 
 #include "tools/AppOutcome.h"
 #include "tools/SyncReporter.h"
@@ -31,11 +33,10 @@ class SyncProgress {
   /// The user asked for an end. May be told again and again.
   void interrupted();
 
-  /// The app's end. Only the first one of an identifier counts; returns whether it was that.
+  /// The app's end, or a package file's. Only the first one of a name counts; returns whether it was that.
   bool finish(const AppOutcome& outcome);
   /// The same for an app that is expected, named as it was then; does nothing for others.
   void finishExpected(std::string_view identifier, AppEvent event, std::string_view reason);
-  [[nodiscard]] bool isFinished(std::string_view identifier);
 
   /// Tells the reporter that it was all. The outcomes, in the order in which they came.
   const AppOutcomes& summarise();
@@ -58,7 +59,7 @@ class SyncProgress {
   std::mutex mutex_;
   // Under mutex_, as are the calls of the reporter:
   std::map<std::string, Running, std::less<>> running_;
-  std::map<std::string, bool, std::less<>> finished_;
+  std::set<std::pair<NameKind, std::string>> finished_;
   AppOutcomes outcomes_;
   double weight_ = 0;
   double done_ = 0;

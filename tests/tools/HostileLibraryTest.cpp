@@ -18,6 +18,7 @@ using testing::HasSubstr;
 using testing::IsEmpty;
 using testing::Not;
 
+using testing::UnorderedElementsAre;
 class HostileLibrary : public ToolFixtureOfEachMode {
  protected:
   /// A package whose "Info.plist" is this.
@@ -108,6 +109,17 @@ TEST_P(HostileLibrary, APackageIsKnownByItsContentToo) {
 
 TEST_P(HostileLibrary, AnUpperCaseSuffixCounts) {
   write(library() + "/NOTES.ZIP", appPackage("org.a"));
+TEST_P(HostileLibrary, ABrokenPackageThatIsCalledAsAnAppIsToldBesideIt) {
+  publish("org.a");
+  write(library() + "/org.a", "PK\x03\x04");
+  Finished run = sync({"--json"});
+  EXPECT_THAT(endsIn(run.out), UnorderedElementsAre("failed org.a", "installed org.a"));
+  EXPECT_EQ(run.status, 1);
+  run = sync({"--json"});
+  EXPECT_THAT(endsIn(run.out), UnorderedElementsAre("failed org.a", "skipped org.a"));
+  EXPECT_EQ(run.status, 1);
+}
+
   EXPECT_THAT(endsIn(sync({"--json"}).out), ElementsAre("installed org.a"));
 }
 

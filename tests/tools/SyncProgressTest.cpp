@@ -42,6 +42,16 @@ class Progress : public testing::Test {
   SyncProgress progress_{recorder_};
 };
 
+TEST_F(Progress, APackageFileThatIsCalledAsAnAppEndsBesideIt) {
+  expect("a", 1000);
+  EXPECT_TRUE(progress_.finish({AppEvent::failed, {"a", "", "", NameKind::packageFile}, "reason"}));
+  progress_.installing("a", 0.5);
+  EXPECT_EQ(recorder_.fractions["a"].back(), 0.75);
+  EXPECT_TRUE(finish("a"));
+  EXPECT_FALSE(progress_.finish({AppEvent::failed, {"a", "", "", NameKind::packageFile}, "reason"}));
+  EXPECT_EQ(progress_.summarise().size(), 2U);
+}
+
 TEST_F(Progress, AnAppNeverGoesBack) {
   expect("a", 1000);
   progress_.installing("a", 0.8);
