@@ -33,7 +33,8 @@ inline constexpr std::string_view kMetricPurgeableSize = "_PurgeableSize";  ///<
 
 /// The daemon drives a client with these calls, one sync at a time and in this order: `prepareForSyncWithHostAnchor`,
 /// `installedAssets`, `reconcileSync`, `outstandingAssetTransfers`, the transfers' reports,
-/// `assetTransferEndedWithSuccess`, `syncEndedWithSuccess`. `clearSyncData` and the questions may come at any time
+/// `assetTransferEndedWithSuccess`, `syncEndedWithSuccess`. A sync that breaks off, wherever it does, still gets the
+/// last two, with false: a sync that was refused as well. `clearSyncData` and the questions may come at any time
 /// between syncs. `reconcileRestoreOfType` comes once after a restore, before the first sync.
 ///
 /// Threads: calls come from the daemon's threads, not two at once, but for the reports on different assets' transfers

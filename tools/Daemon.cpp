@@ -113,6 +113,7 @@ Status Daemon::sync(const SyncRequest& request) {
   tellWhatIsKnown();
   if (Status handedOver = handOverInstructions(); !handedOver) {
     failEverything(handedOver.error());
+    client_.assetTransferEndedWithSuccess(false);
     client_.syncEndedWithSuccess(false);
     return handedOver;
   }

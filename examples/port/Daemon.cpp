@@ -56,6 +56,7 @@ void transfer(FakePlatform& device, ZTClient& client, const std::shared_ptr<ZTAs
 /// Ends a sync that the plug-in refuses. False, for `sync` to answer.
 bool endRefused(ZTClient& client, const std::optional<appsync::Error>& error) {
   std::cout << "the plug-in refused the sync: " << (error ? error->text : "it does not say why") << "\n";
+  client.assetTransferEndedWithSuccess(false);
   client.syncEndedWithSuccess(false);
   return false;
 }

@@ -42,6 +42,21 @@ TEST_F(DeviceErrors, AnExistingDeviceIsNotMadeAgain) {
   expectUnusable(runTool({"init", device()}), device());
 }
 
+TEST_F(DeviceErrors, ARefusedSyncEndsItsTransfersAndItself) {
+  const std::string folder = device() + "/root/var/mobile/Library/ApplicationSync";
+  std::filesystem::remove_all(folder);
+  write(folder, "in the way");
+  publish("org.a");
+  const Finished run = sync({"--log", path("log")});
+  EXPECT_EQ(run.status, 3);
+  EXPECT_THAT(run.err, HasSubstr("the device cannot be synced"));
+  std::ifstream file(path("log"));
+  const std::string log{std::istreambuf_iterator<char>(file), {}};
+  const std::size_t transfers = log.find("|asset transfer ended withsuccess: n");
+  ASSERT_NE(transfers, log.npos) << log;
+  EXPECT_NE(log.find("|sync ended with success: n", transfers), log.npos) << log;
+}
+
 /// A small file system of its own, which only the superuser can mount.
 class SmallDisk : public DeviceErrors {
  protected:
