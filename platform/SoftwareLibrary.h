@@ -8,8 +8,8 @@
 
 namespace appsync::platform {
 
-/// A connection to the store's library. Destroying it after the completion has begun is allowed, also on the
-/// completion's thread.
+/// A connection to the store's library. Threads: any, one at a time for each connection. Destroying it after the
+/// completion has begun is allowed, also on the completion's thread.
 class SoftwareLibrary {
  public:
   virtual ~SoftwareLibrary() = default;
