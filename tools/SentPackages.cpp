@@ -49,9 +49,4 @@ void SentPackages::waitForRoom(std::uint64_t bytes, const Interruption& interrup
     settled_.wait_for(lock, kTimeBetweenLooks, hasRoom);
 }
 
-bool SentPackages::waitUntilEmpty(std::chrono::milliseconds longest) const {
-  std::unique_lock lock(mutex_);
-  return settled_.wait_for(lock, longest, [&] { return packages_.empty(); });
-}
-
 }  // namespace appsync::tools

@@ -40,8 +40,6 @@ class SentPackages {
   /// Blocks until another package of that size may lie beside them, or the user interrupts: sending is faster than
   /// installing.
   void waitForRoom(std::uint64_t bytes, const Interruption& interruption) const;
-  /// Blocks until none is left, or for that long. Returns whether none is.
-  bool waitUntilEmpty(std::chrono::milliseconds longest) const;
 
  private:
   SyncProgress& progress_;

@@ -29,6 +29,12 @@ TEST(FakePlatform, ConnectionsMayBeReplaced) {
   const auto manager = platform.makeBackupManager();
   EXPECT_EQ(other.connections(), 1U);
   EXPECT_EQ(platform.backups.connections(), 0U);
+
+  FakeStore otherStore(otherJournal);
+  platform.useSoftwareLibraries([&] { return otherStore.connect(); });
+  const auto library = platform.makeSoftwareLibrary();
+  EXPECT_EQ(otherStore.connections(), 1U);
+  EXPECT_EQ(platform.store.connections(), 0U);
 }
 
 TEST(FakePlatform, CallsOfAllServicesAreInOneOrder) {
