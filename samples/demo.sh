@@ -54,9 +54,6 @@ if ! diff <(contents phone) <(contents direct-phone); then
 fi
 echo 'The two devices are equal.'
 
-say 'While a sync runs, "appsync tap" has it bring an app before the others, and "appsync cancel" leave one out'
-run appsync tap phone org.example.tides || true
-
 if [[ $# -gt 0 ]]; then
   say "The devices and the pictures are in $1: phone, direct-phone, screen.png, screen-2.png"
 else
