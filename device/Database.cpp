@@ -57,8 +57,10 @@ Status configure(sqlite3* connection, Access access) {
 Result<std::unique_ptr<Database>> Database::open(const std::string& path, Access access) {
   const int mode = access == Access::readOnly ? SQLITE_OPEN_READONLY : SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE;
   sqlite3* connection = nullptr;
+  // A relative path might be taken for a URI.
+  const std::string file = path.starts_with('/') ? path : "./" + path;
   // Without SQLite's own locking: one thread at a time has its turn.
-  const int result = sqlite3_open_v2(path.c_str(), &connection, mode | SQLITE_OPEN_NOMUTEX, nullptr);
+  const int result = sqlite3_open_v2(file.c_str(), &connection, mode | SQLITE_OPEN_NOMUTEX, nullptr);
   std::unique_ptr<Database> database(new Database(connection));
   if (result != SQLITE_OK) return databaseError(connection, result);
   if (Status configured = configure(connection, access); !configured) return configured.error();

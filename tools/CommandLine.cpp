@@ -1,6 +1,7 @@
 #include "tools/CommandLine.h"
 
 #include <string>
+#include <string_view>
 
 #include <CLI/CLI.hpp>
 
@@ -9,6 +10,8 @@
 
 namespace appsync::tools {
 namespace {
+
+constexpr const char* kNameAndVersion = "appsync " APPSYNC_VERSION;
 
 constexpr const char* kPurpose = R"(appsync keeps the apps on a device in step with a folder of app packages.
 
@@ -67,11 +70,15 @@ ExitStatus explain(const CLI::App& line, const CLI::ParseError& error) {
   return ExitStatus::wrongUsage;
 }
 
+ExitStatus show(std::string_view text) {
+  StandardOutput output;
+  output.write(text);
+  return output.finish(ExitStatus::done);
+}
+
 ExitStatus showHelp(const CLI::App& line) {
   const auto named = line.get_subcommands();
-  StandardOutput output;
-  output.write(named.empty() ? line.help() : named.front()->help(line.get_name()));
-  return output.finish(ExitStatus::done);
+  return show(named.empty() ? line.help() : named.front()->help(line.get_name()));
 }
 
 }  // namespace
@@ -79,6 +86,7 @@ ExitStatus showHelp(const CLI::App& line) {
 ExitStatus runCommandLine(int count, const char* const* words) {
   CLI::App line(kPurpose, "appsync");
   line.footer(kExamples);
+  line.set_version_flag("--version", kNameAndVersion, "Print the name and the version and exit");
   line.require_subcommand(1);
   line.get_formatter()->column_width(34);
   Invocation invocation;
@@ -95,6 +103,8 @@ ExitStatus runCommandLine(int count, const char* const* words) {
     line.parse(count, words);
   } catch (const CLI::CallForHelp&) {
     return showHelp(line);
+  } catch (const CLI::CallForVersion&) {
+    return show(std::string(kNameAndVersion) + "\n");
   } catch (const CLI::ParseError& error) {
     return explain(line, error);
   }

@@ -1,5 +1,7 @@
 #include "tools/CommandReports.h"
 
+#include <cstdlib>
+#include <string_view>
 #include <utility>
 
 #include <unistd.h>
@@ -13,9 +15,20 @@ void addReportOptions(CLI::App& command, ReportOptions& options) {
   command.add_option("--log", options.log, "append the sync framework's log to this file")->type_name("FILE");
 }
 
+namespace {
+
+/// Whether lines of standard output can be written over.
+bool canMoveCursor() {
+  const char* terminal = std::getenv("TERM");
+  const std::string_view kind = terminal == nullptr ? "" : terminal;
+  return ::isatty(STDOUT_FILENO) == 1 && !kind.empty() && kind != "dumb";
+}
+
+}  // namespace
+
 std::unique_ptr<SyncReporter> makeReporter(const ReportOptions& options, StandardOutput& output, Course course) {
   if (options.json) return makeJsonReporter(output, course);
-  return ::isatty(STDOUT_FILENO) == 1 ? makeTerminalReporter(output) : makePlainReporter(output);
+  return canMoveCursor() ? makeTerminalReporter(output) : makePlainReporter(output);
 }
 
 Status openLog(const ReportOptions& options, device::Device& device) {

@@ -20,7 +20,7 @@ struct ReportOptions {
 /// Adds --json and --log.
 void addReportOptions(CLI::App& command, ReportOptions& options);
 
-/// JSON Lines if they are asked for, else lines for a terminal or a pipe.
+/// JSON Lines if they are asked for, else lines for a terminal that can write over them, or for a pipe.
 [[nodiscard]] std::unique_ptr<SyncReporter> makeReporter(const ReportOptions& options, StandardOutput& output,
                                                          Course course);
 

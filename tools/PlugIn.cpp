@@ -47,16 +47,23 @@ Result<void*> entryPointOf(const std::string& path) {
 
 }  // namespace
 
-std::string modulePath() {
+Result<std::string> modulePath() {
   const char* named = std::getenv(kModuleVariable);
-  if (named != nullptr && *named != '\0') return std::filesystem::absolute(named).string();
+  if (named != nullptr && *named != '\0') {
+    std::error_code failure;
+    const auto path = std::filesystem::absolute(named, failure);
+    if (!failure) return path.string();
+    return refusal(named,
+                   "the current folder is gone; name it in " + std::string(kModuleVariable) + " by its full path");
+  }
   std::error_code ignored;
   const auto program = std::filesystem::read_symlink("/proc/self/exe", ignored);
   return (program.parent_path() / kModuleFromProgram).lexically_normal().string();
 }
 
 Result<Client> makeClient(platform::Platform& platform) {
-  return makeClient(platform, modulePath());
+  const Result<std::string> path = modulePath();
+  return path ? makeClient(platform, *path) : Result<Client>(path.error());
 }
 
 Result<Client> makeClient(platform::Platform& platform, const std::string& path) {

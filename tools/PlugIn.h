@@ -11,8 +11,8 @@
 namespace appsync::tools {
 
 /// The plug-in's file: what the environment variable APPSYNC_MODULE names, or else the one that is built and installed
-/// with this program.
-[[nodiscard]] std::string modulePath();
+/// with this program. A name without a folder that it starts from is an error.
+[[nodiscard]] Result<std::string> modulePath();
 
 /// A client of the plug-in in that file, which stays loaded. `platform` must outlive the client. Of a file that cannot
 /// be loaded or does not fit this program the error says what to do; why a module makes no client it says in the

@@ -1,5 +1,6 @@
 #include <algorithm>
 #include <memory>
+#include <utility>
 #include <vector>
 
 #include "tools/CommandReports.h"
@@ -43,10 +44,12 @@ Examples:
 Exit status: 0 done, 1 some app failed, 2 wrong usage, 3 the device or library cannot be used.)";
 
 bool isUsable(const SyncOptions& options) {
-  for (const auto* identifiers : {&options.remove, &options.only}) {
+  for (const auto& [option, identifiers] :
+       {std::pair("--remove", &options.remove), std::pair("--only", &options.only)}) {
     for (const std::string& identifier : *identifiers) {
       if (!identifier.empty() && isUTF8(identifier)) continue;
-      printError("an app identifier must be text in UTF-8, not \"" + identifier + "\"");
+      printError(identifier.empty() ? std::string("the app identifier after ") + option + " is empty; name an app"
+                                    : "an app identifier must be text in UTF-8, not \"" + identifier + "\"");
       return false;
     }
   }

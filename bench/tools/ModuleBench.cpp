@@ -20,7 +20,7 @@ void loadAndMake(benchmark::State& state) {
   for (auto _ : state) {
     state.PauseTiming();
     const std::string copy = folder.path(std::to_string(++copies) + ".so");
-    std::filesystem::copy_file(tools::modulePath(), copy);
+    std::filesystem::copy_file(*tools::modulePath(), copy);
     state.ResumeTiming();
     const auto client = tools::makeClient(platform, copy);
     if (!client) return state.SkipWithError(client.error().text.c_str());

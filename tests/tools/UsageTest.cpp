@@ -50,7 +50,26 @@ TEST(Usage, AnUnknownFormIsWrong) {
 }
 
 TEST(Usage, AnEmptyIdentifierIsWrong) {
-  EXPECT_EQ(runTool({"sync", "device", "library", "--only", ""}).status, 2);
+  for (const std::string option : {"--only", "--remove"}) {
+    const Finished run = runTool({"sync", "device", "library", option, ""});
+    EXPECT_EQ(run.status, 2);
+    EXPECT_EQ(run.err, "appsync: the app identifier after " + option + " is empty; name an app\n");
+  }
+}
+
+TEST(Usage, TheVersionIsTold) {
+  const Finished run = runTool({"--version"});
+  EXPECT_EQ(run.status, 0);
+  EXPECT_THAT(run.out, testing::MatchesRegex("appsync [0-9]+\\.[0-9]+\\.[0-9]+\n"));
+  EXPECT_EQ(runTool({"--version"}, {.environment = {}, .output = OutputTo::full, .input = {}}).status, 3);
+}
+
+TEST(Usage, APathIsNeverTakenForAnAddress) {
+  const TemporaryFolder folder;
+  const Finished run =
+      runProgram("sh", {"-c", "cd \"$0\" && appsync init file:x && appsync apps file:x", folder.path()});
+  EXPECT_EQ(run.status, 0);
+  EXPECT_EQ(run.err, "");
 }
 
 TEST(Usage, AnIdentifierThatIsNoTextIsWrongAndShownSafely) {

@@ -102,7 +102,7 @@ _appsync() {
   [[ "$typed" == *"$piece" ]] || typed="$piece" # blanks in quotes
   kept="${typed%"$piece"}"
   if [[ ${#words[@]} -le 2 ]]; then
-    [[ "$typed" == -* ]] && _appsync_offer '' -h --help && return
+    [[ "$typed" == -* ]] && _appsync_offer '' -h --help --version && return
     _appsync_offer '' init pack sync backup restore tap cancel apps report screen history set clear plist
     return
   fi

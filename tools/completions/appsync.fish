@@ -80,6 +80,7 @@ end
 # Files where nothing else is said, and only there.
 complete -c appsync -f
 complete -c appsync -s h -l help -d 'Print this help message and exit'
+complete -c appsync -n 'test (count (commandline -opc)) -eq 1' -l version -d 'Print the name and the version and exit'
 
 for command in \
     'init:Make a new, empty device' \
