@@ -5,6 +5,7 @@
 #include <fcntl.h>
 #include <unistd.h>
 
+#include "device/Characters.h"
 #include "device/TimeText.h"
 
 namespace appsync::device {
@@ -23,18 +24,17 @@ void appendEscaped(std::string& line, char letter) {
   }
 }
 
-bool needsEscape(char letter) {
-  const auto code = static_cast<unsigned char>(letter);
-  return code < 0x20 || code == 0x7F || letter == '\\';
-}
-
 void appendMessage(std::string& line, std::string_view message) {
-  for (const char letter : message) {
-    if (needsEscape(letter)) {
-      appendEscaped(line, letter);
+  while (!message.empty()) {
+    const Character character = firstCharacter(message);
+    const std::string_view bytes = message.substr(0, character.length);
+    if (character.valid && !isTreacherous(character.code) && character.code != '\\') {
+      line += bytes;
     } else {
-      line += letter;
+      for (const char byte : bytes)
+        appendEscaped(line, byte);
     }
+    message.remove_prefix(character.length);
   }
 }
 

@@ -27,9 +27,9 @@ class LogSink {
 ///
 ///     2026-02-03T04:05:06.789012Z 8 default com.corvel.qor.Zephtra.AppSync|getting installed assets
 ///
-/// Times are UTC, levels "default" and "error". Control characters and backslashes in the message are escaped, so that
-/// a message is always one line. Each line is one write at the file's end: lines never mix, not even with those of
-/// another process.
+/// Times are UTC, levels "default" and "error". Backslashes, control characters, what changes the direction of writing
+/// and bytes that are no UTF-8 are escaped in the message, so that it is always one line, and safe to be shown. Each
+/// line is one write at the file's end: lines never mix, not even with those of another process.
 class FileLogSink final : public LogSink {
  public:
   /// Opens the file for appending, or makes it. `hostPath` is a path of this machine. A pipe needs a reader already.

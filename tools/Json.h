@@ -5,19 +5,22 @@
 
 #include <nlohmann/json.hpp>
 
+#include "tools/Printable.h"
+
 namespace appsync::tools {
 
 /// Keeps members in the order in which they were added.
 using Json = nlohmann::ordered_json;
 
-/// On one line. Bytes that are no UTF-8 are replaced, so that the result always is JSON.
+/// On one line. Bytes that are no UTF-8 are replaced, so that the result always is JSON; what would command a terminal
+/// stands in it by number.
 [[nodiscard]] inline std::string onOneLine(const Json& json) {
-  return json.dump(-1, ' ', false, Json::error_handler_t::replace);
+  return withReferences(json.dump(-1, ' ', false, Json::error_handler_t::replace), Notation::json);
 }
 
 /// Indented for people, with the same promise.
 [[nodiscard]] inline std::string indented(const Json& json) {
-  return json.dump(2, ' ', false, Json::error_handler_t::replace);
+  return withReferences(json.dump(2, ' ', false, Json::error_handler_t::replace), Notation::json);
 }
 
 }  // namespace appsync::tools

@@ -6,6 +6,7 @@
 #include "base/PropertyList.h"
 #include "device/HostFile.h"
 #include "tools/Commands.h"
+#include "tools/Printable.h"
 #include "tools/PropertyListJson.h"
 #include "tools/StandardOutput.h"
 
@@ -27,12 +28,16 @@ Examples:
   appsync plist Info.plist --to binary -o Info.binary.plist
   appsync plist ApplicationsSync.plist --to json | jq '.[].identifier')";
 
+Bytes bytesIn(const std::string& text) {
+  const ByteView bytes = bytesOf(text);
+  return {bytes.begin(), bytes.end()};
+}
+
 Result<Bytes> converted(const plist::Value& value, const std::string& form) {
-  if (form == "xml") return plist::writeXML(value);
   if (form == "binary") return plist::writeBinary(value);
-  const std::string json = indented(toJson(value)) + "\n";
-  const ByteView bytes = bytesOf(json);
-  return Bytes(bytes.begin(), bytes.end());
+  if (form == "json") return bytesIn(indented(toJson(value)) + "\n");
+  const Result<Bytes> xml = plist::writeXML(value);
+  return xml ? bytesIn(withReferences(std::string(textOf(*xml)), Notation::xml)) : xml;
 }
 
 ExitStatus run(const PlistOptions& options) {

@@ -14,6 +14,13 @@ inline constexpr std::size_t kLongestText = 200;
 /// direction of writing appear as "\x1b" or "\u{202e}". What goes beyond `columns` is cut and ends with "...".
 [[nodiscard]] std::string printable(std::string_view text, std::size_t columns = kLongestText);
 
+/// Of which kind a document is.
+enum class Notation { json, xml };
+
+/// A document, in UTF-8, that says the same and leaves a terminal alone: control characters above ASCII's first ones,
+/// and such as change the direction of writing, stand in it by their numbers. They may be in its strings only.
+[[nodiscard]] std::string withReferences(std::string document, Notation notation);
+
 /// The columns that printable text takes on a terminal.
 [[nodiscard]] std::size_t displayWidth(std::string_view text);
 

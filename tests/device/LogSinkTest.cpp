@@ -59,6 +59,12 @@ TEST_F(FileLogSinkTest, AMessageIsAlwaysOneLine) {
   EXPECT_EQ(lines(), std::vector<std::string>{R"(2026-02-03T04:05:06.007089Z 8 default a\nb\x0d\x09c\\d\x7f\x00e é)"});
 }
 
+TEST_F(FileLogSinkTest, AMessageThatIsShownCommandsNoTerminal) {
+  open()->write(kTime, 8, LogLevel::standard, "\xc2\x9b[2J \xe2\x80\xae \x9b \xe6\xbd\xae");
+  EXPECT_EQ(lines(), std::vector<std::string>{"2026-02-03T04:05:06.007089Z 8 default "
+                                              R"(\xc2\x9b[2J \xe2\x80\xae \x9b 潮)"});
+}
+
 TEST_F(FileLogSinkTest, TimesBeforeTheEpochAreWrittenToo) {
   open()->write(std::chrono::system_clock::time_point(std::chrono::microseconds(-1)), 8, LogLevel::standard, "m");
   EXPECT_EQ(lines(), std::vector<std::string>{"1969-12-31T23:59:59.999999Z 8 default m"});

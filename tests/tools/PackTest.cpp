@@ -167,6 +167,21 @@ TEST_F(Plist, ConvertsBetweenAllForms) {
   EXPECT_EQ(tools::Json::parse(runTool({"plist", path("binary"), "--to", "json"}).out).at("BundleVersion"), "1.2");
 }
 
+TEST_F(Plist, CommandsNoTerminalAndLosesNothing) {
+  const std::string text = "\x7f \xc2\x9b[2J \xe2\x80\xae \xf3\xa0\x81\x81 é潮";
+  write(path("in"), "<plist><dict><key>" + text + "</key><string>" + text + "</string></dict></plist>");
+  const Finished xml = runTool({"plist", path("in")});
+  const std::string numbers = "&#x7f; &#x9b;[2J &#x202e; &#xe0041; é潮";
+  EXPECT_THAT(xml.out, HasSubstr("<key>" + numbers + "</key>"));
+  EXPECT_THAT(xml.out, HasSubstr("<string>" + numbers + "</string>"));
+  write(path("again"), xml.out);
+  EXPECT_EQ(runTool({"plist", path("again"), "--to", "binary"}).out,
+            runTool({"plist", path("in"), "--to", "binary"}).out);
+  const Finished json = runTool({"plist", path("again"), "--to", "json"});
+  EXPECT_EQ(tools::Json::parse(json.out).at(text), text);
+  EXPECT_THAT(json.out, testing::Not(HasSubstr("\xc2\x9b")));
+}
+
 TEST_F(Plist, ReadsStandardInput) {
   const Finished run = runTool({"plist", "-", "--to", "json"},
                                {.environment = {}, .output = OutputTo::file, .input = "{ a = (1, 2); }"});

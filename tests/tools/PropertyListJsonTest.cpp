@@ -23,6 +23,13 @@ TEST(PropertyListJson, ScalarsHaveTheirOwnForm) {
   EXPECT_EQ(json("text"), "\"text\"");
 }
 
+TEST(PropertyListJson, WhatWouldCommandATerminalStandsByNumber) {
+  EXPECT_EQ(json("\x7f \xc2\x9b[2J \xe2\x80\xae \xf3\xa0\x81\x81 é潮\n"),
+            R"("\u007f \u009b[2J \u202e \udb40\udc41 é潮\n")");
+  EXPECT_EQ(Json::parse(json("\xc2\x9b\xf3\xa0\x81\x81")), "\xc2\x9b\xf3\xa0\x81\x81");
+  EXPECT_EQ(indented(Json::array({"\x7f"})), "[\n  \"\\u007f\"\n]");
+}
+
 TEST(PropertyListJson, IntegersKeepTheirWholeRange) {
   EXPECT_EQ(json(std::numeric_limits<std::int64_t>::min()), "-9223372036854775808");
   EXPECT_EQ(json(std::numeric_limits<std::uint64_t>::max()), "18446744073709551615");
