@@ -113,19 +113,6 @@ Status Settings::setAssertionAnswer(std::string_view bundleIdentifier, Assertion
   return set(kAssertion, value.append(":").append(kAnswers[static_cast<std::size_t>(answer)]));
 }
 
-Result<std::vector<Setting>> Settings::list() {
-  std::vector<Setting> settings;
-  Database::Session session(database_);
-  Statement rows = session.prepare("select key, item, value from settings order by key, item");
-  while (rows.next()) {
-    std::string value(rows.text(1));
-    if (!value.empty()) value += ':';
-    settings.push_back({std::string(rows.text(0)), value.append(rows.text(2))});
-  }
-  if (!rows.status()) return rows.status().error();
-  return settings;
-}
-
 platform::RestrictionValue Settings::restriction(platform::RestrictionSetting setting) {
   const bool isInstallation = setting == platform::RestrictionSetting::appInstallationAllowed;
   const auto value = stored(isInstallation ? kInstallation : kRemoval, "");

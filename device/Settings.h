@@ -5,7 +5,6 @@
 #include <optional>
 #include <string>
 #include <string_view>
-#include <vector>
 
 #include "base/Error.h"
 #include "platform/ProfileConnection.h"
@@ -26,13 +25,6 @@ enum class SettingsFailure : long {
 
 /// What the home screen answers when it is asked to hold an app.
 enum class AssertionAnswer : std::uint8_t { granted, denied, unknown, failing };
-
-/// One setting as people write and read it, KEY=VALUE.
-struct Setting {
-  std::string key;
-  std::string value;
-  bool operator==(const Setting&) const = default;
-};
 
 /// The keys, and the values each takes:
 ///
@@ -61,9 +53,6 @@ class Settings {
 
   /// Answers assertions on that app with `answer` from now on.
   [[nodiscard]] Status setAssertionAnswer(std::string_view bundleIdentifier, AssertionAnswer answer);
-
-  /// What is set, by key, an app's assertion by identifier. What is unset is left out.
-  [[nodiscard]] Result<std::vector<Setting>> list();
 
   // For services. A setting that cannot be read counts as unset.
 
