@@ -43,8 +43,8 @@ Error tooLarge(const std::string& path, std::uint64_t most) {
 }
 
 Error noFile(const std::string& path) {
-  return {std::string(domains::kPOSIX), EINVAL,
-          path + " cannot be read: it is a pipe or a device; put a file in its place", nullptr};
+  return {std::string(domains::kPOSIX), EINVAL, path + " cannot be read: it is a pipe or a device, not a file",
+          nullptr};
 }
 
 /// An opened file, or a standard stream, which is not this object's to close.

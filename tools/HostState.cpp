@@ -17,11 +17,14 @@ std::string pathIn(const std::string& devicePath) {
   return devicePath + "/host-state.plist";
 }
 
+/// `text` says what is wrong with the file.
+Error unusable(long code, const std::string& text) {
+  return {std::string(domains::kPOSIX), code,
+          text + "; put a good copy in its place, or remove it: then apps that were deleted are sent again", nullptr};
+}
+
 Error damaged(const std::string& path, const std::string& why) {
-  return {std::string(domains::kPOSIX), EINVAL,
-          path + " is damaged (" + why +
-              "); put a good copy in its place, or remove it: then apps that were deleted are sent again",
-          nullptr};
+  return unusable(EINVAL, path + " is damaged (" + why + ")");
 }
 
 /// False when it is not the array of identifiers that it must be; none at all is an empty one.
@@ -52,7 +55,7 @@ Result<HostState> loadHostState(const std::string& devicePath) {
   const std::string path = pathIn(devicePath);
   const Result<Bytes> bytes = device::readHostFile(path);
   if (!bytes && bytes.error().code == ENOENT) return HostState{};
-  if (!bytes) return bytes.error();
+  if (!bytes) return unusable(bytes.error().code, bytes.error().text);
   const Result<plist::Value> root = plist::read(*bytes);
   if (!root) return damaged(path, root.error().text);
   HostState state;

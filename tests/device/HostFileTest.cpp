@@ -157,9 +157,8 @@ TEST(WriteHostFile, AFillThatFailsChangesNothing) {
 TEST(ReadHostFile, WhatIsNoFileIsRefusedAndNotWaitedFor) {
   const TemporaryFolder folder;
   makePipe(folder.path("pipe"));
-  EXPECT_EQ(
-      device::readHostFile(folder.path("pipe")).error(),
-      badFile(EINVAL, folder.path("pipe") + " cannot be read: it is a pipe or a device; put a file in its place"));
+  EXPECT_EQ(device::readHostFile(folder.path("pipe")).error(),
+            badFile(EINVAL, folder.path("pipe") + " cannot be read: it is a pipe or a device, not a file"));
   EXPECT_EQ(device::readHostFile("/dev/zero").error().code, EINVAL);
   EXPECT_EQ(device::readHostFile(folder.path()).error(), Error::fromErrno(EISDIR, folder.path() + " cannot be read"));
 }

@@ -34,7 +34,10 @@ TEST(HostState, ThatCannotBeReadIsAnError) {
   const test::TemporaryFolder folder;
   std::filesystem::create_directory(folder.path("host-state.plist"));
   EXPECT_EQ(loadHostState(folder.path()).error(),
-            Error::fromErrno(EISDIR, folder.path("host-state.plist") + " cannot be read"));
+            (Error{std::string(domains::kPOSIX), EISDIR,
+                   Error::fromErrno(EISDIR, folder.path("host-state.plist") + " cannot be read").text +
+                       "; put a good copy in its place, or remove it: then apps that were deleted are sent again",
+                   nullptr}));
 }
 
 TEST(HostState, ListsThatAreNotThereAreEmpty) {

@@ -29,7 +29,7 @@ class HostileFiles : public ToolFixture {
 TEST_F(HostileFiles, ALicenceThatIsAPipeIsNotWaitedFor) {
   makePipe(path("pipe"));
   expectUnusable(runTool({"set", device(), "licence=org.a:" + path("pipe")}),
-                 path("pipe") + " cannot be read: it is a pipe or a device; put a file in its place");
+                 path("pipe") + " cannot be read: it is a pipe or a device, not a file");
 }
 
 TEST_F(HostileFiles, ALicenceHasABound) {
@@ -44,7 +44,7 @@ TEST_F(HostileFiles, AManifestThatIsAPipeIsNotWaitedFor) {
   makePipe(path("backup/Manifest.plist"));
   expectUnusable(runTool({"restore", device(), path("backup")}),
                  path("backup") + " is no backup that can be used: " + path("backup/Manifest.plist") +
-                     " cannot be read: it is a pipe or a device; put a file in its place; name a folder that "
+                     " cannot be read: it is a pipe or a device, not a file; name a folder that "
                      "`appsync backup` made");
 }
 

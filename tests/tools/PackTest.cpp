@@ -109,7 +109,7 @@ TEST_F(Pack, ALinkIsRefused) {
 TEST_F(Pack, AnInfoThatIsAPipeIsRefusedAndNotWaitedFor) {
   std::filesystem::remove(path("Notes.app/Info.plist"));
   makePipe(path("Notes.app/Info.plist"));
-  expectRefused(path("Notes.app"), "Info.plist cannot be read: it is a pipe or a device; put a file in its place");
+  expectRefused(path("Notes.app"), "Info.plist cannot be read: it is a pipe or a device, not a file");
 }
 
 TEST_F(Pack, APipeIsWrittenIntoAndStays) {
