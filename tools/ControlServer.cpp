@@ -2,7 +2,6 @@
 
 #include <cerrno>
 #include <chrono>
-#include <cstdint>
 #include <utility>
 
 #include <poll.h>

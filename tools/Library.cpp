@@ -1,9 +1,7 @@
 #include "tools/Library.h"
 
 #include <algorithm>
-#include <cerrno>
 #include <filesystem>
-#include <set>
 
 #include <fcntl.h>
 #include <unistd.h>
