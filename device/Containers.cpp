@@ -53,13 +53,10 @@ Status NewContainer::writeFile(std::string_view name, ByteView bytes) {
   return outcome(tree::create(folder(), file.c_str(), bytes), name);
 }
 
-Status NewContainer::sync() {
-  return outcome(sys::syncFileSystem(folder()), "the app's container");
-}
-
-Status NewContainer::settle() {
-  const int number = sys::rename(parent_.get(), nameNow_.c_str(), parent_.get(), name_.c_str(), sys::Replace::no);
+Status NewContainer::settle(Durability durability) {
+  int number = sys::rename(parent_.get(), nameNow_.c_str(), parent_.get(), name_.c_str(), sys::Replace::no);
   if (number == 0) nameNow_ = name_;
+  if (number == 0 && durability == Durability::power) number = sys::syncFileSystem(folder());
   return outcome(number, "the app's container");
 }
 

@@ -6,6 +6,7 @@
 
 #include "base/Bytes.h"
 #include "base/Error.h"
+#include "device/Database.h"
 #include "device/DeviceFileSystem.h"
 #include "device/FileDescriptor.h"
 
@@ -26,10 +27,8 @@ class NewContainer {
 
   /// Makes a file of it, in place of one that is there.
   [[nodiscard]] Status writeFile(std::string_view name, ByteView bytes);
-  /// Brings it to the disk.
-  [[nodiscard]] Status sync();
-  /// Gives it its name.
-  [[nodiscard]] Status settle();
+  /// Gives it its name; with `Durability::power` the name and all in it are on the disk then.
+  [[nodiscard]] Status settle(Durability durability);
   /// It belongs to a record now.
   void keep() noexcept { kept_ = true; }
 

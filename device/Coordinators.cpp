@@ -222,6 +222,7 @@ Status Coordinators::show(const PlaceholderState& placeholder, const Store& stor
   if (bringsBack(placeholder)) return registry_.beginReturn(placeholder.identifier, store);
   Result<PlaceholderContainer> made = makePlaceholder(files_, placeholder);
   if (!made) return made.error();
+  if (Status settled = made->container.settle(Durability::process); !settled) return settled;
   InstallRequest request;
   request.role = BundleRole::placeholder;
   request.identifier = placeholder.identifier;

@@ -209,6 +209,9 @@ Database::Transaction::~Transaction() {
 
 Status Database::Transaction::commit() {
   if (!failure_) return failure_;
+  if (durability_ == Durability::power) {
+    if (auto failure = injectedFailure("database to disk")) return *failure;
+  }
   if (Status committed = run("commit"); !committed) return committed;
   open_ = false;
   return {};

@@ -73,7 +73,9 @@ Error unknownApp(std::string_view identifier, std::string_view what) {
 }  // namespace
 
 Status Installer::demote(std::string_view bundleIdentifier, TSInstallType type) {
-  const AppRow app = known(bundleIdentifier);
+  const Result<AppRow> found = known(bundleIdentifier);
+  if (!found) return found.error();
+  const AppRow& app = *found;
   if (!app.installed) return unknownApp(bundleIdentifier, "demote");
   if (app.placeholder || running_.find(bundleIdentifier) != nullptr) {
     return installerError(InstallerFailure::badOptions,
@@ -85,8 +87,7 @@ Status Installer::demote(std::string_view bundleIdentifier, TSInstallType type) 
   if (const auto artwork = readIfThere(files_, containerOf(*app.installed) + '/' + std::string(kArtworkFile))) {
     if (Status kept = container.writeFile(kArtworkFile, *artwork); !kept) return kept;
   }
-  if (Status synced = container.sync(); !synced) return synced;
-  if (Status settled = container.settle(); !settled) return settled;
+  if (Status settled = container.settle(Durability::power); !settled) return settled;
   remains->bundle.container = container.name();
   {
     Database::Transaction transaction(database_, Durability::power);
@@ -101,7 +102,9 @@ Status Installer::demote(std::string_view bundleIdentifier, TSInstallType type) 
 }
 
 Status Installer::setPlaceholderType(std::string_view bundleIdentifier, TSInstallType type) {
-  const AppRow app = known(bundleIdentifier);
+  const Result<AppRow> found = known(bundleIdentifier);
+  if (!found) return found.error();
+  const AppRow& app = *found;
   if (!app.placeholder || app.installed) return unknownApp(bundleIdentifier, "change the placeholder of");
   {
     Database::Session session(database_);
@@ -112,13 +115,17 @@ Status Installer::setPlaceholderType(std::string_view bundleIdentifier, TSInstal
   if (isDemotion(type)) {
     running_.end(bundleIdentifier, TSInstallState::Finished);
   } else if (running_.find(bundleIdentifier) == nullptr) {
-    running_.begin(known(bundleIdentifier), {});
+    AppRow changed = app;
+    changed.placeholder->installType = type;
+    running_.begin(std::move(changed), {});
   }
   return {};
 }
 
 Status Installer::renamePlaceholder(std::string_view bundleIdentifier, std::string_view name) {
-  const AppRow app = known(bundleIdentifier);
+  const Result<AppRow> found = known(bundleIdentifier);
+  if (!found) return found.error();
+  const AppRow& app = *found;
   if (!app.placeholder || app.installed) return unknownApp(bundleIdentifier, "rename the placeholder of");
   if (app.placeholder->name == name) return {};
   const std::string path = containerOf(*app.placeholder) + '/' + app.placeholder->folder + '/' + std::string(kInfoFile);
@@ -138,8 +145,8 @@ Status Installer::renamePlaceholder(std::string_view bundleIdentifier, std::stri
 }
 
 bool Installer::isDemoted(std::string_view bundleIdentifier) {
-  const AppRow app = known(bundleIdentifier);
-  return app.placeholder && !app.installed && isDemotion(app.placeholder->installType);
+  const Result<AppRow> app = known(bundleIdentifier);
+  return app && app->placeholder && !app->installed && isDemotion(app->placeholder->installType);
 }
 
 Status Installer::beginReturn(std::string_view bundleIdentifier, const Alongside& alongside) {

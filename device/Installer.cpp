@@ -1,6 +1,5 @@
 #include "device/Installer.h"
 
-#include <algorithm>
 #include <chrono>
 #include <utility>
 #include <vector>
@@ -75,19 +74,20 @@ std::vector<const StoredBundle*> replacedBy(BundleRole role, const AppRow& app) 
 }
 
 /// A container may go once nothing can bring the record of it back. Placeholders of a sync do not survive a restart
-/// anyway.
-Durability durabilityFor(const std::vector<const StoredBundle*>& replaced) {
-  const bool isNeeded = std::ranges::any_of(
-      replaced, [](const StoredBundle* bundle) { return bundle->installType != TSInstallType::Sync; });
-  return isNeeded ? Durability::power : Durability::process;
+/// anyway, and where there was nothing, nothing that was there is lost.
+Durability durabilityFor(BundleRole role, const AppRow& app) {
+  const bool replacesApp = role == BundleRole::installed && app.installed;
+  const bool replacesLastingPlaceholder = app.placeholder && app.placeholder->installType != TSInstallType::Sync;
+  return replacesApp || replacesLastingPlaceholder ? Durability::power : Durability::process;
 }
 
 }  // namespace
 
-AppRow Installer::known(std::string_view identifier) {
+Result<AppRow> Installer::known(std::string_view identifier) {
   Database::Session session(database_);
   Result<std::optional<AppRow>> found = app_table::find(session, identifier);
-  if (found && *found) return **std::move(found);
+  if (!found) return asSystemError(found.error());
+  if (*found) return **std::move(found);
   AppRow unknown;
   unknown.identifier = identifier;
   return unknown;
@@ -103,11 +103,12 @@ Status Installer::install(const platform::FileLocation& location, const plist::D
 
 Status Installer::installPackage(const platform::FileLocation& location, const InstallRequest& request,
                                  std::string_view applicationType) {
-  AppRow before = known(request.identifier);
-  const bool hasPlaceholder = before.placeholder.has_value();
-  if (before.applicationType.empty()) before.applicationType = applicationType;
-  const auto progress =
-      running_.begin(std::move(before), {TSInstallState::Active, TSInstallPhase::Installing, kProgressUnits, 0});
+  Result<AppRow> before = known(request.identifier);
+  if (!before) return before.error();
+  const bool hasPlaceholder = before->placeholder.has_value();
+  if (before->applicationType.empty()) before->applicationType = applicationType;
+  const auto progress = running_.begin(std::move(before).value(),
+                                       {TSInstallState::Active, TSInstallPhase::Installing, kProgressUnits, 0});
   Status installed = unpackAndRecord(location, request, applicationType, *progress);
   if (installed) {
     running_.end(request.identifier, TSInstallState::Finished);
@@ -135,7 +136,8 @@ Status Installer::unpackAndRecord(const platform::FileLocation& location, const 
   if (!unpacked) return unpacked.error();
   if (Status same = checkIdentifier(unpacked->info, request); !same) return same;
   if (Status kept = keepStoreMetadata(*container, request); !kept) return kept;
-  if (Status synced = container->sync(); !synced) return synced;
+  if (Status given = app_data::giveBack(files_, database_, request.identifier); !given) return given;
+  if (Status settled = container->settle(Durability::power); !settled) return settled;
   return record(*container, request, applicationType, describe(unpacked->info, unpacked->appFolder, unpacked->bytes));
 }
 
@@ -158,9 +160,8 @@ Status Installer::installPlaceholder(const platform::FileLocation& location, con
   if (Status same = checkIdentifier(*info, request); !same) return same;
   if (Status kept = keepStoreMetadata(*container, request); !kept) return kept;
   // A sync's placeholder does not survive a restart: there is no point in waiting until it is on the disk.
-  if (request.installType != TSInstallType::Sync) {
-    if (Status synced = container->sync(); !synced) return synced;
-  }
+  const bool lasts = request.installType != TSInstallType::Sync;
+  if (Status settled = container->settle(lasts ? Durability::power : Durability::process); !settled) return settled;
   return recordPlaceholder(*container, request, applicationType, describe(*info, folder, bytes));
 }
 
@@ -170,21 +171,20 @@ Status Installer::recordPlaceholder(NewContainer& container, const InstallReques
   if (request.installType && isDemotion(*request.installType)) {
     running_.end(request.identifier, TSInstallState::Finished);
   } else {
-    running_.begin(known(request.identifier), {});
+    Result<AppRow> app = known(request.identifier);
+    if (!app) return app.error();
+    running_.begin(std::move(app).value(), {});
   }
   return {};
 }
 
 Status Installer::record(NewContainer& container, const InstallRequest& request, std::string_view applicationType,
                          StoredBundle bundle) {
-  if (request.role == BundleRole::installed) {
-    if (Status given = app_data::giveBack(files_, database_, request.identifier); !given) return given;
-  }
-  if (Status settled = container.settle(); !settled) return settled;
-  const Durability durability = durabilityFor(replacedBy(request.role, known(request.identifier)));
+  const Result<AppRow> app = known(request.identifier);
+  if (!app) return app.error();
   AppRow before;
   {
-    Database::Transaction transaction(database_, durability);
+    Database::Transaction transaction(database_, durabilityFor(request.role, *app));
     Result<std::optional<AppRow>> found = app_table::find(transaction, request.identifier);
     if (!found) return asSystemError(found.error());
     if (*found) before = **std::move(found);
@@ -215,10 +215,11 @@ Status Installer::uninstall(std::string_view bundleIdentifier, const plist::Dict
   // A package takes the place of all that goes with the app, a placeholder of the placeholder alone.
   const BundleRole role =
       only != nullptr && plist::truth(*only).value_or(false) ? BundleRole::placeholder : BundleRole::installed;
-  const Durability durability = durabilityFor(replacedBy(role, known(bundleIdentifier)));
+  const Result<AppRow> before = known(bundleIdentifier);
+  if (!before) return before.error();
   AppRow app;
   {
-    Database::Transaction transaction(database_, durability);
+    Database::Transaction transaction(database_, durabilityFor(role, *before));
     Result<std::optional<AppRow>> found = app_table::find(transaction, bundleIdentifier);
     if (!found) return asSystemError(found.error());
     if (!*found) {

@@ -30,7 +30,7 @@ class Installer {
   [[nodiscard]] Status installPackage(const platform::FileLocation& location, const InstallRequest& request,
                                       std::string_view applicationType);
 
-  /// Makes a filled container the app's placeholder, whose install waits from now on unless the app is demoted.
+  /// Makes a settled container the app's placeholder, whose install waits from now on unless the app is demoted.
   [[nodiscard]] Status recordPlaceholder(NewContainer& container, const InstallRequest& request,
                                          std::string_view applicationType, StoredBundle bundle);
 
@@ -50,11 +50,11 @@ class Installer {
                                           std::string_view applicationType);
   [[nodiscard]] Status unpackAndRecord(const platform::FileLocation& location, const InstallRequest& request,
                                        std::string_view applicationType, InstallProgress& progress);
-  /// Makes a filled container the app's bundle in its role, and removes those that it takes the place of.
+  /// Makes a settled container the app's bundle in its role, and removes those that it takes the place of.
   [[nodiscard]] Status record(NewContainer& container, const InstallRequest& request, std::string_view applicationType,
                               StoredBundle bundle);
   /// The app's row, or one of an app that is new.
-  [[nodiscard]] AppRow known(std::string_view identifier);
+  [[nodiscard]] Result<AppRow> known(std::string_view identifier);
 
   Database& database_;
   DeviceFileSystem& files_;

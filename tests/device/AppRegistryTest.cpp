@@ -2,6 +2,7 @@
 #include <algorithm>
 #include <cerrno>
 #include <filesystem>
+#include <functional>
 #include <string>
 #include <vector>
 
@@ -29,6 +30,28 @@ long stepsUntilFailure = 0;
 int failWhenDue(const char*) {
   return --stepsUntilFailure == 0 ? ENOSPC : 0;
 }
+
+std::vector<std::string> stepsTaken;
+int noteStep(const char* name) {
+  stepsTaken.emplace_back(name);
+  return 0;
+}
+
+/// The steps of `work` that move folders, once for several in a row, or make what went before safe from a loss of
+/// power.
+std::vector<std::string> lastingStepsOf(const std::function<void()>& work) {
+  stepsTaken.clear();
+  device::setStepHook(noteStep);
+  work();
+  device::setStepHook(nullptr);
+  std::erase_if(stepsTaken, [](const std::string& name) {
+    return name != "rename" && name != "sync" && name != "database to disk";
+  });
+  stepsTaken.erase(std::ranges::unique(stepsTaken).begin(), stepsTaken.end());
+  return stepsTaken;
+}
+
+using Steps = std::vector<std::string>;
 
 }  // namespace
 
@@ -155,6 +178,51 @@ TEST_F(AppRegistryTest, AnUpdateSwapsContainers) {
   EXPECT_NE(device_.record("com.a")->bundleContainerPath(), before);
   EXPECT_EQ(device_.containers(), 1);
   EXPECT_TRUE(device_.isTidy());
+}
+
+TEST_F(AppRegistryTest, AnUpdateIsOnTheDiskBeforeTheOldVersionGoes) {
+  plist::Dictionary options = TestDevice::customer("com.a");
+  options.set(platform::InstallTypeKey, static_cast<std::uint64_t>(TSInstallType::Sync));
+  const auto install = [&](std::string_view version) {
+    const auto package = device_.stage("package.zip", appPackage("com.a", version));
+    return lastingStepsOf([&] { EXPECT_TRUE(registry().installApplication(package, options).ok()); });
+  };
+  EXPECT_EQ(install("1.0"), (Steps{"rename", "sync"}));
+  EXPECT_EQ(install("2.0"), (Steps{"rename", "sync", "database to disk", "rename"}));
+}
+
+TEST_F(AppRegistryTest, APlaceholderOfASyncGoesWithoutAWaitForTheDisk) {
+  device_.placeholder("com.a");
+  const auto package = device_.stage("package.zip", appPackage("com.a"));
+  EXPECT_EQ(
+      lastingStepsOf([&] { EXPECT_TRUE(registry().installApplication(package, TestDevice::customer("com.a")).ok()); }),
+      (Steps{"rename", "sync", "rename"}));
+  device_.placeholder("com.b", TSInstallType::Restore);
+  const auto restored = device_.stage("restored.zip", appPackage("com.b"));
+  EXPECT_EQ(
+      lastingStepsOf([&] { EXPECT_TRUE(registry().installApplication(restored, TestDevice::customer("com.b")).ok()); }),
+      (Steps{"rename", "sync", "database to disk", "rename"}));
+}
+
+TEST_F(AppRegistryTest, ARemovalIsOnTheDiskBeforeTheAppGoes) {
+  device_.install("com.a");
+  EXPECT_EQ(lastingStepsOf([&] { EXPECT_TRUE(registry().uninstallApplication("com.a").ok()); }),
+            (Steps{"database to disk", "rename"}));
+}
+
+TEST_F(AppRegistryTest, ARegistryThatCannotBeReadIsNotOneWithoutTheApp) {
+  device_.install("com.a");
+  {
+    device::Database::Session session(device_.services().database());
+    ASSERT_TRUE(session.runScript("alter table bundles rename to lost").ok());
+  }
+  const std::string text = "database: no such table: bundles";
+  EXPECT_EQ(device_.tryInstall("com.a", appPackage("com.a", "2.0")).error().text, text);
+  EXPECT_EQ(registry().uninstallApplication("com.a").error().text, text);
+  EXPECT_EQ(registry().demote("com.a", TSInstallType::Downgrade).error().text, text);
+  EXPECT_EQ(registry().setPlaceholderType("com.a", TSInstallType::Downgrade).error().text, text);
+  EXPECT_EQ(registry().renamePlaceholder("com.a", "Other").error().text, text);
+  EXPECT_EQ(device_.containers(), 1);
 }
 
 TEST_F(AppRegistryTest, APlaceholderHasAContainerOfItsOwn) {
