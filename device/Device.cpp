@@ -75,7 +75,9 @@ Status makeDatabase(const std::string& path, int folder, InstallMode mode) {
   if (Status filled = fillNewDatabase(path, mode); !filled) return filled;
   // A log stays when its database is closed, also one that is not in use any more.
   if (Status removed = removeNewDatabase(folder, {"-wal", "-shm"}); !removed) return removed;
-  const int number = sys::rename(folder, kNewDatabaseFile, folder, kDatabaseFile, sys::Replace::no);
+  // Folders that a loss of power took back would be missed.
+  int number = sys::syncFileSystem(folder);
+  if (number == 0) number = sys::rename(folder, kNewDatabaseFile, folder, kDatabaseFile, sys::Replace::no);
   if (number != 0) return Error::fromErrno(number, kDatabaseFile);
   return {};
 }
@@ -131,7 +133,7 @@ Result<FileDescriptor> makeDevice(const std::string& path, InstallMode mode) {
   if (Status free = checkFolderIsFree(path, folder->get()); !free) return free.error();
   Result<FileDescriptor> lock = lockDevice(path, folder->get());
   if (!lock) return lock.error();
-  if (Status folders = makeDeviceFolders(folder->get()); !folders) return folders.error();
+  if (Status folders = makeDeviceFolders(path, folder->get()); !folders) return folders.error();
   if (Status database = makeDatabase(path, folder->get(), mode); !database) return database.error();
   return lock;
 }
@@ -173,11 +175,9 @@ Result<std::unique_ptr<Device>> Device::open(const std::string& path, Access acc
   const auto prepared = [&]() -> Result<DeviceFileSystem> {
     const Result<FileDescriptor> folder = openFolder(path);
     if (!folder) return folder.error();
-    if (access == Access::readOnly) return openFileSystem(path, folder->get(), access);
-    if (Status made = makeDeviceFolders(folder->get()); !made) return made.error();
-    removeHostFileDrafts(folder->get());
     Result<DeviceFileSystem> files = openFileSystem(path, folder->get(), access);
-    if (!files) return files;
+    if (!files || access == Access::readOnly) return files;
+    removeHostFileDrafts(folder->get());
     Settings settings(**database);
     if (Status tables = makeMissingTables(**database); !tables) return tables.error();
     if (Status recovered = recover(**database, *files, settings); !recovered) return recovered.error();

@@ -28,10 +28,10 @@ constexpr std::array<std::string_view, 7> kBeginnings = {kLockFile,
                                                          "device.db.new-shm",
                                                          "device.db.new-journal"};
 
-/// Folders that other components of a device expect.
-constexpr std::array<std::string_view, 5> kDeviceFolders = {
-    kContainersPath, DeviceFileSystem::kTemporaryDirectory, "/var/mobile/Library/Logs/MediaServices",
-    "/var/mobile/Library/Preferences", "/var/mobile/Media/PublicStaging"};
+/// Folders that other components of a device expect, and that it is whole without.
+constexpr std::array<std::string_view, 4> kDeviceFolders = {
+    DeviceFileSystem::kTemporaryDirectory, "/var/mobile/Library/Logs/MediaServices", "/var/mobile/Library/Preferences",
+    "/var/mobile/Media/PublicStaging"};
 
 /// The process that says in the lock file that it holds the device; empty when it says nothing.
 std::string holder(int lock) {
@@ -46,6 +46,33 @@ Status writeHolder(int lock) {
   const int failed = ftruncate(lock, 0) != 0 ? errno : sys::writeAt(lock, bytesOf(number), 0);
   if (failed != 0) return Error::fromErrno(failed, kLockFile);
   return {};
+}
+
+Status makeIfMissing(int folder, const char* name) {
+  const int number = sys::makeFolder(folder, name);
+  if (number != 0 && number != EEXIST) return Error::fromErrno(number, name);
+  return {};
+}
+
+/// Making it anew would be losing what lay in it: it may be elsewhere for a while only.
+Error missingFolder(const std::string& path, const std::string& name) {
+  return deviceError(DeviceFailure::damaged, path + ": the device is damaged (it has no folder \"" + name +
+                                                 "\"); mount what belongs there, or put a copy of the device in its "
+                                                 "place");
+}
+
+/// Whatever lies in the root.
+Result<DeviceFileSystem> filesIn(const std::string& path, int folder, Access access) {
+  Result<RootFolder> root = RootFolder::open(path + '/' + kRootFolder);
+  if (!root && root.error().code == ENOENT) return missingFolder(path, kRootFolder);
+  if (!root) return root.error();
+  FileDescriptor work;
+  if (access == Access::exclusive) {
+    if (Status made = makeIfMissing(folder, kWorkFolder); !made) return made.error();
+    work = FileDescriptor(openat(folder, kWorkFolder, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+    if (!work.valid()) return Error::fromErrno(errno, kWorkFolder);
+  }
+  return DeviceFileSystem(std::move(root).value(), std::move(work), access);
 }
 
 }  // namespace
@@ -84,30 +111,23 @@ Result<FileDescriptor> lockDevice(const std::string& path, int folder) {
   return lock;
 }
 
-Status makeDeviceFolders(int folder) {
-  for (const char* name : {kRootFolder, kWorkFolder}) {
-    const int number = sys::makeFolder(folder, name);
-    if (number != 0 && number != EEXIST) return Error::fromErrno(number, name);
-  }
-  return {};
+Status makeDeviceFolders(const std::string& path, int folder) {
+  if (Status made = makeIfMissing(folder, kRootFolder); !made) return made;
+  Result<DeviceFileSystem> files = filesIn(path, folder, Access::exclusive);
+  return files ? files->createDirectory(kContainersPath, platform::IntermediateDirectories::create, {}) : files.error();
 }
 
 Result<DeviceFileSystem> openFileSystem(const std::string& path, int folder, Access access) {
-  Result<RootFolder> root = RootFolder::open(path + '/' + kRootFolder);
-  if (!root && root.error().code == ENOENT) {
-    return deviceError(DeviceFailure::damaged,
-                       path + ": the device is damaged (it has no folder \"root\"); open it once for writing");
+  Result<DeviceFileSystem> files = filesIn(path, folder, access);
+  if (!files) return files;
+  const Result<FileDescriptor> containers = files->root().open(kContainersPath, O_PATH | O_DIRECTORY);
+  if (!containers && containers.error().code == ENOENT) {
+    return missingFolder(path, kRootFolder + std::string(kContainersPath));
   }
-  if (!root) return root.error();
-  FileDescriptor work;
-  if (access == Access::exclusive) {
-    work = FileDescriptor(openat(folder, kWorkFolder, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
-    if (!work.valid()) return Error::fromErrno(errno, kWorkFolder);
-  }
-  DeviceFileSystem files(std::move(root).value(), std::move(work), access);
+  if (!containers) return containers.error();
   if (access == Access::readOnly) return files;
   for (const std::string_view name : kDeviceFolders) {
-    const Status made = files.createDirectory(name, platform::IntermediateDirectories::create, {});
+    const Status made = files->createDirectory(name, platform::IntermediateDirectories::create, {});
     if (!made) return made.error();
   }
   return files;

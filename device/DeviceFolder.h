@@ -24,9 +24,10 @@ inline constexpr const char* kLockFile = "lock";
 /// Takes hold of a device until the descriptor is closed; an error that names the holder when another process has it.
 [[nodiscard]] Result<FileDescriptor> lockDevice(const std::string& path, int folder);
 
-/// Makes those folders of a device that are not there.
-[[nodiscard]] Status makeDeviceFolders(int folder);
+/// Makes the folders without which a device is damaged, where an interrupted attempt has not made them.
+[[nodiscard]] Status makeDeviceFolders(const std::string& path, int folder);
 
+/// Makes what may be missing, if `access` allows it; a device without its root or containers is damaged.
 [[nodiscard]] Result<DeviceFileSystem> openFileSystem(const std::string& path, int folder, Access access);
 
 }  // namespace appsync::device

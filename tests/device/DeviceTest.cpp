@@ -264,13 +264,37 @@ TEST_F(DeviceAtPath, ShowsStoredProgressToReaders) {
   EXPECT_EQ(seen->installProgress()->installState(), platform::TSInstallState::Active);
 }
 
-TEST_F(DeviceAtPath, WithoutItsRootIsDamagedForReadersAndMendedForItsHolder) {
+TEST_F(DeviceAtPath, WithoutItsRootOrContainersIsDamagedAndLosesNothing) {
+  TestDevice device;
+  device.install("com.a", "1.5");
+  device.close();
+  for (const std::string folder : {"root", "root/var/mobile/Containers/Bundle"}) {
+    const std::string away = device.path() + "/../away";
+    fs::rename(device.path() + '/' + folder, away);
+    for (const Access access : {Access::readOnly, Access::exclusive}) {
+      EXPECT_EQ(
+          refusal(Device::open(device.path(), access)),
+          failure(DeviceFailure::damaged, device.path() + ": the device is damaged (it has no folder \"" + folder +
+                                              "\"); mount what belongs there, or put a copy of the device in its "
+                                              "place"));
+    }
+    fs::rename(away, device.path() + '/' + folder);
+    device.reopen();
+    EXPECT_EQ(device.record("com.a")->bundleVersion(), "1.5");
+    EXPECT_EQ(device.containers(), 1);
+    device.close();
+  }
+}
+
+TEST_F(DeviceAtPath, IsWholeWithoutWhatCanBeMadeAnew) {
   make();
-  fs::remove_all(path() + "/root");
-  EXPECT_EQ(refusal(open(Access::readOnly)).code, static_cast<long>(DeviceFailure::damaged));
+  fs::remove(path() + "/work");
+  fs::remove_all(path() + "/root/tmp");
+  fs::remove_all(path() + "/root/var/mobile/Media");
   const auto holder = open();
   ASSERT_TRUE(holder.ok()) << holder.error().text;
   EXPECT_TRUE((*holder)->services().fileSystem().fileExists("/tmp"));
+  EXPECT_TRUE((*holder)->services().fileSystem().fileExists("/var/mobile/Media/PublicStaging"));
 }
 
 TEST_F(DeviceAtPath, ThatMayNotBeWrittenSaysSo) {
