@@ -19,6 +19,15 @@ std::string_view appFolderStem(std::string_view folder) {
   return folder.substr(0, folder.size() - kAppExtension.size());
 }
 
+std::optional<std::string> namedFileIn(const std::string& appPath, const plist::Value* name) {
+  const auto text = stringIn(name);
+  if (!text || text->empty() || text->find('\0') != text->npos) return std::nullopt;
+  std::string path = appPath + '/';
+  path += *text;
+  const bool leavesApp = (path + '/').find("/../", appPath.size()) != path.npos;
+  return leavesApp ? std::nullopt : std::optional(std::move(path));
+}
+
 bool isInfoFile(std::string_view path, std::string_view appFolder) {
   return path.size() == appFolder.size() + 1 + kInfoFile.size() && path.starts_with(appFolder) &&
          path[appFolder.size()] == '/' && path.ends_with(kInfoFile);

@@ -28,6 +28,10 @@ struct BundleInfo {
 /// platform::InstallerErrorDomain.
 [[nodiscard]] Result<BundleInfo> readBundleInfo(ByteView document);
 
+/// Where the file is that an app names in its info dictionary: none when `name`, which may be null, is none of a file
+/// inside the app's folder. Whether it is there is another question.
+[[nodiscard]] std::optional<std::string> namedFileIn(const std::string& appPath, const plist::Value* name);
+
 /// Whether an entry of a package is the app's "Info.plist".
 [[nodiscard]] bool isInfoFile(std::string_view path, std::string_view appFolder);
 

@@ -36,10 +36,10 @@ std::optional<Bytes> readIfThere(DeviceFileSystem& files, const std::string& pat
 
 /// The picture that an app names as its icon, as a promise that is fulfilled.
 std::shared_ptr<PromiseState> iconOf(const plist::Dictionary& info, const std::string& appPath) {
-  const auto name = stringIn(info.find(platform::BundleIconFileKey));
-  if (!name) return nullptr;
+  const auto path = namedFileIn(appPath, info.find(platform::BundleIconFileKey));
+  if (!path) return nullptr;
   auto icon = std::make_shared<PromiseState>();
-  icon->transferPath = platform::FileLocation{appPath + '/' + std::string(*name), false};
+  icon->transferPath = platform::FileLocation{*path, false};
   icon->isComplete = true;
   return icon;
 }

@@ -4,21 +4,12 @@
 #include <numbers>
 #include <string>
 
+#include "device/BundleInfo.h"
 #include "platform/Keys.h"
 
 namespace appsync::device {
 
 namespace {
-
-/// Where the bundle says its icon is; none when it names no file inside itself.
-std::optional<std::string> iconPath(const platform::Bundle& bundle) {
-  const auto name = stringIn(bundle.infoDictionaryValue(platform::BundleIconFileKey));
-  if (!name || name->empty() || name->find('\0') != name->npos) return std::nullopt;
-  std::string path = bundle.location().path + '/';
-  path += *name;
-  const bool leavesBundle = (path + '/').find("/../") != path.npos;
-  return leavesBundle ? std::nullopt : std::optional(std::move(path));
-}
 
 /// Fills the square at the origin with the middle of `picture`.
 void paintIcon(cairo_t* context, cairo_surface_t* picture, double size, double cornerRadius) {
@@ -48,8 +39,12 @@ void addRoundedRectangle(cairo_t* context, double width, double height, double c
   cairo_close_path(context);
 }
 
+std::optional<std::string> iconPathIn(const platform::Bundle& bundle) {
+  return namedFileIn(bundle.location().path, bundle.infoDictionaryValue(platform::BundleIconFileKey));
+}
+
 std::unique_ptr<platform::Image> IconRenderer::createHomeScreenIconImage(const platform::Bundle& bundle) {
-  const auto path = iconPath(bundle);
+  const auto path = iconPathIn(bundle);
   if (!path) return nullptr;
   const auto attributes = fileSystem_.attributesOfItem(*path);
   if (!attributes || attributes->isDirectory || attributes->size > kMaximumFileSize) return nullptr;

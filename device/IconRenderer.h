@@ -2,6 +2,8 @@
 #pragma once
 
 #include <memory>
+#include <optional>
+#include <string>
 
 #include "device/IconImage.h"
 #include "platform/FileSystem.h"
@@ -27,6 +29,9 @@ class IconRenderer final : public platform::IconRenderer {
  private:
   platform::FileSystem& fileSystem_;
 };
+
+/// Where the bundle's icon is; none when it names no file inside itself.
+[[nodiscard]] std::optional<std::string> iconPathIn(const platform::Bundle& bundle);
 
 /// Adds to `context`'s path a rectangle with rounded corners, its top left one at the origin.
 void addRoundedRectangle(cairo_t* context, double width, double height, double cornerRadius);

@@ -87,9 +87,9 @@ Status requireText(const plist::Dictionary& info, std::string_view key, const fs
 Status requireFile(const plist::Dictionary& info, std::string_view key, const fs::path& app) {
   const plist::Value* value = info.find(key);
   if (value == nullptr) return {};
-  const auto text = value->string();
+  const auto file = device::namedFileIn(app.string(), value);
   std::error_code failure;
-  if (text && !text->empty() && fs::is_regular_file(app / *text, failure)) return {};
+  if (file && fs::is_regular_file(*file, failure)) return {};
   return wrong(app / device::kInfoFile, "names under " + std::string(key) + " a file that the app does not have");
 }
 

@@ -1,3 +1,5 @@
+#include <filesystem>
+
 #include <gmock/gmock.h>
 
 #include "device/Demotion.h"
@@ -6,6 +8,8 @@
 
 namespace appsync::test {
 namespace {
+
+namespace fs = std::filesystem;
 
 using platform::TSInstallType;
 using testing::ElementsAre;
@@ -69,6 +73,13 @@ TEST_F(Demotion, LeavesIconNameVersionMetadataArtworkAndLicence) {
   EXPECT_EQ(plist::truth(*bundle->infoDictionaryValue("UIPeriodixApp")), true);
   EXPECT_EQ(device_.registry().licenceData("com.a").value(), kLicence);
   EXPECT_EQ(device_.containers(), 1);
+}
+
+TEST_F(Demotion, LeavesNoIconThatLiesOutsideTheApp) {
+  writeHostFile(appFile("Info.plist"), R"({BundleIdentifier = "com.a"; BundleIconFile = "../HarvoMetadata.plist";})");
+  ASSERT_TRUE(demote("com.a").ok());
+  EXPECT_TRUE(fs::exists(appFile("Info.plist")));
+  EXPECT_FALSE(fs::exists(appFile("Icon.png")));
 }
 
 TEST_F(Demotion, WhatItLeavesCanBeRenamed) {

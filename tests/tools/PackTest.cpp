@@ -96,6 +96,16 @@ TEST_F(Pack, ABadIdentifierIsRefused) {
   expectRefused(path("Notes.app"), "Info.plist");
 }
 
+TEST_F(Pack, AnIconOutsideTheAppIsRefused) {
+  write(path("outside.png"), "a picture");
+  for (const std::string name : {"../outside.png", "./../outside.png"}) {
+    write(path("Notes.app/Info.plist"),
+          R"({BundleIdentifier = "org.a"; BundleVersion = "1"; BundleDisplayName = "A"; BundleIconFile = ")" + name +
+              R"(";})");
+    expectRefused(path("Notes.app"), "names under BundleIconFile a file that the app does not have");
+  }
+}
+
 TEST_F(Pack, AnIconThatIsNotThereIsRefused) {
   std::filesystem::remove(path("Notes.app/Icon.png"));
   expectRefused(path("Notes.app"), "BundleIconFile");
