@@ -8,6 +8,7 @@
 #include <fcntl.h>
 #include <sys/stat.h>
 
+#include "device/AppTable.h"
 #include "device/DeviceFolder.h"
 #include "device/HostFile.h"
 #include "device/Recovery.h"
@@ -80,6 +81,13 @@ Status makeDatabase(const std::string& path, int folder, InstallMode mode) {
   if (number == 0) number = sys::rename(folder, kNewDatabaseFile, folder, kDatabaseFile, sys::Replace::no);
   if (number != 0) return Error::fromErrno(number, kDatabaseFile);
   return {};
+}
+
+/// The register is as old as the layout: its tables, made anew, would be those of a device without apps.
+Status checkRegister(Database& database) {
+  Database::Session session(database);
+  const auto found = app_table::find(session, {});
+  return found ? Status() : Status(found.error());
 }
 
 Status checkDatabase(const std::string& path, Database& database) {
@@ -171,7 +179,9 @@ Result<std::unique_ptr<Device>> Device::open(const std::string& path, Access acc
 Result<std::unique_ptr<Device>> Device::open(const std::string& path, Access access, FileDescriptor lock) {
   Result<std::unique_ptr<Database>> database = Database::open(path + '/' + kDatabaseFile, access);
   if (!database) return deviceError(path, access, database.error());
-  if (Status checked = checkDatabase(path, **database); !checked) return deviceError(path, access, checked.error());
+  Status checked = checkDatabase(path, **database);
+  if (checked) checked = checkRegister(**database);
+  if (!checked) return deviceError(path, access, checked.error());
   const auto prepared = [&]() -> Result<DeviceFileSystem> {
     const Result<FileDescriptor> folder = openFolder(path);
     if (!folder) return folder.error();

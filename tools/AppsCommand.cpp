@@ -70,14 +70,15 @@ void writeTable(StandardOutput& output, const std::vector<DeviceApp>& apps) {
 }
 
 ExitStatus run(const AppsOptions& options, device::Device& device) {
-  const std::vector<DeviceApp> apps = appsOn(device);
+  const Result<std::vector<DeviceApp>> apps = appsOn(device);
+  if (!apps) return reportUnusable(apps.error());
   StandardOutput output;
   if (options.json) {
-    output.writeLine(indented(toJson(apps)));
-  } else if (apps.empty()) {
+    output.writeLine(indented(toJson(*apps)));
+  } else if (apps->empty()) {
     output.writeLine("No apps.");
   } else {
-    writeTable(output, apps);
+    writeTable(output, *apps);
   }
   return output.finish(ExitStatus::done);
 }

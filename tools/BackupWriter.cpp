@@ -59,6 +59,7 @@ class AppWriter {
         device_.platform().defaultRegistry().recordForIdentifier(identifier, platform::PlaceholderLookup::on);
     const Result<FileDescriptor> own = makeFolder(folder_.get(), identifier);
     if (!own) return own.error();
+    if (!record) return Error::fromErrno(ENOENT, "the record of " + identifier);
     const Result<std::optional<Bytes>> licence = device_.services().defaultRegistry().licenceData(identifier);
     if (!licence) return licence.error();
     Status written = add(*own, backup_files::kStoreMetadata, storeMetadataOf(device_, *record), entry.storeMetadata);
@@ -107,7 +108,9 @@ Status fill(const FolderDraft& draft, device::Device& device, Backup& backup) {
   const Result<FileDescriptor> apps = makeFolder(draft.folder(), std::string(backup_files::kApps));
   if (!apps) return apps.error();
   AppWriter writer(device, *apps);
-  for (const DeviceApp& app : appsOn(device)) {
+  const Result<std::vector<DeviceApp>> present = appsOn(device);
+  if (!present) return present.error();
+  for (const DeviceApp& app : *present) {
     if (!isToBeSaved(app)) continue;
     Result<BackedUpApp> written = writer.write(app);
     if (!written) return written.error();
@@ -126,7 +129,8 @@ Result<Backup> writeBackup(device::Device& device, const std::string& path) {
   if (!draft) return draft.error();
   Backup backup{path, device::newUUID(), {}, {}};
   const auto order = device.services().homeScreen().iconOrder();
-  if (order) backup.iconOrder = *order;
+  if (!order) return order.error().in("the order of the icons cannot be read");
+  backup.iconOrder = *order;
   if (Status filled = fill(*draft, device, backup); !filled) {
     return filled.error().in(path + " cannot be written, and is not there");
   }

@@ -20,9 +20,13 @@ using platform::ZTAsset;
 
 constexpr auto kShortestTimeBetweenUpdates = std::chrono::milliseconds(50);
 
-std::map<std::string, DeviceApp, std::less<>> appsByIdentifier(device::Device& device) {
-  std::map<std::string, DeviceApp, std::less<>> apps;
-  for (DeviceApp& app : appsOn(device))
+using AppsByIdentifier = std::map<std::string, DeviceApp, std::less<>>;
+
+Result<AppsByIdentifier> appsByIdentifier(device::Device& device) {
+  Result<std::vector<DeviceApp>> all = appsOn(device);
+  if (!all) return all.error();
+  AppsByIdentifier apps;
+  for (DeviceApp& app : *all)
     apps.emplace(app.app.identifier, std::move(app));
   return apps;
 }
@@ -109,13 +113,14 @@ Status Daemon::sync(const SyncRequest& request) {
   device_.platform().systemNotify().post(platform::kZTStartupCompleteNotification);
   client_.prepareForSyncWithHostAnchor(client_.currentSyncAnchor(), {}, nullptr);
   learnDeletedApps();
-  planSync(request);
+  Status begun = planSync(request);
   tellWhatIsKnown();
-  if (Status handedOver = handOverInstructions(); !handedOver) {
-    failEverything(handedOver.error());
+  if (begun) begun = handOverInstructions();
+  if (!begun) {
+    failEverything(begun.error());
     client_.assetTransferEndedWithSuccess(false);
     client_.syncEndedWithSuccess(false);
-    return handedOver;
+    return begun;
   }
   tellRemovals(*watcher);
   transferPackages(*watcher);
@@ -132,10 +137,11 @@ void Daemon::learnDeletedApps() {
   state_.learnDeleted(deletedIn(client_.installedAssets()));
 }
 
-void Daemon::planSync(const SyncRequest& request) {
-  const auto apps = appsByIdentifier(device_);
+Status Daemon::planSync(const SyncRequest& request) {
+  const Result<AppsByIdentifier> apps = appsByIdentifier(device_);
+  if (!apps) return apps.error();
   const IdentifierSet fromStore = awaitedFromStore(device_);
-  plan_ = makePlan({request.library, apps, state_.declined, request.only, request.remove, fromStore});
+  plan_ = makePlan({request.library, *apps, state_.declined, request.only, request.remove, fromStore});
   for (const std::string& identifier : request.only)
     state_.declined.erase(identifier);
   state_.declined.insert(request.remove.begin(), request.remove.end());
@@ -144,7 +150,8 @@ void Daemon::planSync(const SyncRequest& request) {
     state_.offered.insert(app.app.identifier);
     transfers_.emplace(app.app.identifier, &app);
   }
-  wakeDemotedApps(apps);
+  wakeDemotedApps(*apps);
+  return {};
 }
 
 /// Who installs directly asks for no package of an app that has a placeholder, unless it was restored: a demoted app

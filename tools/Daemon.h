@@ -45,7 +45,7 @@ class Daemon {
   };
 
   void learnDeletedApps();
-  void planSync(const SyncRequest& request);
+  [[nodiscard]] Status planSync(const SyncRequest& request);
   void wakeDemotedApps(const std::map<std::string, DeviceApp, std::less<>>& apps);
   [[nodiscard]] Status handOverInstructions();
   void transferPackages(InstallWatcher& watcher);

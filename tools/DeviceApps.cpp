@@ -1,14 +1,13 @@
 #include "tools/DeviceApps.h"
 
-#include "device/AppRecord.h"
-
 namespace appsync::tools {
 
-std::vector<DeviceApp> appsOn(device::Device& device) {
+Result<std::vector<DeviceApp>> appsOn(device::Device& device) {
+  const auto records = device.services().defaultRegistry().apps();
+  if (!records) return device::deviceError(device.path(), device::Access::readOnly, records.error());
   std::vector<DeviceApp> apps;
-  const auto add = [&](const platform::BundleRecord& bundle, bool& /*stop*/) {
-    const auto* record = dynamic_cast<const device::AppRecord*>(bundle.asAppRecord());
-    if (record == nullptr) return;
+  apps.reserve(records->size());
+  for (const auto& record : *records) {
     apps.push_back({{record->applicationIdentifier(), record->name(), record->bundleVersion().value_or("")},
                     record->applicationType(),
                     record->isInstalled(),
@@ -16,8 +15,7 @@ std::vector<DeviceApp> appsOn(device::Device& device) {
                     record->installProgress() != nullptr,
                     record->installType(),
                     record->staticDiskUsage()});
-  };
-  device.platform().defaultRegistry().enumerateBundlesOfType(platform::BundleKind::All, add);
+  }
   return apps;
 }
 

@@ -21,7 +21,8 @@ struct DeviceApp {
   std::uint64_t bytes = 0;
 };
 
-/// Every app and placeholder, in the order in which they came to the device.
-[[nodiscard]] std::vector<DeviceApp> appsOn(device::Device& device);
+/// Every app and placeholder, in the order in which they came to the device; an error of device::kDeviceDomain when its
+/// register cannot be read.
+[[nodiscard]] Result<std::vector<DeviceApp>> appsOn(device::Device& device);
 
 }  // namespace appsync::tools

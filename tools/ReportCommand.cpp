@@ -5,6 +5,7 @@
 #include <utility>
 
 #include "tools/Commands.h"
+#include "tools/DeviceApps.h"
 #include "tools/Json.h"
 #include "tools/OpenDevice.h"
 #include "tools/PlugIn.h"
@@ -130,6 +131,8 @@ void write(StandardOutput& output, const Report& report) {
 ExitStatus run(const DeviceReportOptions& options, device::Device& device) {
   const auto client = makeClient(device.platform());
   if (!client) return reportUnusable(client.error());
+  // To the plug-in a register that cannot be read is one without apps.
+  if (const auto apps = appsOn(device); !apps) return reportUnusable(apps.error());
   const Report report = ask(**client, device.platform().sharedConnection());
   StandardOutput output;
   if (options.json) {

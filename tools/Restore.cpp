@@ -56,7 +56,10 @@ Status writeList(device::Device& device, std::string_view path, const plist::Val
 
 Status Restore::check() const {
   const auto underWay = restoreUnderWay(device_.path());
-  if (underWay == backup_.identifier || appsOn(device_).empty()) return {};
+  if (underWay == backup_.identifier) return {};
+  const Result<std::vector<DeviceApp>> apps = appsOn(device_);
+  if (!apps) return apps.error();
+  if (apps->empty()) return {};
   if (underWay) {
     return refusal(device_.path() +
                    " is in the middle of the restore of another backup; finish that one first, or restore to a new "
@@ -168,9 +171,10 @@ void Restore::makePlaceholders() {
 void Restore::finishApps() {
   for (const BackedUpApp& app : backup_.apps) {
     if (!isWanted(app)) continue;
-    if (recordOf(device_, app.app.identifier) == nullptr) {
+    const auto record = recordOf(device_, app.app.identifier);
+    if (record == nullptr) {
       refuse(app, "the device made no placeholder for it; --log may tell why");
-    } else if (Status demoted = app.isDemoted() ? demote(app) : Status(); !demoted) {
+    } else if (Status demoted = app.isDemoted() ? demote(app, *record) : Status(); !demoted) {
       refuse(app, demoted.error().text);
     } else {
       progress_.finish({AppEvent::restored, app.app, {}});
@@ -184,13 +188,12 @@ void Restore::finishApps() {
 
 /// Without coordination the sync client makes all placeholders alike. No package comes that would bring the app's own
 /// name, where the store has another, nor one at which the data would be given back.
-Status Restore::demote(const BackedUpApp& app) {
+Status Restore::demote(const BackedUpApp& app, const platform::AppRecord& record) {
   const std::string& identifier = app.app.identifier;
-  const auto record = recordOf(device_, identifier);
-  if (record->isPlaceholder() && !record->isInstalled()) {
+  if (record.isPlaceholder() && !record.isInstalled()) {
     device::AppRegistry& registry = device_.services().defaultRegistry();
     Status set =
-        record->installType() == app.demotion ? Status() : registry.setPlaceholderType(identifier, app.demotion);
+        record.installType() == app.demotion ? Status() : registry.setPlaceholderType(identifier, app.demotion);
     if (set && !app.app.name.empty()) set = registry.renamePlaceholder(identifier, app.app.name);
     if (!set) return set;
   }

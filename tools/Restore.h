@@ -39,7 +39,7 @@ class Restore {
   [[nodiscard]] Status takeOver(const BackedUpApp& app, plist::Dictionary& entries);
   [[nodiscard]] Result<plist::Dictionary> entryOf(const BackedUpApp& app) const;
   [[nodiscard]] Status keepData(const BackedUpApp& app);
-  [[nodiscard]] Status demote(const BackedUpApp& app);
+  [[nodiscard]] Status demote(const BackedUpApp& app, const platform::AppRecord& record);
   [[nodiscard]] bool isWanted(const BackedUpApp& app) const { return !refused_.contains(app.app.identifier); }
   void refuse(const BackedUpApp& app, std::string_view reason);
 

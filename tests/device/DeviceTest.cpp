@@ -286,6 +286,25 @@ TEST_F(DeviceAtPath, WithoutItsRootOrContainersIsDamagedAndLosesNothing) {
   }
 }
 
+TEST_F(DeviceAtPath, WithoutItsRegisterIsRefusedAndLosesNothing) {
+  TestDevice device;
+  device.install("com.a", "1.5");
+  device.close();
+  for (const std::string table : {"apps", "bundles"}) {
+    runSQL(device.path() + "/device.db", ("alter table " + table + " rename to lost").c_str());
+    for (const Access access : {Access::readOnly, Access::exclusive}) {
+      EXPECT_EQ(refusal(Device::open(device.path(), access)).text,
+                device.path() + ": the device cannot be used (database: no such table: " + table +
+                    "); see to that and try again");
+    }
+    runSQL(device.path() + "/device.db", ("alter table lost rename to " + table).c_str());
+    device.reopen();
+    EXPECT_EQ(device.record("com.a")->bundleVersion(), "1.5");
+    EXPECT_EQ(device.containers(), 1);
+    device.close();
+  }
+}
+
 TEST_F(DeviceAtPath, IsWholeWithoutWhatCanBeMadeAnew) {
   make();
   fs::remove(path() + "/work");

@@ -3,6 +3,7 @@
 #include <sys/mount.h>
 #include <unistd.h>
 
+#include "device/Database.h"
 #include "tests/tools/ToolFixture.h"
 
 namespace appsync::test {
@@ -36,6 +37,27 @@ TEST_F(DeviceErrors, ADamagedDatabaseSaysSo) {
     if (std::filesystem::exists(device() + file)) write(device() + file, std::string(8192, 'x'));
   }
   expectUnusable(sync(), "damaged");
+}
+
+TEST_F(DeviceErrors, ARegisterThatCannotBeReadIsNotAnEmptyOne) {
+  publish("org.a");
+  ASSERT_EQ(sync().status, 0);
+  ASSERT_EQ(runTool({"backup", device(), path("backup")}).status, 0);
+  {
+    const auto database = device::Database::open(device() + "/device.db", device::Access::exclusive);
+    ASSERT_TRUE(database.ok());
+    device::Database::Session session(**database);
+    ASSERT_TRUE(session.runScript("alter table bundles rename column version to lost").ok());
+  }
+  const std::string reason =
+      device() + ": the device cannot be used (database: no such column: i.version); see to that and try again";
+  expectUnusable(runTool({"apps", device()}), reason);
+  expectUnusable(runTool({"apps", device(), "--json"}), reason);
+  expectUnusable(runTool({"report", device()}), reason);
+  expectUnusable(runTool({"report", device(), "--json"}), reason);
+  expectUnusable(sync(), reason);
+  expectUnusable(runTool({"backup", device(), path("another")}), reason);
+  expectUnusable(runTool({"restore", device(), path("backup")}), reason);
 }
 
 TEST_F(DeviceErrors, AnExistingDeviceIsNotMadeAgain) {
