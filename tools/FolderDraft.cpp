@@ -1,7 +1,7 @@
 #include "tools/FolderDraft.h"
 
 #include <cerrno>
-#include <filesystem>
+#include <string_view>
 #include <utility>
 
 #include <fcntl.h>
@@ -25,12 +25,46 @@ Error alreadyThere(const std::string& path) {
   return refusal(EEXIST, path + " exists already; choose another name, or remove it");
 }
 
+/// In the hidden folder, a file that is made first and goes last, and what is to be published.
+constexpr const char* kMark = ".appsync-draft";
+constexpr const char* kContent = "content";
+
+/// Whether a hidden folder that was there is a draft's: it has the mark, or nothing was put in it yet.
+Result<bool> isDraft(int shell) {
+  struct stat status {};
+  if (fstatat(shell, kMark, &status, AT_SYMLINK_NOFOLLOW) == 0) return true;
+  device::FolderEntries entries(shell);
+  const bool isEmpty = entries.next() == nullptr;
+  if (entries.failure() != 0) return Error::fromErrno(entries.failure());
+  return isEmpty;
+}
+
+/// Removes all but the mark: a kill leaves what is known as a draft.
+int clear(int shell) {
+  device::FolderEntries entries(shell);
+  while (const char* name = entries.next()) {
+    if (name == std::string_view(kMark)) continue;
+    if (const int number = device::tree::remove(shell, name, shell); number != 0) return number;
+  }
+  return entries.failure();
+}
+
+int makeContent(int shell, device::FileDescriptor& content) {
+  int number = device::tree::create(shell, kMark, {});
+  if (number == EEXIST) number = clear(shell);
+  if (number == 0) number = sys::makeFolder(shell, kContent);
+  if (number != 0) return number;
+  content = device::FileDescriptor(openat(shell, kContent, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+  return content.valid() ? 0 : errno;
+}
+
 }  // namespace
 
-FolderDraft::FolderDraft(std::string path, std::string name, device::FileDescriptor parent)
+FolderDraft::FolderDraft(std::string path, const std::filesystem::path& place, device::FileDescriptor parent)
     : path_(std::move(path)),
-      name_(std::move(name)),
-      draftName_("." + name_ + ".partial"),
+      name_(place.filename().string()),
+      shellName_("." + name_ + ".partial"),
+      shellPath_((place.parent_path() / shellName_).string()),
       parent_(std::move(parent)) {}
 
 Result<FolderDraft> FolderDraft::make(const std::string& path) {
@@ -43,40 +77,60 @@ Result<FolderDraft> FolderDraft::make(const std::string& path) {
   if (!parent.valid()) return Error::fromErrno(errno, parentPath + ", in which " + name + " is to be made");
   struct stat status {};
   if (fstatat(parent.get(), name.c_str(), &status, AT_SYMLINK_NOFOLLOW) == 0) return alreadyThere(path);
-  FolderDraft draft(path, name, std::move(parent));
+  FolderDraft draft(path, place, std::move(parent));
   if (Status held = draft.takeHold(); !held) return held.error();
   return draft;
 }
 
-Status FolderDraft::takeHold() {
-  const int made = sys::makeFolder(parent_.get(), draftName_.c_str());
+Result<bool> FolderDraft::lockShell() {
+  const int made = sys::makeFolder(parent_.get(), shellName_.c_str());
   if (made != 0 && made != EEXIST) return Error::fromErrno(made, path_);
-  device::FileDescriptor folder(
-      openat(parent_.get(), draftName_.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
-  if (!folder.valid()) return Error::fromErrno(errno, path_);
-  if (flock(folder.get(), LOCK_EX | LOCK_NB) != 0) {
+  device::FileDescriptor shell(
+      openat(parent_.get(), shellName_.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+  if (!shell.valid() && errno == ENOENT) return false;
+  if (!shell.valid()) return Error::fromErrno(errno, shellPath_);
+  if (flock(shell.get(), LOCK_EX | LOCK_NB) != 0) {
     return refusal(errno, path_ + " is just being made by another process; wait until that has ended");
   }
-  const int emptied = device::tree::empty(folder.get(), folder.get());
-  if (emptied != 0) return Error::fromErrno(emptied, path_);
-  folder_ = std::move(folder);
-  return {};
+  // Its holder may have ended between the opening and the lock, and taken it away.
+  struct stat locked {};
+  struct stat named {};
+  if (fstat(shell.get(), &locked) != 0) return Error::fromErrno(errno, shellPath_);
+  const bool isThere = fstatat(parent_.get(), shellName_.c_str(), &named, AT_SYMLINK_NOFOLLOW) == 0;
+  if (!isThere || locked.st_dev != named.st_dev || locked.st_ino != named.st_ino) return false;
+  const Result<bool> isOurs = isDraft(shell.get());
+  if (!isOurs) return isOurs.error().in(shellPath_);
+  if (!*isOurs) {
+    return refusal(EEXIST, shellPath_ +
+                               " is in the way and holds no unfinished backup; move it away, or choose another "
+                               "name");
+  }
+  shell_ = std::move(shell);
+  return true;
+}
+
+Status FolderDraft::takeHold() {
+  for (bool isLocked = false; !isLocked;) {
+    const Result<bool> locked = lockShell();
+    if (!locked) return locked.error();
+    isLocked = *locked;
+  }
+  const int number = makeContent(shell_.get(), folder_);
+  return number == 0 ? Status() : Status(Error::fromErrno(number, path_));
 }
 
 FolderDraft::~FolderDraft() {
-  if (!folder_.valid()) return;
-  static_cast<void>(device::tree::empty(folder_.get(), folder_.get()));
-  static_cast<void>(sys::removeEmptyFolder(parent_.get(), draftName_.c_str()));
+  if (!shell_.valid()) return;
+  if (clear(shell_.get()) != 0) return;
+  static_cast<void>(sys::removeFile(shell_.get(), kMark));
+  static_cast<void>(sys::removeEmptyFolder(parent_.get(), shellName_.c_str()));
 }
 
 Status FolderDraft::publish() {
   int number = sys::syncFileSystem(folder_.get());
-  if (number == 0) {
-    number = sys::rename(parent_.get(), draftName_.c_str(), parent_.get(), name_.c_str(), sys::Replace::no);
-  }
+  if (number == 0) number = sys::rename(shell_.get(), kContent, parent_.get(), name_.c_str(), sys::Replace::no);
   if (number == EEXIST) return alreadyThere(path_);
   if (number != 0) return Error::fromErrno(number, path_);
-  folder_ = device::FileDescriptor();
   number = sys::syncFileSystem(parent_.get());
   return number == 0 ? Status() : Status(Error::fromErrno(number, path_));
 }

@@ -1,6 +1,7 @@
 // A folder of this machine that is whole or not there.
 #pragma once
 
+#include <filesystem>
 #include <string>
 
 #include "base/Error.h"
@@ -8,12 +9,13 @@
 
 namespace appsync::tools {
 
-/// A folder that is being filled beside its place, under a hidden name. Unless it is published its end removes it;
-/// after a kill the next draft for the same place does.
+/// A folder that is being filled beside its place, in a hidden folder that says what it is. Unless it is published its
+/// end removes it; after a kill the next draft for the same place does.
 class FolderDraft {
  public:
-  /// Fails when there is something at `path`, when its parent is not there, and while another process fills a draft for
-  /// it. Errors: "POSIX"; the text says what to do.
+  /// Fails when there is something at `path`, when its parent is not there, while another process fills a draft for it,
+  /// and when something that is no draft has the hidden folder's name, which is left as it is. Errors: "POSIX"; the
+  /// text says what to do.
   [[nodiscard]] static Result<FolderDraft> make(const std::string& path);
   FolderDraft(FolderDraft&&) = default;
   FolderDraft& operator=(FolderDraft&&) = delete;
@@ -26,13 +28,19 @@ class FolderDraft {
   [[nodiscard]] Status publish();
 
  private:
-  FolderDraft(std::string path, std::string name, device::FileDescriptor parent);
+  FolderDraft(std::string path, const std::filesystem::path& place, device::FileDescriptor parent);
   [[nodiscard]] Status takeHold();
+  /// Opens and locks the hidden folder, made if it is missing; false when it has gone or another one has taken its
+  /// place.
+  [[nodiscard]] Result<bool> lockShell();
 
   std::string path_;
   std::string name_;
-  std::string draftName_;
+  std::string shellName_;
+  std::string shellPath_;
   device::FileDescriptor parent_;
+  /// The hidden folder, which is locked, and in it the one that is published.
+  device::FileDescriptor shell_;
   device::FileDescriptor folder_;
 };
 
