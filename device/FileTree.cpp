@@ -40,21 +40,26 @@ namespace tree {
 
 namespace {
 
-int copyFolder(int from, int toFolder, const char* to, std::uint64_t& bytes) {
+int copyFolder(int from, const struct stat& status, int toFolder, const char* to, std::uint64_t& bytes,
+               std::uint64_t* leftOut) {
   if (const int number = sys::makeFolder(toFolder, to); number != 0) return number;
-  const FileDescriptor made(openat(toFolder, to, O_PATH | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+  const FileDescriptor made(openat(toFolder, to, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
   if (!made.valid()) return errno;
   FolderEntries entries(from);
   while (const char* name = entries.next()) {
-    if (const int number = copy(from, name, made.get(), name, bytes); number != 0) return number;
+    if (const int number = copy(from, name, made.get(), name, bytes, leftOut); number != 0) return number;
   }
-  return entries.failure();
+  if (entries.failure() != 0) return entries.failure();
+  // What may not be entered or changed could not be moved or removed either.
+  return sys::setAttributes(made.get(), (status.st_mode & 0777) | S_IRWXU, status);
 }
 
-int copyFile(int from, mode_t mode, int toFolder, const char* to, std::uint64_t& bytes) {
+int copyFile(int from, const struct stat& status, int toFolder, const char* to, std::uint64_t& bytes) {
+  const mode_t mode = status.st_mode & 0777;
   FileDescriptor made;
-  if (const int number = sys::createFile(toFolder, to, mode & 0777, made); number != 0) return number;
-  return sys::copyContents(from, made.get(), bytes);
+  if (const int number = sys::createFile(toFolder, to, mode, made); number != 0) return number;
+  if (const int number = sys::copyContents(from, made.get(), bytes); number != 0) return number;
+  return sys::setAttributes(made.get(), mode, status);
 }
 
 int copyLink(int fromFolder, const char* from, int toFolder, const char* to) {
@@ -96,15 +101,20 @@ int removeFolder(int work, std::string name) {
 
 }  // namespace
 
-int copy(int fromFolder, const char* from, int toFolder, const char* to, std::uint64_t& bytes) {
+int copy(int fromFolder, const char* from, int toFolder, const char* to, std::uint64_t& bytes, std::uint64_t* leftOut) {
+  const auto leaveOut = [&] {
+    if (leftOut != nullptr) ++*leftOut;
+    return leftOut != nullptr ? 0 : EINVAL;
+  };
   struct stat status {};
   // Non-blocking: opening a pipe must not wait for somebody to write into it.
   const FileDescriptor source(openat(fromFolder, from, O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC));
-  if (!source.valid()) return errno == ELOOP ? copyLink(fromFolder, from, toFolder, to) : errno;
+  if (!source.valid() && errno == ELOOP) return copyLink(fromFolder, from, toFolder, to);
+  if (!source.valid()) return errno == ENXIO ? leaveOut() : errno;  // The answer of sockets.
   if (fstat(source.get(), &status) != 0) return errno;
-  if (S_ISDIR(status.st_mode)) return copyFolder(source.get(), toFolder, to, bytes);
-  if (S_ISREG(status.st_mode)) return copyFile(source.get(), status.st_mode, toFolder, to, bytes);
-  return EINVAL;
+  if (S_ISDIR(status.st_mode)) return copyFolder(source.get(), status, toFolder, to, bytes, leftOut);
+  if (S_ISREG(status.st_mode)) return copyFile(source.get(), status, toFolder, to, bytes);
+  return leaveOut();
 }
 
 int create(int folder, const char* name, ByteView bytes) {

@@ -35,9 +35,12 @@ class FolderEntries {
 /// Files, folders and links, relative to open folders, which stay the caller's. Each returns 0, or the error number.
 namespace tree {
 
-/// Makes `to` a copy of `from`, a file, a link or a folder with all in it, and adds the files' sizes to `bytes`. Fails
-/// with EEXIST when `to` is there and with EINVAL on anything else than these. A failure leaves part of it.
-[[nodiscard]] int copy(int fromFolder, const char* from, int toFolder, const char* to, std::uint64_t& bytes);
+/// Makes `to` a copy of `from`, a file, a link or a folder with all in it, and adds the files' sizes to `bytes`.
+/// Permissions and times are kept, but for links, and every folder of the copy may be used by its owner. Anything else
+/// than these fails with EINVAL, or is left out and counted where there is a `leftOut`. Fails with EEXIST when `to` is
+/// there. A failure leaves part of it.
+[[nodiscard]] int copy(int fromFolder, const char* from, int toFolder, const char* to, std::uint64_t& bytes,
+                       std::uint64_t* leftOut = nullptr);
 
 /// Makes a file with these bytes in it; a failure leaves none.
 [[nodiscard]] int create(int folder, const char* name, ByteView bytes);

@@ -6,7 +6,6 @@
 
 #include <fcntl.h>
 #include <sys/random.h>
-#include <sys/stat.h>
 
 #include "device/Step.h"
 
@@ -96,6 +95,12 @@ int syncFileSystem(int file) {
 
 int touch(int file) {
   return perform("touch", [&] { return futimens(file, nullptr); });
+}
+
+int setAttributes(int file, mode_t mode, const struct stat& status) {
+  const timespec times[] = {status.st_atim, status.st_mtim};
+  const int number = perform("set attributes", [&] { return fchmod(file, mode) == 0 ? futimens(file, times) : -1; });
+  return number == EPERM || number == EOPNOTSUPP ? 0 : number;
 }
 
 int copyContents(int from, int to, std::uint64_t& bytes) {

@@ -4,6 +4,7 @@
 #include <cstdint>
 #include <string>
 
+#include <sys/stat.h>
 #include <sys/types.h>
 
 #include "base/Bytes.h"
@@ -38,6 +39,9 @@ enum class Replace { no, yes };
 
 /// Sets both times to now.
 [[nodiscard]] int touch(int file);
+/// Gives a file of one's own these permissions, whatever the process's mask, and the times of `status`, as far as its
+/// file system can keep them.
+[[nodiscard]] int setAttributes(int file, mode_t mode, const struct stat& status);
 /// Copies what is left of one file to the end of another, sharing blocks where the file system can; adds to `bytes`.
 [[nodiscard]] int copyContents(int from, int to, std::uint64_t& bytes);
 

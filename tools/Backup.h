@@ -34,6 +34,8 @@ struct BackedUpApp {
   std::optional<std::uint64_t> licence;
   std::optional<std::uint64_t> icon;
   std::optional<std::uint64_t> data;
+  /// How much of its data is neither file, folder nor link, and not in the backup. Not in the manifest.
+  std::uint64_t leftOut = 0;
   /// Why the entry cannot be used; empty for one that can.
   std::string damage;
 

@@ -22,6 +22,8 @@ constexpr const char* kExamples =
 metadata, licence, icon, version and data, which apps are demoted, and the order of the icons. Packages are not in
 it: after `appsync restore` the next sync brings them.
 
+What is neither file, folder nor link in an app's data is left out, and said so on standard error.
+
 Whatever ends the process, the folder is whole or not there.
 
 Example:
@@ -37,6 +39,14 @@ std::string summaryOf(const Backup& backup) {
          printable(backup.path) + ".";
 }
 
+void tellWhatIsLeftOut(const Backup& backup) {
+  for (const BackedUpApp& app : backup.apps) {
+    if (app.leftOut == 0) continue;
+    printError("the data of " + app.app.identifier + " is saved without " + std::to_string(app.leftOut) +
+               (app.leftOut == 1 ? " item that is" : " items that are") + " neither file, folder nor link");
+  }
+}
+
 ExitStatus run(const BackupOptions& options, device::Device& device) {
   const auto client = makeClient(device.platform());
   if (!client) return reportUnusable(client.error());
@@ -45,6 +55,7 @@ ExitStatus run(const BackupOptions& options, device::Device& device) {
   if (!listed) return reportUnusable(listed.error());
   const Result<Backup> backup = writeBackup(device, options.backup);
   if (!backup) return reportUnusable(backup.error());
+  tellWhatIsLeftOut(*backup);
   StandardOutput output;
   output.writeLine(summaryOf(*backup));
   return output.finish(ExitStatus::done);

@@ -8,6 +8,7 @@
 #include "device/AppData.h"
 #include "device/Demotion.h"
 #include "device/FileTree.h"
+#include "device/IconRenderer.h"
 #include "device/SystemCalls.h"
 #include "device/UUID.h"
 #include "platform/Keys.h"
@@ -28,14 +29,15 @@ Result<FileDescriptor> makeFolder(int parent, const std::string& name) {
   return folder;
 }
 
-/// The file of the app that its info dictionary names as the icon.
+/// The file of the app that its info dictionary names as the icon; none where it cannot be one.
 std::optional<Bytes> iconOf(device::Device& device, const platform::AppRecord& record) {
-  const auto path = record.bundlePath();
-  const auto bundle = path ? device.platform().bundles().openBundle({*path, true}) : nullptr;
-  const plist::Value* name = bundle ? bundle->infoDictionaryValue(platform::BundleIconFileKey) : nullptr;
-  const auto text = stringIn(name);
-  if (!text) return std::nullopt;
-  Result<Bytes> bytes = device.platform().fileSystem().readFile(*path + "/" + std::string(*text));
+  const auto folder = record.bundlePath();
+  const auto bundle = folder ? device.platform().bundles().openBundle({*folder, true}) : nullptr;
+  const auto path = bundle ? device::iconPathIn(*bundle) : std::nullopt;
+  if (!path) return std::nullopt;
+  const auto attributes = device.platform().fileSystem().attributesOfItem(*path);
+  if (!attributes || attributes->size > device::IconRenderer::kMaximumFileSize) return std::nullopt;
+  Result<Bytes> bytes = device.platform().fileSystem().readFile(*path);
   return bytes ? std::optional(std::move(bytes).value()) : std::nullopt;
 }
 
@@ -57,15 +59,15 @@ class AppWriter {
     if (!app.isInstalled && device::isDemotion(app.installType)) entry.demotion = app.installType;
     const auto record =
         device_.platform().defaultRegistry().recordForIdentifier(identifier, platform::PlaceholderLookup::on);
+    if (!record) return Error::fromErrno(ENOENT, "the record of " + identifier);
     const Result<FileDescriptor> own = makeFolder(folder_.get(), identifier);
     if (!own) return own.error();
-    if (!record) return Error::fromErrno(ENOENT, "the record of " + identifier);
     const Result<std::optional<Bytes>> licence = device_.services().defaultRegistry().licenceData(identifier);
     if (!licence) return licence.error();
     Status written = add(*own, backup_files::kStoreMetadata, storeMetadataOf(device_, *record), entry.storeMetadata);
     if (written) written = add(*own, backup_files::kLicence, *licence, entry.licence);
     if (written) written = add(*own, backup_files::kIcon, iconOf(device_, *record), entry.icon);
-    if (written) written = addData(*own, identifier, entry.data);
+    if (written) written = addData(*own, entry);
     if (!written) return written.error();
     return entry;
   }
@@ -80,7 +82,8 @@ class AppWriter {
   }
 
   /// What the app has, or what an earlier restore still keeps for it.
-  Status addData(const FileDescriptor& folder, const std::string& identifier, std::optional<std::uint64_t>& size) {
+  Status addData(const FileDescriptor& folder, BackedUpApp& entry) {
+    const std::string& identifier = entry.app.identifier;
     const bool isKept = device_.platform().makeBackupManager()->restoreDataExists(identifier, nullptr);
     const std::string path =
         isKept ? std::string(device::kRestoreDataPath) + "/" + identifier : device::dataContainerOf(identifier);
@@ -88,10 +91,10 @@ class AppWriter {
     if (!data && data.error().code == ENOENT) return {};
     if (!data) return data.error();
     std::uint64_t bytes = 0;
-    const int number =
-        device::tree::copy(data->get(), ".", folder.get(), std::string(backup_files::kData).c_str(), bytes);
+    const int number = device::tree::copy(data->get(), ".", folder.get(), std::string(backup_files::kData).c_str(),
+                                          bytes, &entry.leftOut);
     if (number != 0) return Error::fromErrno(number, "the data of " + identifier);
-    size = bytes;
+    entry.data = bytes;
     return {};
   }
 
