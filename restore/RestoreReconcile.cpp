@@ -80,8 +80,8 @@ bool AppsClient::_processHarvoRestoreInfo() {
 bool AppsClient::_restoreApps(plist::DocumentEntries& info) {
   const DemotedApps demotedApps(_loadDemotedAppsPlist(_platform, kDemotedAppsPath, nullptr));
   _log.summary("%s|Demoted Apps: %{public}@", demotedApps.lists());
-  // Asked for each app, a walk would cost as many walks as there are apps. What comes to the device while a restore runs
-  // is not seen.
+  // Asked for each app, a walk would cost as many walks as there are apps. What comes to the device while a restore
+  // runs is not seen.
   const Identifiers userBundles = _useInstallCoordinator ? Identifiers{} : _userBundles();
   bool result = false;
   info.visit([&](std::string_view identifier, const plist::Value& entry) {
