@@ -8,13 +8,14 @@ Result<std::vector<DeviceApp>> appsOn(device::Device& device) {
   std::vector<DeviceApp> apps;
   apps.reserve(records->size());
   for (const auto& record : *records) {
-    apps.push_back({{record->applicationIdentifier(), record->name(), record->bundleVersion().value_or("")},
-                    record->applicationType(),
-                    record->isInstalled(),
-                    record->isPlaceholder(),
-                    record->installProgress() != nullptr,
-                    record->installType(),
-                    record->staticDiskUsage()});
+    DeviceApp& app = apps.emplace_back();
+    app.app = {record->applicationIdentifier(), record->name(), record->bundleVersion().value_or("")};
+    app.type = record->applicationType();
+    app.isInstalled = record->isInstalled();
+    app.isPlaceholder = record->isPlaceholder();
+    app.isUnderWay = record->installProgress() != nullptr;
+    app.installType = record->installType();
+    app.bytes = record->staticDiskUsage();
   }
   return apps;
 }
