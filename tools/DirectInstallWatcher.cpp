@@ -41,8 +41,8 @@ class DirectInstallWatcher final : public InstallWatcher {
     }
   }
 
-  /// What the home screen does not let go of would be tried again without an end. It is dropped and not made to fail: of
-  /// an update that fails the plug-in removes the app.
+  /// What the home screen does not let go of would be tried again without an end. It is dropped and not made to fail:
+  /// of an update that fails the plug-in removes the app.
   void end() {
     progress_.interrupted();
     device_.services().scheduler().close();
