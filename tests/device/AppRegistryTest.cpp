@@ -47,7 +47,7 @@ std::vector<std::string> lastingStepsOf(const std::function<void()>& work) {
   std::erase_if(stepsTaken, [](const std::string& name) {
     return name != "rename" && name != "sync" && name != "database to disk";
   });
-  stepsTaken.erase(std::ranges::unique(stepsTaken).begin(), stepsTaken.end());
+  stepsTaken.erase(std::unique(stepsTaken.begin(), stepsTaken.end()), stepsTaken.end());
   return stepsTaken;
 }
 
