@@ -1,6 +1,5 @@
 #include "device/HostFile.h"
 
-#include <algorithm>
 #include <array>
 #include <cerrno>
 #include <cstdio>
@@ -59,16 +58,6 @@ class Stream {
   FileDescriptor opened_;
   int number_;
 };
-
-/// 0, or the error number. That nobody reads any more is told as EPIPE.
-int writeAll(int file, ByteView bytes) {
-  while (!bytes.empty()) {
-    const ssize_t count = ::write(file, bytes.data(), bytes.size());
-    if (count < 0 && errno != EINTR) return errno;
-    if (count > 0) bytes = bytes.subspan(static_cast<std::size_t>(count));
-  }
-  return 0;
-}
 
 int copyAll(int from, int to) {
   std::array<std::byte, std::size_t{128} * 1024> block;
@@ -167,6 +156,16 @@ bool isDraft(std::string_view name) {
 }
 
 }  // namespace
+
+int writeAll(int stream, ByteView bytes) {
+  while (!bytes.empty()) {
+    const ssize_t count = ::write(stream, bytes.data(), bytes.size());
+    if (count < 0 && errno == EINTR) continue;
+    if (count <= 0) return count < 0 ? errno : ENOSPC;
+    bytes = bytes.subspan(static_cast<std::size_t>(count));
+  }
+  return 0;
+}
 
 Result<Bytes> readHostFile(const std::string& path, std::uint64_t most) {
   const FileDescriptor file(::open(path.c_str(), O_RDONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC));

@@ -27,6 +27,9 @@ inline constexpr std::uint64_t kLargestHostFile = 1'000'000'000;
 /// held, or all of `bytes`. A link is replaced itself. A file that is replaced leaves its mode to the new one.
 [[nodiscard]] Status replaceHostFile(const std::string& path, ByteView bytes);
 
+/// Writes all of it to an open file, pipe or device. 0, or the error number: EPIPE when nobody reads any more.
+[[nodiscard]] int writeAll(int stream, ByteView bytes);
+
 /// Writes what people name as the place of a result: a file is replaced like that, behind links the file that they lead
 /// to; a pipe or device is written to as it is, "-" is standard output. A reader that leaves early is no failure.
 [[nodiscard]] Status writeHostFile(const std::string& path, ByteView bytes);

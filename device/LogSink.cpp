@@ -3,9 +3,9 @@
 #include <cerrno>
 
 #include <fcntl.h>
-#include <unistd.h>
 
 #include "device/Characters.h"
+#include "device/HostFile.h"
 #include "device/TimeText.h"
 
 namespace appsync::device {
@@ -65,12 +65,7 @@ void FileLogSink::write(std::chrono::system_clock::time_point time, int category
   line += level == LogLevel::error ? " error " : " default ";
   appendMessage(line, message);
   line += '\n';
-  for (std::string_view rest = line; !rest.empty();) {
-    const ssize_t written = ::write(file_.get(), rest.data(), rest.size());
-    if (written < 0 && errno == EINTR) continue;
-    if (written <= 0) return;
-    rest.remove_prefix(static_cast<std::size_t>(written));
-  }
+  static_cast<void>(writeAll(file_.get(), bytesOf(line)));
 }
 
 }  // namespace appsync::device

@@ -1,7 +1,6 @@
 #include "tools/Printable.h"
 
 #include <array>
-#include <cstdint>
 #include <cstdio>
 #include <cwchar>
 

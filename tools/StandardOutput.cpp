@@ -13,16 +13,6 @@ namespace {
 constexpr std::size_t kLargestBuffer = std::size_t{64} * 1024;
 constexpr std::size_t kLongestSentence = 2000;
 
-/// 0, or the errno that stopped it.
-int writeAll(int descriptor, std::string_view text) {
-  while (!text.empty()) {
-    const ssize_t written = ::write(descriptor, text.data(), text.size());
-    if (written < 0 && errno != EINTR) return errno;
-    if (written > 0) text.remove_prefix(static_cast<std::size_t>(written));
-  }
-  return 0;
-}
-
 }  // namespace
 
 void StandardOutput::write(std::string_view text) {
@@ -36,7 +26,7 @@ void StandardOutput::writeLine(std::string_view text) {
 }
 
 void StandardOutput::flush() {
-  if (failure_ == 0) failure_ = writeAll(STDOUT_FILENO, pending_);
+  if (failure_ == 0) failure_ = device::writeAll(STDOUT_FILENO, bytesOf(pending_));
   pending_.clear();
 }
 
@@ -53,8 +43,9 @@ bool isForTerminal(const std::string& path, std::string_view what) {
 }
 
 void printError(std::string_view sentence) {
+  const std::string line = "appsync: " + printable(sentence, kLongestSentence) + "\n";
   // Nobody is left to tell when standard error fails too.
-  static_cast<void>(writeAll(STDERR_FILENO, "appsync: " + printable(sentence, kLongestSentence) + "\n"));
+  static_cast<void>(device::writeAll(STDERR_FILENO, bytesOf(line)));
 }
 
 ExitStatus reportUnusable(const Error& error) {
