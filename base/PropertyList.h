@@ -22,7 +22,7 @@ enum class Failure : long {
   outOfRange,        ///< a number, date, offset or length lies outside what is allowed
   badText,           ///< bytes that are not text in their encoding, or text its form cannot hold
   tooDeep,           ///< containers nested deeper than kMaximumDepth
-  tooLarge,          ///< a small document that would unfold into too many values, or a container inside itself
+  tooLarge,          ///< a document or value whose shared content expands to too many values or too much text
   unsupported,       ///< a form or element that is understood but refused
   notRepresentable,  ///< a value that the form to be written cannot hold; every null is one
 };
@@ -30,8 +30,14 @@ enum class Failure : long {
 /// Documents nested deeper than this are neither read nor written.
 inline constexpr int kMaximumDepth = 512;
 
+/// Bytes. Values that share their content can stand for far more than memory holds: forms that repeat shared content,
+/// such as XML, are refused beyond this size.
+inline constexpr std::size_t kMaximumExpandedSize = std::size_t{1} << 30;
+
 // Reading. Input may be hostile: nothing in it is trusted, time and memory stay in proportion to its size, and a
-// failure names the byte at which it was found. Of equal keys in one dictionary the last one counts.
+// failure names the byte at which it was found. Of equal keys in one dictionary the last one counts. Repeated
+// references to text or data in a binary document share its storage. Every document that the writers return can be
+// read.
 
 /// Reads whichever of the three forms the bytes are in, told by their content.
 [[nodiscard]] Result<Value> read(ByteView document);
@@ -47,11 +53,16 @@ inline constexpr int kMaximumDepth = 512;
 
 // Writing. Equal values give equal bytes. A null anywhere makes both fail.
 
-/// "bplist00", with equal scalars stored once.
+/// "bplist00", with equal scalars stored once and shared by the value that is read back. Fails on far more than
+/// kMaximumExpandedSize of text, counted as often as it occurs: readers refuse it too.
 [[nodiscard]] Result<Bytes> writeBinary(const Value& root);
 /// UTF-8, without a document type declaration. Fails on a uid and on text with characters that XML cannot hold;
 /// dates lose their fractions of a second.
 [[nodiscard]] Result<Bytes> writeXML(const Value& root);
+
+/// Estimates the size in bytes of a form that repeats shared content. Beyond kMaximumExpandedSize it only tells that it
+/// is larger.
+[[nodiscard]] std::size_t expandedSize(const Value& value);
 
 /// The value under `key` when `value` is a dictionary that has it, else null. `value` may be null.
 [[nodiscard]] inline const Value* find(const Value* value, std::string_view key) noexcept {

@@ -38,6 +38,18 @@ constexpr std::uint64_t bytesPerElement(unsigned type, unsigned referenceSize) {
   }
 }
 
+constexpr Expansion expansionOf(unsigned type, std::uint64_t count) {
+  switch (type) {
+    case 0x4:
+      return {};
+    case 0x5:
+    case 0x6:
+      return {0, count};
+    default:
+      return {count, 0};
+  }
+}
+
 }  // namespace
 
 Value BinaryReader::fail(Failure kind, std::string_view what, std::size_t at) {
@@ -213,8 +225,9 @@ inline void BinaryReader::readContent(std::uint64_t number, std::size_t at, unsi
   if (!readExtent(at, marker & 0xFU, extent)) return;
   const unsigned type = marker >> 4;
   const std::uint64_t bytesEach = bytesPerElement(type, referenceSize_);
-  if (!fits(at, extent, bytesEach) || !isApart(number, at, extent.count * bytesEach) || !spend(extent.count, at))
-    return;
+  const bool isSound = fits(at, extent, bytesEach) && isApart(number, at, extent.count * bytesEach) &&
+                       expand(expansionOf(type, extent.count), at);
+  if (!isSound) return;
   switch (type) {
     case 0x4:
       place = readData({begin_ + extent.start, static_cast<std::size_t>(extent.count)});
@@ -236,13 +249,13 @@ void BinaryReader::readLong(std::uint64_t number, std::size_t at, unsigned marke
   const bool again = wasSeen(number);
   if (again) {
     if (const auto known = shared_.find(number); known != shared_.end()) {
-      if (spend(known->second.units, at)) place = known->second.value;
+      if (expand(known->second.expansion, at)) place = known->second.value;
       return;
     }
   }
-  const std::uint64_t before = units_;
+  const Expansion before = expansion_;
   readContent(number, at, marker, depth, place);
-  if (again && !failure_) shared_.try_emplace(number, Shared{place, units_ - before});
+  if (again && !failure_) shared_.try_emplace(number, Shared{place, expansion_ - before});
 }
 
 void BinaryReader::readArray(std::size_t at, Extent extent, int depth, Value& place) {
@@ -267,7 +280,7 @@ BinaryReader::KnownKeys* BinaryReader::keysOf(Extent extent, int depth) {
   const std::uint64_t last = loadBigEndian(references + size - referenceSize_, referenceSize_);
   KnownKeys& known = knownKeys_[(reference(extent.start) * 7 + last + extent.count) % knownKeys_.size()];
   if (known.size == size && std::memcmp(known.references, references, size) == 0) {
-    return spend(extent.count, extent.start) ? &known : nullptr;
+    return expand({extent.count, 0}, extent.start) ? &known : nullptr;
   }
   known = KnownKeys{};
   if (!learnKeys(known, extent, depth)) return nullptr;
@@ -278,7 +291,7 @@ BinaryReader::KnownKeys* BinaryReader::keysOf(Extent extent, int depth) {
 
 /// False when they cannot be read, or when two of them are equal.
 bool BinaryReader::learnKeys(KnownKeys& known, Extent extent, int depth) {
-  if (!spend(extent.count, extent.start)) return false;
+  if (!expand({extent.count, 0}, extent.start)) return false;
   std::vector<Value> keys(static_cast<std::size_t>(extent.count));
   std::size_t at = extent.start;
   for (Value& key : keys) {

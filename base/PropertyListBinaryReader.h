@@ -17,10 +17,27 @@
 
 namespace appsync::plist {
 
-/// How much one byte of input may unfold to when objects are referred to again and again, and how much more even a tiny
-/// document may. Each value counts as one, and so does each byte of long text or data: whoever reads may copy it all.
-inline constexpr std::uint64_t kUnitsPerByte = 32;
-inline constexpr std::uint64_t kFreeUnits = 262144;
+/// How far a document expands through objects that are referenced repeatedly: the values of its tree, and the bytes of
+/// long text, both counted at each reference.
+struct Expansion {
+  std::uint64_t values = 0;
+  std::uint64_t text = 0;
+
+  Expansion& operator+=(const Expansion& other) noexcept {
+    values += other.values;
+    text += other.text;
+    return *this;
+  }
+  Expansion operator-(const Expansion& other) const noexcept { return {values - other.values, text - other.text}; }
+};
+
+/// The limits of the expansion of a document of `size` bytes. Repeated objects share their storage, so that memory
+/// stays in proportion to the size in any case; the limits protect callers that visit each value or copy each text.
+/// Data is not limited: callers use it in place. Documents that store each container once never reach the limit of
+/// values, because every reference takes at least a byte.
+constexpr Expansion mostExpanded(std::uint64_t size) noexcept {
+  return {32 * size + 262144, 32 * size + kMaximumExpandedSize};
+}
 
 /// Numbers of objects, a bit for each.
 class ObjectNumbers {
@@ -65,7 +82,7 @@ class BinaryReader {
   /// Reads all entries once. Their places, in the order of their keys, without those that a later one replaces.
   [[nodiscard]] Result<std::vector<std::size_t>> checkEntries();
   /// What follows reads them once more.
-  void startAgain() noexcept { units_ = 1; }
+  void startAgain() noexcept { expansion_ = {}; }
   // Null when it cannot be read.
   [[nodiscard]] Value entryKey(std::size_t place);
   [[nodiscard]] Value entryValue(std::size_t place);
@@ -80,7 +97,7 @@ class BinaryReader {
   /// Long or nested content that was met a second time and is shared from then on.
   struct Shared {
     Value value;
-    std::uint64_t units;
+    Expansion expansion;
   };
 
   /// The keys of a dictionary met before, told by the bytes of its references to them.
@@ -133,10 +150,12 @@ class BinaryReader {
     return false;
   }
   bool isApart(std::uint64_t number, std::size_t at, std::uint64_t bytes);
-  bool spend(std::uint64_t units, std::size_t at) {
-    units_ += units;
-    if (units_ <= kUnitsPerByte * size_ + kFreeUnits) return true;
-    fail(Failure::tooLarge, "Far more values than the document's size accounts for, met", at);
+  /// Returns false if the document expands beyond the limits.
+  bool expand(const Expansion& more, std::size_t at) {
+    expansion_ += more;
+    const Expansion most = mostExpanded(size_);
+    if (expansion_.values <= most.values && expansion_.text <= most.text) return true;
+    fail(Failure::tooLarge, "Far more values or text than the document's size accounts for, met", at);
     return false;
   }
   [[nodiscard]] std::uint64_t reference(std::size_t at) const noexcept {
@@ -155,7 +174,7 @@ class BinaryReader {
   /// The end of the objects and start of the table.
   std::size_t table_ = 0;
 
-  std::uint64_t units_ = 1;
+  Expansion expansion_;
   /// The long or nested objects that were ever met, and how many bytes of content they have.
   ObjectNumbers measured_;
   std::uint64_t content_ = 0;

@@ -3,6 +3,7 @@
 #include <array>
 #include <bit>
 #include <span>
+#include <unordered_map>
 
 #include "base/PropertyListBigEndian.h"
 #include "base/PropertyListDate.h"
@@ -22,6 +23,9 @@ constexpr std::size_t kMargin = 64;
 constexpr std::size_t kMostValues = std::size_t{1} << 26;
 /// Offsets within a document fit their type.
 constexpr std::size_t kLargest = std::size_t{1} << 32;
+/// Scalars of at least this size are recognised by their storage when they are repeated: hashing them each time would
+/// take time in proportion to the expanded document.
+constexpr std::size_t kLongScalar = 4096;
 /// At first the buffer is no larger than this: most of a document may turn out to be the same scalars.
 constexpr std::size_t kLargestAtFirst = std::size_t{1} << 26;
 
@@ -102,6 +106,8 @@ struct Measure {
   std::size_t containers = 0;
   /// An upper bound but for text beyond ASCII.
   std::size_t bytes = 0;
+  /// Bytes of long text, counted as often as readers count it or more.
+  std::size_t text = 0;
   bool isTooDeep = false;
 
   void add(std::span<const Value> several, int depth) {
@@ -113,6 +119,7 @@ struct Measure {
         bytes += Internals::inlineSize(value);
       } else if (!Internals::isContainer(value)) {
         bytes += Internals::text(value).size();
+        text += textSize(value);
       } else {
         addContainer(value, depth + 1);
         if (isTooDeep || values > kMostValues) return;
@@ -121,6 +128,9 @@ struct Measure {
   }
 
  private:
+  static std::size_t textSize(const Value& longScalar) noexcept {
+    return longScalar.type() == Type::string ? Internals::text(longScalar).size() : 0;
+  }
   void addContainer(const Value& value, int depth) {
     ++containers;
     isTooDeep = isTooDeep || depth > kMaximumDepth;
@@ -129,10 +139,20 @@ struct Measure {
     DictionaryPayload* payload = Internals::payload(*value.dictionary());
     if (payload == nullptr) return;
     bytes += payload->count * std::size_t{4};
-    // Keys are many times the same: only those of a shape of its own are likely to take room.
-    if (!payload->shape->isShared()) add(payload->shape->keys, depth);
+    if (payload->shape != latestShape_) addKeys(*payload->shape, depth);
     add({payload->values(), payload->count}, depth);
   }
+  /// Shared keys are most likely stored already and take no space. Readers count them again unless the dictionary
+  /// before had them, too.
+  void addKeys(const Shape& shape, int depth) {
+    latestShape_ = &shape;
+    if (!shape.isShared()) return add(shape.keys, depth);
+    for (const Value& key : shape.keys) {
+      if (!Internals::isInline(key)) text += textSize(key);
+    }
+  }
+
+  const Shape* latestShape_ = nullptr;
 };
 
 class BinaryWriter {
@@ -145,6 +165,7 @@ class BinaryWriter {
     return Internals::isContainer(value) ? writeContainer(value) : writeScalar(value);
   }
   std::uint32_t writeScalar(const Value& value);
+  std::uint32_t writeOnce(const Value& scalar);
   std::byte* encode(const Value& value, std::byte* at);
   std::byte* encodeString(std::string_view text, std::byte* at);
   std::uint32_t writeContainer(const Value& value);
@@ -168,6 +189,8 @@ class BinaryWriter {
   Bytes out_;
   std::size_t end_ = 0;
   ObjectTable objects_;
+  /// The numbers of the long scalars that were written, by their storage.
+  std::unordered_map<const Payload*, std::uint32_t> longScalars_;
   unsigned referenceSize_ = 1;
   /// Writing is given up at an object of this number, which no reference can hold; after a failure, at any.
   std::uint64_t limit_ = 0;
@@ -196,6 +219,11 @@ Result<Bytes> BinaryWriter::write(const Value& root) {
     referenceSize_ *= 2;
   if (failure_) return *std::move(failure_);
   writeEnd();
+  if (end_ > kLargest) return failure(Failure::tooLarge, "Too much content for one property list");
+  // Readers also count short text, which is at most 30 bytes for each byte of the document.
+  if (measure.text > kMaximumExpandedSize + 2 * end_) {
+    return failure(Failure::tooLarge, "Too much text for one property list");
+  }
   return std::move(out_);
 }
 
@@ -204,6 +232,7 @@ bool BinaryWriter::writeObjects(const Value& root, const Measure& measure) {
   limit_ = std::uint64_t{1} << (8 * referenceSize_);
   end_ = 0;
   objects_.clear(measure.values);
+  longScalars_.clear();
   open_.clear();
   keyReferences_.clear();
   knownShapes_.fill({});
@@ -218,10 +247,18 @@ void BinaryWriter::grow(std::size_t size) {
 }
 
 std::uint32_t BinaryWriter::writeScalar(const Value& value) {
+  if (Internals::isInline(value) || Internals::text(value).size() < kLongScalar) return writeOnce(value);
+  const auto [known, isNew] = longScalars_.try_emplace(Internals::shared(value), 0);
+  if (isNew) known->second = writeOnce(value);
+  return known->second;
+}
+
+/// Writes a scalar unless an equal one was written. Returns its number.
+std::uint32_t BinaryWriter::writeOnce(const Value& scalar) {
   const std::size_t before = objects_.size();
-  const std::uint32_t number = objects_.findOrAdd(value, end_);
+  const std::uint32_t number = objects_.findOrAdd(scalar, end_);
   if (number != before) return number;
-  if (const std::byte* end = encode(value, room(0))) advanceTo(end);
+  if (const std::byte* end = encode(scalar, room(0))) advanceTo(end);
   return number;
 }
 

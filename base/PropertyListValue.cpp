@@ -3,6 +3,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <set>
 
 #include "base/PropertyListStorage.h"
 
@@ -120,18 +121,38 @@ Array* Value::array() {
 
 namespace {
 
-/// Pairs of containers whose contents are still to be compared; a list, because recursion would be as deep as they.
-using Pairs = std::vector<std::pair<const Value*, const Value*>>;
+struct Pairs {
+  /// Pairs of values that are still to be compared; a list, because recursion would be as deep as the containers.
+  std::vector<std::pair<const Value*, const Value*>> waiting;
+  /// Pairs of long content known to be equal. Documents refer to the same content many times.
+  std::set<std::pair<const char*, const char*>> equal;
+};
 
 bool sameReal(double one, double other) noexcept {
   return one == other || (std::isnan(one) && std::isnan(other));
 }
 
+/// Compares long content once, however often it is repeated.
+bool sameText(std::string_view one, std::string_view other, Pairs& pairs) {
+  constexpr std::size_t kLong = 4096;
+  if (one.size() < kLong || one.size() != other.size()) return one == other;
+  if (one.data() == other.data() || pairs.equal.contains({one.data(), other.data()})) return true;
+  if (one != other) return false;
+  pairs.equal.emplace(one.data(), other.data());
+  return true;
+}
+
 bool queueElements(const Array& one, const Array& other, Pairs& pairs) {
   if (one.size() != other.size()) return false;
   for (std::size_t i = 0; i < one.size(); ++i)
-    pairs.emplace_back(&one[i], &other[i]);
+    pairs.waiting.emplace_back(&one[i], &other[i]);
   return true;
+}
+
+bool sameKeys(const Shape& one, const Shape& other, Pairs& pairs) {
+  return std::ranges::equal(one.keys, other.keys, [&pairs](const Value& left, const Value& right) {
+    return sameText(Internals::text(left), Internals::text(right), pairs);
+  });
 }
 
 bool queueEntries(const Dictionary& one, const Dictionary& other, Pairs& pairs) {
@@ -140,9 +161,9 @@ bool queueEntries(const Dictionary& one, const Dictionary& other, Pairs& pairs) 
   if (left == right) return true;
   if (one.size() != other.size()) return false;
   if (one.empty()) return true;
-  if (left->shape != right->shape && left->shape->keys != right->shape->keys) return false;
+  if (left->shape != right->shape && !sameKeys(*left->shape, *right->shape, pairs)) return false;
   for (std::uint32_t i = 0; i < left->count; ++i)
-    pairs.emplace_back(left->values() + i, right->values() + i);
+    pairs.waiting.emplace_back(left->values() + i, right->values() + i);
   return true;
 }
 
@@ -151,7 +172,7 @@ bool sameContent(const Value& one, const Value& other, Pairs& pairs) {
   switch (one.type()) {
     case Type::string:
     case Type::data:
-      return Internals::text(one) == Internals::text(other);
+      return sameText(Internals::text(one), Internals::text(other), pairs);
     case Type::real:
       return sameReal(*one.number(), *other.number());
     case Type::date:
@@ -166,9 +187,9 @@ bool sameContent(const Value& one, const Value& other, Pairs& pairs) {
 }
 
 bool drain(Pairs& pairs) {
-  while (!pairs.empty()) {
-    const auto [one, other] = pairs.back();
-    pairs.pop_back();
+  while (!pairs.waiting.empty()) {
+    const auto [one, other] = pairs.waiting.back();
+    pairs.waiting.pop_back();
     if (!sameContent(*one, *other, pairs)) return false;
   }
   return true;

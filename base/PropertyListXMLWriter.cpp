@@ -19,8 +19,6 @@ constexpr std::string_view kTail = "</plist>\n";
 constexpr std::size_t kDataLine = 57;
 
 constexpr std::size_t kDeepest = static_cast<std::size_t>(kMaximumDepth);
-/// Longer documents are refused: values that share their content can stand for far more than memory holds.
-constexpr std::size_t kMaximumSize = std::size_t{1} << 30;
 
 /// An output buffer that is written through a bare pointer after room has been made.
 class Output {
@@ -76,12 +74,31 @@ constexpr std::string_view escapeOf(char c) noexcept {
   }
 }
 
+/// Exact except for escapes and numbers, so that the buffer hardly ever moves.
+void addExpandedSize(const Value& value, std::size_t depth, std::size_t& size) {
+  constexpr std::size_t kTags = 40;
+  size += 2 * depth + kTags;
+  if (depth > kDeepest || size > kMaximumExpandedSize) return;
+  if (const auto text = value.string()) {
+    size += text->size();
+  } else if (const auto data = value.data()) {
+    size += base64Length(data->size()) + (data->size() / kDataLine + 1) * (depth + 1);
+  } else if (const Array* array = value.array()) {
+    for (const Value& element : *array)
+      addExpandedSize(element, depth + 1, size);
+  } else if (const Dictionary* dictionary = value.dictionary()) {
+    for (const auto& [key, entry] : *dictionary) {
+      size += depth + key.size() + 16;
+      addExpandedSize(entry, depth + 1, size);
+    }
+  }
+}
+
 class XMLWriter {
  public:
   Result<Bytes> write(const Value& root) {
-    std::size_t expected = kHead.size() + kTail.size();
-    addExpectedSize(root, 0, expected);
-    if (expected > kMaximumSize) return failure(Failure::tooLarge, "Too many values for one property list");
+    const std::size_t expected = kHead.size() + kTail.size() + expandedSize(root);
+    if (expected > kMaximumExpandedSize) return failure(Failure::tooLarge, "Too many values for one property list");
     Output out(expected);
     out_ = &out;
     out.append(kHead);
@@ -96,7 +113,6 @@ class XMLWriter {
     if (!failure_) failure_ = failure(kind, what);
   }
 
-  static void addExpectedSize(const Value& value, std::size_t depth, std::size_t& size);
   void writeValue(const Value& value, std::size_t depth);
   void writeInteger(const Value& value, std::size_t depth);
   void writeReal(double number, std::size_t depth);
@@ -120,26 +136,6 @@ class XMLWriter {
   Output* out_ = nullptr;
   std::optional<Error> failure_;
 };
-
-/// Exact but for escapes and numbers: good enough that the buffer hardly ever moves.
-void XMLWriter::addExpectedSize(const Value& value, std::size_t depth, std::size_t& size) {
-  constexpr std::size_t kTags = 40;
-  size += 2 * depth + kTags;
-  if (depth > kDeepest || size > kMaximumSize) return;
-  if (const auto text = value.string()) {
-    size += text->size();
-  } else if (const auto data = value.data()) {
-    size += base64Length(data->size()) + (data->size() / kDataLine + 1) * (depth + 1);
-  } else if (const Array* array = value.array()) {
-    for (const Value& element : *array)
-      addExpectedSize(element, depth + 1, size);
-  } else if (const Dictionary* dictionary = value.dictionary()) {
-    for (const auto& [key, entry] : *dictionary) {
-      size += depth + key.size() + 16;
-      addExpectedSize(entry, depth + 1, size);
-    }
-  }
-}
 
 void XMLWriter::writeValue(const Value& value, std::size_t depth) {
   switch (value.type()) {
@@ -273,6 +269,12 @@ void XMLWriter::writeDictionary(const Dictionary& dictionary, std::size_t depth)
 }
 
 }  // namespace
+
+std::size_t expandedSize(const Value& value) {
+  std::size_t size = 0;
+  addExpandedSize(value, 0, size);
+  return size;
+}
 
 Result<Bytes> writeXML(const Value& root) {
   return XMLWriter().write(root);

@@ -1,9 +1,12 @@
 // What a document may take of the memory of whoever reads it.
+#include <algorithm>
 #include <cstddef>
 #include <string>
+#include <utility>
 
 #include <gtest/gtest.h>
 
+#include "base/PropertyListEntries.h"
 #include "tests/HeldMemory.h"
 #include "tests/base/PropertyListSamples.h"
 
@@ -33,6 +36,27 @@ TEST(PropertyListMemory, IsInProportionToADocumentWhoseObjectsLieInEachOther) {
     const std::string document = overlappingDocument(what);
     EXPECT_LE(mostHeldReading(document), document.size() * kMostPerByte);
   }
+}
+
+TEST(PropertyListMemory, HoldsTenThousandEqualIconsOnce) {
+  constexpr std::size_t kIcons = 10'000;
+  constexpr std::size_t kIcon = 65'536;
+  plist::Dictionary apps;
+  const plist::Value icon(Bytes(kIcon, std::byte{5}));
+  for (std::size_t app = 0; app < kIcons; ++app)
+    apps.set("org.app" + std::to_string(app), plist::Dictionary{{"PlaceholderIcon", icon}});
+  const std::string document(textOf(plist::writeBinary(apps)));
+  EXPECT_LT(document.size(), kIcon + kIcons * 32);
+  EXPECT_TRUE(plist::readBinary(bytesOf(document)).ok());
+  EXPECT_LE(mostHeldReading(document), document.size() * kMostPerByte);
+  Bytes given(document.size());
+  std::ranges::copy(bytesOf(document), given.begin());
+  const std::size_t held = memory::mostHeldDuring([&] {
+    auto entries = plist::DocumentEntries::open(std::move(given));
+    ASSERT_TRUE(entries.ok()) << entries.error().text;
+    entries->visit([](std::string_view, const plist::Value&) {});
+  });
+  EXPECT_LE(held, 2 * document.size());
 }
 
 }  // namespace
