@@ -12,6 +12,7 @@
 #include "device/SystemCalls.h"
 #include "device/UUID.h"
 #include "platform/Keys.h"
+#include "tools/BackupCheck.h"
 #include "tools/DeviceApps.h"
 #include "tools/FolderDraft.h"
 
@@ -136,6 +137,9 @@ Result<Backup> writeBackup(device::Device& device, const std::string& path) {
   backup.iconOrder = *order;
   if (Status filled = fill(*draft, device, backup); !filled) {
     return filled.error().in(path + " cannot be written, and is not there");
+  }
+  if (Status checked = checkBackup(draft->folderPath(), backup); !checked) {
+    return checked.error().in(path + " cannot be read back after it was written, and is not there");
   }
   if (Status published = draft->publish(); !published) return published.error();
   return backup;

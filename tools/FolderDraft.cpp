@@ -126,6 +126,10 @@ FolderDraft::~FolderDraft() {
   static_cast<void>(sys::removeEmptyFolder(parent_.get(), shellName_.c_str()));
 }
 
+std::string FolderDraft::folderPath() const {
+  return shellPath_ + "/" + kContent;
+}
+
 Status FolderDraft::publish() {
   int number = sys::syncFileSystem(folder_.get());
   if (number == 0) number = sys::rename(shell_.get(), kContent, parent_.get(), name_.c_str(), sys::Replace::no);

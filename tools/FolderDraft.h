@@ -24,6 +24,9 @@ class FolderDraft {
   /// The open folder.
   [[nodiscard]] int folder() const noexcept { return folder_.get(); }
 
+  /// The path of the open folder until it is published.
+  [[nodiscard]] std::string folderPath() const;
+
   /// Brings it to the disk and gives it its name.
   [[nodiscard]] Status publish();
 

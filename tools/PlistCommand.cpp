@@ -33,9 +33,18 @@ Bytes bytesIn(const std::string& text) {
   return {bytes.begin(), bytes.end()};
 }
 
+/// JSON repeats shared content. Fails where the XML form does.
+Result<Bytes> json(const plist::Value& value) {
+  if (plist::expandedSize(value) > plist::kMaximumExpandedSize) {
+    return Error{std::string(domains::kPropertyList), static_cast<long>(plist::Failure::tooLarge),
+                 "Too many values for one document", nullptr};
+  }
+  return bytesIn(indented(toJson(value)) + "\n");
+}
+
 Result<Bytes> converted(const plist::Value& value, const std::string& form) {
   if (form == "binary") return plist::writeBinary(value);
-  if (form == "json") return bytesIn(indented(toJson(value)) + "\n");
+  if (form == "json") return json(value);
   const Result<Bytes> xml = plist::writeXML(value);
   return xml ? bytesIn(withReferences(std::string(textOf(*xml)), Notation::xml)) : xml;
 }

@@ -9,6 +9,7 @@
 #include "device/BackupManager.h"
 #include "device/Demotion.h"
 #include "tools/DeviceApps.h"
+#include "tools/RestoreInfo.h"
 #include "tools/RestoreMarker.h"
 #include "tools/Ticker.h"
 
@@ -28,23 +29,6 @@ Error refusal(std::string text) {
 
 std::shared_ptr<const platform::AppRecord> recordOf(device::Device& device, std::string_view identifier) {
   return device.platform().defaultRegistry().recordForIdentifier(identifier, platform::PlaceholderLookup::on);
-}
-
-/// What the sync client has to know of an app beside what the store said of it.
-Result<Bytes> completed(const BackedUpApp& app, const std::optional<Bytes>& saved) {
-  plist::Dictionary metadata;
-  if (saved) {
-    const Result<plist::Value> root = plist::read(*saved);
-    if (!root) return root.error().in("its store metadata is damaged");
-    if (root->dictionary() == nullptr) return refusal("its store metadata is damaged: it is no dictionary");
-    metadata = *root->dictionary();
-  }
-  if (metadata.find("title") == nullptr && metadata.find("itemName") == nullptr) {
-    metadata.set("title", app.app.name.empty() ? app.app.identifier : app.app.name);
-  }
-  const bool lacksVersion = metadata.find("bundleVersion") == nullptr;
-  if (lacksVersion || !app.app.version.empty()) metadata.set("bundleVersion", app.app.version);
-  return plist::writeBinary(metadata);
 }
 
 Status writeList(device::Device& device, std::string_view path, const plist::Value& root) {
@@ -110,35 +94,11 @@ Status Restore::putFilesInPlace() {
 }
 
 Status Restore::takeOver(const BackedUpApp& app, plist::Dictionary& entries) {
-  Result<plist::Dictionary> entry = entryOf(app);
+  Result<plist::Dictionary> entry = restoreInfoOf(backup_, app);
   if (!entry) return entry.error();
   if (Status kept = keepData(app); !kept) return kept;
   entries.set(app.app.identifier, std::move(entry).value());
   return {};
-}
-
-Result<plist::Dictionary> Restore::entryOf(const BackedUpApp& app) const {
-  plist::Dictionary entry;
-  std::optional<Bytes> metadata;
-  const auto read = [&](std::string_view name, const std::optional<std::uint64_t>& size, auto&& use) -> Status {
-    if (!size) return {};
-    Result<Bytes> bytes = readBackupFile(backup_, app, name, *size);
-    if (!bytes) return bytes.error();
-    use(std::move(bytes).value());
-    return {};
-  };
-  const auto addTo = [&entry](std::string_view key) {
-    return [&entry, key](Bytes bytes) { entry.set(key, std::move(bytes)); };
-  };
-  Status done =
-      read(backup_files::kStoreMetadata, app.storeMetadata, [&](Bytes bytes) { metadata = std::move(bytes); });
-  if (done) done = read(backup_files::kLicence, app.licence, addTo("ApplicationSINF"));
-  if (done) done = read(backup_files::kIcon, app.icon, addTo("PlaceholderIcon"));
-  if (!done) return done.error();
-  Result<Bytes> document = completed(app, metadata);
-  if (!document) return document.error();
-  entry.set("HarvoMetadata", std::move(document).value());
-  return entry;
 }
 
 Status Restore::keepData(const BackedUpApp& app) {

@@ -37,7 +37,6 @@ class Restore {
   void makePlaceholders();
   void finishApps();
   [[nodiscard]] Status takeOver(const BackedUpApp& app, plist::Dictionary& entries);
-  [[nodiscard]] Result<plist::Dictionary> entryOf(const BackedUpApp& app) const;
   [[nodiscard]] Status keepData(const BackedUpApp& app);
   [[nodiscard]] Status demote(const BackedUpApp& app, const platform::AppRecord& record);
   [[nodiscard]] bool isWanted(const BackedUpApp& app) const { return !refused_.contains(app.app.identifier); }

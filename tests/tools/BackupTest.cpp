@@ -7,6 +7,7 @@
 
 #include "tests/tools/RestoreFixture.h"
 #include "tools/Backup.h"
+#include "tools/BackupCheck.h"
 
 namespace appsync::test {
 namespace {
@@ -28,6 +29,15 @@ class Backup : public RestoreFixture {
     return {};
   }
   [[nodiscard]] std::string file(const std::string& name) const { return readHostFile(backup() + "/Apps/" + name); }
+  /// Has the info dictionary of every installed app name this file as its icon.
+  void nameIcons(const std::string& icon) const {
+    const auto opened = device::Device::open(device(), device::Access::readOnly);
+    const auto apps = (*opened)->services().defaultRegistry().apps();
+    for (const auto& app : *apps) {
+      write(device() + "/root" + *app->bundlePath() + "/Info.plist",
+            "{BundleIdentifier = \"" + app->applicationIdentifier() + "\"; BundleIconFile = \"" + icon + "\";}");
+    }
+  }
   /// What is in the folder in which the backup is made.
   [[nodiscard]] std::vector<std::string> beside() const {
     std::vector<std::string> names;
@@ -165,6 +175,49 @@ TEST_P(Backup, KilledAtAnyStepIsNotThereAndTheNextOneIsWhole) {
   }
   EXPECT_GT(step, 30);
   EXPECT_LT(step, 2000);
+}
+
+TEST_P(Backup, RestoresAppsThatShareOneIcon) {
+  constexpr int kApps = 34;
+  const std::string icon(262'144, 'i');
+  for (int app = 0; app < kApps; ++app)
+    publish("org.app" + std::to_string(app), "1.0", {{"Notes.app/Picture.png", icon}});
+  ASSERT_EQ(sync().status, 0);
+  nameIcons("Picture.png");
+  EXPECT_THAT(run({"backup", device(), backup()}).out, HasSubstr("Saved 34 apps"));
+  EXPECT_EQ(entry("org.app0").icon, icon.size());
+  makeNewDevice();
+  const Finished restored = restore();
+  EXPECT_EQ(restored.status, 0) << restored.err << restored.out;
+  EXPECT_EQ(newApps().size(), std::size_t{kApps});
+}
+
+TEST_P(Backup, CheckFindsDamage) {
+  fillDevice();
+  makeBackup();
+  const auto written = tools::readBackup(backup());
+  ASSERT_TRUE(written.ok());
+  const auto problem = [&] {
+    const Status checked = tools::checkBackup(backup(), *written);
+    return checked ? std::string() : checked.error().text;
+  };
+  EXPECT_EQ(problem(), "");
+  const auto finds = [&](const std::string& name, const std::string& content, const std::string& text) {
+    const std::string before = readHostFile(backup() + "/" + name);
+    write(backup() + "/" + name, content);
+    EXPECT_THAT(problem(), HasSubstr(text)) << name;
+    write(backup() + "/" + name, before);
+  };
+  finds("Apps/org.plain/PlaceholderIcon", "cut", "must have 9");
+  finds("Apps/org.licence/ApplicationSINF", "", "must have 9");
+  finds("Apps/org.data/HarvoMetadata.plist", "", "is damaged");
+  finds("Apps/org.data/Data/Documents/notes", "less", "the data of org.data has 4 bytes and must have 16");
+  finds("Manifest.plist", "", "is no backup that can be used");
+  finds("Manifest.plist", std::string(textOf(*plist::writeXML(tools::manifestOf({backup(), "other", {}, {}})))),
+        "its manifest is not what was written");
+  EXPECT_EQ(problem(), "");
+  std::filesystem::remove_all(backup() + "/Apps/org.auto/Data");
+  EXPECT_THAT(problem(), HasSubstr("org.auto/Data"));
 }
 
 INSTANTIATE_TEST_SUITE_P(Modes, Backup, testing::Values("--direct", "--coordinated"),

@@ -5,6 +5,7 @@
 
 #include <gmock/gmock.h>
 
+#include "base/PropertyList.h"
 #include "tests/device/NamedPipe.h"
 #include "tests/tools/ToolFixture.h"
 
@@ -190,6 +191,18 @@ TEST_F(Plist, CommandsNoTerminalAndLosesNothing) {
   const Finished json = runTool({"plist", path("again"), "--to", "json"});
   EXPECT_EQ(tools::Json::parse(json.out).at(text), text);
   EXPECT_THAT(json.out, testing::Not(HasSubstr("\xc2\x9b")));
+}
+
+TEST_F(Plist, RefusesFormsThatExpandBeyondMemory) {
+  const plist::Value icons(plist::Array(20'000, Bytes(65'536, std::byte{5})));
+  write(path("icons"), textOf(*plist::writeBinary(icons)));
+  for (const char* form : {"json", "xml"}) {
+    const Finished run = runTool({"plist", path("icons"), "--to", form});
+    EXPECT_EQ(run.status, 3) << form;
+    EXPECT_THAT(run.err, HasSubstr("icons has no " + std::string(form) + " form: Too many values"));
+  }
+  EXPECT_EQ(runTool({"plist", path("icons"), "--to", "binary", "-o", path("same")}).status, 0);
+  EXPECT_EQ(contentOf(path("same")), contentOf(path("icons")));
 }
 
 TEST_F(Plist, ReadsStandardInput) {
