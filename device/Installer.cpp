@@ -73,6 +73,17 @@ std::vector<const StoredBundle*> replacedBy(BundleRole role, const AppRow& app) 
   return replaced;
 }
 
+/// Returns what a removal may remove at most: a placeholder alone, or all that belongs to the app.
+BundleRole requestedRole(const plist::Dictionary& options) {
+  const plist::Value* only = options.find(platform::UninstallPlaceholdersOnlyKey);
+  return only != nullptr && plist::truth(*only).value_or(false) ? BundleRole::placeholder : BundleRole::installed;
+}
+
+/// Returns what the removal removes. A placeholder protects the app under it, whose update may have failed.
+BundleRole removedRole(BundleRole requested, const AppRow& app) {
+  return app.installed && app.placeholder ? BundleRole::placeholder : requested;
+}
+
 /// A container may go once nothing can bring the record of it back. Placeholders of a sync do not survive a restart
 /// anyway, and where there was nothing, nothing that was there is lost.
 Durability durabilityFor(BundleRole role, const AppRow& app) {
@@ -211,13 +222,10 @@ Status Installer::record(NewContainer& container, const InstallRequest& request,
 
 Status Installer::uninstall(std::string_view bundleIdentifier, const plist::Dictionary& options,
                             const Alongside& alongside) {
-  const plist::Value* only = options.find(platform::UninstallPlaceholdersOnlyKey);
-  // A package takes the place of all that goes with the app, a placeholder of the placeholder alone.
-  const BundleRole role =
-      only != nullptr && plist::truth(*only).value_or(false) ? BundleRole::placeholder : BundleRole::installed;
   const Result<AppRow> before = known(bundleIdentifier);
   if (!before) return before.error();
   AppRow app;
+  BundleRole role = requestedRole(options);
   {
     Database::Transaction transaction(database_, durabilityFor(role, *before));
     Result<std::optional<AppRow>> found = app_table::find(transaction, bundleIdentifier);
@@ -227,6 +235,7 @@ Status Installer::uninstall(std::string_view bundleIdentifier, const plist::Dict
                             "there is no app \"" + std::string(bundleIdentifier) + "\" to remove");
     }
     app = **std::move(found);
+    role = removedRole(role, app);
     if (role == BundleRole::installed && app.installed) {
       app_table::remove(transaction, app, BundleRole::installed).ignore();
       UninstalledApps::add(transaction, bundleIdentifier).ignore();

@@ -74,9 +74,10 @@ class AppRegistry {
   /// moment, the app is as it was before. Errors: `InstallerErrorDomain`, or "POSIX" where the system failed.
   [[nodiscard]] virtual Status installApplication(const FileLocation& location, const plist::Dictionary& options) = 0;
 
-  /// Removes the app and its placeholder; with `UninstallPlaceholdersOnlyKey` true only a placeholder's mark, so that
-  /// an installed app under it stays. Removing a real app adds it to the uninstalled-apps list. An unknown identifier
-  /// fails.
+  /// Removes the placeholder or, if there is none, the app with its data. An installed app under a placeholder stays
+  /// whole and usable, whatever the options: removing what a failed update leaves never removes the app. With
+  /// `UninstallPlaceholdersOnlyKey` true an app is never removed. Removing a real app, and nothing else, adds it to the
+  /// uninstalled-apps list. An unknown identifier fails.
   [[nodiscard]] virtual Status uninstallApplication(std::string_view bundleIdentifier,
                                                     const plist::Dictionary& options = {}) = 0;
 

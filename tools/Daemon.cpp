@@ -261,7 +261,7 @@ void Daemon::tellRemovals(InstallWatcher& watcher) {
     } else if (forbidden) {
       progress_.finish({AppEvent::skipped, app.app, "removing apps is not allowed on this device (app-removal=no)"});
     } else {
-      progress_.finish({AppEvent::failed, app.app, "the device could not remove it; `appsync history` may tell why"});
+      progress_.finish({AppEvent::failed, app.app, app.reason});
     }
   }
 }

@@ -41,8 +41,8 @@ class DirectInstallWatcher final : public InstallWatcher {
     }
   }
 
-  /// What the home screen does not let go of would be tried again without an end. It is dropped and not made to fail:
-  /// of an update that fails the plug-in removes the app.
+  /// Ends the retries of denied installs, which have no limit. The installs are dropped and not failed: nothing is
+  /// wrong with their packages, and the next sync sends them again.
   void end() {
     progress_.interrupted();
     device_.services().scheduler().close();

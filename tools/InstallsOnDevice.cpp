@@ -22,7 +22,9 @@ double showInstall(device::Device& device, const std::string& identifier, SyncPr
 AppOutcome outcomeOnDevice(device::Device& device, const SentPackage& package) {
   platform::AppRegistry& registry = device.platform().defaultRegistry();
   const auto record = registry.recordForIdentifier(package.app.identifier, PlaceholderLookup::on);
-  if (record && record->isInstalled() && !record->isPlaceholder()) return {package.success, package.app, {}};
+  // After a failed update the earlier version is installed.
+  const bool hasVersion = record && record->bundleVersion().value_or("") == package.app.version;
+  if (hasVersion && record->isInstalled() && !record->isPlaceholder()) return {package.success, package.app, {}};
   const auto failure = device.services().defaultRegistry().lastInstallFailure(package.app.identifier);
   return {AppEvent::failed, package.app, failure ? failure->text : "the device did not install it"};
 }

@@ -13,7 +13,12 @@ PlannedApp planRemoval(const std::string& identifier, const PlanInput& input) {
   if (found == input.deviceApps.end()) {
     return {{identifier, {}, {}}, PlannedWork::skip, nullptr, "it is not on the device"};
   }
-  return {found->second.app, PlannedWork::remove, nullptr, {}};
+  const DeviceApp& present = found->second;
+  if (present.isInstalled && present.isPlaceholder) {
+    return {present.app, PlannedWork::remove, nullptr,
+            "its placeholder was removed instead; ask again to remove the app"};
+  }
+  return {present.app, PlannedWork::remove, nullptr, "the device could not remove it; `appsync history` may tell why"};
 }
 
 /// The app is on the device; whether the library has something newer for it.

@@ -27,7 +27,7 @@ struct PlannedApp {
   AppName app;
   PlannedWork work = PlannedWork::none;
   const LibraryPackage* package = nullptr;  ///< of installs and updates
-  std::string reason;                       ///< why nothing is done
+  std::string reason;                       ///< why nothing is done; of a removal, why the app may stay
 };
 
 struct PlanInput {

@@ -213,11 +213,32 @@ TEST_P(AppRegistryContract, APlaceholderIsRemoved) {
   EXPECT_EQ(stateOf("com.a"), "absent");
 }
 
-TEST_P(AppRegistryContract, AnAppIsRemovedWithItsPlaceholder) {
-  install("com.a");
+TEST_P(AppRegistryContract, RemovalLeavesTheAppUnderAPlaceholder) {
+  install("com.a", "1.0");
   placeholder("com.a", "2.0");
   EXPECT_TRUE(registry().uninstallApplication("com.a").ok());
+  EXPECT_EQ(stateOf("com.a"), "installed");
+  EXPECT_EQ(versionOf("com.a"), "1.0");
+  EXPECT_TRUE(subject().isUsable(*record("com.a")->bundlePath()));
+  EXPECT_EQ(removedApps(), Identifiers());
+}
+
+TEST_P(AppRegistryContract, NextRemovalRemovesTheAppItself) {
+  install("com.a");
+  placeholder("com.a", "2.0");
+  ASSERT_TRUE(registry().uninstallApplication("com.a").ok());
+  EXPECT_TRUE(registry().uninstallApplication("com.a").ok());
   EXPECT_EQ(stateOf("com.a"), "absent");
+  EXPECT_EQ(removedApps(), Identifiers{"com.a"});
+}
+
+TEST_P(AppRegistryContract, RemovalAfterAFailedUpdateLeavesTheApp) {
+  install("com.a", "1.0");
+  placeholder("com.a", "2.0");
+  ASSERT_FALSE(tryInstall(subject().makeDamagedPackage("com.a"), "com.a").ok());
+  EXPECT_TRUE(registry().uninstallApplication("com.a").ok());
+  EXPECT_EQ(stateOf("com.a"), "installed");
+  EXPECT_EQ(versionOf("com.a"), "1.0");
 }
 
 TEST_P(AppRegistryContract, RemovingAnUnknownAppFails) {
@@ -253,12 +274,10 @@ TEST_P(AppRegistryContract, RemovingNotOnlyPlaceholdersRemovesTheApp) {
 }
 
 TEST_P(AppRegistryContract, ARemovedAppEntersTheListOfUninstalledApps) {
-  install("com.app");
-  install("com.both");
-  placeholder("com.both", "2.0");
-  ASSERT_TRUE(registry().uninstallApplication("com.app").ok());
-  ASSERT_TRUE(registry().uninstallApplication("com.both").ok());
-  EXPECT_EQ(removedApps(), (Identifiers{"com.app", "com.both"}));
+  install("com.a");
+  install("com.b");
+  ASSERT_TRUE(registry().uninstallApplication("com.a").ok());
+  EXPECT_EQ(removedApps(), Identifiers{"com.a"});
 }
 
 TEST_P(AppRegistryContract, ARemovedPlaceholderDoesNotEnterTheListOfUninstalledApps) {

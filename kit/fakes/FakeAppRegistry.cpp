@@ -251,7 +251,8 @@ Status FakeAppRegistry::uninstall(std::string_view identifier, const plist::Dict
   const std::scoped_lock lock(mutex_);
   const auto found = apps_.find(identifier);
   if (found == apps_.end()) return installerError("no such app: " + std::string(identifier));
-  if (placeholdersOnly) {
+  const bool isUnderPlaceholder = found->second.isInstalled && found->second.isPlaceholder;
+  if (placeholdersOnly || isUnderPlaceholder) {
     dropPlaceholder(found);
     return {};
   }

@@ -33,10 +33,12 @@ TEST_F(ClearSyncData, EveryStepIsTakenInOrder) {
                logged("Uninstalling all placeholder apps"), called("registry.enumerateBundlesOfType 0"),
                called("registry.uninstallApplication com.a"), logged("Uninstall com.a = y"),
                called("registry.uninstallApplication com.c"), logged("Uninstall com.c = y"),
-               called("uninstalledApps.lookupUninstalled"), called("uninstalledApps.clearUninstalled com.c com.gone")},
+               called("uninstalledApps.lookupUninstalled"), called("uninstalledApps.clearUninstalled com.gone")},
       platform.log.lines()));
   EXPECT_FALSE(platform.files.has(kSyncFolder));
-  EXPECT_EQ(platform.registry.identifiers(), std::vector<std::string>{"com.b"});
+  EXPECT_EQ(platform.registry.identifiers(), (std::vector<std::string>{"com.b", "com.c"}));
+  EXPECT_TRUE(platform.registry.app("com.c")->isInstalled);
+  EXPECT_FALSE(platform.registry.app("com.c")->isPlaceholder);
   EXPECT_TRUE(platform.uninstalledList.identifiers().empty());
 }
 

@@ -239,6 +239,8 @@ TEST_F(AppRegistryTest, RemovalTakesContainersAway) {
   device_.install("com.a");
   device_.placeholder("com.a");
   ASSERT_TRUE(registry().uninstallApplication("com.a").ok());
+  EXPECT_EQ(device_.containers(), 1);
+  ASSERT_TRUE(registry().uninstallApplication("com.a").ok());
   EXPECT_EQ(device_.containers(), 0);
   EXPECT_TRUE(device_.isTidy());
   expectFailure(registry().uninstallApplication("com.a"), InstallerFailure::unknownApp,

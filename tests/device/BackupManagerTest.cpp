@@ -142,6 +142,17 @@ TEST_F(BackupManagerTest, RemovingAPlaceholderOnlyLeavesTheData) {
   EXPECT_TRUE(manager.restoreDataExists("com.a", nullptr));
 }
 
+TEST_F(BackupManagerTest, RemovalUnderAPlaceholderKeepsTheData) {
+  device_.install("com.a");
+  const std::string container = device_.host(device::dataContainerOf("com.a"));
+  std::filesystem::create_directories(container);
+  EXPECT_TRUE(manager.keepRestoreData("com.a", data(9)));
+  device_.placeholder("com.a");
+  EXPECT_TRUE(device_.registry().uninstallApplication("com.a"));
+  EXPECT_TRUE(std::filesystem::exists(container));
+  EXPECT_TRUE(manager.restoreDataExists("com.a", nullptr));
+}
+
 TEST_F(BackupManagerTest, CancellingWithoutDataIsASuccess) {
   EXPECT_TRUE(manager.cancelApplicationRestore("com.a", nullptr));
 }

@@ -1,8 +1,11 @@
 // Whole syncs by the tool, as people and scripts see them.
 #include <filesystem>
+#include <fstream>
+#include <iterator>
 
 #include <gmock/gmock.h>
 
+#include "device/Device.h"
 #include "tests/tools/ToolFixture.h"
 
 namespace appsync::test {
@@ -14,7 +17,30 @@ using testing::HasSubstr;
 using testing::IsEmpty;
 using testing::UnorderedElementsAre;
 
-class Sync : public ToolFixtureOfEachMode {};
+class Sync : public ToolFixtureOfEachMode {
+ protected:
+  /// Puts a placeholder over an installed app, which a restore would have made.
+  void coverWithPlaceholder(const std::string& identifier) const {
+    const auto opened = device::Device::open(device(), device::Access::exclusive);
+    ASSERT_TRUE(opened.ok());
+    const std::string folder = "/tmp/" + identifier + ".app";
+    std::filesystem::create_directories(device() + "/root" + folder);
+    write(device() + "/root" + folder + "/Info.plist", infoPlist(identifier, "2.0"));
+    const plist::Dictionary options{
+        {platform::PackageTypeKey, platform::PackageTypePlaceholder},
+        {platform::BundleIdentifierKey, identifier},
+        {platform::InstallTypeKey, static_cast<std::uint64_t>(platform::TSInstallType::Restore)}};
+    ASSERT_TRUE((*opened)->platform().defaultRegistry().installApplication({folder, true}, options).ok());
+  }
+  [[nodiscard]] plist::Dictionary removedApps() const {
+    const auto opened = device::Device::open(device(), device::Access::exclusive);
+    return (*opened)->platform().uninstalledApps().lookupUninstalled().value();
+  }
+  [[nodiscard]] static std::string contentOf(const std::string& path) {
+    std::ifstream file(path);
+    return {std::istreambuf_iterator<char>(file), {}};
+  }
+};
 INSTANTIATE_TEST_SUITE_P(Modes, Sync, kModes, nameOfMode);
 
 TEST_P(Sync, InstallsWhatTheDeviceLacks) {
@@ -127,6 +153,56 @@ TEST_P(Sync, AnAppWhoseUpdateFailedIsOfferedAgain) {
   EXPECT_THAT(apps(), ElementsAre("org.a 2.0"));
 }
 
+/// Flips one byte of an installed app's new package.
+TEST_P(Sync, FailedUpdateKeepsTheAppAndItsData) {
+  publish("org.a");
+  ASSERT_EQ(sync().status, 0);
+  const std::string data = device() + "/root/var/mobile/Containers/Data/org.a";
+  std::filesystem::create_directories(data);
+  write(data + "/notes", "kept");
+  publish("org.a", "2.0", {{"Notes.app/content", "flipped", S_IFREG | 0644, false, true}});
+
+  const Finished failed = sync({"--json"});
+  EXPECT_EQ(failed.status, 1);
+  EXPECT_THAT(endsIn(failed.out), ElementsAre("failed org.a"));
+  EXPECT_THAT(failed.out, HasSubstr("Notes.app/content"));
+  EXPECT_THAT(apps(), ElementsAre("org.a 1.0"));
+  EXPECT_THAT(removedApps(), IsEmpty());
+  EXPECT_EQ(contentOf(data + "/notes"), "kept");
+
+  publish("org.a", "2.0");
+  EXPECT_THAT(endsIn(sync({"--json"}).out), ElementsAre("updated org.a"));
+  EXPECT_THAT(apps(), ElementsAre("org.a 2.0"));
+  EXPECT_EQ(contentOf(data + "/notes"), "kept");
+}
+
+TEST_P(Sync, RemovalUnderAPlaceholderNeedsAnotherSync) {
+  publish("org.a");
+  ASSERT_EQ(sync().status, 0);
+  coverWithPlaceholder("org.a");
+
+  const Finished first = sync({"--json", "--remove", "org.a"});
+  EXPECT_EQ(first.status, 1);
+  EXPECT_THAT(endsIn(first.out), ElementsAre("failed org.a"));
+  EXPECT_THAT(first.out, HasSubstr("its placeholder was removed instead; ask again to remove the app"));
+  EXPECT_THAT(apps(), ElementsAre("org.a 1.0"));
+
+  EXPECT_THAT(endsIn(sync({"--json", "--remove", "org.a"}).out), ElementsAre("removed org.a"));
+  EXPECT_THAT(apps(), IsEmpty());
+}
+
+TEST_P(Sync, ClearLeavesAnAppUnderAPlaceholder) {
+  publish("org.a");
+  ASSERT_EQ(sync().status, 0);
+  coverWithPlaceholder("org.a");
+  const std::string data = device() + "/root/var/mobile/Containers/Data/org.a";
+  std::filesystem::create_directories(data);
+  write(data + "/notes", "kept");
+  ASSERT_EQ(runTool({"clear", device()}).status, 0);
+  EXPECT_THAT(apps(), ElementsAre("org.a 1.0"));
+  EXPECT_EQ(contentOf(data + "/notes"), "kept");
+}
+
 TEST_P(Sync, ForbiddenInstallsAreSkippedWithTheReason) {
   publish("org.a");
   ASSERT_EQ(runTool({"set", device(), "app-installation=no"}).status, 0);
@@ -231,6 +307,15 @@ TEST_F(DirectSync, AHomeScreenThatFailsFailsTheApp) {
   publish("org.a");
   ASSERT_EQ(runTool({"set", device(), "assertion=org.a:failing"}).status, 0);
   EXPECT_THAT(endsIn(sync({"--json"}).out), ElementsAre("failed org.a"));
+}
+
+TEST_F(DirectSync, HomeScreenThatFailsAnUpdateKeepsTheApp) {
+  publish("org.a");
+  ASSERT_EQ(sync().status, 0);
+  publish("org.a", "2.0");
+  ASSERT_EQ(runTool({"set", device(), "assertion=org.a:failing"}).status, 0);
+  EXPECT_THAT(endsIn(sync({"--json"}).out), ElementsAre("failed org.a"));
+  EXPECT_THAT(apps(), ElementsAre("org.a 1.0"));
 }
 
 }  // namespace

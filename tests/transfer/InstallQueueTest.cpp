@@ -278,6 +278,20 @@ TEST_F(InstallQueue, ARecoverableFailureKeepsTodoEntryAndPlaceholder) {
   EXPECT_FALSE(platform.files.has(pathOf("com.a")));
 }
 
+TEST_F(InstallQueue, FailedUpdateKeepsTheInstalledApp) {
+  writeTodoList({"com.a"});
+  platform.registry.add(FakeApp::updating("com.a").withVersion("1.0"));
+  platform.registry.failures.failNext(RegistryOperation::installApplication, "com.a", installerError("bad"));
+  performInstall(receive("com.a"));
+  EXPECT_EQ(operationWord(platform.files, "com.a"), "FAILED");
+  EXPECT_EQ(platform.registry.uninstalls(), (std::vector<FakeAppRegistry::Uninstall>{{"com.a", {}}}));
+  ASSERT_TRUE(platform.registry.app("com.a"));
+  EXPECT_TRUE(platform.registry.app("com.a")->isInstalled);
+  EXPECT_FALSE(platform.registry.app("com.a")->isPlaceholder);
+  EXPECT_TRUE(platform.uninstalledList.identifiers().empty());
+  EXPECT_EQ(transactionsOf("com.a").back(), "Nimbra restore: placeholder removed y");
+}
+
 TEST_F(InstallQueue, AFailedRestoreIsNeverMarkedFailedAndNeverUninstalled) {
   writeTodoList({"com.a"});
   platform.registry.add(FakeApp::placeholder("com.a", platform::TSInstallType::Restore));
