@@ -1,11 +1,15 @@
 // A system that has run out of threads.
 #pragma once
 
+#include <cerrno>
 #include <cstddef>
+#include <functional>
 #include <system_error>
 #include <thread>
 
 #include <pthread.h>
+
+#include "base/Scheduler.h"
 
 namespace appsync::test {
 
@@ -40,6 +44,11 @@ class NoMoreThreads {
 
  private:
   ::pthread_attr_t before_{};
+};
+
+/// A scheduler whose thread cannot be started.
+struct ThreadlessScheduler final : Scheduler {
+  void after(Duration, std::function<void()>) override { throw std::system_error(EAGAIN, std::generic_category()); }
 };
 
 }  // namespace appsync::test

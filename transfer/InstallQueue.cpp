@@ -39,13 +39,25 @@ void logAssertion(const PlugInLog& log, TerminationAssertionOutcome outcome, con
   log.error("%s|Unknown error %d getting assertion for %{public}@", static_cast<int>(outcome), identifier);
 }
 
+void removePackage(platform::FileSystem& files, const ZTAsset& asset) {
+  files.removeItem(asset.path().value_or("")).ignore();
+}
+
+/// Ends an install for which the system has no thread like any failed install. Nothing is thrown to the daemon, nor out
+/// of an operation or a task.
+void failInstall(AppsClient& client, platform::FileSystem& files, const ZTAsset& asset,
+                 const std::system_error& noThread) {
+  client.assetInstallFailed(asset, {std::string(domains::kPOSIX), noThread.code().value(), noThread.what(), {}});
+  removePackage(files, asset);
+}
+
 }  // namespace
 
 void AppsClient::_enqueueAssetInstall(const std::shared_ptr<ZTAsset>& asset) {
-  PendingInstall install{std::make_shared<GroupEntry>(_installGroup), asset, shared_from_this()};
+  const PendingInstall install{std::make_shared<GroupEntry>(_installGroup), asset, shared_from_this()};
   _log.message("%s|Enqueue install request for %{public}@", asset->identifier());
   try {
-    _installOperationQueue.add([install = std::move(install)] {
+    _installOperationQueue.add([install] {
       AppsClient& client = *install.client;
       const std::string& identifier = install.asset->identifier();
       client._log.message("%s|Performing install for %{public}@", identifier);
@@ -53,8 +65,8 @@ void AppsClient::_enqueueAssetInstall(const std::shared_ptr<ZTAsset>& asset) {
       client._log.message("%s|Finished install for %{public}@", identifier);
       client._accessQueue.sync([&] { client.cleanRestoreStateForIdentifier(identifier); });
     });
-  } catch (const std::system_error& noThread) {  // It has failed like any install: the daemon is not to know threads.
-    assetInstallFailed(*asset, {std::string(domains::kPOSIX), noThread.code().value(), noThread.what(), {}});
+  } catch (const std::system_error& noThread) {
+    failInstall(*this, _platform.fileSystem(), *asset, noThread);
   }
 }
 
@@ -74,7 +86,7 @@ void AppsClient::_performAssetInstall(const std::shared_ptr<ZTAsset>& asset) {
   if (rule.action == AssertionAction::retryLater) {
     _scheduleInstallRetry(asset);
   } else {
-    _platform.fileSystem().removeItem(asset->path().value_or("")).ignore();
+    removePackage(_platform.fileSystem(), *asset);
   }
 }
 
@@ -96,11 +108,15 @@ void AppsClient::_scheduleInstallRetry(const std::shared_ptr<ZTAsset>& asset) {
   _log.error("%s|Will retry installation of %{public}@ in %d seconds", identifier,
              static_cast<int>(kRetryDelay.count()));
   _platform.transactionLog().logScenario(kInstallScenario, 0, true, identifier, "retrying asset install");
-  PendingInstall install{std::make_shared<GroupEntry>(_installGroup), asset, shared_from_this()};
-  _platform.scheduler().after(kRetryDelay, [install = std::move(install)] {
-    install.client->_log.error("%s|Re-enqueue installation request for %{public}@", install.asset->identifier());
-    install.client->_enqueueAssetInstall(install.asset);
-  });
+  const PendingInstall install{std::make_shared<GroupEntry>(_installGroup), asset, shared_from_this()};
+  try {
+    _platform.scheduler().after(kRetryDelay, [install] {
+      install.client->_log.error("%s|Re-enqueue installation request for %{public}@", install.asset->identifier());
+      install.client->_enqueueAssetInstall(install.asset);
+    });
+  } catch (const std::system_error& noThread) {
+    failInstall(*this, _platform.fileSystem(), *asset, noThread);
+  }
 }
 
 void AppsClient::assetInstallSucceeded(const ZTAsset& asset) {

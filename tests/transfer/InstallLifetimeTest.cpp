@@ -5,6 +5,7 @@
 #include <mutex>
 #include <optional>
 #include <string>
+#include <string_view>
 #include <utility>
 
 #include <gtest/gtest.h>
@@ -13,6 +14,7 @@
 #include "kit/fakes/FakePackages.h"
 #include "kit/fakes/Gate.h"
 #include "tests/ClientFixture.h"
+#include "tests/NoMoreThreads.h"
 
 namespace appsync::test {
 namespace {
@@ -57,6 +59,14 @@ class InstallLifetime : public ClientFixture {
     asset->setPath(path);
     return asset;
   }
+
+  /// So that a clock shows whether an install still counts at its last step.
+  void endTransfersWhenThePackageIsRemoved(AppsClient& client) {
+    platform.journal.setHook([&client](std::string_view operation, std::string_view) -> std::optional<Error> {
+      if (operation == "fileSystem.removeItem") client.assetTransferEndedWithSuccess(true);
+      return std::nullopt;
+    });
+  }
 };
 
 TEST_F(InstallLifetime, OnceTheTransfersHaveEndedNoInstallOwnsTheClientOrTheAsset) {
@@ -89,6 +99,35 @@ TEST_F(InstallLifetime, ARetryThatIsDroppedIsNotWaitedFor) {
   client._performAssetInstall(received(std::make_shared<ZTAsset>("com.a", "Application", "A")));
   client.assetTransferEndedWithSuccess(true);
   EXPECT_EQ(clock.firstWaitBlocks, false);
+}
+
+TEST_F(InstallLifetime, LeavesTheGroupLastWithoutAQueueThread) {
+  if (!NoMoreThreads::arePossible()) GTEST_SKIP() << "this build starts threads in its own way";
+  WaitProbe clock;
+  platform.use(clock);
+  AppsClient& client = makeClient();
+  const auto asset = received(std::make_shared<ZTAsset>("com.a", "Application", "A"));
+  endTransfersWhenThePackageIsRemoved(client);
+  {
+    const NoMoreThreads none;
+    client._enqueueAssetInstall(asset);
+  }
+  platform.journal.setHook(nullptr);
+  EXPECT_EQ(clock.firstWaitBlocks, true);
+}
+
+TEST_F(InstallLifetime, LeavesTheGroupLastWithoutASchedulerThread) {
+  WaitProbe clock;
+  ThreadlessScheduler scheduler;
+  platform.use(clock);
+  platform.use(scheduler);
+  platform.screen.answerNext("com.a", {AssertionAnswer::denied()});
+  AppsClient& client = makeClient();
+  const auto asset = received(std::make_shared<ZTAsset>("com.a", "Application", "A"));
+  endTransfersWhenThePackageIsRemoved(client);
+  client._performAssetInstall(asset);
+  platform.journal.setHook(nullptr);
+  EXPECT_EQ(clock.firstWaitBlocks, true);
 }
 
 TEST_F(InstallLifetime, QueuedInstallsKeepTheClientAliveAndItEndsOnTheirThread) {

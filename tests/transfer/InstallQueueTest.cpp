@@ -1,4 +1,5 @@
 // Installing received packages: assertions, retries, outcomes, and ten at a time.
+#include <cerrno>
 #include <chrono>
 #include <future>
 #include <memory>
@@ -22,6 +23,8 @@ using platform::ZTAsset;
 using Strings = std::vector<std::string>;
 
 constexpr std::string_view kRestoreStatePath = "/var/mobile/Library/ApplicationSync/RestoreState.plist";
+
+const Error kNoThread{"POSIX", EAGAIN, "Resource temporarily unavailable", nullptr};
 
 class InstallQueue : public ClientFixture {
  protected:
@@ -146,9 +149,38 @@ TEST_F(InstallQueue, AnInstallForWhichTheSystemHasNoThreadHasFailed) {
     client._enqueueAssetInstall(asset);
   }
   client.assetTransferEndedWithSuccess(true);
-  const Error none{"POSIX", EAGAIN, "Resource temporarily unavailable", nullptr};
-  EXPECT_TRUE(platform.log.contains(logged("com.a install failed unrecoverably: " + description(none))));
+  EXPECT_TRUE(platform.log.contains(logged("com.a install failed unrecoverably: " + description(kNoThread))));
   EXPECT_TRUE(platform.registry.installs().empty());
+  EXPECT_FALSE(platform.files.has(pathOf("com.a")));
+}
+
+TEST_F(InstallQueue, DenialWithoutASchedulerThreadFailsTheInstall) {
+  ThreadlessScheduler scheduler;
+  platform.use(scheduler);
+  writeTodoList({"com.a"});
+  writeRestoreState("com.a");
+  platform.screen.answerNext("com.a", {AssertionAnswer::denied()});
+  AppsClient& client = makeClient();
+  client._enqueueAssetInstall(receive("com.a"));
+  client.assetTransferEndedWithSuccess(true);
+  EXPECT_TRUE(platform.log.contains(logged("com.a install failed unrecoverably: " + description(kNoThread))));
+  EXPECT_EQ(operationWord(platform.files, "com.a"), "FAILED");
+  EXPECT_FALSE(platform.files.has(kRestoreStatePath));
+  EXPECT_FALSE(platform.files.has(pathOf("com.a")));
+  EXPECT_TRUE(platform.registry.installs().empty());
+  EXPECT_EQ(client._getAndResetNumAppInstallsAttempted(), 0);
+}
+
+TEST_F(InstallQueue, RecoverableLackOfASchedulerThreadKeepsTheEntry) {
+  ThreadlessScheduler scheduler;
+  platform.use(scheduler);
+  writeTodoList({"com.a"});
+  platform.framework.judgeErrorsBy([](const Error& error) { return error.code == EAGAIN; });
+  platform.screen.answerNext("com.a", {AssertionAnswer::denied()});
+  performInstall(receive("com.a"));
+  EXPECT_EQ(operationWord(platform.files, "com.a"), "DOWNLOADED");
+  EXPECT_TRUE(platform.registry.uninstalls().empty());
+  EXPECT_FALSE(platform.files.has(pathOf("com.a")));
 }
 
 TEST_F(InstallQueue, ADeniedAssertionLeavesThePackageCleansTheRestoreStateAndCountsNoAttempt) {
