@@ -60,8 +60,8 @@ class FileSystem {
   [[nodiscard]] virtual Status createDirectory(std::string_view path, IntermediateDirectories intermediates,
                                                const OwnerAttributes& attributes) = 0;
 
-  /// Copies a file, or a folder with all that is in it; the parent of `to` must exist. Something already at `to` is a
-  /// failure, and stays. A copy that fails midway is removed.
+  /// Copies a file, or a folder with all that is in it; the parent of `to` must exist. Something already at `to` stays,
+  /// and the copy fails with EEXIST. A copy that fails midway is removed.
   [[nodiscard]] virtual Status copyItem(std::string_view from, std::string_view to) = 0;
 
   /// Moves a file or folder in one step: at any moment it is whole at `from` or whole at `to`, whose parent must exist.

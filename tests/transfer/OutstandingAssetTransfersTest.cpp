@@ -110,7 +110,6 @@ TEST_F(OutstandingAssetTransfers, TheStepsComeInOrder) {
                      "homeScreen.getFlattenedIconState", "fileSystem.removeItem " + kIcons,
                      "iconRenderer.createHomeScreenIconImage " + kWork + "/com.a",
                      "syncFramework.downloadAssetWithIdentifier com.a",
-                     "fileSystem.removeItem /tmp/com.corvel.zeph.Apps/com.a.app/Icon.png",
                      "registry.installApplication com.a /tmp/com.corvel.zeph.Apps/com.a.app"}));
 }
 

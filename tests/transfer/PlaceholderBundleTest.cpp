@@ -1,4 +1,5 @@
 // Placeholder apps laid out on disk and handed to the registry.
+#include <cerrno>
 #include <string>
 #include <vector>
 
@@ -205,6 +206,30 @@ TEST_F(PlaceholderBundle, AnIconThatAnEarlierPlaceholderLeftIsReplaced) {
   EXPECT_EQ(platform.files.text(std::string(kFolder) + "/Icon.png"), "the icon of a newer version");
   for (const LogLine& line : platform.log.lines())
     EXPECT_EQ(line.level, LogLevel::standard) << line.text;
+}
+
+TEST_F(PlaceholderBundle, CopiesAFirstIconWithoutARemoval) {
+  create(asset_);
+  EXPECT_EQ(platform.journal.lines({"fileSystem.copyItem", "fileSystem.removeItem"}),
+            Strings{"fileSystem.copyItem /icons/com.a.png " + std::string(kFolder) + "/Icon.png"});
+}
+
+TEST_F(PlaceholderBundle, MissingSourceKeepsTheEarlierIcon) {
+  create(asset_);
+  platform.files.erase("/icons/com.a.png");
+  create(asset_);
+  EXPECT_EQ(platform.files.text(std::string(kFolder) + "/Icon.png"), "a picture");
+  // A file system may look at the destination first.
+  platform.files.failures.failNext(FileOperation::copyItem, "/icons/com.a.png", Error::fromErrno(EEXIST));
+  create(asset_);
+  EXPECT_EQ(platform.files.text(std::string(kFolder) + "/Icon.png"), "a picture");
+}
+
+TEST_F(PlaceholderBundle, FailedCopyKeepsTheEarlierIcon) {
+  create(asset_);
+  platform.files.failures.failNext(FileOperation::copyItem, "/icons/com.a.png", kDenied);
+  create(asset_);
+  EXPECT_EQ(platform.files.text(std::string(kFolder) + "/Icon.png"), "a picture");
 }
 
 TEST_F(PlaceholderBundle, AnAssetWithoutAnIconCopiesNone) {
