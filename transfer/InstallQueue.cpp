@@ -18,6 +18,8 @@ using platform::ZTAsset;
 constexpr std::string_view kInstallScenario = "Asset install";
 constexpr std::string_view kRestoreScenario = "Nimbra restore";
 constexpr std::chrono::seconds kRetryDelay{30};
+/// Remains if the home screen sets no outcome: an unknown failure.
+constexpr TerminationAssertionOutcome kNoOutcome{0xFF};
 
 /// What an install holds while it is queued, runs or waits to be tried again. The group is left last: whoever waits for
 /// it may then end the client, the assets and the platform.
@@ -39,8 +41,10 @@ void logAssertion(const PlugInLog& log, TerminationAssertionOutcome outcome, con
   log.error("%s|Unknown error %d getting assertion for %{public}@", static_cast<int>(outcome), identifier);
 }
 
+/// Removes nothing if the asset has no path.
 void removePackage(platform::FileSystem& files, const ZTAsset& asset) {
-  files.removeItem(asset.path().value_or("")).ignore();
+  const std::string path = asset.path().value_or("");
+  if (!path.empty()) files.removeItem(path).ignore();
 }
 
 /// Ends an install for which the system has no thread like any failed install. Nothing is thrown to the daemon, nor out
@@ -73,7 +77,7 @@ void AppsClient::_enqueueAssetInstall(const std::shared_ptr<ZTAsset>& asset) {
 void AppsClient::_performAssetInstall(const std::shared_ptr<ZTAsset>& asset) {
   const std::string& identifier = asset->identifier();
   _log.message("%s|Grabbing assertion for %{public}@", identifier);
-  auto outcome = TerminationAssertionOutcome::granted;
+  auto outcome = kNoOutcome;
   auto assertion = _platform.homeScreen().terminationAssertionCreate(identifier, 0, outcome);
 
   logAssertion(_log, outcome, identifier);

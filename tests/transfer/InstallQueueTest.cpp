@@ -1,9 +1,12 @@
 // Installing received packages: assertions, retries, outcomes, and ten at a time.
 #include <cerrno>
 #include <chrono>
+#include <cstdint>
 #include <future>
 #include <memory>
+#include <optional>
 #include <string>
+#include <string_view>
 #include <utility>
 #include <vector>
 
@@ -25,6 +28,18 @@ using Strings = std::vector<std::string>;
 constexpr std::string_view kRestoreStatePath = "/var/mobile/Library/ApplicationSync/RestoreState.plist";
 
 const Error kNoThread{"POSIX", EAGAIN, "Resource temporarily unavailable", nullptr};
+
+/// Answers a request for an assertion with nothing.
+class ForgetfulHomeScreen final : public platform::HomeScreenService {
+ public:
+  Port blockableServerPort() override { return 0; }
+  void setIconState(Port, ByteView) override {}
+  std::optional<Bytes> getFlattenedIconState(Port, std::uint32_t) override { return std::nullopt; }
+  std::unique_ptr<platform::TerminationAssertion> terminationAssertionCreate(
+      std::string_view, std::uint32_t, platform::TerminationAssertionOutcome&) override {
+    return nullptr;
+  }
+};
 
 class InstallQueue : public ClientFixture {
  protected:
@@ -181,6 +196,25 @@ TEST_F(InstallQueue, RecoverableLackOfASchedulerThreadKeepsTheEntry) {
   EXPECT_EQ(operationWord(platform.files, "com.a"), "DOWNLOADED");
   EXPECT_TRUE(platform.registry.uninstalls().empty());
   EXPECT_FALSE(platform.files.has(pathOf("com.a")));
+}
+
+TEST_F(InstallQueue, OutcomeThatIsNotSetIsNoGrant) {
+  ForgetfulHomeScreen screen;
+  platform.use(screen);
+  performInstall(receive("com.a"));
+  EXPECT_TRUE(platform.log.contains(loggedError("Unknown error 255 getting assertion for com.a")));
+  EXPECT_EQ(transactionsOf("com.a").front(), "Asset install: unknown error grabbing assertion n");
+  EXPECT_TRUE(platform.registry.installs().empty());
+  EXPECT_FALSE(platform.files.has(pathOf("com.a")));
+}
+
+TEST_F(InstallQueue, AssetWithoutAPathRemovesNoFile) {
+  for (const auto& path : {std::optional<std::string>(), std::optional<std::string>("")}) {
+    const auto asset = receive("com.a");
+    asset->setPath(path);
+    performInstall(asset);
+  }
+  EXPECT_EQ(platform.journal.count("fileSystem.removeItem"), 0U);
 }
 
 TEST_F(InstallQueue, ADeniedAssertionLeavesThePackageCleansTheRestoreStateAndCountsNoAttempt) {
