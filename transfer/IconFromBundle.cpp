@@ -1,5 +1,6 @@
 // From an app bundle to a PNG file of its home-screen icon.
 #include "core/AppsClient.h"
+#include "transfer/ScratchPath.h"
 
 namespace appsync {
 
@@ -24,7 +25,7 @@ bool AppsClient::_makeIconFromBundlePath(platform::Platform& platform, const std
   encoder->addImage(*image);
   if (!encoder->finalize()) return failed("%s|Couldn't finalize image");
 
-  if (!platform.fileSystem().writeFileAtomically(destination, picture)) {
+  if (leavesItsFolder(destination) || !platform.fileSystem().writeFileAtomically(destination, picture)) {
     log.error("%s|Couldn't save image file to %{public}@", destination);
     return false;
   }

@@ -7,6 +7,7 @@
 #include "core/SyncFiles.h"
 #include "transfer/PlaceholderIcon.h"
 #include "transfer/PlaceholderInfo.h"
+#include "transfer/ScratchPath.h"
 
 namespace appsync {
 
@@ -33,11 +34,9 @@ std::string AppsClient::placeholderAppPathForBundleIdentifier(std::string_view b
 
 bool AppsClient::createPlaceHolderPath(std::string_view path, std::string_view bundleIdentifier,
                                        const platform::OwnerAttributes& attributes) {
-  // An identifier may begin with "../": what lies beside the placeholders' folder is not the plug-in's.
-  const bool leavesItsFolder = path.find("/../") != std::string_view::npos;
-  const Status created = leavesItsFolder ? Error::fromErrno(EINVAL)
-                                         : _platform.fileSystem().createDirectory(
-                                               path, platform::IntermediateDirectories::create, attributes);
+  const Status created = leavesItsFolder(path) ? Error::fromErrno(EINVAL)
+                                               : _platform.fileSystem().createDirectory(
+                                                     path, platform::IntermediateDirectories::create, attributes);
   if (!created) {
     // The scenario names a restore whoever asks: readers of the log look for it there.
     _platform.transactionLog().logScenario("Harvo App Restore", 0, false, bundleIdentifier,

@@ -109,6 +109,17 @@ TEST_F(HostileTodoList, AnIdentifierThatLeadsOutOfThePlaceholdersFolderHasNone) 
                                    description(Error::fromErrno(EINVAL)))));
 }
 
+TEST_F(HostileTodoList, ClimbingIdentifierHasNoIconBesideTheFolder) {
+  constexpr std::string_view kBeside = "/var/mobile/Library/ApplicationSync/Other.png";
+  putAppFolder(platform.files, "/var/mobile/Library/ApplicationSync/HarvoStuff/../Other", "../Other", "Other");
+  putAppFolder(platform.files, "/var/mobile/Library/ApplicationSync/Other", "../Other", "Other");
+  platform.files.put(kBeside, "another file");
+  EXPECT_EQ(outstandingFor(plist::Array{installEntry("../Other")}).size(), 1U);
+  EXPECT_EQ(platform.files.text(kBeside), "another file");
+  EXPECT_TRUE(platform.log.contains(
+      loggedError("Couldn't save image file to /var/mobile/Library/ApplicationSync/Icons/../Other.png")));
+}
+
 TEST_F(HostileTodoList, AVeryLongIdentifierIsWantedLikeAnyOther) {
   const std::string identifier(64 * 1024, 'x');
   const auto assets = outstandingFor(plist::Array{installEntry(identifier), installEntry("com.b")});
