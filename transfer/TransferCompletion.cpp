@@ -1,7 +1,9 @@
 // What becomes of a package while the host sends it and once it has come, or failed to.
 #include <algorithm>
 #include <cmath>
+#include <filesystem>
 #include <limits>
+#include <string_view>
 #include <utility>
 
 #include "core/AppsClient.h"
@@ -26,6 +28,12 @@ std::int64_t completedUnits(double fraction) {
   const double units = fraction * static_cast<double>(kTransferUnits);
   const auto largest = static_cast<double>(std::numeric_limits<std::int32_t>::max());
   return std::isnan(units) ? 0 : static_cast<std::int64_t>(std::clamp(units, -largest, largest));
+}
+
+/// The staging folder is no package: the end of an install would remove it with all packages in it.
+bool isStagingFolder(std::string_view path) {
+  using Path = std::filesystem::path;
+  return (Path(path) / "").lexically_normal() == Path(kPublicStaging) / "";
 }
 
 void showTransfer(InstallProgress& progress, double fraction) {
@@ -92,7 +100,7 @@ void AppsClient::_handleReceivedAsset(const std::shared_ptr<ZTAsset>& asset, Tra
   const auto received = _receivedPath(*asset);
   const plist::Value* path = received ? &*received : nullptr;
   if (auto text = ownedStringIn(path)) asset->setPath(std::move(text));
-  if (!isValidBundleIdentifier(path)) {
+  if (!isValidBundleIdentifier(path) || isStagingFolder(*path->string())) {
     _log.message("%s|Ignoring invalid path: %{public}@", path);
     return;
   }

@@ -210,6 +210,18 @@ TEST_F(TransferCompletion, AnEmptyPathIsNoneSoThatTheStagingFolderIsNeverTakenFo
   EXPECT_TRUE(platform.files.has(kPackage));
 }
 
+TEST_F(TransferCompletion, StagingFolderItselfIsNoPackage) {
+  for (const std::string path : {".", "./", "./.", "/var/mobile/Media/PublicStaging",
+                                 "/var/mobile/Media/PublicStaging/", "/var/mobile//Media/./PublicStaging/."}) {
+    asset_->setPath(path);
+    succeed();
+    EXPECT_TRUE(platform.log.contains(logged("Ignoring invalid path: " + *asset_->path()))) << path;
+    EXPECT_TRUE(platform.registry.installs().empty()) << path;
+    EXPECT_TRUE(platform.files.has(kPackage)) << path;
+  }
+  EXPECT_EQ(operationWord(platform.files, "com.a"), "install");
+}
+
 TEST_F(TransferCompletion, ASavedPathThatIsNoStringIsRejected) {
   putPropertyList(platform.files, kRestoreStatePath,
                   plist::Dictionary{{"com.a", plist::Dictionary{{"2.0", plist::Dictionary{{"path", 7}}}}}});
