@@ -142,17 +142,28 @@ struct Measure {
     if (payload->shape != latestShape_) addKeys(*payload->shape, depth);
     add({payload->values(), payload->count}, depth);
   }
-  /// Shared keys are most likely stored already and take no space. Readers count them again unless the dictionary
+  /// Shared keys are most likely stored already and take no space. Readers count their text again unless the dictionary
   /// before had them, too.
   void addKeys(const Shape& shape, int depth) {
     latestShape_ = &shape;
     if (!shape.isShared()) return add(shape.keys, depth);
-    for (const Value& key : shape.keys) {
-      if (!Internals::isInline(key)) text += textSize(key);
-    }
+    KnownShape& known = knownShapes_[reinterpret_cast<std::uintptr_t>(&shape) / 64 % knownShapes_.size()];
+    if (known.shape != &shape) known = {&shape, textOfKeys(shape)};
+    text += known.text;
+  }
+  static std::size_t textOfKeys(const Shape& shape) noexcept {
+    std::size_t size = 0;
+    for (const Value& key : shape.keys)
+      size += Internals::isInline(key) ? 0 : textSize(key);
+    return size;
   }
 
+  struct KnownShape {
+    const Shape* shape = nullptr;
+    std::size_t text = 0;
+  };
   const Shape* latestShape_ = nullptr;
+  std::array<KnownShape, 16> knownShapes_;
 };
 
 class BinaryWriter {
@@ -166,6 +177,7 @@ class BinaryWriter {
   }
   std::uint32_t writeScalar(const Value& value);
   std::uint32_t writeOnce(const Value& scalar);
+  std::uint32_t writeLong(const Value& scalar);
   std::byte* encode(const Value& value, std::byte* at);
   std::byte* encodeString(std::string_view text, std::byte* at);
   std::uint32_t writeContainer(const Value& value);
@@ -246,20 +258,24 @@ void BinaryWriter::grow(std::size_t size) {
   out_.resize((out_.size() + size) * 2);
 }
 
-std::uint32_t BinaryWriter::writeScalar(const Value& value) {
-  if (Internals::isInline(value) || Internals::text(value).size() < kLongScalar) return writeOnce(value);
-  const auto [known, isNew] = longScalars_.try_emplace(Internals::shared(value), 0);
-  if (isNew) known->second = writeOnce(value);
-  return known->second;
-}
-
 /// Writes a scalar unless an equal one was written. Returns its number.
-std::uint32_t BinaryWriter::writeOnce(const Value& scalar) {
+inline std::uint32_t BinaryWriter::writeOnce(const Value& scalar) {
   const std::size_t before = objects_.size();
   const std::uint32_t number = objects_.findOrAdd(scalar, end_);
   if (number != before) return number;
   if (const std::byte* end = encode(scalar, room(0))) advanceTo(end);
   return number;
+}
+
+std::uint32_t BinaryWriter::writeScalar(const Value& value) {
+  if (!Internals::isInline(value) && Internals::text(value).size() >= kLongScalar) return writeLong(value);
+  return writeOnce(value);
+}
+
+std::uint32_t BinaryWriter::writeLong(const Value& scalar) {
+  const auto [known, isNew] = longScalars_.try_emplace(Internals::shared(scalar), 0);
+  if (isNew) known->second = writeOnce(scalar);
+  return known->second;
 }
 
 /// Writes a scalar; null when it cannot be written. There is room for everything but text and data.
