@@ -14,14 +14,15 @@ set(CMAKE_CXX_FLAGS_RELWITHDEBINFO "-O2 -g1" CACHE STRING "Assertions stay on; l
 # -O1 keeps sanitized tests quick and their stacks readable.
 set(CMAKE_CXX_FLAGS_SANITIZE "-O1 -g1" CACHE STRING "Sanitizers" FORCE)
 
-# ccache refuses precompiled headers unless told that they may be trusted; their own content is still hashed. With all
-# paths relative, and the build folder's own name kept out of debug information, every checkout and build folder share.
+# ccache shares objects between checkouts and presets: paths below the repository are made relative to the build folder, and
+# the build folder's own name is kept out of debug information. It refuses precompiled headers unless told that they may be
+# trusted; their own content is still hashed.
 find_program(APPSYNC_CCACHE ccache)
 if(APPSYNC_CCACHE AND (NOT CMAKE_CXX_COMPILER_LAUNCHER OR CMAKE_CXX_COMPILER_LAUNCHER STREQUAL "ccache"))
   set(CMAKE_CXX_COMPILER_LAUNCHER
-      "${CMAKE_COMMAND}" -E env CCACHE_BASEDIR=/ CCACHE_SLOPPINESS=pch_defines,time_macros
+      "${CMAKE_COMMAND}" -E env "CCACHE_BASEDIR=${CMAKE_SOURCE_DIR}" CCACHE_NOHASHDIR=1 CCACHE_SLOPPINESS=pch_defines,time_macros
       "${APPSYNC_CCACHE}")
-  add_compile_options("-fdebug-prefix-map=${CMAKE_BINARY_DIR}=.")
+  add_compile_options("-ffile-prefix-map=${CMAKE_SOURCE_DIR}/=" "-fdebug-prefix-map=${CMAKE_BINARY_DIR}=.")
 endif()
 
 find_package(Threads REQUIRED)

@@ -1,5 +1,5 @@
-# Target header-check: every header compiles alone, with the include roots of its own room. A header whose source has
-# the same name is the first thing that source includes (the formatter sees to it), so compiling that is the check.
+# Target header-check: every header compiles alone. A header whose source has the same name is the first thing that source
+# includes (the formatter sees to it), so compiling that is the check.
 
 function(appsync_header_check name link)
   file(GLOB_RECURSE headers CONFIGURE_DEPENDS RELATIVE "${CMAKE_SOURCE_DIR}" "${CMAKE_SOURCE_DIR}/${name}/*.h")
@@ -21,10 +21,10 @@ function(appsync_header_check name link)
 endfunction()
 
 add_custom_target(header-check)
-foreach(room IN ITEMS base platform ${APPSYNC_PLUGIN_ROOMS} device tools)
-  appsync_header_check(${room} ${room})
+foreach(component IN LISTS APPSYNC_COMPONENTS)
+  if(component STREQUAL "tests" AND BUILD_TESTING)
+    appsync_header_check(tests tests_headers)
+  elseif(TARGET ${component})
+    appsync_header_check(${component} ${component})
+  endif()
 endforeach()
-if(BUILD_TESTING)
-  appsync_header_check(kit kit)
-  appsync_header_check(tests "tests_headers_all;kit")
-endif()

@@ -1,6 +1,6 @@
 # What `cmake --install` lays out below a prefix: the tool, the loadable module, static libraries with their headers, and
 # the packages by which CMake and pkg-config find them. Everything is found relative to the prefix, which may be moved.
-# Integrators see one include root, where every header keeps its room: #include "platform/Platform.h".
+# Integrators see one include root, where every header keeps its component: #include "platform/Platform.h".
 
 include(GNUInstallDirs)
 include(CMakePackageConfigHelpers)
@@ -27,9 +27,10 @@ function(appsync_install_library target name part)
   add_dependencies(installable ${target})
 endfunction()
 
-# Installs all headers of a room.
-function(appsync_install_headers room)
-  install(DIRECTORY "${CMAKE_SOURCE_DIR}/${room}" DESTINATION "${APPSYNC_INSTALL_INCLUDEDIR}" FILES_MATCHING PATTERN "*.h")
+# Installs the headers of a component, those of its internal directory left out.
+function(appsync_install_headers component)
+  install(DIRECTORY "${CMAKE_SOURCE_DIR}/${component}" DESTINATION "${APPSYNC_INSTALL_INCLUDEDIR}"
+          FILES_MATCHING PATTERN "*.h" PATTERN internal EXCLUDE)
 endfunction()
 
 # Installs NAME.pc, made of cmake/NAME.pc.in.
@@ -43,7 +44,7 @@ endfunction()
 function(appsync_install_help)
   file(GLOB pages CONFIGURE_DEPENDS "${CMAKE_SOURCE_DIR}/docs/man/*.1")
   install(FILES ${pages} DESTINATION "${CMAKE_INSTALL_MANDIR}/man1")
-  set(completions "${CMAKE_SOURCE_DIR}/tools/completions")
+  set(completions "${CMAKE_SOURCE_DIR}/cli/completions")
   install(FILES "${completions}/appsync.bash" RENAME appsync DESTINATION "${CMAKE_INSTALL_DATADIR}/bash-completion/completions")
   install(FILES "${completions}/_appsync" DESTINATION "${CMAKE_INSTALL_DATADIR}/zsh/site-functions")
   install(FILES "${completions}/appsync.fish" DESTINATION "${CMAKE_INSTALL_DATADIR}/fish/vendor_completions.d")

@@ -1,9 +1,9 @@
 // Making everything ready for a package that the host is about to send.
+#include "common/PropertyListFile.h"
+#include "common/SyncError.h"
+#include "common/TransactionSteps.h"
 #include "coordination/InstallPreparation.h"
-#include "coordination/SyncError.h"
-#include "coordination/TransactionSteps.h"
 #include "core/AppsClient.h"
-#include "core/PropertyListFile.h"
 
 namespace appsync {
 

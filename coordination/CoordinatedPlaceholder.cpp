@@ -1,10 +1,10 @@
 // The placeholder of an app that is about to be installed through a coordinator.
+#include "common/PlaceholderBundle.h"
+#include "common/PlaceholderIcon.h"
+#include "common/TransactionSteps.h"
 #include "coordination/InstallPreparation.h"
-#include "coordination/TransactionSteps.h"
 #include "core/AppsClient.h"
-#include "core/PropertyListAccess.h"
-#include "transfer/PlaceholderIcon.h"
-#include "transfer/PlaceholderInfo.h"
+#include "plist/Access.h"
 
 namespace appsync {
 

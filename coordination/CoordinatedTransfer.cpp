@@ -1,7 +1,7 @@
 // Passing on to a coordinator how its app's package comes, or that it does not.
-#include "coordination/PromiseFulfilment.h"
-#include "coordination/SyncError.h"
+#include "common/SyncError.h"
 #include "core/AppsClient.h"
+#include "platform/PromiseFulfilment.h"
 
 namespace appsync {
 

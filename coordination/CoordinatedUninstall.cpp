@@ -1,5 +1,5 @@
 // Removing an app through the install-coordination service.
-#include "coordination/TransactionSteps.h"
+#include "common/TransactionSteps.h"
 #include "core/AppsClient.h"
 
 namespace appsync {

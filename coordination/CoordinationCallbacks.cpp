@@ -1,7 +1,7 @@
 // What the install-coordination service and the registry report, in the words of the sync.
-#include "coordination/SyncError.h"
+#include "common/SyncError.h"
 #include "core/AppsClient.h"
-#include "core/SyncFiles.h"
+#include "platform/SyncFiles.h"
 
 namespace appsync {
 

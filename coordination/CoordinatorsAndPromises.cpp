@@ -1,8 +1,8 @@
 // What coordinated installs and restores are put together from: coordinators, placeholders and promises.
-#include "coordination/PromiseFulfilment.h"
-#include "coordination/SyncError.h"
-#include "coordination/TransactionSteps.h"
+#include "common/SyncError.h"
+#include "common/TransactionSteps.h"
 #include "core/AppsClient.h"
+#include "platform/PromiseFulfilment.h"
 
 namespace appsync {
 

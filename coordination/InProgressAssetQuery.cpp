@@ -1,7 +1,7 @@
 #include "coordination/InProgressAssetQuery.h"
 
+#include "common/InstallNames.h"
 #include "coordination/InstallActivity.h"
-#include "coordination/InstallNames.h"
 
 namespace appsync {
 

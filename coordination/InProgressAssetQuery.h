@@ -7,7 +7,7 @@
 #include <vector>
 
 #include "base/Semaphore.h"
-#include "core/PlugInLog.h"
+#include "common/PlugInLog.h"
 #include "platform/Platform.h"
 
 namespace appsync {

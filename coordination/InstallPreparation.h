@@ -3,9 +3,9 @@
 
 #include <optional>
 
-#include "base/PropertyList.h"
-#include "coordination/CoordinatedPreparation.h"
+#include "coordination/Preparation.h"
 #include "platform/ZTAsset.h"
+#include "plist/PropertyList.h"
 
 namespace appsync {
 

@@ -16,13 +16,13 @@
 #include "base/Error.h"
 #include "base/Group.h"
 #include "base/OperationQueue.h"
-#include "base/PropertyList.h"
 #include "base/SerialQueue.h"
-#include "coordination/AppInstallUsingCoordination.h"
-#include "core/IdentifierSet.h"
-#include "core/PlugInLog.h"
+#include "common/Identifiers.h"
+#include "common/PlugInLog.h"
+#include "core/AppInstallUsingCoordination.h"
 #include "platform/Platform.h"
 #include "platform/ZTClient.h"
+#include "plist/PropertyList.h"
 
 namespace appsync::plist {
 class DocumentEntries;

@@ -1,6 +1,6 @@
 // What the home screen hears of a sync, and the order of its icons.
 #include "core/AppsClient.h"
-#include "core/SyncFiles.h"
+#include "platform/SyncFiles.h"
 
 namespace appsync {
 

@@ -1,10 +1,10 @@
 #include <unordered_set>
 
-#include "base/SecretHash.h"
+#include "base/SeededHash.h"
+#include "common/TodoList.h"
 #include "core/AppsClient.h"
-#include "core/PropertyListAccess.h"
-#include "core/SyncFiles.h"
-#include "core/TodoList.h"
+#include "platform/SyncFiles.h"
+#include "plist/Access.h"
 
 namespace appsync {
 

@@ -1,6 +1,6 @@
 // Making and ending the object, and its fixed answers to the daemon.
 #include "core/AppsClient.h"
-#include "core/SyncFiles.h"
+#include "platform/SyncFiles.h"
 
 namespace appsync {
 

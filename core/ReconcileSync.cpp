@@ -1,7 +1,7 @@
+#include "common/TodoList.h"
 #include "core/AppsClient.h"
-#include "core/PropertyListAccess.h"
-#include "core/SyncFiles.h"
-#include "core/TodoList.h"
+#include "platform/SyncFiles.h"
+#include "plist/Access.h"
 
 namespace appsync {
 

@@ -1,9 +1,9 @@
 // The ends: of the transfers, of the sync, and of syncing altogether.
 #include "base/Semaphore.h"
-#include "coordination/InstallNames.h"
+#include "common/InstallNames.h"
 #include "core/AppsClient.h"
-#include "core/PropertyListAccess.h"
-#include "core/SyncFiles.h"
+#include "platform/SyncFiles.h"
+#include "plist/Access.h"
 
 namespace appsync {
 

@@ -1,9 +1,9 @@
-#include "core/SyncFiles.h"
+#include "platform/SyncFiles.h"
 
 #include <optional>
 
 #include "core/AppsClient.h"
-#include "core/PropertyListAccess.h"
+#include "plist/Access.h"
 
 namespace appsync {
 

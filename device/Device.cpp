@@ -8,12 +8,12 @@
 #include <fcntl.h>
 #include <sys/stat.h>
 
-#include "device/AppTable.h"
-#include "device/DeviceFolder.h"
-#include "device/HostFile.h"
+#include "device/DeviceLayout.h"
 #include "device/Recovery.h"
-#include "device/Step.h"
-#include "device/SystemCalls.h"
+#include "device/apps/AppTable.h"
+#include "device/storage/FaultPoint.h"
+#include "device/storage/HostFile.h"
+#include "device/storage/SystemCalls.h"
 
 namespace appsync::device {
 

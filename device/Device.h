@@ -5,12 +5,12 @@
 #include <string>
 
 #include "base/Error.h"
-#include "device/Access.h"
-#include "device/Database.h"
 #include "device/DeviceError.h"
-#include "device/DeviceFileSystem.h"
-#include "device/FileDescriptor.h"
 #include "device/Services.h"
+#include "device/storage/Access.h"
+#include "device/storage/Database.h"
+#include "device/storage/DeviceFileSystem.h"
+#include "device/storage/FileDescriptor.h"
 #include "platform/Platform.h"
 
 namespace appsync::device {

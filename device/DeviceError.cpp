@@ -6,10 +6,7 @@
 #include <memory>
 #include <utility>
 
-#include <sqlite3.h>
-
-#include "device/Database.h"
-#include "device/DatabaseError.h"
+#include "device/storage/DatabaseError.h"
 
 namespace appsync::device {
 
@@ -36,11 +33,6 @@ constexpr std::array<Meaning, 7> kMeanings{{
     {EPERM, DeviceFailure::readOnly, kMayNotWrite},
 }};
 
-bool isDamage(const Error& cause) {
-  const long primary = cause.code & 0xFF;
-  return cause.domain == kSQLiteDomain && (primary == SQLITE_CORRUPT || primary == SQLITE_NOTADB);
-}
-
 Error causedBy(Error error, const Error& cause) {
   error.underlying = std::make_shared<const Error>(cause);
   return error;
@@ -54,7 +46,7 @@ Error deviceError(DeviceFailure failure, std::string text) {
 
 Error deviceError(const std::string& path, Access access, const Error& cause) {
   if (cause.domain == kDeviceDomain) return cause;
-  if (isDamage(cause)) {
+  if (isDatabaseDamage(cause)) {
     return causedBy(deviceError(DeviceFailure::damaged,
                                 path + ": the device is damaged (" + cause.text +
                                     "); put a copy of it in its place, or make a new one with \"appsync init\""),

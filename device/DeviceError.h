@@ -4,7 +4,7 @@
 #include <string>
 
 #include "base/Error.h"
-#include "device/Access.h"
+#include "device/storage/Access.h"
 
 namespace appsync::device {
 

@@ -9,13 +9,13 @@
 #include <fcntl.h>
 #include <sys/stat.h>
 
-#include "device/AppData.h"
-#include "device/AppRecord.h"
-#include "device/AppTable.h"
-#include "device/BundleInfo.h"
-#include "device/CoordinatorTable.h"
-#include "device/FileTree.h"
-#include "device/SystemCalls.h"
+#include "device/apps/AppData.h"
+#include "device/apps/AppRecord.h"
+#include "device/apps/AppTable.h"
+#include "device/coordination/CoordinatorTable.h"
+#include "device/packages/BundleInfo.h"
+#include "device/storage/FileTree.h"
+#include "device/storage/SystemCalls.h"
 
 namespace appsync::device {
 

@@ -2,9 +2,9 @@
 #pragma once
 
 #include "base/Error.h"
-#include "device/Database.h"
-#include "device/DeviceFileSystem.h"
-#include "device/Settings.h"
+#include "device/services/Settings.h"
+#include "device/storage/Database.h"
+#include "device/storage/DeviceFileSystem.h"
 
 namespace appsync::device {
 

@@ -7,11 +7,11 @@
 #include <vector>
 
 #include "base/Error.h"
-#include "base/PropertyList.h"
 #include "platform/AppRecord.h"
 #include "platform/FileLocation.h"
 #include "platform/InstallTypes.h"
 #include "platform/Keys.h"
+#include "plist/PropertyList.h"
 
 namespace appsync::platform {
 

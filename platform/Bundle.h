@@ -6,8 +6,8 @@
 #include <string>
 #include <string_view>
 
-#include "base/PropertyList.h"
 #include "platform/FileLocation.h"
+#include "plist/PropertyList.h"
 
 namespace appsync::platform {
 

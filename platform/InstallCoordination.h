@@ -10,7 +10,6 @@
 #include <string_view>
 
 #include "base/Error.h"
-#include "base/PropertyList.h"
 #include "platform/ClientIdentity.h"
 #include "platform/FileLocation.h"
 #include "platform/InstallCoordinator.h"
@@ -18,6 +17,7 @@
 #include "platform/InstallPromise.h"
 #include "platform/InstallTypes.h"
 #include "platform/Placeholder.h"
+#include "plist/PropertyList.h"
 
 namespace appsync::platform {
 

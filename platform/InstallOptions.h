@@ -6,8 +6,8 @@
 #include <string>
 #include <utility>
 
-#include "base/PropertyList.h"
 #include "platform/InstallTypes.h"
+#include "plist/PropertyList.h"
 
 namespace appsync::platform {
 

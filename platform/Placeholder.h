@@ -8,11 +8,11 @@
 
 #include "base/Bytes.h"
 #include "base/Error.h"
-#include "base/PropertyList.h"
 #include "platform/ClientIdentity.h"
 #include "platform/InstallOptions.h"
 #include "platform/InstallPromise.h"
 #include "platform/InstallTypes.h"
+#include "plist/PropertyList.h"
 
 namespace appsync::platform {
 

@@ -5,7 +5,7 @@
 #include <string>
 #include <vector>
 
-#include "base/PropertyList.h"
+#include "plist/PropertyList.h"
 
 namespace appsync::platform {
 

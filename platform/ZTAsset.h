@@ -6,8 +6,8 @@
 #include <string>
 #include <utility>
 
-#include "base/PropertyList.h"
 #include "platform/FileLocation.h"
+#include "plist/PropertyList.h"
 
 namespace appsync::platform {
 

@@ -11,9 +11,9 @@
 #include <vector>
 
 #include "base/Error.h"
-#include "base/PropertyList.h"
 #include "platform/ZTAsset.h"
 #include "platform/ZTMutableAccountInfo.h"
+#include "plist/PropertyList.h"
 
 namespace appsync::platform {
 

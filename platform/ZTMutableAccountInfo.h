@@ -8,7 +8,7 @@
 #include <utility>
 
 #include "base/Describe.h"
-#include "base/PropertyList.h"
+#include "plist/PropertyList.h"
 
 namespace appsync::platform {
 

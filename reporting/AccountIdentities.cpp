@@ -1,6 +1,6 @@
 // The store accounts that own the apps on the device.
 #include "core/AppsClient.h"
-#include "core/PropertyListAccess.h"
+#include "plist/Access.h"
 #include "reporting/StoreMetadata.h"
 #include "reporting/TypedLookup.h"
 #include "reporting/UserApps.h"

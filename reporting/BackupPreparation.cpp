@@ -1,7 +1,7 @@
 // Bringing the store metadata of installed apps up to date before the device is backed up.
+#include "common/PropertyListFile.h"
 #include "core/AppsClient.h"
-#include "core/PropertyListAccess.h"
-#include "core/PropertyListFile.h"
+#include "plist/Access.h"
 #include "reporting/StoreMetadata.h"
 #include "reporting/UserApps.h"
 

@@ -1,6 +1,6 @@
 // Which dataclasses a device's restrictions leave nothing to do for.
 #include "core/AppsClient.h"
-#include "core/SyncFiles.h"
+#include "platform/SyncFiles.h"
 
 namespace appsync {
 

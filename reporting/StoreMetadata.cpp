@@ -1,7 +1,7 @@
 #include "reporting/StoreMetadata.h"
 
-#include "core/PropertyListFile.h"
-#include "core/SyncFiles.h"
+#include "common/PropertyListFile.h"
+#include "platform/SyncFiles.h"
 
 namespace appsync {
 

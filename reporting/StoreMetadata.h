@@ -5,9 +5,9 @@
 #include <optional>
 #include <string>
 
-#include "base/PropertyList.h"
 #include "platform/AppRecord.h"
 #include "platform/FileSystem.h"
+#include "plist/PropertyList.h"
 
 namespace appsync {
 

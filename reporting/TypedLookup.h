@@ -3,8 +3,8 @@
 
 #include <string_view>
 
-#include "base/PropertyList.h"
-#include "core/PlugInLog.h"
+#include "common/PlugInLog.h"
+#include "plist/PropertyList.h"
 
 namespace appsync {
 

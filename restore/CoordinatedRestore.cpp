@@ -1,9 +1,9 @@
 // Getting a restored app ready with the install-coordination service.
-#include "coordination/CoordinatedPreparation.h"
-#include "coordination/SyncError.h"
-#include "coordination/TransactionSteps.h"
+#include "common/PropertyListFile.h"
+#include "common/SyncError.h"
+#include "common/TransactionSteps.h"
+#include "coordination/Preparation.h"
 #include "core/AppsClient.h"
-#include "core/PropertyListFile.h"
 #include "restore/RestoreMetadata.h"
 
 namespace appsync {

@@ -1,11 +1,11 @@
 // The placeholder of a restored app as the install-coordination service wants it.
-#include "coordination/CoordinatedPreparation.h"
-#include "coordination/SyncError.h"
+#include "common/PlaceholderBundle.h"
+#include "common/PlaceholderIcon.h"
+#include "common/SyncError.h"
+#include "coordination/Preparation.h"
 #include "core/AppsClient.h"
-#include "core/PropertyListAccess.h"
+#include "plist/Access.h"
 #include "restore/RestoreMetadata.h"
-#include "transfer/PlaceholderIcon.h"
-#include "transfer/PlaceholderInfo.h"
 
 namespace appsync {
 

@@ -3,7 +3,7 @@
 #include <utility>
 
 #include "core/AppsClient.h"
-#include "core/PropertyListAccess.h"
+#include "plist/Access.h"
 
 namespace appsync {
 

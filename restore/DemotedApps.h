@@ -5,9 +5,9 @@
 #include <string_view>
 #include <unordered_set>
 
-#include "base/PropertyList.h"
-#include "base/SecretHash.h"
-#include "restore/DemotionStatus.h"
+#include "base/SeededHash.h"
+#include "common/DemotionStatus.h"
+#include "plist/PropertyList.h"
 
 namespace appsync {
 

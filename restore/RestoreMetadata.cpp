@@ -1,7 +1,7 @@
 #include "restore/RestoreMetadata.h"
 
-#include "core/PropertyListAccess.h"
-#include "transfer/PlaceholderInfo.h"
+#include "common/PlaceholderBundle.h"
+#include "plist/Access.h"
 
 namespace appsync {
 

@@ -4,8 +4,8 @@
 #include <optional>
 #include <string>
 
-#include "base/PropertyList.h"
-#include "core/PlugInLog.h"
+#include "common/PlugInLog.h"
+#include "plist/PropertyList.h"
 
 namespace appsync {
 

@@ -1,11 +1,11 @@
 // The placeholder of a restored app where installs are not coordinated: a bundle of the plug-in's own making.
+#include "common/PlaceholderBundle.h"
+#include "common/PlaceholderIcon.h"
+#include "common/PropertyListFile.h"
 #include "core/AppsClient.h"
-#include "core/PropertyListFile.h"
-#include "core/SyncFiles.h"
 #include "platform/Keys.h"
+#include "platform/SyncFiles.h"
 #include "restore/RestoreMetadata.h"
-#include "transfer/PlaceholderIcon.h"
-#include "transfer/PlaceholderInfo.h"
 
 namespace appsync {
 

@@ -2,10 +2,10 @@
 #include <chrono>
 #include <utility>
 
-#include "base/PropertyListEntries.h"
 #include "core/AppsClient.h"
-#include "core/PropertyListAccess.h"
-#include "core/SyncFiles.h"
+#include "platform/SyncFiles.h"
+#include "plist/Access.h"
+#include "plist/DictionaryStream.h"
 #include "restore/DemotedApps.h"
 
 namespace appsync {

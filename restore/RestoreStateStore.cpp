@@ -1,8 +1,8 @@
 // Where restored packages lie, by app and version, across restarts of the daemon.
+#include "common/PropertyListFile.h"
+#include "common/RestoreState.h"
 #include "core/AppsClient.h"
-#include "core/PropertyListAccess.h"
-#include "core/PropertyListFile.h"
-#include "restore/RestoreState.h"
+#include "plist/Access.h"
 
 namespace appsync {
 

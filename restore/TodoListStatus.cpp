@@ -1,9 +1,9 @@
 // How far each app of the host's todo list has come, written back into it.
 #include <utility>
 
+#include "common/TodoList.h"
 #include "core/AppsClient.h"
-#include "core/SyncFiles.h"
-#include "core/TodoList.h"
+#include "platform/SyncFiles.h"
 
 namespace appsync {
 

@@ -5,7 +5,7 @@
 #include <utility>
 
 #include "core/AppsClient.h"
-#include "core/SyncFiles.h"
+#include "platform/SyncFiles.h"
 #include "transfer/TerminationAssertionRules.h"
 
 namespace appsync {

@@ -1,9 +1,9 @@
 // Which packages the host must still send.
+#include "common/RestoreState.h"
 #include "coordination/InProgressAssetQuery.h"
 #include "core/AppsClient.h"
-#include "core/PropertyListAccess.h"
-#include "core/SyncFiles.h"
-#include "restore/RestoreState.h"
+#include "platform/SyncFiles.h"
+#include "plist/Access.h"
 #include "transfer/SkipRules.h"
 #include "transfer/WantedEntry.h"
 

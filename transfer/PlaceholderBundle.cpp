@@ -1,12 +1,13 @@
 // Placeholder apps: bundles on disk with a name, a version and an icon, but no code.
+#include "common/PlaceholderBundle.h"
+
 #include <cerrno>
 
+#include "common/PlaceholderIcon.h"
+#include "common/PropertyListFile.h"
 #include "core/AppsClient.h"
-#include "core/PropertyListAccess.h"
-#include "core/PropertyListFile.h"
-#include "core/SyncFiles.h"
-#include "transfer/PlaceholderIcon.h"
-#include "transfer/PlaceholderInfo.h"
+#include "platform/SyncFiles.h"
+#include "plist/Access.h"
 #include "transfer/ScratchPath.h"
 
 namespace appsync {

@@ -3,7 +3,7 @@
 
 #include <string>
 
-#include "core/PlugInLog.h"
+#include "common/PlugInLog.h"
 #include "transfer/WantedEntry.h"
 
 namespace appsync {

@@ -6,10 +6,10 @@
 #include <string_view>
 #include <utility>
 
+#include "common/RestoreState.h"
 #include "core/AppsClient.h"
-#include "core/PropertyListAccess.h"
-#include "core/SyncFiles.h"
-#include "restore/RestoreState.h"
+#include "platform/SyncFiles.h"
+#include "plist/Access.h"
 
 namespace appsync {
 

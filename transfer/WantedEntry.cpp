@@ -1,8 +1,8 @@
 #include "transfer/WantedEntry.h"
 
-#include "core/PropertyListAccess.h"
-#include "core/SyncFiles.h"
 #include "platform/Keys.h"
+#include "platform/SyncFiles.h"
+#include "plist/Access.h"
 
 namespace appsync {
 

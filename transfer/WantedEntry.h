@@ -8,8 +8,8 @@
 #include <string_view>
 #include <utility>
 
-#include "base/PropertyList.h"
 #include "platform/AppRecord.h"
+#include "plist/PropertyList.h"
 
 namespace appsync {
 

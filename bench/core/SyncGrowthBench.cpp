@@ -15,7 +15,7 @@
 #include "core/AppsClient.h"
 #include "device/Device.h"
 #include "kit/fakes/FakePlatform.h"
-#include "kit/fakes/TodoList.h"
+#include "kit/fakes/SyncFileBuilder.h"
 
 namespace appsync::bench {
 namespace {

@@ -2,8 +2,8 @@
 #include <benchmark/benchmark.h>
 
 #include "core/AppsClient.h"
-#include "kit/fakes/TodoList.h"
-#include "tests/ManyApps.h"
+#include "kit/fakes/SyncFileBuilder.h"
+#include "tests/support/ManyApps.h"
 
 namespace appsync::bench {
 namespace {

@@ -12,9 +12,9 @@
 
 #include "core/AppsClient.h"
 #include "kit/fakes/FakePlatform.h"
-#include "kit/fakes/TodoList.h"
-#include "tests/HeldMemory.h"
-#include "tests/ManyApps.h"
+#include "kit/fakes/SyncFileBuilder.h"
+#include "tests/support/HeldMemory.h"
+#include "tests/support/ManyApps.h"
 
 namespace appsync::bench {
 namespace {

@@ -11,10 +11,10 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
-#include "base/PropertyList.h"
-#include "bench/base/PropertyListCorpora.h"
+#include "bench/plist/PropertyListCorpora.h"
 #include "core/AppsClient.h"
 #include "kit/fakes/FakePlatform.h"
+#include "plist/PropertyList.h"
 
 namespace appsync::bench {
 namespace {

@@ -4,7 +4,7 @@
 #include <optional>
 
 #include "kit/fakes/FakePackages.h"
-#include "kit/fakes/TodoList.h"
+#include "kit/fakes/SyncFileBuilder.h"
 
 namespace port {
 

@@ -5,7 +5,7 @@
 #include <thread>
 
 #include "kit/contracts/AppRegistryContract.h"
-#include "kit/contracts/Occurrences.h"
+#include "kit/contracts/EventCounter.h"
 #include "kit/fakes/Threads.h"
 
 namespace appsync::test {

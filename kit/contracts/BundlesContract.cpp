@@ -1,7 +1,7 @@
 #include "kit/contracts/BundlesContract.h"
 
-#include "base/PropertyList.h"
 #include "kit/fakes/Threads.h"
+#include "plist/PropertyList.h"
 
 namespace appsync::test {
 

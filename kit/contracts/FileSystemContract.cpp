@@ -4,7 +4,7 @@
 #include <cerrno>
 #include <cstddef>
 
-#include "kit/contracts/Outcomes.h"
+#include "kit/contracts/Errors.h"
 #include "kit/fakes/Threads.h"
 
 namespace appsync::test {

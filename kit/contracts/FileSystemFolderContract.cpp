@@ -3,8 +3,8 @@
 #include <atomic>
 #include <cerrno>
 
+#include "kit/contracts/Errors.h"
 #include "kit/contracts/FileSystemContract.h"
-#include "kit/contracts/Outcomes.h"
 #include "kit/fakes/Threads.h"
 
 namespace appsync::test {

@@ -3,8 +3,8 @@
 #include <functional>
 #include <vector>
 
+#include "kit/contracts/Errors.h"
 #include "kit/contracts/FileSystemContract.h"
-#include "kit/contracts/Outcomes.h"
 
 namespace appsync::test {
 

@@ -5,8 +5,8 @@
 #include <thread>
 #include <vector>
 
-#include "base/PropertyList.h"
 #include "kit/fakes/Threads.h"
+#include "plist/PropertyList.h"
 
 namespace appsync::test {
 

@@ -2,7 +2,7 @@
 
 #include <optional>
 
-#include "kit/contracts/Occurrences.h"
+#include "kit/contracts/EventCounter.h"
 
 namespace appsync::test {
 

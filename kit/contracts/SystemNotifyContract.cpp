@@ -7,7 +7,7 @@
 #include <thread>
 #include <vector>
 
-#include "kit/contracts/Occurrences.h"
+#include "kit/contracts/EventCounter.h"
 #include "kit/fakes/Threads.h"
 
 namespace appsync::test {

@@ -1,6 +1,6 @@
 #include "kit/contracts/ZTDeviceServiceContract.h"
 
-#include "kit/contracts/Occurrences.h"
+#include "kit/contracts/EventCounter.h"
 #include "kit/fakes/Threads.h"
 
 namespace appsync::test {

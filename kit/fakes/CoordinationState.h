@@ -12,9 +12,9 @@
 #include <vector>
 
 #include "kit/fakes/CallJournal.h"
-#include "kit/fakes/CallbackThread.h"
 #include "kit/fakes/FailurePlan.h"
 #include "kit/fakes/FakeAppRegistry.h"
+#include "kit/fakes/FakeCallbackThread.h"
 #include "kit/fakes/FakeCoordinator.h"
 #include "kit/fakes/FakeFileSystem.h"
 #include "kit/fakes/Gate.h"

@@ -8,9 +8,9 @@
 #include <string_view>
 #include <utility>
 
-#include "base/PropertyList.h"
 #include "kit/fakes/FakeInstallProgress.h"
 #include "platform/AppRecord.h"
+#include "plist/PropertyList.h"
 
 namespace appsync::test {
 

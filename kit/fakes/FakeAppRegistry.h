@@ -12,9 +12,9 @@
 #include <vector>
 
 #include "kit/fakes/CallJournal.h"
-#include "kit/fakes/CallbackThread.h"
 #include "kit/fakes/FailurePlan.h"
 #include "kit/fakes/FakeApp.h"
+#include "kit/fakes/FakeCallbackThread.h"
 #include "kit/fakes/FakeFileSystem.h"
 #include "kit/fakes/FakePackages.h"
 #include "kit/fakes/FakeUninstalledAppsList.h"

@@ -12,7 +12,7 @@
 
 #include "kit/fakes/CallJournal.h"
 #include "kit/fakes/FailurePlan.h"
-#include "kit/fakes/FileTree.h"
+#include "kit/fakes/FakeFileTree.h"
 #include "platform/FileSystem.h"
 
 namespace appsync::test {

@@ -2,8 +2,8 @@
 
 #include <utility>
 
-#include "base/PropertyList.h"
 #include "kit/fakes/Misuse.h"
+#include "plist/PropertyList.h"
 
 namespace appsync::test {
 

@@ -7,10 +7,10 @@
 #include <string_view>
 
 #include "base/Error.h"
-#include "base/PropertyList.h"
 #include "kit/fakes/FakeApp.h"
 #include "kit/fakes/FakeFileSystem.h"
 #include "platform/FileLocation.h"
+#include "plist/PropertyList.h"
 
 namespace appsync::test {
 

@@ -10,7 +10,7 @@
 #include <vector>
 
 #include "kit/fakes/CallJournal.h"
-#include "kit/fakes/CallbackThread.h"
+#include "kit/fakes/FakeCallbackThread.h"
 #include "platform/SoftwareLibrary.h"
 
 namespace appsync::test {

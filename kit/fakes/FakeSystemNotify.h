@@ -11,7 +11,7 @@
 #include <vector>
 
 #include "kit/fakes/CallJournal.h"
-#include "kit/fakes/CallbackThread.h"
+#include "kit/fakes/FakeCallbackThread.h"
 #include "platform/SystemNotify.h"
 
 namespace appsync::test {

@@ -18,8 +18,8 @@
 #include "base/Semaphore.h"
 #include "base/SystemClock.h"
 #include "kit/fakes/Gate.h"
-#include "tests/NoMoreThreads.h"
-#include "tests/base/AtEnd.h"
+#include "tests/support/AtEnd.h"
+#include "tests/support/NoMoreThreads.h"
 
 namespace appsync::test {
 namespace {

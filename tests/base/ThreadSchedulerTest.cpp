@@ -12,7 +12,7 @@
 #include "base/ThreadScheduler.h"
 #include "base/VirtualTime.h"
 #include "kit/fakes/Gate.h"
-#include "tests/base/AtEnd.h"
+#include "tests/support/AtEnd.h"
 
 namespace appsync::test {
 namespace {

@@ -6,7 +6,7 @@
 #include "kit/contracts/FileSystemContract.h"
 #include "kit/contracts/TimeContract.h"
 #include "kit/contracts/UninstalledAppsListContract.h"
-#include "tests/device/TestDevice.h"
+#include "tests/support/TestDevice.h"
 
 namespace appsync::test {
 

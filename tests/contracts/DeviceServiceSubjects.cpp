@@ -20,8 +20,8 @@
 #include "kit/contracts/ZTDeviceServiceContract.h"
 #include "kit/fakes/FakeDeviceService.h"
 #include "platform/Keys.h"
-#include "tests/device/Pictures.h"
-#include "tests/device/TestDevice.h"
+#include "tests/device/screen/Pictures.h"
+#include "tests/support/TestDevice.h"
 
 namespace appsync::test {
 

@@ -20,7 +20,7 @@
 #include "kit/contracts/ZTDeviceServiceContract.h"
 #include "kit/fakes/FakePackages.h"
 #include "kit/fakes/FakePlatform.h"
-#include "kit/fakes/TodoList.h"
+#include "kit/fakes/SyncFileBuilder.h"
 #include "platform/Keys.h"
 
 namespace appsync::test {

@@ -4,7 +4,7 @@
 #include <gtest/gtest.h>
 
 #include "tests/coordination/CoordinationFixture.h"
-#include "tests/coordination/FatalCall.h"
+#include "tests/support/FatalCall.h"
 
 namespace appsync::test {
 namespace {

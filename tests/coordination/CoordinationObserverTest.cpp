@@ -6,7 +6,7 @@
 #include <gtest/gtest.h>
 
 #include "kit/fakes/TextDiff.h"
-#include "tests/ClientFixture.h"
+#include "tests/support/ClientFixture.h"
 
 namespace appsync::test {
 

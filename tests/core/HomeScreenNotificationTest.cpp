@@ -10,8 +10,8 @@
 #include <gtest/gtest.h>
 
 #include "kit/fakes/CallsInLog.h"
-#include "kit/fakes/TodoList.h"
-#include "tests/ClientFixture.h"
+#include "kit/fakes/SyncFileBuilder.h"
+#include "tests/support/ClientFixture.h"
 
 namespace appsync::test {
 

@@ -7,7 +7,7 @@
 #include <string_view>
 
 #include "kit/fakes/CallsInLog.h"
-#include "tests/ClientFixture.h"
+#include "tests/support/ClientFixture.h"
 
 namespace appsync::test {
 

@@ -13,8 +13,8 @@
 
 #include <gtest/gtest.h>
 
+#include "kit/fakes/SyncFileBuilder.h"
 #include "kit/fakes/TextDiff.h"
-#include "kit/fakes/TodoList.h"
 #include "tests/core/SyncEndFixture.h"
 
 namespace appsync::test {

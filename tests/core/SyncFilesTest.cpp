@@ -6,10 +6,10 @@
 
 #include <gtest/gtest.h>
 
-#include "core/SyncFiles.h"
+#include "kit/fakes/SyncFileBuilder.h"
 #include "kit/fakes/TextDiff.h"
-#include "kit/fakes/TodoList.h"
-#include "tests/ClientFixture.h"
+#include "platform/SyncFiles.h"
+#include "tests/support/ClientFixture.h"
 
 namespace appsync::test {
 

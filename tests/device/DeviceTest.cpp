@@ -10,8 +10,8 @@
 #include <unistd.h>
 
 #include "device/Device.h"
-#include "device/Step.h"
-#include "tests/device/TestDevice.h"
+#include "device/storage/FaultPoint.h"
+#include "tests/support/TestDevice.h"
 
 namespace appsync::test {
 

@@ -6,7 +6,7 @@
 #include <unistd.h>
 
 #include "device/Recovery.h"
-#include "tests/device/KilledDevice.h"
+#include "tests/support/KilledDevice.h"
 
 namespace appsync::test {
 

@@ -5,8 +5,8 @@
 
 #include <gtest/gtest.h>
 
-#include "core/SyncFiles.h"
-#include "tests/ClientFixture.h"
+#include "platform/SyncFiles.h"
+#include "tests/support/ClientFixture.h"
 
 namespace appsync::test {
 

@@ -8,7 +8,7 @@
 
 #include <gtest/gtest.h>
 
-#include "kit/fakes/TodoList.h"
+#include "kit/fakes/SyncFileBuilder.h"
 #include "platform/ZTClient.h"
 
 namespace appsync::test {

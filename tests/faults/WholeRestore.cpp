@@ -6,8 +6,8 @@
 
 #include <gtest/gtest.h>
 
-#include "core/SyncFiles.h"
 #include "kit/fakes/FakePackages.h"
+#include "platform/SyncFiles.h"
 #include "tests/faults/RestoreClock.h"
 #include "tests/restore/RestoreFixture.h"
 

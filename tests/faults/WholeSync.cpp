@@ -4,9 +4,9 @@
 
 #include <gtest/gtest.h>
 
-#include "core/SyncFiles.h"
 #include "kit/fakes/FakePackages.h"
-#include "kit/fakes/TodoList.h"
+#include "kit/fakes/SyncFileBuilder.h"
+#include "platform/SyncFiles.h"
 
 namespace appsync::test {
 

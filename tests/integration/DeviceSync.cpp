@@ -4,9 +4,9 @@
 #include <chrono>
 #include <filesystem>
 
-#include "core/SyncFiles.h"
+#include "kit/fakes/SyncFileBuilder.h"
 #include "kit/fakes/Threads.h"
-#include "kit/fakes/TodoList.h"
+#include "platform/SyncFiles.h"
 
 namespace appsync::test {
 

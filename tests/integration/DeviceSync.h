@@ -11,7 +11,7 @@
 #include <vector>
 
 #include "core/AppsClient.h"
-#include "tests/device/TestDevice.h"
+#include "tests/support/TestDevice.h"
 
 namespace appsync::test {
 

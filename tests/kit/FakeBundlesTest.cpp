@@ -1,7 +1,7 @@
 #include <gtest/gtest.h>
 
 #include "kit/fakes/FakePlatform.h"
-#include "kit/fakes/TodoList.h"
+#include "kit/fakes/SyncFileBuilder.h"
 
 namespace appsync::test {
 namespace {

@@ -8,8 +8,8 @@
 
 #include "generated/BuildPaths.h"
 #include "kit/fakes/FakePlatform.h"
-#include "tests/HeldMemory.h"
 #include "tests/module/LoadedModule.h"
+#include "tests/support/HeldMemory.h"
 
 namespace appsync::test {
 

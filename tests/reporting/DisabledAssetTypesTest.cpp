@@ -5,7 +5,7 @@
 
 #include <gtest/gtest.h>
 
-#include "tests/ClientFixture.h"
+#include "tests/support/ClientFixture.h"
 
 namespace appsync::test {
 namespace {

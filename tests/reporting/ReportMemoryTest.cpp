@@ -6,9 +6,9 @@
 #include <gtest/gtest.h>
 
 #include "core/AppsClient.h"
-#include "kit/fakes/TodoList.h"
-#include "tests/HeldMemory.h"
-#include "tests/ManyApps.h"
+#include "kit/fakes/SyncFileBuilder.h"
+#include "tests/support/HeldMemory.h"
+#include "tests/support/ManyApps.h"
 
 namespace appsync::test {
 namespace {

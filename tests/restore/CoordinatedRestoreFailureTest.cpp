@@ -3,8 +3,8 @@
 
 #include <gtest/gtest.h>
 
-#include "tests/coordination/FatalCall.h"
 #include "tests/restore/RestoreFixture.h"
+#include "tests/support/FatalCall.h"
 
 namespace appsync::test {
 namespace {

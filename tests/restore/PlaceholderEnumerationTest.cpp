@@ -7,7 +7,7 @@
 
 #include "kit/fakes/CallsInLog.h"
 #include "kit/fakes/TextDiff.h"
-#include "tests/ClientFixture.h"
+#include "tests/support/ClientFixture.h"
 
 namespace appsync::test {
 

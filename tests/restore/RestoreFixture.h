@@ -9,8 +9,8 @@
 #include <vector>
 
 #include "kit/fakes/CallsInLog.h"
-#include "kit/fakes/TodoList.h"
-#include "tests/ClientFixture.h"
+#include "kit/fakes/SyncFileBuilder.h"
+#include "tests/support/ClientFixture.h"
 
 namespace appsync::test {
 

@@ -4,7 +4,7 @@
 #include <gtest/gtest.h>
 
 #include "kit/fakes/Threads.h"
-#include "tests/ClientFixture.h"
+#include "tests/support/ClientFixture.h"
 
 namespace appsync::test {
 namespace {

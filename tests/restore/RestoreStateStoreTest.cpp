@@ -9,11 +9,11 @@
 
 #include <gtest/gtest.h>
 
+#include "common/RestoreState.h"
+#include "kit/fakes/SyncFileBuilder.h"
 #include "kit/fakes/TextDiff.h"
 #include "kit/fakes/Threads.h"
-#include "kit/fakes/TodoList.h"
-#include "restore/RestoreState.h"
-#include "tests/ClientFixture.h"
+#include "tests/support/ClientFixture.h"
 
 namespace appsync::test {
 

@@ -11,9 +11,9 @@
 #include <gtest/gtest.h>
 
 #include "kit/fakes/CallsInLog.h"
+#include "kit/fakes/SyncFileBuilder.h"
 #include "kit/fakes/Threads.h"
-#include "kit/fakes/TodoList.h"
-#include "tests/ClientFixture.h"
+#include "tests/support/ClientFixture.h"
 
 namespace appsync::test {
 

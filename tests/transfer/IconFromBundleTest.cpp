@@ -5,7 +5,7 @@
 
 #include "core/AppsClient.h"
 #include "kit/fakes/FakePlatform.h"
-#include "kit/fakes/TodoList.h"
+#include "kit/fakes/SyncFileBuilder.h"
 
 namespace appsync::test {
 namespace {

@@ -13,8 +13,8 @@
 #include "core/AppsClient.h"
 #include "kit/fakes/FakePackages.h"
 #include "kit/fakes/Gate.h"
-#include "tests/ClientFixture.h"
-#include "tests/NoMoreThreads.h"
+#include "tests/support/ClientFixture.h"
+#include "tests/support/NoMoreThreads.h"
 
 namespace appsync::test {
 namespace {

@@ -5,8 +5,8 @@
 #include <gtest/gtest.h>
 
 #include "core/AppsClient.h"
-#include "kit/fakes/TodoList.h"
-#include "tests/ClientFixture.h"
+#include "kit/fakes/SyncFileBuilder.h"
+#include "tests/support/ClientFixture.h"
 
 namespace appsync::test {
 namespace {

@@ -1,0 +1,62 @@
+// Devices for commands.
+#pragma once
+
+#include <functional>
+#include <memory>
+#include <string>
+
+#include <CLI/CLI.hpp>
+
+#include "cli/Commands.h"
+#include "cli/ExitStatus.h"
+#include "device/Device.h"
+
+namespace appsync::cli {
+
+/// Adds the positional DEVICE to a command.
+void addDevice(CLI::App& command, std::string& path);
+
+/// Opens the device and does `work` with it; a device that cannot be opened is reported.
+[[nodiscard]] ExitStatus withDevice(const std::string& path, device::Access access,
+                                    const std::function<ExitStatus(device::Device&)>& work);
+
+/// How a command is called, what it does in a few words, and what stands below its options in its help.
+struct CommandText {
+  const char* name;
+  const char* purpose;
+  const char* examples;
+};
+
+/// A command that was added, for the rest of its options.
+template <class Options>
+struct AddedCommand {
+  CLI::App& command;
+  std::shared_ptr<Options> options;
+};
+
+/// Adds a command that opens a device and then does `run`. Of the options, which live as long as the command line,
+/// `device` is filled in already.
+template <class Options>
+AddedCommand<Options> addDeviceCommand(CLI::App& line, Invocation& invocation, const CommandText& text,
+                                       device::Access access, ExitStatus (*run)(const Options&, device::Device&)) {
+  const auto options = std::make_shared<Options>();
+  CLI::App* command = line.add_subcommand(text.name, text.purpose);
+  addDevice(*command, options->device);
+  command->footer(text.examples);
+  command->callback([options, access, run, &invocation] {
+    invocation = [options, access, run] {
+      return withDevice(options->device, access, [&](device::Device& device) { return run(*options, device); });
+    };
+  });
+  return {*command, options};
+}
+
+/// The same for a command that shows what is on a device, to people or, with the option `json`, to machines.
+template <class Options>
+void addListingCommand(CLI::App& line, Invocation& invocation, const CommandText& text,
+                       ExitStatus (*run)(const Options&, device::Device&)) {
+  const auto added = addDeviceCommand(line, invocation, text, device::Access::readOnly, run);
+  added.command.add_flag("--json", added.options->json, "write JSON");
+}
+
+}  // namespace appsync::cli

@@ -1,0 +1,153 @@
+#include <cstdint>
+#include <set>
+#include <string>
+#include <string_view>
+#include <utility>
+
+#include "cli/Commands.h"
+#include "cli/DeviceCommand.h"
+#include "cli/Json.h"
+#include "cli/Printable.h"
+#include "cli/PropertyListJson.h"
+#include "cli/StandardOutput.h"
+#include "daemon/ClientModule.h"
+#include "host/DeviceApps.h"
+
+namespace appsync::cli {
+namespace {
+
+using platform::RestrictionSetting;
+using platform::RestrictionValue;
+using platform::ZTMutableAccountInfo;
+
+struct DeviceReportOptions {
+  std::string device;
+  bool json = false;
+};
+
+constexpr const char* kExamples =
+    R"(Tells what the plug-in answers to the sync daemon's questions about a device: how many apps there are and what they
+take, which store accounts own them, and which dataclasses are disabled: "Application", where apps may be neither
+installed nor removed. Accounts stand in the apps' store metadata, two identifiers of one app where its metadata
+disagrees with itself. An app whose metadata is missing or cannot be read has no account; the others have theirs.
+
+With --json: one object:
+  metrics             {count, physicalSize, purgeableSize}, the sizes in bytes
+  corvelIDs           array of the accounts' identifiers
+  accounts            array of {corvelID, DSID, altDSID}; of these DSID is a number, and what is not known is null
+  disabledAssetTypes  array of dataclasses
+  restrictions        {"app-installation", "app-removal"}, each "yes", "no" or "unset"
+
+Examples:
+  appsync report phone
+  appsync report phone --json | jq -r '.corvelIDs[]')";
+
+/// What there is to report of a device.
+struct Report {
+  std::uint64_t count = 0;
+  std::uint64_t physicalSize = 0;
+  std::uint64_t purgeableSize = 0;
+  std::set<std::string> identifiers;
+  platform::ZTAccountInfos accounts;
+  std::set<std::string> disabledTypes;
+  RestrictionValue installation = RestrictionValue::unset;
+  RestrictionValue removal = RestrictionValue::unset;
+};
+
+std::uint64_t metric(const plist::Dictionary& metrics, std::string_view key) {
+  const plist::Value* number = metrics.find(key);
+  return number == nullptr ? 0 : number->uint64().value_or(0);
+}
+
+Report ask(platform::ZTClient& client, platform::ProfileConnection& restrictions) {
+  const plist::Dictionary metrics = client.installedAssetMetrics();
+  Report report;
+  report.count = metric(metrics, platform::kMetricCount);
+  report.physicalSize = metric(metrics, platform::kMetricPhysicalSize);
+  report.purgeableSize = metric(metrics, platform::kMetricPurgeableSize);
+  report.identifiers = client.corvelIDsForAssets();
+  report.accounts = client.accountsForAssets();
+  report.disabledTypes = client.disabledAssetTypes().value_or(std::set<std::string>());
+  report.installation = restrictions.effectiveBoolValueForSetting(RestrictionSetting::appInstallationAllowed);
+  report.removal = restrictions.effectiveBoolValueForSetting(RestrictionSetting::appRemovalAllowed);
+  return report;
+}
+
+std::string_view wordOf(RestrictionValue value) {
+  if (value == RestrictionValue::unset) return "unset";
+  return value == RestrictionValue::no ? "no" : "yes";
+}
+
+Json accountJson(const ZTMutableAccountInfo& account) {
+  return {{"corvelID", account.corvelID()},
+          {"DSID", account.DSID() ? toJson(*account.DSID()) : Json(nullptr)},
+          {"altDSID", account.altDSID() ? Json(*account.altDSID()) : Json(nullptr)}};
+}
+
+Json reportJson(const Report& report) {
+  Json accounts = Json::array();
+  for (const ZTMutableAccountInfo& account : report.accounts)
+    accounts.push_back(accountJson(account));
+  return {
+      {"metrics",
+       {{"count", report.count}, {"physicalSize", report.physicalSize}, {"purgeableSize", report.purgeableSize}}},
+      {"corvelIDs", Json(report.identifiers)},
+      {"accounts", std::move(accounts)},
+      {"disabledAssetTypes", Json(report.disabledTypes)},
+      {"restrictions", {{"app-installation", wordOf(report.installation)}, {"app-removal", wordOf(report.removal)}}}};
+}
+
+std::string shown(std::string_view text) {
+  return text.empty() ? "(empty)" : printable(text);
+}
+
+std::string shown(const ZTMutableAccountInfo& account) {
+  std::string line = shown(account.corvelID());
+  if (account.DSID()) line += "  DSID " + description(*account.DSID());
+  if (account.altDSID()) line += "  altDSID " + shown(*account.altDSID());
+  return line;
+}
+
+/// A title and a line for each of `things`; nothing for none.
+template <class Things>
+void writeList(StandardOutput& output, std::string_view title, const Things& things) {
+  if (things.empty()) return;
+  output.writeLine("");
+  output.writeLine(title);
+  for (const auto& thing : things)
+    output.writeLine("  " + shown(thing));
+}
+
+void write(StandardOutput& output, const Report& report) {
+  output.writeLine("apps               " + std::to_string(report.count) + ", " + byteCount(report.physicalSize));
+  output.writeLine("can be purged      " + byteCount(report.purgeableSize));
+  output.writeLine(std::string("app-installation   ").append(wordOf(report.installation)));
+  output.writeLine(std::string("app-removal        ").append(wordOf(report.removal)));
+  writeList(output, "disabled", report.disabledTypes);
+  writeList(output, "account identifiers", report.identifiers);
+  writeList(output, "accounts", report.accounts);
+}
+
+ExitStatus run(const DeviceReportOptions& options, device::Device& device) {
+  const auto client = daemon::makeClient(device.platform());
+  if (!client) return reportUnusable(client.error());
+  // To the plug-in a register that cannot be read is one without apps.
+  if (const auto apps = host::appsOn(device); !apps) return reportUnusable(apps.error());
+  const Report report = ask(**client, device.platform().sharedConnection());
+  StandardOutput output;
+  if (options.json) {
+    output.writeLine(indented(reportJson(report)));
+  } else {
+    write(output, report);
+  }
+  return output.finish(ExitStatus::done);
+}
+
+}  // namespace
+
+void addReportCommand(CLI::App& line, Invocation& invocation) {
+  const CommandText text = {"report", "Tell how many apps a device holds, and whose they are.", kExamples};
+  addListingCommand(line, invocation, text, run);
+}
+
+}  // namespace appsync::cli

@@ -1,0 +1,33 @@
+#include "daemon/CoordinatorCleanup.h"
+
+#include "platform/SyncFramework.h"
+
+namespace appsync::daemon {
+namespace {
+
+using platform::ClientIdentity;
+using platform::CoordinatorKind;
+
+bool isLeftover(const device::CoordinatorSummary& coordinator) {
+  return coordinator.creator == ClientIdentity::CXClientSync &&
+         (coordinator.kind == CoordinatorKind::initiating || coordinator.kind == CoordinatorKind::updating);
+}
+
+}  // namespace
+
+void giveUpLeftovers(device::Device& device) {
+  device::InstallCoordination& coordination = device.services().installCoordination();
+  const auto coordinators = coordination.list();
+  if (!coordinators) return;
+  const Error reason = {std::string(platform::kZTErrorDomain), static_cast<long>(device::TransferFailure::interrupted),
+                        "the sync ended before the package came; it is offered again", nullptr};
+  for (const device::CoordinatorSummary& summary : *coordinators) {
+    if (!isLeftover(summary)) continue;
+    const auto coordinator =
+        coordination.coordinatorForApp(summary.kind, summary.identifier, ClientIdentity::CXClientSync,
+                                       platform::IfMissing::findNothing, nullptr, nullptr);
+    if (coordinator != nullptr) coordinator->cancelForReason(reason, ClientIdentity::CXClientSync).ignore();
+  }
+}
+
+}  // namespace appsync::daemon

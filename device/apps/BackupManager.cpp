@@ -1,0 +1,27 @@
+#include "device/apps/BackupManager.h"
+
+namespace appsync::device {
+
+Status BackupManager::keepRestoreData(std::string_view bundleIdentifier, const std::string& hostFolder) {
+  return app_data::keep(files_, database_, bundleIdentifier, hostFolder);
+}
+
+Status BackupManager::restoreDataNow(std::string_view bundleIdentifier) {
+  if (Status given = app_data::giveBack(files_, database_, bundleIdentifier); !given) return given;
+  Database::Session session(database_);
+  return app_data::forget(session, bundleIdentifier);
+}
+
+bool BackupManager::restoreDataExists(std::string_view bundleIdentifier, std::uint64_t* size) {
+  Database::Session session(database_);
+  const Result<bool> kept = app_data::isKept(session, bundleIdentifier, size);
+  return kept && *kept;
+}
+
+bool BackupManager::cancelApplicationRestore(std::string_view bundleIdentifier, ErrorSlot error) {
+  const Status dropped = app_data::drop(files_, database_, bundleIdentifier);
+  if (!dropped) setError(error, dropped.error());
+  return dropped.ok();
+}
+
+}  // namespace appsync::device

@@ -1,0 +1,92 @@
+#include "device/apps/PlaceholderBundle.h"
+
+#include <cerrno>
+#include <chrono>
+#include <optional>
+#include <string>
+#include <utility>
+
+#include <fcntl.h>
+
+#include "device/packages/BundleInfo.h"
+#include "device/packages/PackageReader.h"
+#include "device/storage/FileTree.h"
+#include "device/storage/SystemCalls.h"
+#include "platform/Keys.h"
+#include "plist/PropertyList.h"
+
+namespace appsync::device {
+
+namespace {
+
+constexpr std::string_view kIconFile = "Icon.png";
+constexpr std::string_view kLaunchProhibitedKey = "TSApplicationLaunchProhibited";
+
+std::optional<Bytes> readIcon(DeviceFileSystem& files, const PlaceholderContents& placeholder) {
+  if (!placeholder.iconPath) return std::nullopt;
+  const Result<FileDescriptor> file = files.root().open(*placeholder.iconPath, O_RDONLY | O_NONBLOCK);
+  Bytes bytes;
+  if (!file || tree::read(file->get(), kMaximumMetadataBytes, bytes) != 0) return std::nullopt;
+  return bytes;
+}
+
+const std::string& shownName(const PlaceholderContents& placeholder) {
+  return placeholder.bundleName.empty() ? placeholder.identifier : placeholder.bundleName;
+}
+
+std::optional<std::string> versionOf(const PlaceholderContents& placeholder) {
+  if (placeholder.attributes.bundleVersion()) return placeholder.attributes.bundleVersion();
+  return ownedStringIn(placeholder.attributes.infoDictionary().find(platform::BundleVersionKey));
+}
+
+/// The app's own info dictionary, with what the placeholder says of it.
+Result<Bytes> infoDocument(const PlaceholderContents& placeholder, const StoredBundle& bundle, bool hasIcon) {
+  plist::Dictionary info = placeholder.attributes.infoDictionary();
+  info.set(platform::BundleIdentifierKey, placeholder.identifier);
+  info.set(platform::BundleDisplayNameKey, bundle.name);
+  info.set(platform::BundleExecutableKey, bundle.name);
+  info.set(kLaunchProhibitedKey, placeholder.attributes.launchProhibited());
+  if (bundle.version) info.set(platform::BundleVersionKey, *bundle.version);
+  if (hasIcon) {
+    info.set(platform::BundleIconFileKey, kIconFile);
+  } else {
+    info.erase(platform::BundleIconFileKey);
+  }
+  return plist::writeBinary(info);
+}
+
+Status writeApp(const NewContainer& container, const std::string& folder, ByteView info,
+                const std::optional<Bytes>& icon) {
+  int number = sys::makeFolder(container.folder(), folder.c_str());
+  if (number != 0) return Error::fromErrno(number, folder);
+  const FileDescriptor app(openat(container.folder(), folder.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+  if (!app.valid()) return Error::fromErrno(errno, folder);
+  number = tree::create(app.get(), std::string(kInfoFile).c_str(), info);
+  if (number == 0 && icon) number = tree::create(app.get(), std::string(kIconFile).c_str(), *icon);
+  if (number != 0) return Error::fromErrno(number, folder);
+  return {};
+}
+
+}  // namespace
+
+Result<PlaceholderContainer> makePlaceholder(DeviceFileSystem& files, const PlaceholderContents& placeholder) {
+  const std::optional<Bytes> icon = readIcon(files, placeholder);
+  StoredBundle bundle;
+  bundle.folder = placeholder.identifier + ".app";
+  bundle.name = shownName(placeholder);
+  bundle.version = versionOf(placeholder);
+  bundle.installType = placeholder.installType;
+  bundle.installedAt = std::chrono::duration<double>(std::chrono::system_clock::now().time_since_epoch()).count();
+  const Result<Bytes> info = infoDocument(placeholder, bundle, icon.has_value());
+  if (!info) return info.error().in("the placeholder's Info.plist");
+  bundle.bytes = info->size() + (icon ? icon->size() : 0);
+  Result<NewContainer> container = NewContainer::make(files);
+  if (!container) return container.error();
+  if (Status written = writeApp(*container, bundle.folder, *info, icon); !written) return written.error();
+  if (placeholder.storeMetadata) {
+    if (Status kept = container->writeFile(kStoreMetadataFile, *placeholder.storeMetadata); !kept) return kept.error();
+  }
+  return PlaceholderContainer{std::move(container).value(), std::move(bundle)};
+}
+
+}  // namespace appsync::device

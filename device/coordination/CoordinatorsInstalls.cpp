@@ -1,0 +1,206 @@
+// What the service does of itself: installs, removals, what an earlier process left.
+#include <algorithm>
+
+#include <unistd.h>
+
+#include "device/coordination/CoordinatorHandle.h"
+#include "device/coordination/Coordinators.h"
+#include "device/storage/SystemCalls.h"
+
+namespace appsync::device {
+
+using platform::ClientIdentity;
+using platform::InstallObserverDelegate;
+using platform::TSInstallState;
+
+namespace {
+
+/// What the installer is asked; the placeholder says what the options do not.
+InstallRequest requestOf(const CoordinatorState& coordinator) {
+  InstallRequest request;
+  request.identifier = coordinator.identifier;
+  request.installType = coordinator.placeholder->installType;
+  request.licenceData = coordinator.placeholder->licence;
+  request.defaultStoreMetadata = coordinator.placeholder->storeMetadata;
+  if (coordinator.options) {
+    request.installType = coordinator.options->installType;
+    if (coordinator.options->storeMetadata) request.defaultStoreMetadata = coordinator.options->storeMetadata;
+  }
+  return request;
+}
+
+}  // namespace
+
+void Coordinators::begin() {
+  Result<CoordinatorList> left = [this] {
+    Database::Session session(database_);
+    return coordinator_table::all(session);
+  }();
+  if (!left) return;
+  const std::lock_guard lock(mutex_);
+  for (const Coordinator& coordinator : *left)
+    coordinators_[coordinator->identifier].push_back(coordinator);
+  for (const Coordinator& coordinator : *left) {
+    keepShown(*coordinator);
+    // Nobody sends its package just now.
+    const auto progress = registry_.runningInstalls().find(coordinator->identifier);
+    if (progress != nullptr) progress->setInstallState(TSInstallState::Waiting);
+    advance(coordinator);
+    endIfDemoted(coordinator);
+  }
+}
+
+void Coordinators::keepShown(const CoordinatorState& coordinator) {
+  if (!coordinator.showsPlaceholder() || coordinator.stage != CoordinatorStage::waiting) return;
+  const auto app = registry_.recordForIdentifier(coordinator.identifier, platform::PlaceholderLookup::on);
+  const bool isShown = app != nullptr && app->isPlaceholder() && app->installProgress() != nullptr;
+  // A home screen without it does not keep the app from being installed.
+  if (!isShown) show(*coordinator.placeholder, [](Database::Session&) {}).ignore();
+  followPromise(coordinator);
+}
+
+void Coordinators::end() {
+  {
+    const std::lock_guard lock(mutex_);
+    isEnding_ = true;
+  }
+  // First the removals, which may wait for an install.
+  removalQueue_.reset();
+  installs_.reset();
+  observers_->end();
+  storeWhatIsAhead();
+}
+
+void Coordinators::storeWhatIsAhead() {
+  const std::lock_guard lock(mutex_);
+  std::vector<const CoordinatorState*> ahead;
+  for (const auto& [identifier, ofApp] : coordinators_) {
+    for (const Coordinator& coordinator : ofApp) {
+      if (coordinator->appAsset && coordinator->appAsset->isAhead) ahead.push_back(coordinator.get());
+    }
+  }
+  if (ahead.empty()) return;
+  Database::Transaction transaction(database_);
+  for (const CoordinatorState* coordinator : ahead) {
+    coordinator_table::storePromise(transaction, coordinator->number, PromiseRole::appAsset, *coordinator->appAsset)
+        .ignore();
+  }
+  transaction.commit().ignore();
+}
+
+void Coordinators::advance(const Coordinator& coordinator) {
+  if (isEnding_ || !coordinator->isReady()) return;
+  coordinator->stage = CoordinatorStage::installing;
+  ++installing_;
+  installs_->add([this, coordinator] { install(coordinator); });
+}
+
+void Coordinators::install(const Coordinator& coordinator) {
+  InstallRequest request;
+  {
+    const std::lock_guard lock(mutex_);
+    if (isEnding_) {
+      coordinator->stage = CoordinatorStage::waiting;
+      --installing_;
+      changed_.notify_all();
+      return;
+    }
+    request = requestOf(*coordinator);
+  }
+  // Nobody changes the package's promise from here on.
+  request.alongside = [&](Database::Session& session) { coordinator_table::remove(session, *coordinator).ignore(); };
+  const auto& path = coordinator->appAsset->transferPath;
+  const Status installed = path ? registry_.installPackage(*path, request)
+                                : coordinationError(CoordinationFailure::noPackage,
+                                                    "the app-asset promise is complete and names no package");
+  if (installed) removePackage(*coordinator);
+  const std::lock_guard lock(mutex_);
+  if (!installed) {
+    registry_.runningInstalls().end(coordinator->identifier, TSInstallState::Failed);
+    // What cannot be taken away now is tried again when the device is opened next.
+    if (erase(*coordinator)) removePackage(*coordinator);
+  }
+  close(coordinator, installed.failure());
+  // The end of one coordinator's install is the end of the app's placeholder.
+  for (const Coordinator& other : ofApp(coordinator->identifier))
+    keepShown(*other);
+  tell(coordinator, &InstallObserverDelegate::coordinatorDidCompleteSuccessfully);
+  --installing_;
+  changed_.notify_all();
+}
+
+void Coordinators::removePackage(const CoordinatorState& coordinator) {
+  const auto path = coordinator.ownPackage();
+  if (!path) return;
+  const Result<RootFolder::Place> place = files_.root().place(*path);
+  // A folder in a package's place is not the service's to remove.
+  if (place) static_cast<void>(sys::removeFile(place->folder.get(), place->name.c_str()));
+  Database::Session session(database_);
+  coordinator_table::forgetSpentPackage(session, *path).ignore();
+}
+
+bool Coordinators::isInstalling(std::string_view identifier) const {
+  return std::ranges::any_of(ofApp(identifier), [](const Coordinator& coordinator) {
+    return coordinator->stage == CoordinatorStage::installing;
+  });
+}
+
+bool Coordinators::prioritize(std::string_view identifier) {
+  const std::lock_guard lock(mutex_);
+  const CoordinatorList coordinators = ofApp(identifier);
+  if (coordinators.empty() || isEnding_) return false;
+  registry_.prioritizeInstall(identifier);
+  for (const Coordinator& coordinator : coordinators)
+    tell(coordinator, &InstallObserverDelegate::coordinatorShouldPrioritize);
+  return true;
+}
+
+void Coordinators::uninstall(std::string identifier, Completion completion) {
+  {
+    const std::lock_guard lock(mutex_);
+    if (!isEnding_) {
+      ++removals_;
+      removalQueue_->add([this, identifier = std::move(identifier), completion = std::move(completion)] {
+        completion(uninstallNow(identifier));
+        const std::lock_guard counting(mutex_);
+        --removals_;
+        changed_.notify_all();
+      });
+      return;
+    }
+  }
+  completion(checkOpen().failure());
+}
+
+std::optional<Error> Coordinators::uninstallNow(const std::string& identifier) {
+  bool hadCoordinators = false;
+  {
+    std::unique_lock lock(mutex_);
+    changed_.wait(lock, [&] { return !isInstalling(identifier); });
+    const Error reason = coordinationError(CoordinationFailure::appRemoved, "the app is being removed");
+    for (const Coordinator& coordinator : ofApp(identifier)) {
+      hadCoordinators = true;
+      if (Status cancelled = cancelNow(coordinator, reason, ClientIdentity::CXClientUser); !cancelled) {
+        return cancelled.failure();
+      }
+    }
+  }
+  if (hadCoordinators && !registry_.applicationIsInstalled(identifier)) return std::nullopt;
+  return registry_.uninstallApplication(identifier).failure();
+}
+
+bool Coordinators::waitUntilIdle(std::chrono::steady_clock::time_point deadline) {
+  const auto isIdle = [this] { return installing_ == 0 && removals_ == 0; };
+  for (;;) {
+    {
+      std::unique_lock lock(mutex_);
+      if (!changed_.wait_until(lock, deadline, isIdle)) return false;
+    }
+    if (!observers_->waitUntilTold(deadline)) return false;
+    // Who was told may have set something off.
+    const std::lock_guard lock(mutex_);
+    if (isIdle()) return true;
+  }
+}
+
+}  // namespace appsync::device

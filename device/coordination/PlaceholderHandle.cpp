@@ -1,0 +1,66 @@
+#include "device/coordination/PlaceholderHandle.h"
+
+#include "device/coordination/Coordinators.h"
+#include "device/coordination/PromiseHandles.h"
+#include "plist/PropertyList.h"
+
+namespace appsync::device {
+
+std::shared_ptr<PlaceholderState> stateOf(const Coordinators& coordinators,
+                                          const std::shared_ptr<platform::Placeholder>& placeholder) {
+  const auto* own = dynamic_cast<const AppPlaceholder*>(placeholder.get());
+  return own == nullptr ? nullptr : own->stateIn(coordinators);
+}
+
+Status AppPlaceholder::setIconPromise(std::shared_ptr<platform::PromisedTransferToPath> promise) {
+  const auto icon = stateOf(*coordinators_, promise);
+  return coordinators_->configure(state_, [&](PlaceholderState& copy) -> Status {
+    const bool isUsable = icon != nullptr && !icon->role && !icon->isCancelled && copy.icon == nullptr;
+    if (!isUsable) return coordinationError(CoordinationFailure::notUsable, "this is no icon for the placeholder");
+    copy.icon = icon;
+    return {};
+  });
+}
+
+Status AppPlaceholder::setPlaceholderAttributes(const platform::PlaceholderAttributes& attributes) {
+  Result<Bytes> document = plist::writeBinary(attributes.infoDictionary());
+  if (!document) return document.error().in("the placeholder's info dictionary");
+  return coordinators_->configure(state_, [&](PlaceholderState& copy) -> Status {
+    copy.attributes = attributes;
+    copy.infoDocument = std::move(document).value();
+    return {};
+  });
+}
+
+Status AppPlaceholder::setMetadata(const std::optional<platform::StoreMetadata>& metadata) {
+  std::optional<Bytes> kept;
+  if (metadata) {
+    Result<Bytes> document = plist::writeBinary(metadata->dictionary());
+    if (!document) return document.error().in("the store metadata");
+    kept = std::move(document).value();
+  }
+  return coordinators_->configure(state_, [&](PlaceholderState& copy) -> Status {
+    copy.storeMetadata = std::move(kept);
+    return {};
+  });
+}
+
+Status AppPlaceholder::setSinfData(ByteView licence) {
+  return coordinators_->configure(state_, [&](PlaceholderState& copy) -> Status {
+    copy.licence = Bytes(licence.begin(), licence.end());
+    return {};
+  });
+}
+
+Status AppPlaceholder::setConfigurationComplete() {
+  return coordinators_->configure(state_, [](PlaceholderState& copy) -> Status {
+    copy.isConfigured = true;
+    return {};
+  });
+}
+
+Status AppPlaceholder::cancelForReason(const Error&, platform::ClientIdentity client) {
+  return coordinators_->takeBack(state_, client);
+}
+
+}  // namespace appsync::device

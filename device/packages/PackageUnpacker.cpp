@@ -1,0 +1,116 @@
+#include <cerrno>
+#include <utility>
+
+#include <fcntl.h>
+
+#include "device/packages/InstallerError.h"
+#include "device/packages/Package.h"
+#include "device/storage/RootDirectory.h"
+#include "device/storage/SystemCalls.h"
+
+namespace appsync::device {
+
+namespace {
+
+/// Makes the files and folders of one package. Entries mostly come folder by folder, so the last folder stays open.
+class Unpacking {
+ public:
+  Unpacking(PackageReader& package, int container) : package_(package), container_(container) {}
+
+  Status unpack(const PackageReader::Entry& entry) {
+    if (entry.kind == PackageReader::Kind::folder) return outcome(enter(entry.path), entry.path);
+    const std::size_t slash = entry.path.rfind('/');
+    const bool top = slash == entry.path.npos;
+    if (const int number = top ? 0 : enter(entry.path.substr(0, slash)); number != 0)
+      return outcome(number, entry.path);
+    FileDescriptor file;
+    const mode_t mode = entry.executable ? 0755 : sys::kFileMode;
+    const int number = top ? sys::createFile(container_, entry.path.c_str(), mode, file)
+                           : sys::createFile(folder_.get(), entry.path.c_str() + slash + 1, mode, file);
+    if (number != 0) return outcome(number, entry.path);
+    return fill(file.get(), entry.path);
+  }
+
+  /// "Info.plist", once it was unpacked.
+  [[nodiscard]] const std::optional<Bytes>& info() const noexcept { return info_; }
+
+ private:
+  /// Opens a folder of the container, made with its parents where it is not there yet, and keeps it as the current one.
+  int enter(const std::string& path) {
+    if (path == path_ && folder_.valid()) return 0;
+    FileDescriptor opened;
+    int number = open(container_, path, opened);
+    if (number == ENOENT) number = make(path, opened);
+    if (number != 0) return number;
+    folder_ = std::move(opened);
+    path_ = path;
+    return 0;
+  }
+
+  static int open(int folder, const std::string& path, FileDescriptor& opened) {
+    return openBeneath(folder, path, O_PATH | O_DIRECTORY | O_NOFOLLOW, 0, Resolution::kernel, opened);
+  }
+
+  int make(const std::string& path, FileDescriptor& opened) {
+    const std::size_t slash = path.rfind('/');
+    if (slash == path.npos) {
+      if (const int number = sys::makeFolder(container_, path.c_str()); number != 0) return number;
+      return open(container_, path, opened);
+    }
+    if (const int number = enter(path.substr(0, slash)); number != 0) return number;
+    const std::string name = path.substr(slash + 1);
+    if (const int number = sys::makeFolder(folder_.get(), name.c_str()); number != 0) return number;
+    return open(folder_.get(), name, opened);
+  }
+
+  Status fill(int file, const std::string& path) {
+    const bool isInfo = isInfoFile(path, package_.appFolder());
+    if (isInfo) info_.emplace();
+    PackageReader::Block block;
+    for (;;) {
+      const Result<bool> more = package_.nextBlock(block);
+      if (!more) return more.error();
+      if (!*more) return {};
+      if (const int number = sys::writeAt(file, block.bytes, block.offset); number != 0) return outcome(number, path);
+      if (isInfo && info_->size() <= kMaximumMetadataBytes) {
+        info_->insert(info_->end(), block.bytes.begin(), block.bytes.end());
+      }
+    }
+  }
+
+  static Status outcome(int number, const std::string& path) {
+    if (number == 0) return {};
+    if (number != EEXIST && number != ENOTDIR && number != ELOOP) return Error::fromErrno(number, path);
+    return installerError(InstallerFailure::duplicateEntry,
+                          "the package holds \"" + path + "\" as a file and as a folder; make the package again");
+  }
+
+  PackageReader& package_;
+  int container_;
+  std::string path_;
+  FileDescriptor folder_;
+  std::optional<Bytes> info_;
+};
+
+}  // namespace
+
+Result<UnpackedPackage> unpackPackage(PackageReader& package, int folder,
+                                      const std::function<bool(double fraction)>& goOn) {
+  Unpacking unpacking(package, folder);
+  PackageReader::Entry entry;
+  for (;;) {
+    const Result<bool> more = package.next(entry);
+    if (!more) return more.error();
+    if (!*more) break;
+    if (Status unpacked = unpacking.unpack(entry); !unpacked) return unpacked.error();
+    if (!goOn(package.fraction())) {
+      return installerError(InstallerFailure::cancelled, "the install was cancelled; start it again to have the app");
+    }
+  }
+  if (!unpacking.info()) return missingInfo(package.appFolder());
+  Result<BundleInfo> info = readBundleInfo(*unpacking.info());
+  if (!info) return info.error();
+  return UnpackedPackage{package.appFolder(), std::move(info).value(), package.unpackedBytes()};
+}
+
+}  // namespace appsync::device

@@ -1,0 +1,22 @@
+// The profile service: restrictions as the device's settings say.
+#pragma once
+
+#include "device/services/Settings.h"
+#include "platform/ProfileConnection.h"
+
+namespace appsync::device {
+
+class Restrictions final : public platform::ProfileConnection {
+ public:
+  /// `settings` must outlive it.
+  explicit Restrictions(Settings& settings) : settings_(settings) {}
+
+  [[nodiscard]] platform::RestrictionValue effectiveBoolValueForSetting(platform::RestrictionSetting setting) override {
+    return settings_.restriction(setting);
+  }
+
+ private:
+  Settings& settings_;
+};
+
+}  // namespace appsync::device

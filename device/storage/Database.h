@@ -1,0 +1,183 @@
+// The device's database: a small layer over SQLite that is safe to use from any thread.
+#pragma once
+
+#include <concepts>
+#include <cstdint>
+#include <map>
+#include <memory>
+#include <mutex>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <type_traits>
+
+#include "base/Bytes.h"
+#include "base/Error.h"
+#include "device/storage/Access.h"
+
+struct sqlite3;
+struct sqlite3_stmt;
+
+namespace appsync::device {
+
+/// Error domain of the database; codes are SQLite's extended result codes.
+inline constexpr std::string_view kSQLiteDomain = "SQLite";
+
+/// What a committed transaction survives. A kill of the process it always does, and a loss of power never leaves half
+/// of one; `power` also waits until the disk has it.
+enum class Durability { process, power };
+
+/// One connection, which threads take in turn. Write-ahead log: readers in other processes neither wait nor make wait.
+///
+///     Database::Session session(database);
+///     Statement query = session.prepare("select name, size from things where kind = ?", kind);
+///     while (query.next()) use(query.text(0), query.integer(1));
+///     if (!query.status()) return query.status();
+///
+///     Database::Transaction transaction(database);
+///     transaction.run("insert into things values (?, ?, ?)", name, kind, size).ignore();
+///     return transaction.commit();
+///
+/// A thread has one session (or transaction) at a time, and calls out to nothing that might open another while it has.
+/// Every service makes its own tables: a `static constexpr const char* kSchema` of "create table if not exists …"
+/// statements, listed in `Device.cpp`.
+class Database {
+ public:
+  class Session;
+  class Transaction;
+
+  /// Opens the file at a host path; `exclusive` makes it if it is missing, `readOnly` changes nothing. Whether one
+  /// process or several open it is the caller's business.
+  [[nodiscard]] static Result<std::unique_ptr<Database>> open(const std::string& path, Access access);
+  ~Database();
+  Database(const Database&) = delete;
+  Database& operator=(const Database&) = delete;
+
+ private:
+  friend class Statement;
+
+  /// A statement that stays prepared for as long as the connection lives.
+  struct Prepared {
+    sqlite3_stmt* statement = nullptr;
+    bool busy = false;
+  };
+
+  explicit Database(sqlite3* connection) : connection_(connection) {}
+
+  std::mutex turn_;
+  // Under turn_:
+  sqlite3* connection_;
+  std::map<std::string, Prepared, std::less<>> prepared_;
+};
+
+/// A statement with its parameters bound. Lives within a session. The first failure sticks: `next` is false from then
+/// on.
+class Statement {
+ public:
+  Statement(Statement&& other) noexcept;
+  Statement& operator=(Statement&&) = delete;
+  ~Statement();
+
+  /// Steps to the next row; false at the end and on failure.
+  [[nodiscard]] bool next();
+  /// Success, or what made `next` end early.
+  [[nodiscard]] const Status& status() const noexcept { return status_; }
+
+  // Columns of the current row, from 0. Views hold until the next step. Other types are converted as SQLite does;
+  // a null is empty or 0.
+  [[nodiscard]] bool isNull(int column) const;
+  [[nodiscard]] std::int64_t integer(int column) const;
+  [[nodiscard]] double real(int column) const;
+  [[nodiscard]] std::string_view text(int column) const;
+  [[nodiscard]] ByteView blob(int column) const;
+  [[nodiscard]] std::optional<std::string> optionalText(int column) const;
+
+ private:
+  friend class Database::Session;
+
+  Statement(Database& database, std::string_view sql);
+
+  void bind(int index, std::nullptr_t);
+  void bind(int index, std::int64_t value);
+  void bind(int index, double value);
+  void bind(int index, std::string_view value);
+  void bind(int index, ByteView value);
+  template <std::integral T>
+  void bind(int index, T value) {
+    bind(index, static_cast<std::int64_t>(value));
+  }
+  template <class T>
+  requires std::is_enum_v<T>
+  void bind(int index, T value) { bind(index, static_cast<std::int64_t>(value)); }
+  template <class T>
+  requires std::convertible_to<const T&, std::string_view>
+  void bind(int index, const T& value) { bind(index, static_cast<std::string_view>(value)); }
+  template <class T>
+  void bind(int index, const std::optional<T>& value) {
+    value ? bind(index, *value) : bind(index, nullptr);
+  }
+  void bind(int index, const Bytes& value) { bind(index, ByteView(value)); }
+
+  void check(int result);
+
+  sqlite3* connection_;
+  sqlite3_stmt* statement_ = nullptr;
+  /// Where the statement goes back to; null when it is this object's own.
+  Database::Prepared* home_ = nullptr;
+  Status status_;
+};
+
+/// A thread's turn on the connection. Each statement outside a transaction is one of its own.
+class Database::Session {
+ public:
+  explicit Session(Database& database) : database_(database), lock_(database.turn_) {}
+
+  /// Binds `arguments` (integers, enumerations, reals, texts, bytes, optionals of these, nullptr) to the "?" in order.
+  /// The arguments are copied. Failures show in the statement's status.
+  template <class... Arguments>
+  [[nodiscard]] Statement prepare(std::string_view sql, const Arguments&... arguments) {
+    Statement statement(database_, sql);
+    int index = 0;
+    (statement.bind(++index, arguments), ...);
+    return statement;
+  }
+
+  /// Runs a statement to its end.
+  template <class... Arguments>
+  Status run(std::string_view sql, const Arguments&... arguments) {
+    Statement statement = prepare(sql, arguments...);
+    return finish(statement);
+  }
+
+  /// Runs several statements, separated by semicolons and without parameters, that are not worth keeping prepared.
+  Status runScript(const char* sql);
+
+  /// Rows that the last insert, update or delete touched.
+  [[nodiscard]] std::int64_t changes() const;
+
+ protected:
+  Status finish(Statement& statement);
+
+  Database& database_;
+  std::unique_lock<std::mutex> lock_;
+  /// The first statement that failed.
+  Status failure_;
+  /// After a failure nothing more is run.
+  bool allOrNothing_ = false;
+};
+
+/// A session whose statements take effect together, or not at all: without a `commit` its end takes them back.
+class Database::Transaction : public Database::Session {
+ public:
+  explicit Transaction(Database& database, Durability durability = Durability::process);
+  ~Transaction();
+
+  /// Fails, and changes nothing, when any `run` of this transaction failed, with the first of their errors.
+  [[nodiscard]] Status commit();
+
+ private:
+  Durability durability_;
+  bool open_ = false;
+};
+
+}  // namespace appsync::device

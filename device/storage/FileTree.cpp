@@ -1,0 +1,165 @@
+#include "device/storage/FileTree.h"
+
+#include <cerrno>
+#include <cstring>
+#include <utility>
+#include <vector>
+
+#include <fcntl.h>
+#include <limits.h>
+#include <sys/stat.h>
+
+#include "device/storage/SystemCalls.h"
+
+namespace appsync::device {
+
+FolderEntries::FolderEntries(int folder) {
+  FileDescriptor own(openat(folder, ".", O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+  if (own.valid()) stream_.reset(fdopendir(own.get()));
+  if (stream_ == nullptr) {
+    failure_ = errno;
+  } else {
+    static_cast<void>(own.release());  // The stream's now.
+  }
+}
+
+const char* FolderEntries::next() {
+  while (stream_ != nullptr) {
+    errno = 0;
+    const dirent* entry = readdir(stream_.get());
+    if (entry == nullptr) {
+      failure_ = errno;
+      return nullptr;
+    }
+    if (std::strcmp(entry->d_name, ".") != 0 && std::strcmp(entry->d_name, "..") != 0) return entry->d_name;
+  }
+  return nullptr;
+}
+
+namespace tree {
+
+namespace {
+
+int copyFolder(int from, const struct stat& status, int toFolder, const char* to, std::uint64_t& bytes,
+               std::uint64_t* leftOut) {
+  if (const int number = sys::makeFolder(toFolder, to); number != 0) return number;
+  const FileDescriptor made(openat(toFolder, to, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+  if (!made.valid()) return errno;
+  FolderEntries entries(from);
+  while (const char* name = entries.next()) {
+    if (const int number = copy(from, name, made.get(), name, bytes, leftOut); number != 0) return number;
+  }
+  if (entries.failure() != 0) return entries.failure();
+  // What may not be entered or changed could not be moved or removed either.
+  return sys::setAttributes(made.get(), (status.st_mode & 0777) | S_IRWXU, status);
+}
+
+int copyFile(int from, const struct stat& status, int toFolder, const char* to, std::uint64_t& bytes) {
+  const mode_t mode = status.st_mode & 0777;
+  FileDescriptor made;
+  if (const int number = sys::createFile(toFolder, to, mode, made); number != 0) return number;
+  if (const int number = sys::copyContents(from, made.get(), bytes); number != 0) return number;
+  return sys::setAttributes(made.get(), mode, status);
+}
+
+int copyLink(int fromFolder, const char* from, int toFolder, const char* to) {
+  char target[PATH_MAX];
+  const ssize_t length = readlinkat(fromFolder, from, target, sizeof target - 1);
+  if (length < 0) return errno;
+  target[length] = '\0';
+  return sys::makeLink(target, toFolder, to);
+}
+
+/// Empties a folder: its files go, its folders move to `work` and join `pending`, so that no depth needs more than one
+/// open folder.
+int flatten(int folder, int work, std::vector<std::string>& pending) {
+  FolderEntries entries(folder);
+  while (const char* name = entries.next()) {
+    int number = sys::removeFile(folder, name);
+    if (number == EISDIR || number == EPERM) {  // What a folder answers depends on the system.
+      std::string moved = sys::temporaryName();
+      number = sys::rename(folder, name, work, moved.c_str(), sys::Replace::yes);
+      if (number == 0) pending.push_back(std::move(moved));
+    }
+    if (number != 0) return number;
+  }
+  return entries.failure();
+}
+
+int removeFolder(int work, std::string name) {
+  std::vector<std::string> pending{std::move(name)};
+  while (!pending.empty()) {
+    const std::string folder = std::move(pending.back());
+    pending.pop_back();
+    const FileDescriptor opened(openat(work, folder.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+    if (!opened.valid()) return errno;
+    if (const int number = flatten(opened.get(), work, pending); number != 0) return number;
+    if (const int number = sys::removeEmptyFolder(work, folder.c_str()); number != 0) return number;
+  }
+  return 0;
+}
+
+}  // namespace
+
+int copy(int fromFolder, const char* from, int toFolder, const char* to, std::uint64_t& bytes, std::uint64_t* leftOut) {
+  const auto leaveOut = [&] {
+    if (leftOut != nullptr) ++*leftOut;
+    return leftOut != nullptr ? 0 : EINVAL;
+  };
+  struct stat status {};
+  // Non-blocking: opening a pipe must not wait for somebody to write into it.
+  const FileDescriptor source(openat(fromFolder, from, O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC));
+  if (!source.valid() && errno == ELOOP) return copyLink(fromFolder, from, toFolder, to);
+  if (!source.valid()) return errno == ENXIO ? leaveOut() : errno;  // The answer of sockets.
+  if (fstat(source.get(), &status) != 0) return errno;
+  if (S_ISDIR(status.st_mode)) return copyFolder(source.get(), status, toFolder, to, bytes, leftOut);
+  if (S_ISREG(status.st_mode)) return copyFile(source.get(), status, toFolder, to, bytes);
+  return leaveOut();
+}
+
+int create(int folder, const char* name, ByteView bytes) {
+  FileDescriptor file;
+  if (const int number = sys::createFile(folder, name, sys::kFileMode, file); number != 0) return number;
+  const int number = sys::writeAt(file.get(), bytes, 0);
+  if (number != 0) unlinkat(folder, name, 0);
+  return number;
+}
+
+int remove(int folder, const char* name, int work) {
+  std::string moved = sys::temporaryName();
+  if (const int number = sys::rename(folder, name, work, moved.c_str(), sys::Replace::yes); number != 0) return number;
+  const int number = sys::removeFile(work, moved.c_str());
+  return number == EISDIR || number == EPERM ? removeFolder(work, std::move(moved)) : number;
+}
+
+int empty(int folder, int work) {
+  FolderEntries entries(folder);
+  while (const char* name = entries.next()) {
+    if (const int number = remove(folder, name, work); number != 0) return number;
+  }
+  return entries.failure();
+}
+
+int read(int file, std::uint64_t most, Bytes& bytes) {
+  struct stat status {};
+  if (fstat(file, &status) != 0) return errno;
+  if (S_ISDIR(status.st_mode)) return EISDIR;
+  if (!S_ISREG(status.st_mode)) return EINVAL;
+  const auto expected = static_cast<std::uint64_t>(status.st_size);
+  if (expected > most) return EFBIG;
+  bytes.resize(expected);
+  std::size_t length = 0;
+  while (length < bytes.size()) {
+    const ssize_t got = ::read(file, bytes.data() + length, bytes.size() - length);
+    if (got < 0 && errno == EINTR) continue;
+    if (got < 0) return errno;
+    if (got == 0) break;  // It was cut meanwhile.
+    length += static_cast<std::size_t>(got);
+  }
+  bytes.resize(length);
+  return 0;
+}
+
+}  // namespace tree
+
+}  // namespace appsync::device

@@ -1,0 +1,143 @@
+#include "device/storage/SystemCalls.h"
+
+#include <cerrno>
+#include <cinttypes>
+#include <cstdio>
+
+#include <fcntl.h>
+#include <sys/random.h>
+
+#include "device/storage/FaultPoint.h"
+
+namespace appsync::device::sys {
+
+namespace {
+
+/// One step: the call, unless a test wants it to fail. Calls return -1 on failure.
+template <class Call>
+int perform(const char* name, Call call) {
+  if (const int injected = step(name); injected != 0) return injected;
+  for (;;) {
+    if (call() != -1) return 0;
+    if (errno != EINTR) return errno;
+  }
+}
+
+/// For file systems that rename, but not without replacing.
+int renameUnlessThere(int fromFolder, const char* from, int toFolder, const char* to) {
+  struct stat there {};
+  if (fstatat(toFolder, to, &there, AT_SYMLINK_NOFOLLOW) == 0) return EEXIST;
+  return renameat(fromFolder, from, toFolder, to) == 0 ? 0 : errno;
+}
+
+}  // namespace
+
+int makeFolder(int folder, const char* name) {
+  return perform("make folder", [&] { return mkdirat(folder, name, kFolderMode); });
+}
+
+int createFile(int folder, const char* name, mode_t mode, FileDescriptor& file) {
+  return perform("create file", [&] {
+    const int number = openat(folder, name, O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, mode);
+    file = FileDescriptor(number);
+    return number;
+  });
+}
+
+int writeAt(int file, ByteView bytes, std::int64_t offset) {
+  while (!bytes.empty()) {
+    ssize_t written = 0;
+    const int number = perform("write", [&] {
+      written = pwrite(file, bytes.data(), bytes.size(), offset);
+      return written < 0 ? -1 : 0;
+    });
+    if (number != 0) return number;
+    if (written == 0) return ENOSPC;
+    bytes = bytes.subspan(static_cast<std::size_t>(written));
+    offset += written;
+  }
+  return 0;
+}
+
+int makeLink(const char* target, int folder, const char* name) {
+  return perform("make link", [&] { return symlinkat(target, folder, name); });
+}
+
+int rename(int fromFolder, const char* from, int toFolder, const char* to, Replace replace) {
+  if (replace == Replace::yes) {
+    return perform("rename", [&] { return renameat(fromFolder, from, toFolder, to); });
+  }
+  const int number = perform("rename", [&] { return renameat2(fromFolder, from, toFolder, to, RENAME_NOREPLACE); });
+  return number == EINVAL || number == ENOSYS ? renameUnlessThere(fromFolder, from, toFolder, to) : number;
+}
+
+int removeFile(int folder, const char* name) {
+  return perform("remove file", [&] { return unlinkat(folder, name, 0); });
+}
+
+int removeEmptyFolder(int folder, const char* name) {
+  return perform("remove folder", [&] { return unlinkat(folder, name, AT_REMOVEDIR); });
+}
+
+int writeOut(int file) {
+  // The rename is journaled after the bytes are out, and a journal's commit makes the disk keep what came before it. So
+  // the order holds without waiting for a commit, which costs up to fifty times as much while packages are being
+  // unpacked.
+  constexpr unsigned kAll = SYNC_FILE_RANGE_WAIT_BEFORE | SYNC_FILE_RANGE_WRITE | SYNC_FILE_RANGE_WAIT_AFTER;
+  const int number = perform("write out", [&] { return sync_file_range(file, 0, 0, kAll); });
+  if (number != ENOSYS && number != EINVAL && number != EOPNOTSUPP) return number;
+  return perform("write out", [&] { return fdatasync(file); });
+}
+
+int syncFileSystem(int file) {
+  return perform("sync", [&] { return syncfs(file); });
+}
+
+int touch(int file) {
+  return perform("touch", [&] { return futimens(file, nullptr); });
+}
+
+int setAttributes(int file, mode_t mode, const struct stat& status) {
+  const timespec times[] = {status.st_atim, status.st_mtim};
+  const int number = perform("set attributes", [&] { return fchmod(file, mode) == 0 ? futimens(file, times) : -1; });
+  return number == EPERM || number == EOPNOTSUPP ? 0 : number;
+}
+
+int copyContents(int from, int to, std::uint64_t& bytes) {
+  constexpr std::size_t kMost = std::size_t{1} << 30;
+  for (;;) {
+    ssize_t copied = 0;
+    const int number = perform("copy", [&] {
+      copied = copy_file_range(from, nullptr, to, nullptr, kMost, 0);
+      return copied < 0 ? -1 : 0;
+    });
+    if (number == 0 && copied == 0) return 0;
+    if (number == 0) {
+      bytes += static_cast<std::uint64_t>(copied);
+      continue;
+    }
+    if (number != EXDEV && number != ENOSYS && number != EINVAL && number != EOPNOTSUPP) return number;
+    // Not between these two file systems: by hand, from where it stopped.
+    Bytes buffer(std::size_t{1} << 17);
+    const ssize_t got = read(from, buffer.data(), buffer.size());
+    if (got < 0 && errno != EINTR) return errno;
+    if (got == 0) return 0;
+    if (got < 0) continue;
+    const auto end = lseek(to, 0, SEEK_END);
+    if (end < 0) return errno;
+    const auto size = static_cast<std::size_t>(got);
+    if (const int failed = writeAt(to, ByteView(buffer).first(size), end); failed != 0) return failed;
+    bytes += size;
+  }
+}
+
+std::string temporaryName() {
+  std::uint64_t number = 0;
+  while (getrandom(&number, sizeof number, 0) != static_cast<ssize_t>(sizeof number)) {
+  }
+  char name[kTemporaryNameDigits + 1];
+  std::snprintf(name, sizeof name, "%016" PRIx64, number);
+  return name;
+}
+
+}  // namespace appsync::device::sys

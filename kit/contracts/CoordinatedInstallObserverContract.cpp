@@ -1,0 +1,268 @@
+// The part of the contract of coordinated installs that is about who hears of them.
+#include <atomic>
+#include <future>
+#include <memory>
+#include <set>
+#include <thread>
+
+#include "kit/contracts/CoordinationListener.h"
+#include "kit/contracts/EventCounter.h"
+#include "kit/contracts/InstallCoordinationContract.h"
+
+namespace appsync::test {
+
+using platform::ClientIdentity;
+using platform::InstallCoordinator;
+
+namespace {
+
+using Lines = std::vector<std::string>;
+using Connection = std::unique_ptr<platform::InstallObserver>;
+
+constexpr std::string_view kServiceName = "com.corvel.contract.observer";
+
+Connection connect(platform::InstallCoordination& service, platform::InstallObserverDelegate& delegate,
+                   const std::set<ClientIdentity>& clients = {ClientIdentity::CXClientSync}) {
+  Connection connection = service.initWithMachServiceName(kServiceName, clients, delegate);
+  EXPECT_NE(connection, nullptr);
+  return connection;
+}
+
+}  // namespace
+
+// What is told.
+
+TEST_P(CoordinatedInstallContract, AnInstallIsToldFromPlaceholderToCompletion) {
+  CoordinationListener listener;
+  const Connection connection = connect(service(), listener);
+  const Asset asset = prepare(*coordinator("com.a"));
+  subject().waitUntilIdle();
+  EXPECT_EQ(listener.heard(), Lines{"placeholder com.a"});
+  EXPECT_NE(listener.thread(), std::this_thread::get_id());
+  deliver(*asset, subject().makePackage("com.a", "1.0"));
+  subject().waitUntilIdle();
+  EXPECT_EQ(listener.heard(), (Lines{"placeholder com.a", "complete com.a"}));
+}
+
+TEST_P(CoordinatedInstallContract, AnInstallThatFailsIsToldAsCompleteWithAnError) {
+  CoordinationListener listener;
+  const Connection connection = connect(service(), listener);
+  const Asset asset = prepare(*coordinator("com.a"));
+  subject().waitUntilIdle();
+  deliver(*asset, subject().makeDamagedPackage("com.a"));
+  subject().waitUntilIdle();
+  EXPECT_EQ(listener.heard(), (Lines{"placeholder com.a", "complete com.a with error"}));
+}
+
+TEST_P(CoordinatedInstallContract, NoOperationWaitsForACallback) {
+  std::promise<void> done;
+  const std::shared_future<void> end = done.get_future().share();
+  CoordinationListener listener([&end](InstallCoordinator&) { end.wait(); });
+  const Connection connection = connect(service(), listener);
+  const Asset asset = prepare(*coordinator("com.a"));
+  done.set_value();
+  subject().waitUntilIdle();
+  EXPECT_EQ(listener.heard(), Lines{"placeholder com.a"});
+}
+
+TEST_P(CoordinatedInstallContract, WhatTheUserWantsIsTold) {
+  CoordinationListener listener;
+  const Connection connection = connect(service(), listener);
+  const Asset asset = prepare(*coordinator("com.a"));
+  subject().waitUntilIdle();
+  subject().prioritize("com.a");
+  subject().waitUntilIdle();
+  subject().cancelByUser("com.a");
+  subject().waitUntilIdle();
+  const Lines heard = listener.heard();
+  ASSERT_EQ(heard.size(), 3U);
+  EXPECT_EQ(heard[1], "prioritize com.a");
+  EXPECT_TRUE(heard[2].starts_with("cancelled com.a by 2 for ")) << heard[2];
+}
+
+TEST_P(CoordinatedInstallContract, ACancellationByAnotherClientIsToldWithItsReason) {
+  CoordinationListener listener;
+  const Connection connection = connect(service(), listener);
+  EXPECT_TRUE(coordinator("com.a")->cancelForReason(reason(), kStore));
+  subject().waitUntilIdle();
+  EXPECT_EQ(listener.heard(), Lines{"cancelled com.a by 1 for ZTError 30"});
+}
+
+TEST_P(CoordinatedInstallContract, WhoCancelsItsOwnIsNotToldSo) {
+  CoordinationListener listener;
+  const Connection connection = connect(service(), listener);
+  EXPECT_TRUE(cancel(*coordinator("com.a")));
+  subject().waitUntilIdle();
+  EXPECT_EQ(listener.heard(), Lines{});
+}
+
+TEST_P(CoordinatedInstallContract, WhatHappenedToOneAppIsToldInOrder) {
+  CoordinationListener listener;
+  const Connection connection = connect(service(), listener);
+  const Asset asset = prepare(*coordinator("com.a"));
+  subject().prioritize("com.a");
+  deliver(*asset, subject().makePackage("com.a", "1.0"));
+  subject().waitUntilIdle();
+  EXPECT_EQ(listener.count("placeholder com.a"), 1U);
+  EXPECT_EQ(listener.count("prioritize com.a"), 1U);
+  EXPECT_EQ(listener.heard().back(), "complete com.a");
+}
+
+TEST_P(CoordinatedInstallContract, ACallbackGetsTheCoordinatorThatItIsAbout) {
+  CoordinationListener listener([](InstallCoordinator& told) {
+    EXPECT_EQ(told.kind(), Kind::updating);
+    EXPECT_EQ(told.creatorIdentifier(), kSync);
+    EXPECT_TRUE(told.hasPlaceholderPromise());
+    EXPECT_FALSE(told.description().empty());
+  });
+  const Connection connection = connect(service(), listener);
+  EXPECT_TRUE(coordinator("com.a", Kind::updating)->setPlaceholderPromise(makeConfiguredPlaceholder("com.a")));
+  subject().waitUntilIdle();
+  EXPECT_EQ(listener.heard(), Lines{"placeholder com.a"});
+}
+
+// Who is told.
+
+TEST_P(CoordinatedInstallContract, AConnectionReportsTheCoordinatorsOfItsClientsOnly) {
+  CoordinationListener syncs;
+  CoordinationListener stores;
+  CoordinationListener both;
+  CoordinationListener nobodys;
+  const Connection first = connect(service(), syncs, {kSync});
+  const Connection second = connect(service(), stores, {kStore});
+  const Connection third = connect(service(), both, {kSync, kStore});
+  const Connection fourth = connect(service(), nobodys, {});
+  const Coordinator own = coordinator("com.a");
+  const Coordinator foreign = coordinator("com.b", Kind::initiating, kStore);
+  subject().prioritize("com.a");
+  subject().waitUntilIdle();
+  subject().prioritize("com.b");
+  subject().waitUntilIdle();
+  EXPECT_EQ(syncs.heard(), Lines{"prioritize com.a"});
+  EXPECT_EQ(stores.heard(), Lines{"prioritize com.b"});
+  EXPECT_EQ(both.heard(), (Lines{"prioritize com.a", "prioritize com.b"}));
+  EXPECT_EQ(nobodys.heard(), Lines{});
+}
+
+TEST_P(CoordinatedInstallContract, ACoordinatorReportsToItsOwnObserver) {
+  const auto observer = std::make_shared<CoordinationListener>();
+  coordinator("com.a")->setObserver(observer);
+  const Coordinator other = coordinator("com.b");
+  subject().prioritize("com.a");
+  subject().prioritize("com.b");
+  subject().waitUntilIdle();
+  EXPECT_EQ(observer->heard(), Lines{"prioritize com.a"});
+}
+
+TEST_P(CoordinatedInstallContract, WhoObservesTwiceHearsOnce) {
+  const auto observer = std::make_shared<CoordinationListener>();
+  const Connection connection = connect(service(), *observer);
+  const Coordinator made = coordinator("com.a");
+  made->setObserver(observer);
+  made->setObserver(observer);
+  const Asset asset = prepare(*made);
+  deliver(*asset, subject().makePackage("com.a", "1.0"));
+  subject().waitUntilIdle();
+  EXPECT_EQ(observer->heard(), (Lines{"placeholder com.a", "complete com.a"}));
+}
+
+TEST_P(CoordinatedInstallContract, ALaterObserverTakesThePlaceOfAnEarlierOne) {
+  const auto earlier = std::make_shared<CoordinationListener>();
+  const auto later = std::make_shared<CoordinationListener>();
+  const Coordinator made = coordinator("com.a");
+  made->setObserver(earlier);
+  made->setObserver(later);
+  subject().prioritize("com.a");
+  subject().waitUntilIdle();
+  EXPECT_EQ(earlier->heard(), Lines{});
+  EXPECT_EQ(later->heard(), Lines{"prioritize com.a"});
+}
+
+TEST_P(CoordinatedInstallContract, AnObserverThatHasGoneIsNotMissed) {
+  auto observer = std::make_shared<CoordinationListener>();
+  const Coordinator made = coordinator("com.a");
+  made->setObserver(observer);
+  observer.reset();
+  subject().prioritize("com.a");
+  deliver(*prepare(*made), subject().makePackage("com.a", "1.0"));
+  subject().waitUntilIdle();
+  EXPECT_EQ(stateOf("com.a"), "installed");
+}
+
+TEST_P(CoordinatedInstallContract, AnObserverStillHearsWhenItsConnectionHasClosed) {
+  const auto observer = std::make_shared<CoordinationListener>();
+  Connection connection = connect(service(), *observer);
+  coordinator("com.a")->setObserver(observer);
+  connection.reset();
+  subject().prioritize("com.a");
+  subject().waitUntilIdle();
+  EXPECT_EQ(observer->heard(), Lines{"prioritize com.a"});
+}
+
+// Connections.
+
+TEST_P(CoordinatedInstallContract, AClosedConnectionReportsNothingMore) {
+  CoordinationListener listener;
+  CoordinationListener witness;
+  Connection connection = connect(service(), listener);
+  const Connection open = connect(service(), witness);
+  const Coordinator made = coordinator("com.a");
+  connection.reset();
+  subject().prioritize("com.a");
+  subject().waitUntilIdle();
+  EXPECT_EQ(listener.heard(), Lines{});
+  EXPECT_EQ(witness.heard(), Lines{"prioritize com.a"});
+}
+
+TEST_P(CoordinatedInstallContract, ClosingAConnectionWaitsForItsRunningCallback) {
+  Occurrences begun;
+  Occurrences mayEnd;
+  std::atomic<bool> hasEnded = false;
+  CoordinationListener listener([&](InstallCoordinator&) {
+    begun.happened();
+    static_cast<void>(mayEnd.waitFor(1));
+    hasEnded = true;
+  });
+  Connection connection = connect(service(), listener);
+  const Coordinator made = coordinator("com.a");
+  subject().prioritize("com.a");
+  ASSERT_TRUE(begun.waitFor(1));
+  std::jthread closer([&] {
+    connection.reset();
+    EXPECT_TRUE(hasEnded);
+  });
+  mayEnd.happened();
+}
+
+TEST_P(CoordinatedInstallContract, AConnectionMayCloseInItsOwnCallback) {
+  Connection connection;
+  CoordinationListener listener([&](InstallCoordinator&) { connection.reset(); });
+  connection = connect(service(), listener);
+  const Coordinator made = coordinator("com.a");
+  subject().prioritize("com.a");
+  subject().waitUntilIdle();
+  subject().prioritize("com.a");
+  subject().waitUntilIdle();
+  EXPECT_EQ(listener.heard(), Lines{"prioritize com.a"});
+}
+
+TEST_P(CoordinatedInstallContract, ACallbackMayUseTheService) {
+  CoordinationListener listener([&](InstallCoordinator& told) {
+    if (told.bundleID() != "com.a") return;
+    EXPECT_NE(find("com.a"), nullptr);
+    EXPECT_TRUE(coordinator("com.b")->setInstallOptions(options()));
+    EXPECT_TRUE(told.setInitialODRAssetPromises({}));
+    EXPECT_TRUE(cancel(told));
+    CoordinationListener other;
+    const Connection inner = connect(service(), other);
+  });
+  const Connection connection = connect(service(), listener);
+  const Coordinator made = coordinator("com.a");
+  subject().prioritize("com.a");
+  subject().waitUntilIdle();
+  EXPECT_EQ(listener.heard(), Lines{"prioritize com.a"});
+  EXPECT_EQ(find("com.a"), nullptr);
+  EXPECT_NE(find("com.b"), nullptr);
+}
+
+}  // namespace appsync::test

@@ -1,0 +1,52 @@
+#include "kit/fakes/FakeCallbackThread.h"
+
+#include <utility>
+
+namespace appsync::test {
+
+CallbackThread::Subscription CallbackThread::subscribe() {
+  const std::scoped_lock lock(mutex_);
+  subscriptions_.insert(++last_);
+  return last_;
+}
+
+void CallbackThread::unsubscribe(Subscription subscription) {
+  std::unique_lock lock(mutex_);
+  subscriptions_.erase(subscription);
+  if (running_ == subscription && runner_ == std::this_thread::get_id()) return;
+  changed_.wait(lock, [&] { return running_ != subscription; });
+}
+
+void CallbackThread::post(Subscription subscription, std::function<void()> callback) {
+  {
+    const std::scoped_lock lock(mutex_);
+    ++pending_;
+  }
+  queue_.add([this, subscription, callback = std::move(callback)] { run(subscription, callback); });
+}
+
+void CallbackThread::run(Subscription subscription, const std::function<void()>& callback) {
+  std::unique_lock lock(mutex_);
+  if (subscriptions_.contains(subscription)) {
+    running_ = subscription;
+    runner_ = std::this_thread::get_id();
+    lock.unlock();
+    callback();
+    lock.lock();
+    running_ = 0;
+  }
+  --pending_;
+  changed_.notify_all();
+}
+
+void CallbackThread::waitUntilIdle() {
+  std::unique_lock lock(mutex_);
+  changed_.wait(lock, [this] { return pending_ == 0; });
+}
+
+std::size_t CallbackThread::subscriptions() const {
+  const std::scoped_lock lock(mutex_);
+  return subscriptions_.size();
+}
+
+}  // namespace appsync::test

@@ -1,0 +1,246 @@
+// The XML form: elements become values.
+#include <algorithm>
+#include <array>
+#include <iterator>
+
+#include "plist/internal/Base64.h"
+#include "plist/internal/Date.h"
+#include "plist/internal/Encoding.h"
+#include "plist/internal/Failure.h"
+#include "plist/internal/Number.h"
+#include "plist/internal/Storage.h"
+#include "plist/internal/XMLScanner.h"
+
+namespace appsync::plist {
+
+namespace {
+
+class XMLReader {
+ public:
+  explicit XMLReader(std::string_view text) noexcept : scanner_(text) {}
+
+  Result<Value> read() {
+    Value root = readRoot();
+    if (!scanner_.failed()) scanner_.expectEnd();
+    if (scanner_.failed()) return scanner_.takeFailure();
+    return root;
+  }
+
+ private:
+  /// The keys of the latest dictionary at one depth. The next one there most likely has the same.
+  struct Level {
+    DictionaryMaker maker;
+    /// As they were written.
+    std::vector<Value> keys;
+    std::vector<std::uint32_t> places;
+  };
+
+  Value fail(Failure kind, std::string_view what) {
+    scanner_.fail(kind, what);
+    return {};
+  }
+
+  Value readRoot();
+  Value readValue(const Tag& tag, int depth);
+  Value readScalar(const Tag& tag);
+  Value readInteger(std::string_view text);
+  Value readReal(std::string_view text);
+  Value readDate(std::string_view text);
+  Value readData(const Tag& tag);
+  Value readArray(const Tag& tag, int depth);
+  Value readDictionary(const Tag& tag, int depth);
+  bool readEntry(const Tag& tag, Level& level, std::size_t& matched, std::size_t firstKey, int depth);
+  void spellOut(const Level& level, std::size_t matched, std::size_t firstKey);
+  Value finishDictionary(Level& level, std::size_t matched, std::size_t firstKey, std::size_t firstValue);
+
+  XMLScanner scanner_;
+  std::array<std::unique_ptr<Level>, kMaximumDepth + 1> levels_;
+  /// Keys and values of the containers that are still open, innermost last.
+  std::vector<Value> keys_;
+  std::vector<Value> values_;
+};
+
+Value XMLReader::readRoot() {
+  scanner_.readProlog();
+  Tag tag = scanner_.readTag();
+  const bool isWrapped = tag.element == Element::plist && tag.kind == Tag::Kind::open;
+  if (isWrapped) tag = scanner_.readTag();
+  if (scanner_.failed()) return {};
+  Value root = readValue(tag, 0);
+  if (isWrapped && !scanner_.failed()) {
+    const Tag close = scanner_.readTag();
+    const bool isClose = close.element == Element::plist && close.kind == Tag::Kind::close;
+    if (!isClose) return fail(Failure::malformed, "More than one value");
+  }
+  return root;
+}
+
+Value XMLReader::readValue(const Tag& tag, int depth) {
+  if (tag.kind == Tag::Kind::close) return fail(Failure::malformed, "A closing tag in place of a value");
+  switch (tag.element) {
+    case Element::array:
+      return readArray(tag, depth + 1);
+    case Element::dict:
+      return readDictionary(tag, depth + 1);
+    case Element::data:
+      return readData(tag);
+    case Element::key:
+    case Element::plist:
+    case Element::unknown:
+      return fail(Failure::malformed, "An element that is no value");
+    default:
+      return readScalar(tag);
+  }
+}
+
+Value XMLReader::readScalar(const Tag& tag) {
+  const std::string_view text = scanner_.readCharacters(tag);
+  if (scanner_.failed()) return {};
+  switch (tag.element) {
+    case Element::string:
+      return text;
+    case Element::integer:
+      return readInteger(trimmed(text));
+    case Element::real:
+      return readReal(trimmed(text));
+    case Element::date:
+      return readDate(trimmed(text));
+    default:
+      if (!trimmed(text).empty()) return fail(Failure::malformed, "Text in a boolean");
+      return tag.element == Element::trueElement;
+  }
+}
+
+Value XMLReader::readInteger(std::string_view text) {
+  Value number;
+  switch (parseInteger(text, number)) {
+    case NumberOutcome::parsed:
+      return number;
+    case NumberOutcome::outOfRange:
+      return fail(Failure::outOfRange, "An integer that does not fit in 64 bits before");
+    default:
+      return fail(Failure::malformed, "An integer that is none before");
+  }
+}
+
+Value XMLReader::readReal(std::string_view text) {
+  double number = 0;
+  switch (parseReal(text, number)) {
+    case NumberOutcome::parsed:
+      return number;
+    case NumberOutcome::outOfRange:
+      return fail(Failure::outOfRange, "A real too large before");
+    default:
+      return fail(Failure::malformed, "A real that is none before");
+  }
+}
+
+Value XMLReader::readDate(std::string_view text) {
+  if (const auto date = parseDate(text)) return *date;
+  return fail(Failure::outOfRange, "A date that does not exist before");
+}
+
+Value XMLReader::readData(const Tag& tag) {
+  Bytes bytes;
+  if (const auto raw = scanner_.rawCharacters(tag); raw && !decodeBase64(*raw, bytes)) {
+    scanner_.skipRawCharacters(tag, *raw);
+    return bytes;
+  }
+  const std::string_view text = scanner_.readCharacters(tag);
+  if (scanner_.failed()) return {};
+  if (decodeBase64(text, bytes)) return fail(Failure::malformed, "Data that is no Base64 before");
+  return bytes;
+}
+
+Value XMLReader::readArray(const Tag& tag, int depth) {
+  if (depth > kMaximumDepth) return fail(Failure::tooDeep, "Containers nested too deep");
+  if (tag.kind == Tag::Kind::empty) return Array();
+  const std::size_t first = values_.size();
+  for (;;) {
+    const Tag next = scanner_.readTag();
+    if (next.kind == Tag::Kind::close && next.element == Element::array) break;
+    if (!scanner_.failed()) values_.push_back(readValue(next, depth));
+    if (scanner_.failed()) return {};
+  }
+  const auto begin = values_.begin() + static_cast<std::ptrdiff_t>(first);
+  Array elements(std::make_move_iterator(begin), std::make_move_iterator(values_.end()));
+  values_.resize(first);
+  return elements;
+}
+
+Value XMLReader::readDictionary(const Tag& tag, int depth) {
+  if (depth > kMaximumDepth) return fail(Failure::tooDeep, "Containers nested too deep");
+  if (tag.kind == Tag::Kind::empty) return Dictionary();
+  auto& holder = levels_[static_cast<std::size_t>(depth)];
+  if (holder == nullptr) holder = std::make_unique<Level>();
+  Level& level = *holder;
+  const std::size_t firstKey = keys_.size();
+  const std::size_t firstValue = values_.size();
+  std::size_t matched = 0;
+  for (;;) {
+    const Tag next = scanner_.readTag();
+    if (scanner_.failed()) return {};
+    if (next.kind == Tag::Kind::close && next.element == Element::dict) break;
+    if (!readEntry(next, level, matched, firstKey, depth)) return {};
+  }
+  return finishDictionary(level, matched, firstKey, firstValue);
+}
+
+/// `matched` counts the leading keys that are the level's; from the first other one on, all are in `keys_`.
+bool XMLReader::readEntry(const Tag& tag, Level& level, std::size_t& matched, std::size_t firstKey, int depth) {
+  if (tag.element != Element::key || tag.kind == Tag::Kind::close) {
+    scanner_.fail(Failure::malformed, "No key before a value in a dictionary");
+    return false;
+  }
+  const std::string_view key = scanner_.readCharacters(tag);
+  const bool isAsExpected =
+      keys_.size() == firstKey && matched < level.keys.size() && Internals::text(level.keys[matched]) == key;
+  if (isAsExpected) {
+    ++matched;
+  } else {
+    spellOut(level, matched, firstKey);
+    keys_.emplace_back(key);
+  }
+  const Tag next = scanner_.readTag();
+  if (scanner_.failed()) return false;
+  values_.push_back(readValue(next, depth));
+  return !scanner_.failed();
+}
+
+/// Puts the matched keys into `keys_` unless some are there already.
+void XMLReader::spellOut(const Level& level, std::size_t matched, std::size_t firstKey) {
+  if (keys_.size() != firstKey) return;
+  keys_.insert(keys_.end(), level.keys.begin(), level.keys.begin() + static_cast<std::ptrdiff_t>(matched));
+}
+
+Value XMLReader::finishDictionary(Level& level, std::size_t matched, std::size_t firstKey, std::size_t firstValue) {
+  const std::span<Value> values = std::span(values_).subspan(firstValue);
+  if (values.empty()) return Dictionary();
+  Dictionary dictionary;
+  if (keys_.size() == firstKey && matched == level.keys.size()) {
+    dictionary = makeDictionary(level.maker, level.places, values);
+  } else {
+    spellOut(level, matched, firstKey);
+    const std::span<Value> keys = std::span(keys_).subspan(firstKey);
+    dictionary = makeDictionary(keys, values);
+    if (dictionary.size() == keys.size()) {
+      level.maker = DictionaryMaker(*Internals::payload(dictionary)->shape);
+      level.places = placesOf(keys, *level.maker);
+      level.keys.assign(std::make_move_iterator(keys.begin()), std::make_move_iterator(keys.end()));
+    }
+    keys_.resize(firstKey);
+  }
+  values_.resize(firstValue);
+  return dictionary;
+}
+
+}  // namespace
+
+Result<Value> readXML(ByteView document) {
+  std::string converted;
+  const auto text = decodeText(document, converted);
+  if (!text) return text.error();
+  return XMLReader(*text).read();
+}
+
+}  // namespace appsync::plist

@@ -1,0 +1,194 @@
+// What property-list values share behind the scenes. Only base/PropertyList*.cpp include this.
+#pragma once
+
+#include <array>
+#include <atomic>
+#include <cstddef>
+#include <cstdint>
+#include <memory>
+#include <span>
+#include <string_view>
+#include <utility>
+#include <vector>
+
+#include "plist/Value.h"
+
+namespace appsync::plist {
+
+/// Counted content; the last owner frees it. Content with more than one owner never changes.
+struct Payload {
+  std::atomic<std::uint32_t> owners{1};
+
+  void retain(std::uint32_t times = 1) noexcept { owners.fetch_add(times, std::memory_order_relaxed); }
+  /// True for the last owner.
+  [[nodiscard]] bool release(std::uint32_t times = 1) noexcept {
+    // Most payloads never had a second owner, and no other thread can become one meanwhile.
+    return owners.load(std::memory_order_acquire) == times ||
+           owners.fetch_sub(times, std::memory_order_acq_rel) == times;
+  }
+  [[nodiscard]] bool isShared() const noexcept { return owners.load(std::memory_order_acquire) != 1; }
+};
+
+/// A long string; its bytes follow it in memory.
+struct TextPayload : Payload {
+  std::size_t size = 0;
+
+  [[nodiscard]] char* bytes() noexcept { return reinterpret_cast<char*>(this + 1); }
+  [[nodiscard]] static TextPayload* make(std::size_t size);
+  static void destroy(TextPayload* text) noexcept;
+};
+
+/// Bytes of its own, or a part of a document that it keeps alive.
+struct DataPayload : Payload {
+  explicit DataPayload(Bytes content) noexcept : own(std::move(content)), bytes(own) {}
+  DataPayload(std::shared_ptr<const Bytes> whole, ByteView part) noexcept : document(std::move(whole)), bytes(part) {}
+
+  const Bytes own;
+  const std::shared_ptr<const Bytes> document;
+  const ByteView bytes;
+};
+
+/// Content that holds values. Freed through `bury`, so that deep nesting does not take deep recursion.
+struct Container : Payload {
+  enum class Kind : std::uint8_t { array, dictionary };
+  explicit Container(Kind which) noexcept : kind(which) {}
+
+  Kind kind;
+  Container* nextToBury = nullptr;
+
+  /// Gives up one ownership.
+  static void drop(Container* container) noexcept {
+    if (container->release()) bury(container);
+  }
+
+ private:
+  static void bury(Container* container) noexcept;
+  static void destroy(Container* container) noexcept;
+};
+
+struct ArrayPayload : Container {
+  explicit ArrayPayload(Array content) noexcept : Container(Kind::array), elements(std::move(content)) {}
+  Array elements;
+};
+
+/// The keys of one or many dictionaries, as strings in order. Documents hold thousands of dictionaries with the same
+/// keys: they share one of these, so that each costs its values alone and a writer can recognise it.
+struct Shape : Payload {
+  std::vector<Value> keys;
+
+  static void drop(Shape* shape, std::uint32_t times = 1) noexcept {
+    if (shape->release(times)) delete shape;
+  }
+};
+
+/// Memory for several dictionaries, which follows it. Goes with the last of them.
+struct alignas(std::max_align_t) Slab : Payload {
+  [[nodiscard]] std::byte* memory() noexcept { return reinterpret_cast<std::byte*>(this + 1); }
+  /// With `owners` owners.
+  [[nodiscard]] static Slab* make(std::size_t bytes, std::uint32_t owners);
+  static void drop(Slab* slab, std::uint32_t times = 1) noexcept;
+};
+
+/// The values of a dictionary, parallel to the keys of its shape; they follow it in memory.
+struct DictionaryPayload : Container {
+  DictionaryPayload(Shape* keys, std::uint32_t room) noexcept
+      : Container(Kind::dictionary), capacity(room), shape(keys) {}
+
+  std::uint32_t capacity;
+  std::uint32_t count = 0;
+  Shape* shape;
+  /// What its memory is part of; null when it has its own.
+  Slab* slab = nullptr;
+
+  [[nodiscard]] Value* values() noexcept { return std::launder(reinterpret_cast<Value*>(this + 1)); }
+  /// Room for `capacity` values, none made yet. Takes over one ownership of `shape`.
+  [[nodiscard]] static DictionaryPayload* make(Shape* shape, std::size_t capacity);
+  static void destroy(DictionaryPayload* dictionary) noexcept;
+};
+
+/// Makes the dictionaries of one shape, or none. Documents that hold one such dictionary tend to hold thousands: their
+/// memory is asked for, and the ownerships of the shape are taken, several at a time.
+class DictionaryMaker {
+ public:
+  DictionaryMaker() noexcept = default;
+  explicit DictionaryMaker(Shape& shape) noexcept : shape_(&shape) { shape.retain(); }
+  DictionaryMaker(DictionaryMaker&& other) noexcept { *this = std::move(other); }
+  DictionaryMaker& operator=(DictionaryMaker&& other) noexcept {
+    std::swap(shape_, other.shape_);
+    std::swap(slab_, other.slab_);
+    std::swap(next_, other.next_);
+    std::swap(left_, other.left_);
+    std::swap(atOnce_, other.atOnce_);
+    return *this;
+  }
+  ~DictionaryMaker();
+
+  /// A dictionary of nulls, which are then to be replaced in its payload.
+  [[nodiscard]] Dictionary make();
+  [[nodiscard]] Shape& operator*() const noexcept { return *shape_; }
+  [[nodiscard]] Shape* operator->() const noexcept { return shape_; }
+
+ private:
+  void refill(std::size_t bytesEach);
+
+  Shape* shape_ = nullptr;
+  Slab* slab_ = nullptr;
+  std::byte* next_ = nullptr;
+  std::uint32_t left_ = 0;
+  std::uint32_t atOnce_ = 1;
+};
+
+/// The way into values for readers and writers.
+struct Internals {
+  using Words = std::array<std::uint64_t, sizeof(Value) / sizeof(std::uint64_t)>;
+
+  [[nodiscard]] static DictionaryPayload* payload(const Dictionary& dictionary) noexcept { return dictionary.payload_; }
+  /// Takes over one ownership of `payload`, whose values must be complete.
+  [[nodiscard]] static Dictionary adopt(DictionaryPayload* payload) noexcept {
+    Dictionary dictionary;
+    dictionary.payload_ = payload;
+    return dictionary;
+  }
+  /// A string's or data's bytes.
+  [[nodiscard]] static std::string_view text(const Value& value) noexcept { return value.text(); }
+  [[nodiscard]] static bool isInline(const Value& value) noexcept { return value.bits_.length != Value::kShared; }
+  /// How many bytes a string or data takes that is held inline.
+  [[nodiscard]] static std::size_t inlineSize(const Value& value) noexcept { return value.bits_.length; }
+  [[nodiscard]] static bool isContainer(const Value& value) noexcept { return value.bits_.type >= Type::array; }
+  /// Puts a string that fits into the value itself, its unused bytes zero, in place of a null.
+  static void setShortString(Value& null, const Words& words, std::size_t size) noexcept {
+    std::memcpy(static_cast<void*>(&null.bits_), words.data(), sizeof null.bits_);
+    null.bits_.length = static_cast<std::uint8_t>(size);
+    null.bits_.type = Type::string;
+  }
+  /// Data that stays where it is, in `document`, and keeps it alive.
+  [[nodiscard]] static Value dataIn(std::shared_ptr<const Bytes> document, ByteView part) {
+    Value data;
+    data.store<Payload*>(Type::data, new DataPayload(std::move(document), part), Value::kShared);
+    return data;
+  }
+  static constexpr std::size_t kInlineCapacity = Value::kInlineCapacity;
+  [[nodiscard]] static const void* bits(const Value& value) noexcept { return &value.bits_; }
+  /// A value as numbers; one by one, because a copy of the whole would go through memory.
+  [[nodiscard]] static Words words(const Value& value) noexcept {
+    const auto word = [&value](std::size_t i) {
+      std::uint64_t number;
+      std::memcpy(&number, reinterpret_cast<const std::byte*>(&value.bits_) + i * sizeof number, sizeof number);
+      return number;
+    };
+    return {word(0), word(1), word(2), word(3)};
+  }
+  [[nodiscard]] static Payload* shared(const Value& value) noexcept { return value.load<Payload*>(); }
+};
+
+/// Makes a dictionary of keys and values in any order; of equal keys the last one counts. The values are moved away.
+[[nodiscard]] Dictionary makeDictionary(std::span<const Value> keys, std::span<Value> values);
+
+/// Makes a dictionary of values in the order that `places` was made for.
+[[nodiscard]] Dictionary makeDictionary(DictionaryMaker& maker, std::span<const std::uint32_t> places,
+                                        std::span<Value> values);
+
+/// For each key its place in the shape. Empty when they are all in order.
+[[nodiscard]] std::vector<std::uint32_t> placesOf(std::span<const Value> keys, const Shape& shape);
+
+}  // namespace appsync::plist

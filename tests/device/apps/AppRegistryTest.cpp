@@ -1,0 +1,350 @@
+// What the contract of registries leaves open.
+#include <algorithm>
+#include <cerrno>
+#include <filesystem>
+#include <functional>
+#include <string>
+#include <vector>
+
+#include <gtest/gtest.h>
+
+#include "device/packages/InstallerError.h"
+#include "device/storage/FaultPoint.h"
+#include "kit/fakes/Threads.h"
+#include "tests/device/apps/AppRegistryFixture.h"
+
+namespace appsync::test {
+
+using device::InstallerFailure;
+using platform::AppRecords;
+using platform::BundleKind;
+using platform::TSInstallPhase;
+using platform::TSInstallState;
+using platform::TSInstallType;
+
+namespace {
+
+namespace fs = std::filesystem;
+
+long stepsUntilFailure = 0;
+int failWhenDue(const char*) {
+  return --stepsUntilFailure == 0 ? ENOSPC : 0;
+}
+
+std::vector<std::string> stepsTaken;
+int noteStep(const char* name) {
+  stepsTaken.emplace_back(name);
+  return 0;
+}
+
+/// The steps of `work` that move folders, once for several in a row, or make what went before safe from a loss of
+/// power.
+std::vector<std::string> lastingStepsOf(const std::function<void()>& work) {
+  stepsTaken.clear();
+  device::setStepHook(noteStep);
+  work();
+  device::setStepHook(nullptr);
+  std::erase_if(stepsTaken, [](const std::string& name) {
+    return name != "rename" && name != "sync" && name != "database to disk";
+  });
+  stepsTaken.erase(std::unique(stepsTaken.begin(), stepsTaken.end()), stepsTaken.end());
+  return stepsTaken;
+}
+
+using Steps = std::vector<std::string>;
+
+}  // namespace
+
+// Options.
+
+TEST_F(AppRegistryTest, SaysWhichOptionIsWrong) {
+  const auto package = device_.stage("a.zip", appPackage("com.a"));
+  const auto install = [&](const plist::Dictionary& options) {
+    return registry().installApplication(package, options);
+  };
+  expectFailure(install({}), InstallerFailure::badOptions,
+                "the install option \"PackageType\" must be \"Customer\" or \"Placeholder\"");
+  plist::Dictionary options = TestDevice::customer("com.a");
+  options.erase(platform::BundleIdentifierKey);
+  expectFailure(install(options), InstallerFailure::badOptions,
+                "the install option \"BundleIdentifier\" must name the app");
+  expectFailure(
+      install(TestDevice::customer("com/a")), InstallerFailure::badIdentifier,
+      "\"com/a\" is no bundle identifier: it may have only letters, digits, '-', '.' and '_', at most 200 and no dot first");
+  options = TestDevice::customer("com.a");
+  options.set(platform::InstallTypeKey, "4");
+  expectFailure(install(options), InstallerFailure::badOptions,
+                "the install option \"TSInstallType\" must be a number");
+  options = TestDevice::customer("com.a");
+  options.set(platform::LicenceDataKey, "text");
+  expectFailure(install(options), InstallerFailure::badOptions, "the install option \"LicenceData\" must be data");
+  EXPECT_EQ(device_.record("com.a"), nullptr);
+}
+
+TEST_F(AppRegistryTest, SaysWhichAppThePackageIs) {
+  expectFailure(device_.tryInstall("com.b", appPackage("com.a")), InstallerFailure::identifierMismatch,
+                "this is the app \"com.a\" and not \"com.b\"; ask for the one it is");
+}
+
+TEST_F(AppRegistryTest, InstallsNothingFromOutsideTheDevice) {
+  writeHostFile(device_.path() + "/../outside.zip", appPackage("com.a"));
+  fs::create_symlink("../../outside.zip", device_.host("/link"));
+  for (const char* path : {"/../outside.zip", "/link", "/../../outside.zip"}) {
+    EXPECT_EQ(registry().installApplication({path}, TestDevice::customer("com.a")).error().code, EXDEV) << path;
+  }
+}
+
+TEST_F(AppRegistryTest, WantsAFolderOfAnAppAsPlaceholder) {
+  fs::create_directories(device_.host("/tmp/folder"));
+  expectFailure(registry().installApplication({"/tmp/folder", true}, TestDevice::placeholderOptions("com.a")),
+                InstallerFailure::notAPackage, "a placeholder is a folder \"Name.app\", and \"folder\" is not");
+  fs::create_directories(device_.host("/tmp/A.app"));
+  expectFailure(registry().installApplication({"/tmp/A.app/", true}, TestDevice::placeholderOptions("com.a")),
+                InstallerFailure::noApp,
+                "the package's \"A.app\" holds no Info.plist and is no app; add one and pack it again");
+  EXPECT_EQ(device_.containers(), 0);
+}
+
+// Records.
+
+TEST_F(AppRegistryTest, KnowsNameSizeAndDateOfAnApp) {
+  device_.install("com.a", "2.0");
+  const auto apps = registry().apps();
+  ASSERT_TRUE(apps.ok());
+  ASSERT_EQ(apps->size(), 1U);
+  const device::AppRecord& app = *apps->front();
+  EXPECT_EQ(app.name(), "Notes");
+  EXPECT_EQ(app.staticDiskUsage(), 5000U + 9 + 10 + infoPlist("com.a", "2.0").size());
+  EXPECT_GT(app.installedAt().value_or(0), 1.7e9);
+  EXPECT_EQ(app.description(), "com.a 2.0 (installed)");
+  EXPECT_EQ(fs::path(*app.bundlePath()).filename(), "Notes.app");
+}
+
+TEST_F(AppRegistryTest, KeepsMetadataBesideTheBundle) {
+  const std::vector<ZipEntry> more{{"HarvoMetadata.plist", "packed"}, {"HarvoArtwork", "art"}};
+  ASSERT_TRUE(device_.tryInstall("com.a", appPackage("com.a", "1.0", more)).ok());
+  EXPECT_EQ(inContainer("com.a", "HarvoMetadata.plist"), "packed");
+  EXPECT_EQ(inContainer("com.a", "HarvoArtwork"), "art");
+}
+
+TEST_F(AppRegistryTest, KeepsMetadataAndLicenceOfTheOptions) {
+  plist::Dictionary options = TestDevice::placeholderOptions("com.a", TSInstallType::Restore);
+  options.set(platform::StoreMetadataKey, plist::Value::data(bytesOf("given")));
+  options.set(platform::LicenceDataKey, plist::Value::data(bytesOf("licence")));
+  ASSERT_TRUE(registry().installApplication(device_.stagePlaceholder("com.a"), options).ok());
+  EXPECT_EQ(inContainer("com.a", "HarvoMetadata.plist"), "given");
+  const auto licence = registry().licenceData("com.a");
+  ASSERT_TRUE(licence.ok() && *licence);
+  EXPECT_EQ(textOf(**licence), "licence");
+  device_.install("com.a");
+  EXPECT_EQ(textOf(registry().licenceData("com.a")->value_or(Bytes())), "licence");
+  EXPECT_EQ(device_.record("com.a")->installType(), TSInstallType::Restore);
+}
+
+TEST_F(AppRegistryTest, PrefersTheOptionsMetadataToThePackages) {
+  plist::Dictionary options = TestDevice::customer("com.a");
+  options.set(platform::StoreMetadataKey, plist::Value::data(bytesOf("given")));
+  const auto package = device_.stage("a.zip", appPackage("com.a", "1.0", {{"HarvoMetadata.plist", "packed"}}));
+  ASSERT_TRUE(registry().installApplication(package, options).ok());
+  EXPECT_EQ(inContainer("com.a", "HarvoMetadata.plist"), "given");
+}
+
+TEST_F(AppRegistryTest, WalksInTheOrderInWhichAppsCame) {
+  for (const char* identifier : {"com.c", "com.a", "com.b"})
+    device_.install(identifier);
+  device_.install("com.c", "2.0");
+  EXPECT_EQ(walk(BundleKind::All), (Identifiers{"com.c", "com.a", "com.b"}));
+}
+
+TEST_F(AppRegistryTest, KeepsAppsOfTheSystemApart) {
+  device_.install("com.user");
+  ASSERT_TRUE(registry()
+                  .installSystemApplication(device_.stagePlaceholder("com.system"),
+                                            TestDevice::placeholderOptions("com.system", TSInstallType::Downgrade))
+                  .ok());
+  EXPECT_EQ(walk(BundleKind::System), Identifiers{"com.system"});
+  EXPECT_EQ(walk(BundleKind::User), Identifiers{"com.user"});
+  device_.install("com.system");
+  EXPECT_EQ(device_.record("com.system")->applicationType(), platform::ApplicationTypeSystem);
+  EXPECT_EQ(walk(BundleKind::System), Identifiers{"com.system"});
+}
+
+// Containers.
+
+TEST_F(AppRegistryTest, AnUpdateSwapsContainers) {
+  device_.install("com.a", "1.0");
+  const std::string before = *device_.record("com.a")->bundleContainerPath();
+  device_.install("com.a", "2.0");
+  EXPECT_NE(device_.record("com.a")->bundleContainerPath(), before);
+  EXPECT_EQ(device_.containers(), 1);
+  EXPECT_TRUE(device_.isTidy());
+}
+
+TEST_F(AppRegistryTest, AnUpdateIsOnTheDiskBeforeTheOldVersionGoes) {
+  plist::Dictionary options = TestDevice::customer("com.a");
+  options.set(platform::InstallTypeKey, static_cast<std::uint64_t>(TSInstallType::Sync));
+  const auto install = [&](std::string_view version) {
+    const auto package = device_.stage("package.zip", appPackage("com.a", version));
+    return lastingStepsOf([&] { EXPECT_TRUE(registry().installApplication(package, options).ok()); });
+  };
+  EXPECT_EQ(install("1.0"), (Steps{"rename", "sync"}));
+  EXPECT_EQ(install("2.0"), (Steps{"rename", "sync", "database to disk", "rename"}));
+}
+
+TEST_F(AppRegistryTest, APlaceholderOfASyncGoesWithoutAWaitForTheDisk) {
+  device_.placeholder("com.a");
+  const auto package = device_.stage("package.zip", appPackage("com.a"));
+  EXPECT_EQ(
+      lastingStepsOf([&] { EXPECT_TRUE(registry().installApplication(package, TestDevice::customer("com.a")).ok()); }),
+      (Steps{"rename", "sync", "rename"}));
+  device_.placeholder("com.b", TSInstallType::Restore);
+  const auto restored = device_.stage("restored.zip", appPackage("com.b"));
+  EXPECT_EQ(
+      lastingStepsOf([&] { EXPECT_TRUE(registry().installApplication(restored, TestDevice::customer("com.b")).ok()); }),
+      (Steps{"rename", "sync", "database to disk", "rename"}));
+}
+
+TEST_F(AppRegistryTest, ARemovalIsOnTheDiskBeforeTheAppGoes) {
+  device_.install("com.a");
+  EXPECT_EQ(lastingStepsOf([&] { EXPECT_TRUE(registry().uninstallApplication("com.a").ok()); }),
+            (Steps{"database to disk", "rename"}));
+}
+
+TEST_F(AppRegistryTest, ARegistryThatCannotBeReadIsNotOneWithoutTheApp) {
+  device_.install("com.a");
+  {
+    device::Database::Session session(device_.services().database());
+    ASSERT_TRUE(session.runScript("alter table bundles rename to lost").ok());
+  }
+  const std::string text = "database: no such table: bundles";
+  EXPECT_EQ(device_.tryInstall("com.a", appPackage("com.a", "2.0")).error().text, text);
+  EXPECT_EQ(registry().uninstallApplication("com.a").error().text, text);
+  EXPECT_EQ(registry().demote("com.a", TSInstallType::Downgrade).error().text, text);
+  EXPECT_EQ(registry().setPlaceholderType("com.a", TSInstallType::Downgrade).error().text, text);
+  EXPECT_EQ(registry().renamePlaceholder("com.a", "Other").error().text, text);
+  EXPECT_EQ(device_.containers(), 1);
+}
+
+TEST_F(AppRegistryTest, APlaceholderHasAContainerOfItsOwn) {
+  device_.install("com.a", "1.0");
+  const std::string before = *device_.record("com.a")->bundleContainerPath();
+  device_.placeholder("com.a");
+  EXPECT_EQ(device_.record("com.a")->bundleContainerPath(), before);
+  EXPECT_EQ(device_.containers(), 2);
+  device_.install("com.a", "2.0");
+  EXPECT_EQ(device_.containers(), 1);
+}
+
+TEST_F(AppRegistryTest, RemovalTakesContainersAway) {
+  device_.install("com.a");
+  device_.placeholder("com.a");
+  ASSERT_TRUE(registry().uninstallApplication("com.a").ok());
+  EXPECT_EQ(device_.containers(), 1);
+  ASSERT_TRUE(registry().uninstallApplication("com.a").ok());
+  EXPECT_EQ(device_.containers(), 0);
+  EXPECT_TRUE(device_.isTidy());
+  expectFailure(registry().uninstallApplication("com.a"), InstallerFailure::unknownApp,
+                "there is no app \"com.a\" to remove");
+}
+
+TEST_F(AppRegistryTest, LeavesNoTraceWhenAnyStepFails) {
+  device_.install("com.a", "1.0");
+  const auto package = device_.stage("b.zip", appPackage("com.a", "2.0"));
+  for (long step = 1;; ++step) {
+    stepsUntilFailure = step;
+    device::setStepHook(failWhenDue);
+    const Status installed = registry().installApplication(package, TestDevice::customer("com.a"));
+    device::setStepHook(nullptr);
+    if (installed) break;
+    EXPECT_EQ(installed.error().domain, domains::kPOSIX) << installed.error().text;
+    EXPECT_EQ(installed.error().code, ENOSPC) << installed.error().text;
+    EXPECT_EQ(registry().lastInstallFailure("com.a"), installed.error());
+    EXPECT_EQ(device_.record("com.a")->bundleVersion(), "1.0") << "step " << step;
+    EXPECT_EQ(device_.record("com.a")->installProgress(), nullptr) << "step " << step;
+    EXPECT_EQ(device_.containers(), 1) << "step " << step;
+    EXPECT_TRUE(device_.isTidy()) << "step " << step;
+    ASSERT_FALSE(HasFailure());
+  }
+  device_.install("com.a", "3.0");
+  EXPECT_EQ(registry().lastInstallFailure("com.a"), std::nullopt);
+  device_.reopen();
+  EXPECT_EQ(device_.record("com.a")->bundleVersion(), "3.0");
+  EXPECT_EQ(device_.containers(), 1);
+}
+
+TEST_F(AppRegistryTest, TenInstallsAndRemovalsAtOnceLeaveWhatTheyShould) {
+  constexpr std::size_t kThreads = 10;
+  for (std::size_t index = 0; index < kThreads; ++index) {
+    device_.stage(std::to_string(index), appPackage("com.a" + std::to_string(index)));
+  }
+  runOnThreads(kThreads, [&](std::size_t index) {
+    const std::string identifier = "com.a" + std::to_string(index);
+    const platform::FileLocation package{"/var/mobile/Media/PublicStaging/" + std::to_string(index)};
+    for (int round = 0; round < 3; ++round) {
+      EXPECT_TRUE(registry().installApplication(package, TestDevice::customer(identifier)).ok());
+      if (index % 2 == 0) {
+        EXPECT_TRUE(registry().uninstallApplication(identifier).ok());
+      }
+    }
+  });
+  EXPECT_EQ(walk(BundleKind::All).size(), 5U);
+  EXPECT_EQ(device_.containers(), 5);
+  EXPECT_EQ(device_.services().uninstalledApps().lookupUninstalled()->size(), 5U);
+  EXPECT_TRUE(device_.isTidy());
+}
+
+// Progress.
+
+TEST_F(AppRegistryTest, APlaceholdersInstallWaitsAtFirst) {
+  device_.placeholder("com.a");
+  ASSERT_NE(progress("com.a"), nullptr);
+  EXPECT_EQ(progress("com.a")->installState(), TSInstallState::Waiting);
+  EXPECT_EQ(progress("com.a")->installPhase(), TSInstallPhase::Loading);
+  EXPECT_EQ(progress("com.a")->completedUnitCount(), 0);
+  EXPECT_EQ(progress("com.a")->description(), "com.a: TSInstallState 0, TSInstallPhase 0, 0 of 1000");
+}
+
+TEST_F(AppRegistryTest, AFinishedInstallEndsFinished) {
+  device_.placeholder("com.a");
+  const auto watched = progress("com.a");
+  device_.install("com.a");
+  EXPECT_EQ(watched->installState(), TSInstallState::Finished);
+  EXPECT_EQ(watched->installPhase(), TSInstallPhase::Installing);
+}
+
+TEST_F(AppRegistryTest, AFailedInstallOfAPlaceholdersPackageStaysAsFailed) {
+  device_.placeholder("com.a");
+  EXPECT_FALSE(device_.tryInstall("com.a", "no package").ok());
+  ASSERT_NE(progress("com.a"), nullptr);
+  EXPECT_EQ(progress("com.a")->installState(), TSInstallState::Failed);
+}
+
+TEST_F(AppRegistryTest, ARemovedPlaceholdersInstallEndsCancelled) {
+  device_.placeholder("com.a");
+  const auto watched = progress("com.a");
+  ASSERT_TRUE(registry().uninstallApplication("com.a").ok());
+  EXPECT_EQ(watched->installState(), TSInstallState::Canceled);
+}
+
+TEST_F(AppRegistryTest, ACancelledInstallNoLongerRuns) {
+  device_.placeholder("com.a");
+  const auto watched = progress("com.a");
+  watched->cancel();
+  EXPECT_EQ(progress("com.a"), nullptr);
+  EXPECT_NE(device_.record("com.a"), nullptr);
+  watched->setInstallState(TSInstallState::Active);
+  EXPECT_EQ(watched->installState(), TSInstallState::Canceled);
+  device_.install("com.a");
+  EXPECT_TRUE(device_.record("com.a")->isInstalled());
+}
+
+TEST_F(AppRegistryTest, APhaseFinishedByAnOldProgressChangesNothing) {
+  device_.placeholder("com.a");
+  const auto old = progress("com.a");
+  ASSERT_TRUE(registry().uninstallApplication("com.a").ok());
+  device_.placeholder("com.a");
+  registry().installPhaseFinishedForProgress(*old);
+  EXPECT_EQ(progress("com.a")->installPhase(), TSInstallPhase::Loading);
+}
+
+}  // namespace appsync::test
