@@ -4,6 +4,7 @@
 #include <chrono>
 #include <utility>
 
+#include "base/ReturnIfError.h"
 #include "daemon/CoordinatorCleanup.h"
 #include "daemon/SyncControl.h"
 #include "device/services/SyncFramework.h"
@@ -174,7 +175,7 @@ void Daemon::wakeDemotedApps(const std::map<std::string, host::DeviceApp, std::l
 /// What the host knows must be safe before the device acts on it: a kill may come at any moment.
 Status Daemon::handOverInstructions() {
   if (Status staged = host::stage(device_, plan_); !staged) return staged.error().in("the device cannot be synced");
-  if (Status saved = host::saveHostState(device_.path(), state_); !saved) return saved;
+  RETURN_IF_ERROR(host::saveHostState(device_.path(), state_));
   std::optional<Error> error;
   if (client_.reconcileSync({}, client_.currentSyncAnchor(), {}, &error)) return {};
   return error.value_or(Error{}).in("the device cannot be synced");

@@ -8,6 +8,7 @@
 #include <fcntl.h>
 #include <sys/stat.h>
 
+#include "base/ReturnIfError.h"
 #include "device/DeviceLayout.h"
 #include "device/Recovery.h"
 #include "device/apps/AppTable.h"
@@ -64,7 +65,7 @@ Status fillNewDatabase(const std::string& path, InstallMode mode) {
     }
     transaction.runScript(("pragma application_id = " + std::to_string(kApplicationId)).c_str()).ignore();
     transaction.runScript(("pragma user_version = " + std::to_string(kLayoutVersion)).c_str()).ignore();
-    if (Status committed = transaction.commit(); !committed) return committed;
+    RETURN_IF_ERROR(transaction.commit());
   }
   Database::Session session(**database);
   return session.runScript("pragma journal_mode = delete");
@@ -72,10 +73,10 @@ Status fillNewDatabase(const std::string& path, InstallMode mode) {
 
 /// When the database has its name the folder is a device.
 Status makeDatabase(const std::string& path, int folder, InstallMode mode) {
-  if (Status removed = removeNewDatabase(folder, {"", "-journal", "-wal", "-shm"}); !removed) return removed;
-  if (Status filled = fillNewDatabase(path, mode); !filled) return filled;
+  RETURN_IF_ERROR(removeNewDatabase(folder, {"", "-journal", "-wal", "-shm"}));
+  RETURN_IF_ERROR(fillNewDatabase(path, mode));
   // A log stays when its database is closed, also one that is not in use any more.
-  if (Status removed = removeNewDatabase(folder, {"-wal", "-shm"}); !removed) return removed;
+  RETURN_IF_ERROR(removeNewDatabase(folder, {"-wal", "-shm"}));
   // Folders that a loss of power took back would be missed.
   int number = sys::syncFileSystem(folder);
   if (number == 0) number = sys::rename(folder, kNewDatabaseFile, folder, kDatabaseFile, sys::Replace::no);
@@ -138,11 +139,11 @@ Result<FileDescriptor> makeDevice(const std::string& path, InstallMode mode) {
   if (made != 0 && made != EEXIST) return Error::fromErrno(made, path);
   const Result<FileDescriptor> folder = openFolder(path);
   if (!folder) return folder.error();
-  if (Status free = checkFolderIsFree(path, folder->get()); !free) return free.error();
+  RETURN_IF_ERROR(checkFolderIsFree(path, folder->get()));
   Result<FileDescriptor> lock = lockDevice(path, folder->get());
   if (!lock) return lock.error();
-  if (Status folders = makeDeviceFolders(path, folder->get()); !folders) return folders.error();
-  if (Status database = makeDatabase(path, folder->get(), mode); !database) return database.error();
+  RETURN_IF_ERROR(makeDeviceFolders(path, folder->get()));
+  RETURN_IF_ERROR(makeDatabase(path, folder->get(), mode));
   return lock;
 }
 
@@ -168,7 +169,7 @@ Result<std::unique_ptr<Device>> Device::open(const std::string& path, Access acc
   const auto locked = [&]() -> Result<FileDescriptor> {
     const Result<FileDescriptor> folder = openFolder(path);
     if (!folder) return folder.error();
-    if (Status device = checkIsDevice(path, folder->get()); !device) return device.error();
+    RETURN_IF_ERROR(checkIsDevice(path, folder->get()));
     return access == Access::readOnly ? FileDescriptor() : lockDevice(path, folder->get());
   };
   Result<FileDescriptor> lock = locked();
@@ -189,8 +190,8 @@ Result<std::unique_ptr<Device>> Device::open(const std::string& path, Access acc
     if (!files || access == Access::readOnly) return files;
     removeHostFileDrafts(folder->get());
     Settings settings(**database);
-    if (Status tables = makeMissingTables(**database); !tables) return tables.error();
-    if (Status recovered = recover(**database, *files, settings); !recovered) return recovered.error();
+    RETURN_IF_ERROR(makeMissingTables(**database));
+    RETURN_IF_ERROR(recover(**database, *files, settings));
     return files;
   };
   Result<DeviceFileSystem> files = prepared();

@@ -10,6 +10,7 @@
 #include <sys/file.h>
 #include <sys/stat.h>
 
+#include "base/ReturnIfError.h"
 #include "device/DeviceError.h"
 #include "device/apps/AppRecord.h"
 #include "device/storage/FileTree.h"
@@ -68,7 +69,7 @@ Result<DeviceFileSystem> filesIn(const std::string& path, int folder, Access acc
   if (!root) return root.error();
   FileDescriptor work;
   if (access == Access::exclusive) {
-    if (Status made = makeIfMissing(folder, kWorkFolder); !made) return made.error();
+    RETURN_IF_ERROR(makeIfMissing(folder, kWorkFolder));
     work = FileDescriptor(openat(folder, kWorkFolder, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
     if (!work.valid()) return Error::fromErrno(errno, kWorkFolder);
   }
@@ -107,12 +108,12 @@ Result<FileDescriptor> lockDevice(const std::string& path, int folder) {
                                                 (number.empty() ? "" : " (pid " + number + ")") +
                                                 "; wait until it has ended and try again");
   }
-  if (Status written = writeHolder(lock.get()); !written) return written.error();
+  RETURN_IF_ERROR(writeHolder(lock.get()));
   return lock;
 }
 
 Status makeDeviceFolders(const std::string& path, int folder) {
-  if (Status made = makeIfMissing(folder, kRootFolder); !made) return made;
+  RETURN_IF_ERROR(makeIfMissing(folder, kRootFolder));
   Result<DeviceFileSystem> files = filesIn(path, folder, Access::exclusive);
   return files ? files->createDirectory(kContainersPath, platform::IntermediateDirectories::create, {}) : files.error();
 }

@@ -9,6 +9,7 @@
 #include <fcntl.h>
 #include <sys/stat.h>
 
+#include "base/ReturnIfError.h"
 #include "device/apps/AppData.h"
 #include "device/apps/AppRecord.h"
 #include "device/apps/AppTable.h"
@@ -46,7 +47,7 @@ Result<CoordinatedPlaceholders> reconcileCoordinators(Database::Session& session
       (isOver ? placeholders.orphaned : placeholders.owned).insert(coordinator->identifier);
     }
     if (isOver) {
-      if (Status removed = coordinator_table::remove(session, *coordinator); !removed) return removed.error();
+      RETURN_IF_ERROR(coordinator_table::remove(session, *coordinator));
     } else if (const auto package = coordinator->ownPackage()) {
       placeholders.packages.insert(*package);
     }
@@ -114,7 +115,7 @@ Status reconcileRecords(Database& database, int containers, bool coordinationIsO
     const std::optional<ProgressValues> progress =
         resumed(app, hasPlaceholder, coordinated->owned.contains(app.identifier));
     if (progress == app.progress) continue;
-    if (Status stored = app_table::storeProgress(transaction, app.identifier, progress); !stored) return stored;
+    RETURN_IF_ERROR(app_table::storeProgress(transaction, app.identifier, progress));
   }
   return transaction.commit();
 }
@@ -161,8 +162,8 @@ Status recover(Database& database, DeviceFileSystem& files, Settings& settings) 
       !reconciled) {
     return reconciled;
   }
-  if (Status swept = sweepPackages(database, files, packages); !swept) return swept;
-  if (Status data = app_data::recover(files, database); !data) return data;
+  RETURN_IF_ERROR(sweepPackages(database, files, packages));
+  RETURN_IF_ERROR(app_data::recover(files, database));
   int number = sweepContainers(containers->get(), kept, files.work());
   if (number == 0) number = tree::empty(temporary->get(), files.work());
   if (number == 0) number = tree::empty(files.work(), files.work());

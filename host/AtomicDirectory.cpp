@@ -9,6 +9,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include "base/ReturnIfError.h"
 #include "device/storage/FileTree.h"
 #include "device/storage/SystemCalls.h"
 
@@ -78,7 +79,7 @@ Result<FolderDraft> FolderDraft::make(const std::string& path) {
   struct stat status {};
   if (fstatat(parent.get(), name.c_str(), &status, AT_SYMLINK_NOFOLLOW) == 0) return alreadyThere(path);
   FolderDraft draft(path, place, std::move(parent));
-  if (Status held = draft.takeHold(); !held) return held.error();
+  RETURN_IF_ERROR(draft.takeHold());
   return draft;
 }
 

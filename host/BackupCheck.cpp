@@ -8,6 +8,7 @@
 #include <system_error>
 #include <utility>
 
+#include "base/ReturnIfError.h"
 #include "host/RestoreInfo.h"
 #include "plist/DictionaryStream.h"
 
@@ -76,7 +77,7 @@ Status checkBackup(const std::string& path, const Backup& written) {
   if (!backup) return backup.error();
   if (manifestOf(*backup) != manifestOf(written)) return damage("its manifest is not what was written");
   for (const BackedUpApp& app : backup->apps) {
-    if (Status sound = checkApp(*backup, app); !sound) return sound;
+    RETURN_IF_ERROR(checkApp(*backup, app));
   }
   return checkRestoreFile(*backup);
 }

@@ -5,6 +5,7 @@
 
 #include <fcntl.h>
 
+#include "base/ReturnIfError.h"
 #include "device/apps/AppData.h"
 #include "device/apps/Demotion.h"
 #include "device/screen/IconRenderer.h"
@@ -141,7 +142,7 @@ Result<Backup> writeBackup(device::Device& device, const std::string& path) {
   if (Status checked = checkBackup(draft->folderPath(), backup); !checked) {
     return checked.error().in(path + " cannot be read back after it was written, and is not there");
   }
-  if (Status published = draft->publish(); !published) return published.error();
+  RETURN_IF_ERROR(draft->publish());
   return backup;
 }
 

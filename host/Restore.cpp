@@ -5,6 +5,7 @@
 #include <memory>
 #include <utility>
 
+#include "base/ReturnIfError.h"
 #include "device/apps/AppData.h"
 #include "device/apps/BackupManager.h"
 #include "device/apps/Demotion.h"
@@ -87,7 +88,7 @@ Status Restore::putFilesInPlace() {
   }
   const plist::Dictionary demoted = {{device::kAutomaticDowngradesKey, std::move(automatic)},
                                      {device::kIntentionalDowngradesKey, std::move(intentional)}};
-  if (Status written = writeList(device_, device::kDemotedAppsPath, demoted); !written) return written;
+  RETURN_IF_ERROR(writeList(device_, device::kDemotedAppsPath, demoted));
   Status made = device_.platform().fileSystem().createDirectory(kHostRestoreFolder,
                                                                 platform::IntermediateDirectories::create, {});
   return made ? writeList(device_, kHostRestorePath, entries) : made;
@@ -96,7 +97,7 @@ Status Restore::putFilesInPlace() {
 Status Restore::takeOver(const BackedUpApp& app, plist::Dictionary& entries) {
   Result<plist::Dictionary> entry = restoreInfoOf(backup_, app);
   if (!entry) return entry.error();
-  if (Status kept = keepData(app); !kept) return kept;
+  RETURN_IF_ERROR(keepData(app));
   entries.set(app.app.identifier, std::move(entry).value());
   return {};
 }
@@ -110,7 +111,7 @@ Status Restore::keepData(const BackedUpApp& app) {
   // An attempt that was cut off may have come further.
   if (!isKept && device_.platform().fileSystem().fileExists(device::dataContainerOf(identifier))) return {};
   if (isKept && size == *app.data) return {};
-  if (Status kept = manager.keepRestoreData(identifier, dataFolderIn(backup_, app)); !kept) return kept;
+  RETURN_IF_ERROR(manager.keepRestoreData(identifier, dataFolderIn(backup_, app)));
   if (manager.restoreDataExists(identifier, &size) && size == *app.data) return {};
   manager.cancelApplicationRestore(identifier, nullptr);
   return Error{std::string(domains::kPOSIX), EINVAL,

@@ -12,6 +12,7 @@
 #include <sys/un.h>
 #include <unistd.h>
 
+#include "base/ReturnIfError.h"
 #include "daemon/control/Protocol.h"
 
 namespace appsync::daemon {
@@ -93,7 +94,7 @@ Result<std::string> readLine(int connection, const ControlPatience& patience) {
   std::string line;
   std::array<char, kLongestControlLine> piece = {};
   while (line.size() < kLongestControlLine) {
-    if (Status ready = patience.await(connection, POLLIN); !ready) return ready.error();
+    RETURN_IF_ERROR(patience.await(connection, POLLIN));
     const ssize_t count = ::recv(connection, piece.data(), kLongestControlLine - line.size(), 0);
     if (count < 0 && isPassing(errno)) continue;
     if (count <= 0) return failure(count < 0 ? errno : ECONNRESET);
@@ -107,7 +108,7 @@ Result<std::string> readLine(int connection, const ControlPatience& patience) {
 
 Status writeLine(int connection, std::string_view line, const ControlPatience& patience) {
   while (!line.empty()) {
-    if (Status ready = patience.await(connection, POLLOUT); !ready) return ready.error();
+    RETURN_IF_ERROR(patience.await(connection, POLLOUT));
     const ssize_t count = ::send(connection, line.data(), line.size(), MSG_NOSIGNAL);
     if (count < 0 && !isPassing(errno)) return failure(errno);
     if (count > 0) line.remove_prefix(static_cast<std::size_t>(count));

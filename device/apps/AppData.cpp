@@ -6,6 +6,7 @@
 
 #include <fcntl.h>
 
+#include "base/ReturnIfError.h"
 #include "device/packages/BundleIdentifier.h"
 #include "device/storage/FileTree.h"
 #include "device/storage/SystemCalls.h"
@@ -27,7 +28,7 @@ std::string keptPathOf(std::string_view identifier) {
 }
 
 Result<FileDescriptor> openFolder(DeviceFileSystem& files, std::string_view path) {
-  if (Status made = files.createDirectory(path, IntermediateDirectories::create, {}); !made) return made.error();
+  RETURN_IF_ERROR(files.createDirectory(path, IntermediateDirectories::create, {}));
   return files.root().open(path, O_RDONLY | O_DIRECTORY);
 }
 
@@ -77,10 +78,10 @@ Status keep(DeviceFileSystem& files, Database& database, std::string_view identi
   {
     // What is replaced is not kept any more: a kill must not leave the new data under the old one's name.
     Database::Session session(database);
-    if (Status forgotten = forget(session, identifier); !forgotten) return forgotten;
+    RETURN_IF_ERROR(forget(session, identifier));
   }
   std::uint64_t bytes = 0;
-  if (Status copied = copyToKept(files, name, hostFolder, bytes); !copied) return copied;
+  RETURN_IF_ERROR(copyToKept(files, name, hostFolder, bytes));
   Database::Transaction transaction(database, Durability::power);
   transaction.run("insert or replace into restore_data values (?, ?)", identifier, bytes).ignore();
   return transaction.commit();
@@ -97,7 +98,7 @@ Result<bool> isKept(Database::Session& session, std::string_view identifier, std
 Status drop(DeviceFileSystem& files, Database& database, std::string_view identifier) {
   {
     Database::Session session(database);
-    if (Status forgotten = forget(session, identifier); !forgotten) return forgotten;
+    RETURN_IF_ERROR(forget(session, identifier));
   }
   return isBundleIdentifier(identifier) ? removeIfThere(files, keptPathOf(identifier)) : Status();
 }
@@ -126,7 +127,7 @@ Status forget(Database::Session& session, std::string_view identifier) {
 }
 
 Status markRemoved(Database::Session& session, std::string_view identifier) {
-  if (Status forgotten = forget(session, identifier); !forgotten) return forgotten;
+  RETURN_IF_ERROR(forget(session, identifier));
   return session.run("insert or ignore into removed_data values (?)", identifier);
 }
 

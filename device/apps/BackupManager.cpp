@@ -1,5 +1,7 @@
 #include "device/apps/BackupManager.h"
 
+#include "base/ReturnIfError.h"
+
 namespace appsync::device {
 
 Status BackupManager::keepRestoreData(std::string_view bundleIdentifier, const std::string& hostFolder) {
@@ -7,7 +9,7 @@ Status BackupManager::keepRestoreData(std::string_view bundleIdentifier, const s
 }
 
 Status BackupManager::restoreDataNow(std::string_view bundleIdentifier) {
-  if (Status given = app_data::giveBack(files_, database_, bundleIdentifier); !given) return given;
+  RETURN_IF_ERROR(app_data::giveBack(files_, database_, bundleIdentifier));
   Database::Session session(database_);
   return app_data::forget(session, bundleIdentifier);
 }

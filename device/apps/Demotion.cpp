@@ -7,6 +7,7 @@
 
 #include <fcntl.h>
 
+#include "base/ReturnIfError.h"
 #include "device/apps/PlaceholderBundle.h"
 #include "device/packages/BundleInfo.h"
 #include "device/packages/InstallerError.h"
@@ -75,9 +76,9 @@ Status Installer::demote(std::string_view bundleIdentifier, TSInstallType type) 
   if (!remains) return remains.error();
   NewContainer& container = remains->container;
   if (const auto artwork = readIfThere(files_, containerOf(*app.installed) + '/' + std::string(kArtworkFile))) {
-    if (Status kept = container.writeFile(kArtworkFile, *artwork); !kept) return kept;
+    RETURN_IF_ERROR(container.writeFile(kArtworkFile, *artwork));
   }
-  if (Status settled = container.settle(Durability::power); !settled) return settled;
+  RETURN_IF_ERROR(container.settle(Durability::power));
   remains->bundle.container = container.name();
   {
     Database::Transaction transaction(database_, Durability::power);
@@ -126,7 +127,7 @@ Status Installer::renamePlaceholder(std::string_view bundleIdentifier, std::stri
   info->dictionary.set(platform::BundleDisplayNameKey, name);
   document = plist::writeBinary(info->dictionary);  // which, unlike XML, has a form for every name
   if (!document) return document.error();
-  if (Status written = files_.writeFileAtomically(path, *document); !written) return written;
+  RETURN_IF_ERROR(files_.writeFileAtomically(path, *document));
   Database::Session session(database_);
   Status set = session.run("update bundles set name = ? where app = ? and role = ?", name, app.position,
                            BundleRole::placeholder);
@@ -175,7 +176,7 @@ Status recordDemotedApps(AppRegistry& registry, DeviceFileSystem& files) {
 }
 
 Status demote(AppRegistry& registry, DeviceFileSystem& files, std::string_view bundleIdentifier, TSInstallType type) {
-  if (Status demoted = registry.demote(bundleIdentifier, type); !demoted) return demoted;
+  RETURN_IF_ERROR(registry.demote(bundleIdentifier, type));
   return recordDemotedApps(registry, files);
 }
 

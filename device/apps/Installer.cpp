@@ -6,6 +6,7 @@
 
 #include <fcntl.h>
 
+#include "base/ReturnIfError.h"
 #include "device/apps/AppData.h"
 #include "device/apps/UninstalledApps.h"
 #include "device/packages/InstallerError.h"
@@ -145,10 +146,10 @@ Status Installer::unpackAndRecord(const platform::FileLocation& location, const 
   };
   const Result<UnpackedPackage> unpacked = unpackPackage(*package, container->folder(), goOn);
   if (!unpacked) return unpacked.error();
-  if (Status same = checkIdentifier(unpacked->info, request); !same) return same;
-  if (Status kept = keepStoreMetadata(*container, request); !kept) return kept;
-  if (Status given = app_data::giveBack(files_, database_, request.identifier); !given) return given;
-  if (Status settled = container->settle(Durability::power); !settled) return settled;
+  RETURN_IF_ERROR(checkIdentifier(unpacked->info, request));
+  RETURN_IF_ERROR(keepStoreMetadata(*container, request));
+  RETURN_IF_ERROR(app_data::giveBack(files_, database_, request.identifier));
+  RETURN_IF_ERROR(container->settle(Durability::power));
   return record(*container, request, applicationType, describe(unpacked->info, unpacked->appFolder, unpacked->bytes));
 }
 
@@ -168,17 +169,17 @@ Status Installer::installPlaceholder(const platform::FileLocation& location, con
   if (number != 0) return Error::fromErrno(number, location.path);
   const Result<BundleInfo> info = readInfoOf(container->folder(), folder);
   if (!info) return info.error();
-  if (Status same = checkIdentifier(*info, request); !same) return same;
-  if (Status kept = keepStoreMetadata(*container, request); !kept) return kept;
+  RETURN_IF_ERROR(checkIdentifier(*info, request));
+  RETURN_IF_ERROR(keepStoreMetadata(*container, request));
   // A sync's placeholder does not survive a restart: there is no point in waiting until it is on the disk.
   const bool lasts = request.installType != TSInstallType::Sync;
-  if (Status settled = container->settle(lasts ? Durability::power : Durability::process); !settled) return settled;
+  RETURN_IF_ERROR(container->settle(lasts ? Durability::power : Durability::process));
   return recordPlaceholder(*container, request, applicationType, describe(*info, folder, bytes));
 }
 
 Status Installer::recordPlaceholder(NewContainer& container, const InstallRequest& request,
                                     std::string_view applicationType, StoredBundle bundle) {
-  if (Status done = record(container, request, applicationType, std::move(bundle)); !done) return done;
+  RETURN_IF_ERROR(record(container, request, applicationType, std::move(bundle)));
   if (request.installType && isDemotion(*request.installType)) {
     running_.end(request.identifier, TSInstallState::Finished);
   } else {

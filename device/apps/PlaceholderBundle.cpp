@@ -8,6 +8,7 @@
 
 #include <fcntl.h>
 
+#include "base/ReturnIfError.h"
 #include "device/packages/BundleInfo.h"
 #include "device/packages/PackageReader.h"
 #include "device/storage/FileTree.h"
@@ -82,9 +83,9 @@ Result<PlaceholderContainer> makePlaceholder(DeviceFileSystem& files, const Plac
   bundle.bytes = info->size() + (icon ? icon->size() : 0);
   Result<NewContainer> container = NewContainer::make(files);
   if (!container) return container.error();
-  if (Status written = writeApp(*container, bundle.folder, *info, icon); !written) return written.error();
+  RETURN_IF_ERROR(writeApp(*container, bundle.folder, *info, icon));
   if (placeholder.storeMetadata) {
-    if (Status kept = container->writeFile(kStoreMetadataFile, *placeholder.storeMetadata); !kept) return kept.error();
+    RETURN_IF_ERROR(container->writeFile(kStoreMetadataFile, *placeholder.storeMetadata));
   }
   return PlaceholderContainer{std::move(container).value(), std::move(bundle)};
 }

@@ -3,6 +3,7 @@
 #include <map>
 #include <utility>
 
+#include "base/ReturnIfError.h"
 #include "plist/PropertyList.h"
 
 namespace appsync::device::coordinator_table {
@@ -114,9 +115,9 @@ Result<Coordinators> all(Database::Session& session) {
   Coordinators coordinators;
   ByNumber byNumber;
   if (!hasTables(session)) return coordinators;
-  if (Status read = readCoordinators(session, coordinators, byNumber); !read) return read.error();
-  if (Status read = readPlaceholders(session, byNumber); !read) return read.error();
-  if (Status read = readPromises(session, byNumber); !read) return read.error();
+  RETURN_IF_ERROR(readCoordinators(session, coordinators, byNumber));
+  RETURN_IF_ERROR(readPlaceholders(session, byNumber));
+  RETURN_IF_ERROR(readPromises(session, byNumber));
   return coordinators;
 }
 
@@ -169,7 +170,7 @@ Status storePlaceholder(Database::Session& session, std::int64_t coordinator, co
 
 Status remove(Database::Session& session, const CoordinatorState& state) {
   if (const auto package = state.ownPackage()) {
-    if (Status spent = session.run("insert or ignore into spent_packages values (?)", *package); !spent) return spent;
+    RETURN_IF_ERROR(session.run("insert or ignore into spent_packages values (?)", *package));
   }
   return session.run("delete from coordinators where number = ?", state.number);
 }

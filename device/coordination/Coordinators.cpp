@@ -2,6 +2,7 @@
 
 #include <algorithm>
 
+#include "base/ReturnIfError.h"
 #include "device/apps/PlaceholderBundle.h"
 #include "device/coordination/CoordinatorHandle.h"
 #include "device/packages/BundleIdentifier.h"
@@ -74,7 +75,7 @@ Result<Coordinators::Coordinator> Coordinators::findOrMake(CoordinatorKind kind,
   for (const Coordinator& coordinator : ofApp(identifier)) {
     if (coordinator->kind == kind) return coordinator;
   }
-  if (Status open = checkOpen(); !open) return open.error();
+  RETURN_IF_ERROR(checkOpen());
   const auto coordinator = std::make_shared<CoordinatorState>();
   coordinator->identifier = identifier;
   coordinator->kind = kind;
@@ -90,7 +91,7 @@ Result<Coordinators::Coordinator> Coordinators::findOrMake(CoordinatorKind kind,
 }
 
 Status Coordinators::mayChange(const CoordinatorState& coordinator, ClientIdentity client, bool wasSet) const {
-  if (Status open = checkOpen(); !open) return open;
+  RETURN_IF_ERROR(checkOpen());
   if (coordinator.stage == CoordinatorStage::ended) {
     return coordinationError(CoordinationFailure::ended, "the coordinator has ended");
   }
@@ -114,7 +115,7 @@ Status Coordinators::choose(const Coordinator& coordinator, CoordinatorChoices c
   const auto store = [&](Database::Session& session) {
     coordinator_table::storeChoices(session, coordinator->number, choices).ignore();
   };
-  if (Status stored = this->store(*coordinator, store); !stored) return stored;
+  RETURN_IF_ERROR(this->store(*coordinator, store));
   static_cast<CoordinatorChoices&>(*coordinator) = std::move(choices);
   advance(coordinator);
   return {};
@@ -127,7 +128,7 @@ void Coordinators::setObserver(const Coordinator& coordinator, CoordinatorObserv
 
 Status Coordinators::setOptions(const Coordinator& coordinator, ClientIdentity client, CoordinatorOptions options) {
   const std::lock_guard lock(mutex_);
-  if (Status may = mayChange(*coordinator, client, coordinator->options.has_value()); !may) return may;
+  RETURN_IF_ERROR(mayChange(*coordinator, client, coordinator->options.has_value()));
   CoordinatorChoices choices = *coordinator;
   choices.options = std::move(options);
   return choose(coordinator, std::move(choices));
@@ -136,15 +137,15 @@ Status Coordinators::setOptions(const Coordinator& coordinator, ClientIdentity c
 Status Coordinators::setInitialODRAssets(const Coordinator& coordinator, ClientIdentity client,
                                          std::vector<std::shared_ptr<PromiseState>> promises) {
   const std::lock_guard lock(mutex_);
-  if (Status may = mayChange(*coordinator, client, coordinator->hasInitialODRAssets); !may) return may;
+  RETURN_IF_ERROR(mayChange(*coordinator, client, coordinator->hasInitialODRAssets));
   for (const auto& promise : promises) {
     const bool isTwice = std::ranges::count(promises, promise) > 1;
-    if (Status usable = checkPromise(isTwice ? nullptr : promise); !usable) return usable;
+    RETURN_IF_ERROR(checkPromise(isTwice ? nullptr : promise));
   }
   CoordinatorChoices choices = *coordinator;
   choices.hasInitialODRAssets = true;
   choices.initialODRAssets = promises;
-  if (Status chosen = choose(coordinator, std::move(choices)); !chosen) return chosen;
+  RETURN_IF_ERROR(choose(coordinator, std::move(choices)));
   for (const auto& promise : promises) {
     promise->role = PromiseRole::initialODRAsset;
     promise->coordinator = coordinator;
@@ -155,7 +156,7 @@ Status Coordinators::setInitialODRAssets(const Coordinator& coordinator, ClientI
 Status Coordinators::setResponsibleClient(const Coordinator& coordinator, ClientIdentity client,
                                           ClientIdentity responsible) {
   const std::lock_guard lock(mutex_);
-  if (Status may = mayChange(*coordinator, client, coordinator->responsibleClient.has_value()); !may) return may;
+  RETURN_IF_ERROR(mayChange(*coordinator, client, coordinator->responsibleClient.has_value()));
   CoordinatorChoices choices = *coordinator;
   choices.responsibleClient = responsible;
   return choose(coordinator, std::move(choices));
@@ -230,7 +231,7 @@ Status Coordinators::show(const PlaceholderState& placeholder, const Store& stor
   if (bringsBack(placeholder)) return registry_.beginReturn(placeholder.identifier, store);
   Result<PlaceholderContainer> made = makePlaceholder(files_, contentsOf(placeholder));
   if (!made) return made.error();
-  if (Status settled = made->container.settle(Durability::process); !settled) return settled;
+  RETURN_IF_ERROR(made->container.settle(Durability::process));
   InstallRequest request;
   request.role = BundleRole::placeholder;
   request.identifier = placeholder.identifier;
@@ -242,13 +243,13 @@ Status Coordinators::show(const PlaceholderState& placeholder, const Store& stor
 
 Status Coordinators::cancel(const Coordinator& coordinator, const Error& reason, ClientIdentity client) {
   const std::lock_guard lock(mutex_);
-  if (Status open = checkOpen(); !open) return open;
+  RETURN_IF_ERROR(checkOpen());
   return cancelNow(coordinator, reason, client);
 }
 
 Status Coordinators::cancelAll(std::string_view identifier, const Error& reason, ClientIdentity client) {
   const std::lock_guard lock(mutex_);
-  if (Status open = checkOpen(); !open) return open;
+  RETURN_IF_ERROR(checkOpen());
   const CoordinatorList coordinators = ofApp(identifier);
   if (coordinators.empty()) {
     return coordinationError(CoordinationFailure::noCoordinator,
@@ -259,7 +260,7 @@ Status Coordinators::cancelAll(std::string_view identifier, const Error& reason,
                              "\"" + std::string(identifier) + "\" is just being installed; wait until that has ended");
   }
   for (const Coordinator& coordinator : coordinators) {
-    if (Status cancelled = cancelNow(coordinator, reason, client); !cancelled) return cancelled;
+    RETURN_IF_ERROR(cancelNow(coordinator, reason, client));
   }
   return {};
 }
@@ -271,7 +272,7 @@ Status Coordinators::cancelNow(const Coordinator& coordinator, const Error& reas
   if (coordinator->stage == CoordinatorStage::installing) {
     return coordinationError(CoordinationFailure::installing, "the app is just being installed");
   }
-  if (Status erased = erase(*coordinator); !erased) return erased;
+  RETURN_IF_ERROR(erase(*coordinator));
   removePackage(*coordinator);
   close(coordinator, reason);
   if (client == coordinator->creator) return {};

@@ -3,6 +3,7 @@
 #include <cmath>
 
 #include "base/Describe.h"
+#include "base/ReturnIfError.h"
 #include "device/coordination/Coordinators.h"
 
 namespace appsync::device {
@@ -71,7 +72,7 @@ void Coordinators::fulfil(const std::shared_ptr<PromiseState>& promise) {
 
 Status Coordinators::takeBack(const std::shared_ptr<PromiseState>& promise, ClientIdentity client) {
   const std::lock_guard lock(mutex_);
-  if (Status open = checkOpen(); !open) return open;
+  RETURN_IF_ERROR(checkOpen());
   if (!promise->canChange()) return coordinationError(CoordinationFailure::ended, "the promise is over");
   const Coordinator coordinator = promise->coordinator.lock();
   if (promise->role && client != promise->client) return foreign("promise");
@@ -84,7 +85,7 @@ Status Coordinators::takeBack(const std::shared_ptr<PromiseState>& promise, Clie
     const auto store = [&](Database::Session& session) {
       coordinator_table::storePromise(session, coordinator->number, *promise->role, copy).ignore();
     };
-    if (Status stored = this->store(*coordinator, store); !stored) return stored;
+    RETURN_IF_ERROR(this->store(*coordinator, store));
   }
   promise->isCancelled = true;
   return {};
@@ -101,13 +102,13 @@ std::string Coordinators::describe(const PromiseState& promise) const {
 
 Status Coordinators::configure(const std::shared_ptr<PlaceholderState>& placeholder, const Configuration& change) {
   const std::lock_guard lock(mutex_);
-  if (Status open = checkOpen(); !open) return open;
+  RETURN_IF_ERROR(checkOpen());
   if (placeholder->isCancelled) return coordinationError(CoordinationFailure::ended, "the placeholder was given up");
   if (placeholder->isConfigured) {
     return coordinationError(CoordinationFailure::setBefore, "the placeholder's configuration is complete");
   }
   PlaceholderState copy = *placeholder;
-  if (Status changed = change(copy); !changed) return changed;
+  RETURN_IF_ERROR(change(copy));
   const Coordinator coordinator = placeholder->coordinator.lock();
   const bool isToShow = coordinator && copy.isConfigured && coordinator->stage == CoordinatorStage::waiting;
   if (coordinator) {

@@ -8,6 +8,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include "base/ReturnIfError.h"
 #include "device/storage/FileTree.h"
 #include "device/storage/SystemCalls.h"
 
@@ -49,7 +50,7 @@ Result<std::shared_ptr<PromisedTransferToPath>> promiseFor(InstallCoordination& 
   auto promise =
       service.makePromisedTransferToPath(identifier + "-Asset", ClientIdentity::CXClientBazaarly, std::nullopt, 0);
   if (promise == nullptr) return Error::fromErrno(ENOTSUP, "the promise of the package");
-  if (Status set = coordinator.setAppAssetPromise(promise); !set) return set.error();
+  RETURN_IF_ERROR(coordinator.setAppAssetPromise(promise));
   return promise;
 }
 

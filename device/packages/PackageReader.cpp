@@ -9,6 +9,7 @@
 #include <locale.h>
 #include <sys/stat.h>
 
+#include "base/ReturnIfError.h"
 #include "device/packages/BundleInfo.h"
 #include "device/packages/InstallerError.h"
 
@@ -134,7 +135,7 @@ Result<bool> PackageReader::next(Entry& entry) {
     return installerError(InstallerFailure::encrypted,
                           "the package is encrypted at " + quoted(current_) + "; make it again without a password");
   }
-  if (Status checked = check(entry); !checked) return checked.error();
+  RETURN_IF_ERROR(check(entry));
   if (archive_entry_size_is_set(header) != 0) {
     const auto size = static_cast<std::uint64_t>(std::max<la_int64_t>(archive_entry_size(header), 0));
     if (size > limits_.unpackedBytes - unpackedBytes_) return tooLarge();
@@ -152,7 +153,7 @@ Status PackageReader::check(const Entry& entry) {
         InstallerFailure::unsafeEntry,
         "the package holds " + quoted(entry.path) + ", a name that may lead out of it" + std::string(kMakeAgain));
   }
-  if (Status placed = checkPlace(entry.path, entry.kind); !placed) return placed;
+  RETURN_IF_ERROR(checkPlace(entry.path, entry.kind));
   if (!seen_.insert(entry.path).second) {
     return installerError(InstallerFailure::duplicateEntry,
                           "the package holds " + quoted(entry.path) + " twice" + std::string(kMakeAgain));

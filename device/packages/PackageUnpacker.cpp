@@ -3,6 +3,7 @@
 
 #include <fcntl.h>
 
+#include "base/ReturnIfError.h"
 #include "device/packages/InstallerError.h"
 #include "device/packages/Package.h"
 #include "device/storage/RootDirectory.h"
@@ -102,7 +103,7 @@ Result<UnpackedPackage> unpackPackage(PackageReader& package, int folder,
     const Result<bool> more = package.next(entry);
     if (!more) return more.error();
     if (!*more) break;
-    if (Status unpacked = unpacking.unpack(entry); !unpacked) return unpacked.error();
+    RETURN_IF_ERROR(unpacking.unpack(entry));
     if (!goOn(package.fraction())) {
       return installerError(InstallerFailure::cancelled, "the install was cancelled; start it again to have the app");
     }

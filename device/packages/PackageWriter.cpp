@@ -12,6 +12,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include "base/ReturnIfError.h"
 #include "device/packages/Package.h"
 #include "device/storage/FileDescriptor.h"
 #include "device/storage/HostFile.h"
@@ -112,7 +113,7 @@ Status writeItems(const std::vector<Item>& items, int file, const std::string& p
     return failed(writer, package);
   }
   for (const Item& item : items) {
-    if (Status written = writeItem(writer, item); !written) return written;
+    RETURN_IF_ERROR(writeItem(writer, item));
   }
   if (archive_write_close(writer.get()) != ARCHIVE_OK) return failed(writer, package);
   return {};
@@ -134,7 +135,7 @@ Status writePackage(const std::vector<std::string>& items, const std::string& pa
   std::vector<Item> all;
   for (const std::string& item : items) {
     const fs::path path = fs::path(item).has_filename() ? fs::path(item) : fs::path(item).parent_path();
-    if (Status added = collect(path, path.filename().string(), all); !added) return added;
+    RETURN_IF_ERROR(collect(path, path.filename().string(), all));
   }
   std::sort(all.begin(), all.end());
   return writeHostFile(package, [&](int file) {

@@ -4,6 +4,7 @@
 #include <unordered_set>
 #include <utility>
 
+#include "base/ReturnIfError.h"
 #include "device/packages/BundleIdentifier.h"
 #include "device/storage/Database.h"
 #include "plist/PropertyList.h"
@@ -102,7 +103,7 @@ std::unique_ptr<platform::TerminationAssertion> HomeScreen::terminationAssertion
 
 Result<std::vector<std::string>> HomeScreen::iconOrder() {
   IconOrder icons;
-  if (const Status laidOut = appendLayout(database_, icons); !laidOut) return laidOut.error();
+  RETURN_IF_ERROR(appendLayout(database_, icons));
   appendApps(registry_, icons);
   return icons.take();
 }

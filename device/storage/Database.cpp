@@ -5,6 +5,7 @@
 
 #include <sqlite3.h>
 
+#include "base/ReturnIfError.h"
 #include "device/storage/FaultPoint.h"
 
 namespace appsync::device {
@@ -63,7 +64,7 @@ Result<std::unique_ptr<Database>> Database::open(const std::string& path, Access
   const int result = sqlite3_open_v2(file.c_str(), &connection, mode | SQLITE_OPEN_NOMUTEX, nullptr);
   std::unique_ptr<Database> database(new Database(connection));
   if (result != SQLITE_OK) return databaseError(connection, result);
-  if (Status configured = configure(connection, access); !configured) return configured.error();
+  RETURN_IF_ERROR(configure(connection, access));
   return database;
 }
 
@@ -212,7 +213,7 @@ Status Database::Transaction::commit() {
   if (durability_ == Durability::power) {
     if (auto failure = injectedFailure("database to disk")) return *failure;
   }
-  if (Status committed = run("commit"); !committed) return committed;
+  RETURN_IF_ERROR(run("commit"));
   open_ = false;
   return {};
 }

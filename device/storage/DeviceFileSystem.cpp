@@ -7,6 +7,7 @@
 #include <sys/stat.h>
 #include <sys/xattr.h>
 
+#include "base/ReturnIfError.h"
 #include "device/storage/FileTree.h"
 #include "device/storage/SystemCalls.h"
 
@@ -128,7 +129,7 @@ Status DeviceFileSystem::createDirectory(std::string_view path, platform::Interm
   Result<RootFolder::Place> place = placeToChange(path);
   if (!place && place.error().code == ENOENT && createParents) {
     const std::string_view parent = path.substr(0, path.find_last_of('/', path.find_last_not_of('/')));
-    if (Status made = createDirectory(parent.empty() ? "/" : parent, intermediates, attributes); !made) return made;
+    RETURN_IF_ERROR(createDirectory(parent.empty() ? "/" : parent, intermediates, attributes));
     place = placeToChange(path);
   }
   if (!place) return place.error();

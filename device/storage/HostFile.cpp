@@ -12,6 +12,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include "base/ReturnIfError.h"
 #include "device/storage/FileDescriptor.h"
 #include "device/storage/FileTree.h"
 #include "device/storage/SystemCalls.h"
@@ -86,7 +87,7 @@ Status fillStream(const std::string& path, const HostFileFill& fill) {
   const std::unique_ptr<std::FILE, int (*)(std::FILE*)> whole(std::tmpfile(), std::fclose);
   if (whole == nullptr) return Error::fromErrno(errno, "a temporary file cannot be made");
   const int file = ::fileno(whole.get());
-  if (Status filled = fill(file); !filled) return filled;
+  RETURN_IF_ERROR(fill(file));
   return writeStream(path, [&](int stream) { return copyAll(file, stream); });
 }
 
