@@ -197,7 +197,7 @@ TEST_F(TapAndCancel, ClientsThatMeanIllDoNotHoldUpTheSync) {
   for (const std::string& said : {std::string(), std::string("cancel org.a"), std::string(5000, 'x')}) {
     auto client = daemon::connectIn(folder->get());
     ASSERT_TRUE(client.ok());
-    tools::writeLine(client->get(), said, daemon::ControlPatience(std::chrono::minutes(1), -1)).ignore();
+    daemon::writeLine(client->get(), said, daemon::ControlPatience(std::chrono::minutes(1), -1)).ignore();
     clients.push_back(std::move(client).value());
   }
   hold.letGo();
