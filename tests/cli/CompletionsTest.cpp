@@ -35,7 +35,7 @@ std::string nameOf(const testing::TestParamInfo<Shell>& shell) {
 }
 
 std::string scriptsFolder() {
-  return std::string(kSourceFolder) + "/tools/completions";
+  return std::string(kSourceFolder) + "/cli/completions";
 }
 
 /// Names of options and commands.
@@ -61,7 +61,7 @@ class Completions : public ToolFixture, public testing::WithParamInterface<Shell
   [[nodiscard]] OffersByLine offersFor(const std::vector<std::string>& lines) const {
     const Shell& shell = GetParam();
     std::vector<std::string> words = shell.withoutConfiguration;
-    words.push_back(std::string(kSourceFolder) + "/tests/tools/completions/drive." + shell.name);
+    words.push_back(std::string(kSourceFolder) + "/tests/cli/completions/drive." + shell.name);
     words.insert(words.end(), {scriptsFolder(), path("")});
     std::string input;
     for (const std::string& line : lines)

@@ -17,7 +17,7 @@ constexpr int kDocuments = 2000;
 
 /// Runs the script that makes and checks documents; true when it is content.
 bool runScript(const std::string& action, int seed, const std::filesystem::path& file) {
-  const std::string command = "python3 '" + std::string(kSourceFolder) + "/tests/base/plistlib_documents.py' " +
+  const std::string command = "python3 '" + std::string(kSourceFolder) + "/tests/plist/plistlib_documents.py' " +
                               action + " " + std::to_string(seed) + " " + std::to_string(kDocuments) + " '" +
                               file.string() + "'";
   return std::system(command.c_str()) == 0;
