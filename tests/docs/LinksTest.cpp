@@ -38,9 +38,10 @@ Names matchesIn(const std::string& text, const std::regex& pattern) {
   return {std::sregex_token_iterator(text.begin(), text.end(), pattern, 1), std::sregex_token_iterator()};
 }
 
-/// Returns the targets in this repository of "[text](target)" and of pictures, without the part after "#".
+/// Returns the targets in this repository of "[text](target)" and of pictures, without the part after "#". Code such as
+/// "[](int value)" is no link.
 Names linksIn(const std::string& text) {
-  Names links = matchesIn(text, std::regex(R"(\]\((?!https?:)([^)#\s]+)[^)]*\))"));
+  Names links = matchesIn(text, std::regex(R"([^\[]\]\((?!https?:)([^)#\s]+)[^)]*\))"));
   links.merge(matchesIn(text, std::regex(R"re(<img src="([^"]+)")re")));
   return links;
 }
@@ -76,7 +77,7 @@ TEST(Links, NamedSourcesExist) {
 }
 
 TEST(Links, AreFoundInText) {
-  EXPECT_EQ(linksIn("see [a](b/c.md), [d](e.md#f) and [g](https://h.i) <img src=\"j.png\">"),
+  EXPECT_EQ(linksIn("see [a](b/c.md), [d](e.md#f) and [g](https://h.i) [](int j) <img src=\"j.png\">"),
             (Names{"b/c.md", "e.md", "j.png"}));
   EXPECT_EQ(sourcesIn("`base/Error.h`, `x`, `cmake/a_b.py`, `cmake/c-d.cmake.in`"),
             (Names{"base/Error.h", "cmake/a_b.py", "cmake/c-d.cmake.in"}));
