@@ -1,9 +1,9 @@
-# What the demos share; to be sourced with the demo's own arguments, with $samples set. Finds the tool, goes to the folder
-# in which everything happens, and defines say, run and make_apps.
+# Shared part of the demos; source it with the demo's arguments and $samples set. Finds the command, changes to the folder of
+# the demo, and defines say, run and make_apps.
 # shellcheck shell=bash
 command -v appsync >/dev/null || PATH="$samples/../build/bin:$PATH"
 command -v appsync >/dev/null || {
-  echo "demo: there is no appsync yet; make it with ./dev build" >&2
+  echo "demo: appsync is not built; run ./dev build" >&2
   exit 1
 }
 
@@ -27,7 +27,7 @@ fi
 
 say() { printf '\n%s# %s%s\n' "$bold" "$*" "$plain"; }
 
-# run COMMAND...: shows the command as one would type it, then what it does.
+# run COMMAND...: prints the command as a user would type it, then runs it.
 run() {
   local word shown='$'
   for word in "$@"; do
@@ -38,7 +38,7 @@ run() {
   "$@"
 }
 
-# make_apps SAMPLES: copies the sample apps to apps/ and makes an empty library.
+# make_apps SAMPLES: copies the sample apps to apps/ and creates an empty library.
 make_apps() {
   cp -R "$1" apps
   rm -f apps/*.sh apps/draw_icons.py

@@ -1,11 +1,11 @@
 #!/usr/bin/env bash
-# Shows a restore: fills a device with apps, backs it up, and brings everything back to a new one, in both of the ways in
-# which devices install.
+# Demonstrates a restore: installs apps on a device, backs it up, and restores everything to a new device, with both ways to
+# install.
 #
 # usage: samples/demo-restore.sh [FOLDER]
 #
-# Everything happens in FOLDER, which stays and must be missing or empty; without one in a folder that is removed at the
-# end. The tool is the `appsync` on the PATH, or the one that ./dev build made.
+# Creates all files in FOLDER, which must be missing or empty. Without FOLDER it uses a temporary folder and deletes it at
+# the end. Runs the `appsync` on the PATH, or the one that ./dev build has built.
 set -euo pipefail
 
 samples="$(cd "$(dirname "${BASH_SOURCE[0]}")" && pwd)"
@@ -14,7 +14,7 @@ source "$samples/demo-common.sh"
 
 data=root/var/mobile/Containers/Data
 
-# content_of DEVICE: what a restore is to bring back: each app with version, state and files, and all data.
+# content_of DEVICE: prints what a restore must preserve: each app with version, state and files, and all data.
 content_of() {
   (
     cd "$1"
@@ -26,7 +26,7 @@ content_of() {
   )
 }
 
-# fill DEVICE: all apps, two of them demoted, two with data, one with a licence.
+# fill DEVICE: installs all apps, adds data to two and a licence to one, and demotes two.
 fill() {
   run appsync sync "$1" library
   mkdir -p "$1/$data/org.example.ledger" "$1/$data/org.example.gambit"
@@ -36,13 +36,13 @@ fill() {
 }
 
 make_apps "$samples"
-# Four more apps, so that there is something to see.
+# Four more apps, for a fuller home screen.
 for app in Almanac Kettle Metronome Verdant; do
   cp -R "apps/$app" "apps/$app-2"
   sed -i -E 's|(<string>org\.example\.[a-z]+)(</string>)|\1-2\2|' "apps/$app-2/$app.app/Info.plist"
 done
 echo 'licence of the device demo' >licence
-say 'Turn twelve apps into packages'
+say 'Pack twelve apps'
 for app in apps/*/; do
   app="${app%/}"
   appsync pack "$app" -o "library/${app#apps/}.zip" >/dev/null
@@ -56,19 +56,19 @@ for mode in coordinated direct; do
   run appsync apps "phone-$mode"
   run appsync screen "phone-$mode" -o "$mode-1-before.png"
 
-  say 'Back it up, and wipe it'
+  say 'Back it up, and delete it'
   run appsync backup "phone-$mode" "backup-$mode"
   content_of "phone-$mode" >"$mode-before.txt"
   run rm -rf "phone-$mode"
 
-  say 'Restore it: placeholders stand for all apps'
+  say 'Restore it: all apps are placeholders'
   run appsync init "phone-$mode" "--$mode"
   run appsync set "phone-$mode" store=library
   run appsync restore "phone-$mode" "backup-$mode" --log "$mode-restore.log"
   run appsync apps "phone-$mode"
   run appsync screen "phone-$mode" -o "$mode-2-placeholders.png"
 
-  say 'The next sync brings the packages'
+  say 'The next sync installs the packages'
   run appsync sync "phone-$mode" library
   run appsync apps "phone-$mode"
   run appsync screen "phone-$mode" -o "$mode-3-after.png"
@@ -77,12 +77,12 @@ for mode in coordinated direct; do
   run cmp "$mode-1-before.png" "$mode-3-after.png"
   run appsync backup "phone-$mode" "backup-$mode-after"
   run cmp {"backup-$mode","backup-$mode-after"}/Apps/org.example.tides/ApplicationSINF
-  say "Apps, versions, files, data, licence and demotion are as they were ($mode)"
+  say "Apps, versions, files, data, licence and demotion are unchanged ($mode)"
 done
 run diff coordinated-after.txt direct-after.txt
 
 if [[ $# -gt 0 ]]; then
   say "The devices, backups, logs and pictures are in $1"
 else
-  say 'All of it is gone now; "samples/demo-restore.sh FOLDER" keeps it, with pictures of the home screen'
+  say 'All files are deleted; "samples/demo-restore.sh FOLDER" keeps them, with pictures of the home screen'
 fi

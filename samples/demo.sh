@@ -1,17 +1,17 @@
 #!/usr/bin/env bash
-# Shows appsync at work: packs the sample apps, keeps a device in step with them, and draws its home screen.
+# Demonstrates appsync: packs the sample apps, synchronises a device with them, and draws its home screen.
 #
 # usage: samples/demo.sh [FOLDER]
 #
-# Everything happens in FOLDER, which stays and must be missing or empty; without one in a folder that is removed at the
-# end. The tool is the `appsync` on the PATH, or the one that ./dev build made.
+# Creates all files in FOLDER, which must be missing or empty. Without FOLDER it uses a temporary folder and deletes it at
+# the end. Runs the `appsync` on the PATH, or the one that ./dev build has built.
 set -euo pipefail
 
 samples="$(cd "$(dirname "${BASH_SOURCE[0]}")" && pwd)"
 # shellcheck source=samples/demo-common.sh
 source "$samples/demo-common.sh"
 
-# contents DEVICE: its apps and their files, but for the names of containers and the order in which they came.
+# contents DEVICE: prints its apps and their files, without the names of containers and the order of installation.
 contents() {
   appsync apps "$1" | sort
   (cd "$1/root/var/mobile/Containers/Bundle" && find . -type f -exec sha256sum {} +) | sed 's|\./[^/]*/||' | sort
@@ -19,13 +19,13 @@ contents() {
 
 make_apps "$samples"
 
-say 'Turn the apps into packages'
+say 'Pack the apps'
 for app in apps/*/; do
   app="${app%/}"
   run appsync pack "$app" -o "library/${app#apps/}.zip"
 done
 
-say 'Make a device and install everything'
+say 'Create a device and install everything'
 run appsync init phone
 run appsync sync phone library
 run appsync apps phone
@@ -41,7 +41,7 @@ run appsync sync phone library --remove org.example.gambit
 run appsync apps phone
 run appsync screen phone -o screen-2.png
 
-say 'What was removed is not sent again, unless one asks for it'
+say 'A removed app is sent again only on request'
 run appsync sync phone library
 run appsync sync phone library --only org.example.gambit
 
@@ -57,5 +57,5 @@ echo 'The two devices are equal.'
 if [[ $# -gt 0 ]]; then
   say "The devices and the pictures are in $1: phone, direct-phone, screen.png, screen-2.png"
 else
-  say 'All of it is gone now; "samples/demo.sh FOLDER" keeps it, with pictures of the home screen'
+  say 'All files are deleted; "samples/demo.sh FOLDER" keeps them, with pictures of the home screen'
 fi

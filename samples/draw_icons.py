@@ -1,5 +1,5 @@
 #!/usr/bin/python3
-"""Draws the sample apps' icons and artwork. Needed only when one is to change: the pictures are kept beside the sources.
+"""Draws the sample apps' icons and artwork. Needed only to change one: the pictures are in the repository.
 
 usage: samples/draw_icons.py      (Debian package python3-cairo)
 
