@@ -21,7 +21,7 @@ Character firstCharacter(std::string_view text) {
   return {code, length, true};
 }
 
-bool isTreacherous(char32_t code) {
+bool isUnsafeForDisplay(char32_t code) {
   return code < 0x20 || (code >= 0x7F && code <= 0x9F) || code == 0xAD || code == 0x61C ||
          (code >= 0x200B && code <= 0x200F && code != 0x200D) || (code >= 0x2028 && code <= 0x202E) ||
          (code >= 0x2060 && code <= 0x206F) || code == 0xFEFF || (code >= 0xFFF0 && code <= 0xFFFB) ||

@@ -17,6 +17,6 @@ struct Character {
 [[nodiscard]] Character firstCharacter(std::string_view text);
 
 /// Whether a character commands a terminal, or is invisible and lets text pretend to be other text.
-[[nodiscard]] bool isTreacherous(char32_t code);
+[[nodiscard]] bool isUnsafeForDisplay(char32_t code);
 
 }  // namespace appsync::device

@@ -14,7 +14,7 @@ using device::firstCharacter;
 
 /// Columns that a character takes, or a negative number when it must not reach a terminal.
 int columnsOf(const Character& character) {
-  if (!character.valid || device::isTreacherous(character.code)) return -1;
+  if (!character.valid || device::isUnsafeForDisplay(character.code)) return -1;
   if (character.code < 0x7F) return 1;
   return wcwidth(static_cast<wchar_t>(character.code));
 }
@@ -49,7 +49,7 @@ std::string withReferences(std::string document, Notation notation) {
   std::size_t kept = 0;  // how much of the document `out` stands for
   for (std::size_t place = 0; place < document.size();) {
     const Character character = firstCharacter(std::string_view(document).substr(place));
-    if (character.valid && character.code >= 0x7F && device::isTreacherous(character.code)) {
+    if (character.valid && character.code >= 0x7F && device::isUnsafeForDisplay(character.code)) {
       out.append(document, kept, place - kept).append(reference(character.code, notation));
       kept = place + character.length;
     }

@@ -47,8 +47,8 @@ Status makeMissingTables(Database& database) {
 /// Removes those files of a new database that are there.
 Status removeNewDatabase(int folder, std::initializer_list<std::string_view> endings) {
   for (const std::string_view ending : endings) {
-    const int number = sys::removeFile(folder, (kNewDatabaseFile + std::string(ending)).c_str());
-    if (number != 0 && number != ENOENT) return Error::fromErrno(number, kNewDatabaseFile);
+    const int error = sys::removeFile(folder, (kNewDatabaseFile + std::string(ending)).c_str());
+    if (error != 0 && error != ENOENT) return Error::fromErrno(error, kNewDatabaseFile);
   }
   return {};
 }
@@ -78,9 +78,9 @@ Status makeDatabase(const std::string& path, int folder, InstallMode mode) {
   // A log stays when its database is closed, also one that is not in use any more.
   RETURN_IF_ERROR(removeNewDatabase(folder, {"-wal", "-shm"}));
   // Folders that a loss of power took back would be missed.
-  int number = sys::syncFileSystem(folder);
-  if (number == 0) number = sys::rename(folder, kNewDatabaseFile, folder, kDatabaseFile, sys::Replace::no);
-  if (number != 0) return Error::fromErrno(number, kDatabaseFile);
+  int error = sys::syncFileSystem(folder);
+  if (error == 0) error = sys::rename(folder, kNewDatabaseFile, folder, kDatabaseFile, sys::Replace::no);
+  if (error != 0) return Error::fromErrno(error, kDatabaseFile);
   return {};
 }
 
@@ -139,10 +139,10 @@ Result<FileDescriptor> makeDevice(const std::string& path, InstallMode mode) {
   if (made != 0 && made != EEXIST) return Error::fromErrno(made, path);
   const Result<FileDescriptor> folder = openFolder(path);
   if (!folder) return folder.error();
-  RETURN_IF_ERROR(checkFolderIsFree(path, folder->get()));
+  RETURN_IF_ERROR(checkDirectoryIsFree(path, folder->get()));
   Result<FileDescriptor> lock = lockDevice(path, folder->get());
   if (!lock) return lock.error();
-  RETURN_IF_ERROR(makeDeviceFolders(path, folder->get()));
+  RETURN_IF_ERROR(makeDeviceDirectories(path, folder->get()));
   RETURN_IF_ERROR(makeDatabase(path, folder->get(), mode));
   return lock;
 }
@@ -180,10 +180,9 @@ Result<std::unique_ptr<Device>> Device::open(const std::string& path, Access acc
 Result<std::unique_ptr<Device>> Device::open(const std::string& path, Access access, FileDescriptor lock) {
   Result<std::unique_ptr<Database>> database = Database::open(path + '/' + kDatabaseFile, access);
   if (!database) return deviceError(path, access, database.error());
-  Status checked = checkDatabase(path, **database);
-  if (checked) checked = checkRegister(**database);
-  if (!checked) return deviceError(path, access, checked.error());
   const auto prepared = [&]() -> Result<DeviceFileSystem> {
+    RETURN_IF_ERROR(checkDatabase(path, **database));
+    RETURN_IF_ERROR(checkRegister(**database));
     const Result<FileDescriptor> folder = openFolder(path);
     if (!folder) return folder.error();
     Result<DeviceFileSystem> files = openFileSystem(path, folder->get(), access);

@@ -13,7 +13,7 @@ namespace appsync::device {
 namespace {
 
 struct Meaning {
-  int number;
+  int error;
   DeviceFailure failure;
   std::string_view advice;
 };
@@ -52,7 +52,7 @@ Error deviceError(const std::string& path, Access access, const Error& cause) {
                                     "); put a copy of it in its place, or make a new one with \"appsync init\""),
                     cause);
   }
-  const auto found = std::ranges::find(kMeanings, systemErrorOf(cause), &Meaning::number);
+  const auto found = std::ranges::find(kMeanings, systemErrorOf(cause), &Meaning::error);
   const bool isAnswer =
       found != kMeanings.end() && (found->failure != DeviceFailure::readOnly || access == Access::exclusive);
   if (!isAnswer) {

@@ -13,19 +13,19 @@ namespace appsync::device {
 inline constexpr const char* kDatabaseFile = "device.db";
 /// A database under this name is still being made.
 inline constexpr const char* kNewDatabaseFile = "device.db.new";
-inline constexpr const char* kRootFolder = "root";
-inline constexpr const char* kWorkFolder = "work";
+inline constexpr const char* kRootDirectory = "root";
+inline constexpr const char* kWorkDirectory = "work";
 inline constexpr const char* kLockFile = "lock";
 
 /// Whether a folder can become a device: it is empty, or holds what an interrupted attempt left. Else an error of
 /// kDeviceDomain.
-[[nodiscard]] Status checkFolderIsFree(const std::string& path, int folder);
+[[nodiscard]] Status checkDirectoryIsFree(const std::string& path, int folder);
 
 /// Takes hold of a device until the descriptor is closed; an error that names the holder when another process has it.
 [[nodiscard]] Result<FileDescriptor> lockDevice(const std::string& path, int folder);
 
 /// Makes the folders without which a device is damaged, where an interrupted attempt has not made them.
-[[nodiscard]] Status makeDeviceFolders(const std::string& path, int folder);
+[[nodiscard]] Status makeDeviceDirectories(const std::string& path, int folder);
 
 /// Makes what may be missing, if `access` allows it; a device without its root or containers is damaged.
 [[nodiscard]] Result<DeviceFileSystem> openFileSystem(const std::string& path, int folder, Access access);

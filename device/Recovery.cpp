@@ -108,8 +108,8 @@ Status reconcileRecords(Database& database, int containers, bool coordinationIsO
       if (stays(containers, app, role, *coordinated)) {
         kept.insert(bundle->container);
         hasPlaceholder = role == BundleRole::placeholder;
-      } else if (Status removed = app_table::remove(transaction, app, role); !removed) {
-        return removed;
+      } else {
+        RETURN_IF_ERROR(app_table::remove(transaction, app, role));
       }
     }
     const std::optional<ProgressValues> progress =
@@ -127,7 +127,7 @@ int sweepContainers(int containers, const std::unordered_set<std::string>& kept,
     if (!kept.contains(name)) strays.emplace_back(name);
   }
   for (const std::string& stray : strays) {
-    if (const int number = tree::remove(containers, stray.c_str(), work); number != 0) return number;
+    if (const int error = tree::remove(containers, stray.c_str(), work); error != 0) return error;
   }
   return entries.failure();
 }
@@ -138,7 +138,7 @@ Status sweepPackages(Database& database, DeviceFileSystem& files, const std::uno
   const Result<std::vector<std::string>> spent = coordinator_table::spentPackages(transaction);
   if (!spent) return spent.error();
   for (const std::string& path : *spent) {
-    const Result<RootFolder::Place> place = files.root().place(path);
+    const Result<RootDirectory::Place> place = files.root().place(path);
     if (place && !needed.contains(path)) {
       static_cast<void>(sys::removeFile(place->folder.get(), place->name.c_str()));
     }
@@ -158,16 +158,13 @@ Status recover(Database& database, DeviceFileSystem& files, Settings& settings) 
   std::unordered_set<std::string> kept;
   std::unordered_set<std::string> packages;
   const bool coordinationIsOn = settings.coordinationIsOn();
-  if (Status reconciled = reconcileRecords(database, containers->get(), coordinationIsOn, kept, packages);
-      !reconciled) {
-    return reconciled;
-  }
+  RETURN_IF_ERROR(reconcileRecords(database, containers->get(), coordinationIsOn, kept, packages));
   RETURN_IF_ERROR(sweepPackages(database, files, packages));
   RETURN_IF_ERROR(app_data::recover(files, database));
-  int number = sweepContainers(containers->get(), kept, files.work());
-  if (number == 0) number = tree::empty(temporary->get(), files.work());
-  if (number == 0) number = tree::empty(files.work(), files.work());
-  if (number != 0) return Error::fromErrno(number, "what a crash left behind");
+  int error = sweepContainers(containers->get(), kept, files.work());
+  if (error == 0) error = tree::empty(temporary->get(), files.work());
+  if (error == 0) error = tree::empty(files.work(), files.work());
+  if (error != 0) return Error::fromErrno(error, "what a crash left behind");
   return {};
 }
 

@@ -37,7 +37,7 @@ int copyPieceByHand(int from, int to, std::size_t& copied) {
 
 /// Copies at most one piece; `copied` is 0 at the end.
 int copyPiece(int from, int to, std::size_t& copied) {
-  if (const int failed = device::step("send package"); failed != 0) return failed;
+  if (const int failed = device::faultPoint("send package"); failed != 0) return failed;
   ssize_t count = -1;
   do {
     count = ::copy_file_range(from, nullptr, to, nullptr, kPiece, 0);
@@ -70,7 +70,7 @@ int copyInto(int from, int folder, const std::string& name, std::uint64_t size, 
 /// what it then removes is the name. Copies would have to be written out with every app that is installed meanwhile.
 int lendWhole(int from, int folder, const std::string& name, const PackageSender::GoOn& goOn) {
   if (!goOn(0)) return ECANCELED;
-  if (const int failed = device::step("send package"); failed != 0) return failed;
+  if (const int failed = device::faultPoint("send package"); failed != 0) return failed;
   if (::linkat(from, "", folder, name.c_str(), AT_EMPTY_PATH) != 0) {
     const std::string path = "/proc/self/fd/" + std::to_string(from);
     if (::linkat(AT_FDCWD, path.c_str(), folder, name.c_str(), AT_SYMLINK_FOLLOW) != 0) return errno;
@@ -89,7 +89,7 @@ Result<std::string> PackageSender::send(const LibraryPackage& package, const GoO
   Status made = files_.createDirectory(folder, platform::IntermediateDirectories::create, {});
   if (!made) return made.error();
   const std::string name = std::to_string(++sent_) + ".zip";
-  const Result<device::RootFolder::Place> place = files_.root().place(folder + "/" + name);
+  const Result<device::RootDirectory::Place> place = files_.root().place(folder + "/" + name);
   if (!place) return place.error();
   int failed = lendWhole(from.get(), place->folder.get(), name, goOn);
   if (failed != 0 && failed != ECANCELED) failed = copyInto(from.get(), place->folder.get(), name, package.bytes, goOn);

@@ -52,12 +52,12 @@ Status copyToKept(DeviceFileSystem& files, const std::string& identifier, const 
   const Result<FileDescriptor> kept = openFolder(files, kRestoreDataPath);
   if (!kept) return kept.error();
   const std::string draft = sys::temporaryName();
-  int number = tree::copy(source.get(), ".", files.work(), draft.c_str(), bytes);
-  if (number == 0) number = sys::syncFileSystem(kept->get());
-  if (number == 0) number = moveInto(files.work(), draft.c_str(), kept->get(), identifier.c_str(), files.work());
-  if (number == 0) return {};
+  int error = tree::copy(source.get(), ".", files.work(), draft.c_str(), bytes);
+  if (error == 0) error = sys::syncFileSystem(kept->get());
+  if (error == 0) error = moveInto(files.work(), draft.c_str(), kept->get(), identifier.c_str(), files.work());
+  if (error == 0) return {};
   static_cast<void>(tree::remove(files.work(), draft.c_str(), files.work()));
-  return Error::fromErrno(number, "the data of " + identifier);
+  return Error::fromErrno(error, "the data of " + identifier);
 }
 
 Result<std::vector<std::string>> identifiersIn(Database& database, const char* query) {
@@ -78,7 +78,7 @@ Status keep(DeviceFileSystem& files, Database& database, std::string_view identi
   {
     // What is replaced is not kept any more: a kill must not leave the new data under the old one's name.
     Database::Session session(database);
-    RETURN_IF_ERROR(forget(session, identifier));
+    RETURN_IF_ERROR(deleteRestoreRecord(session, identifier));
   }
   std::uint64_t bytes = 0;
   RETURN_IF_ERROR(copyToKept(files, name, hostFolder, bytes));
@@ -98,12 +98,12 @@ Result<bool> isKept(Database::Session& session, std::string_view identifier, std
 Status drop(DeviceFileSystem& files, Database& database, std::string_view identifier) {
   {
     Database::Session session(database);
-    RETURN_IF_ERROR(forget(session, identifier));
+    RETURN_IF_ERROR(deleteRestoreRecord(session, identifier));
   }
   return isBundleIdentifier(identifier) ? removeIfThere(files, keptPathOf(identifier)) : Status();
 }
 
-Status giveBack(DeviceFileSystem& files, Database& database, std::string_view identifier) {
+Status commitRestoreData(DeviceFileSystem& files, Database& database, std::string_view identifier) {
   {
     Database::Session session(database);
     const Result<bool> kept = isKept(session, identifier, nullptr);
@@ -117,17 +117,17 @@ Status giveBack(DeviceFileSystem& files, Database& database, std::string_view id
   const Result<FileDescriptor> data = openFolder(files, kDataPath);
   if (!data) return data.error();
   const std::string name(identifier);
-  const int number = moveInto(from->get(), name.c_str(), data->get(), name.c_str(), files.work());
-  if (number != 0) return Error::fromErrno(number, "the data of " + name);
+  const int error = moveInto(from->get(), name.c_str(), data->get(), name.c_str(), files.work());
+  if (error != 0) return Error::fromErrno(error, "the data of " + name);
   return {};
 }
 
-Status forget(Database::Session& session, std::string_view identifier) {
+Status deleteRestoreRecord(Database::Session& session, std::string_view identifier) {
   return session.run("delete from restore_data where identifier = ?", identifier);
 }
 
 Status markRemoved(Database::Session& session, std::string_view identifier) {
-  RETURN_IF_ERROR(forget(session, identifier));
+  RETURN_IF_ERROR(deleteRestoreRecord(session, identifier));
   return session.run("insert or ignore into removed_data values (?)", identifier);
 }
 
@@ -155,8 +155,8 @@ Status recover(DeviceFileSystem& files, Database& database) {
     if (!*isOwned) strays.emplace_back(name);
   }
   for (const std::string& stray : strays) {
-    const int number = tree::remove(kept->get(), stray.c_str(), files.work());
-    if (number != 0) return Error::fromErrno(number, stray);
+    const int error = tree::remove(kept->get(), stray.c_str(), files.work());
+    if (error != 0) return Error::fromErrno(error, stray);
   }
   return {};
 }

@@ -39,10 +39,10 @@ create table if not exists removed_data (identifier text primary key) without ro
 /// Drops what is kept.
 [[nodiscard]] Status drop(DeviceFileSystem& files, Database& database, std::string_view identifier);
 
-/// Puts what is kept, if anything is, in the data container's place. Until `forget` it counts as kept all the same, and
-/// doing it again does no harm.
-[[nodiscard]] Status giveBack(DeviceFileSystem& files, Database& database, std::string_view identifier);
-Status forget(Database::Session& session, std::string_view identifier);
+/// Puts what is kept, if anything is, in the data container's place. Until `deleteRestoreRecord` it counts as kept all
+/// the same, and doing it again does no harm.
+[[nodiscard]] Status commitRestoreData(DeviceFileSystem& files, Database& database, std::string_view identifier);
+Status deleteRestoreRecord(Database::Session& session, std::string_view identifier);
 
 /// All data of a removed app is to go, that which is kept too; and goes now, or when the device is opened next.
 Status markRemoved(Database::Session& session, std::string_view identifier);

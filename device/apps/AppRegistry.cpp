@@ -94,12 +94,12 @@ void AppRegistry::noteOutcome(std::string_view bundleIdentifier, const Status& i
   }
 }
 
-Status AppRegistry::recordPlaceholder(NewContainer& container, const InstallRequest& request, StoredBundle bundle) {
+Status AppRegistry::recordPlaceholder(PendingContainer& container, const InstallRequest& request, StoredBundle bundle) {
   return installer_.recordPlaceholder(container, request, platform::ApplicationTypeUser, std::move(bundle));
 }
 
-Status AppRegistry::removePlaceholder(std::string_view bundleIdentifier, const Alongside& alongside) {
-  return installer_.uninstall(bundleIdentifier, {{platform::UninstallPlaceholdersOnlyKey, true}}, alongside);
+Status AppRegistry::removePlaceholder(std::string_view bundleIdentifier, const TransactionHook& transactionHook) {
+  return installer_.uninstall(bundleIdentifier, {{platform::UninstallPlaceholdersOnlyKey, true}}, transactionHook);
 }
 
 std::optional<Error> AppRegistry::lastInstallFailure(std::string_view bundleIdentifier) {

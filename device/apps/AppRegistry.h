@@ -47,15 +47,16 @@ class AppRegistry final : public platform::AppRegistry {
   // For install coordination: the same with requests that were checked.
 
   [[nodiscard]] Status installPackage(const platform::FileLocation& location, const InstallRequest& request);
-  [[nodiscard]] Status recordPlaceholder(NewContainer& container, const InstallRequest& request, StoredBundle bundle);
+  [[nodiscard]] Status recordPlaceholder(PendingContainer& container, const InstallRequest& request,
+                                         StoredBundle bundle);
   /// Takes a placeholder's mark away; an unknown app fails.
-  [[nodiscard]] Status removePlaceholder(std::string_view bundleIdentifier, const Alongside& alongside);
+  [[nodiscard]] Status removePlaceholder(std::string_view bundleIdentifier, const TransactionHook& transactionHook);
   [[nodiscard]] RunningInstalls& runningInstalls() noexcept { return *running_; }
   /// Whether what is left of a demoted app is on the home screen.
   [[nodiscard]] bool isDemoted(std::string_view bundleIdentifier) { return installer_.isDemoted(bundleIdentifier); }
   /// Begins the install of a demoted app, whose own placeholder stands for it.
-  [[nodiscard]] Status beginReturn(std::string_view bundleIdentifier, const Alongside& alongside) {
-    return installer_.beginReturn(bundleIdentifier, alongside);
+  [[nodiscard]] Status beginReturn(std::string_view bundleIdentifier, const TransactionHook& transactionHook) {
+    return installer_.beginReturn(bundleIdentifier, transactionHook);
   }
 
   /// `installApplication` for an app, or its placeholder, that is part of the system.

@@ -1,5 +1,6 @@
 #include "device/apps/AppTable.h"
 
+#include "base/ReturnIfError.h"
 #include "device/apps/Licence.h"
 
 namespace appsync::device::app_table {
@@ -86,9 +87,8 @@ Result<std::vector<AppRow>> ofType(Database::Session& session, std::string_view 
 
 Status put(Database::Session& session, std::string_view identifier, std::string_view applicationType, BundleRole role,
            const StoredBundle& bundle, const std::optional<Bytes>& licence) {
-  Status added = session.run("insert into apps (identifier, application_type) values (?, ?) on conflict do nothing",
-                             identifier, applicationType);
-  if (!added) return added;
+  RETURN_IF_ERROR(session.run("insert into apps (identifier, application_type) values (?, ?) on conflict do nothing",
+                              identifier, applicationType));
   return session.run(
       "insert or replace into bundles "
       "select position, ?, ?, ?, ?, ?, ?, ?, ?, coalesce(?, (select licence from bundles where app = position and licence "
@@ -99,8 +99,7 @@ Status put(Database::Session& session, std::string_view identifier, std::string_
 
 Status remove(Database::Session& session, const AppRow& app, BundleRole role) {
   if (!app.bundle(role)) return {};
-  Status removed = session.run("delete from bundles where app = ? and role = ?", app.position, role);
-  if (!removed) return removed;
+  RETURN_IF_ERROR(session.run("delete from bundles where app = ? and role = ?", app.position, role));
   return session.run("delete from apps where position = ?1 and not exists (select 1 from bundles where app = ?1)",
                      app.position);
 }

@@ -9,9 +9,9 @@ Status BackupManager::keepRestoreData(std::string_view bundleIdentifier, const s
 }
 
 Status BackupManager::restoreDataNow(std::string_view bundleIdentifier) {
-  RETURN_IF_ERROR(app_data::giveBack(files_, database_, bundleIdentifier));
+  RETURN_IF_ERROR(app_data::commitRestoreData(files_, database_, bundleIdentifier));
   Database::Session session(database_);
-  return app_data::forget(session, bundleIdentifier);
+  return app_data::deleteRestoreRecord(session, bundleIdentifier);
 }
 
 bool BackupManager::restoreDataExists(std::string_view bundleIdentifier, std::uint64_t* size) {
@@ -21,9 +21,9 @@ bool BackupManager::restoreDataExists(std::string_view bundleIdentifier, std::ui
 }
 
 bool BackupManager::cancelApplicationRestore(std::string_view bundleIdentifier, ErrorSlot error) {
-  const Status dropped = app_data::drop(files_, database_, bundleIdentifier);
-  if (!dropped) setError(error, dropped.error());
-  return dropped.ok();
+  const Status status = app_data::drop(files_, database_, bundleIdentifier);
+  if (!status) setError(error, status.error());
+  return status.ok();
 }
 
 }  // namespace appsync::device

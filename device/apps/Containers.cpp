@@ -14,50 +14,50 @@ namespace appsync::device {
 
 namespace {
 
-constexpr std::string_view kUnsettled = ".tmp";
+constexpr std::string_view kPendingSuffix = ".tmp";
 
-Status outcome(int number, std::string_view what) {
-  if (number == 0) return {};
-  return Error::fromErrno(number, what);
+Status outcome(int error, std::string_view what) {
+  if (error == 0) return {};
+  return Error::fromErrno(error, what);
 }
 
 }  // namespace
 
-NewContainer::NewContainer(DeviceFileSystem& files, FileDescriptor parent)
-    : files_(&files), parent_(std::move(parent)), name_(newUUID()), nameNow_(name_ + std::string(kUnsettled)) {}
+PendingContainer::PendingContainer(DeviceFileSystem& files, FileDescriptor parent)
+    : files_(&files), parent_(std::move(parent)), name_(newUUID()), nameNow_(name_ + std::string(kPendingSuffix)) {}
 
-Result<NewContainer> NewContainer::make(DeviceFileSystem& files) {
+Result<PendingContainer> PendingContainer::make(DeviceFileSystem& files) {
   Result<FileDescriptor> parent = files.root().open(kContainersPath, O_PATH | O_DIRECTORY);
   if (!parent) return parent.error();
-  NewContainer container(files, std::move(parent).value());
+  PendingContainer container(files, std::move(parent).value());
   const int parentFolder = container.parent_.get();
   const char* name = container.nameNow_.c_str();
-  if (const int number = sys::makeFolder(parentFolder, name); number != 0) {
-    container.kept_ = true;  // There is nothing to remove.
-    return Error::fromErrno(number, "a container for the app");
+  if (const int error = sys::makeFolder(parentFolder, name); error != 0) {
+    container.released_ = true;  // There is nothing to remove.
+    return Error::fromErrno(error, "a container for the app");
   }
   container.folder_ = FileDescriptor(openat(parentFolder, name, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
   if (!container.folder_.valid()) return Error::fromErrno(errno, "a container for the app");
   return container;
 }
 
-NewContainer::~NewContainer() {
+PendingContainer::~PendingContainer() {
   const bool movedFrom = !parent_.valid();
-  if (!kept_ && !movedFrom) static_cast<void>(tree::remove(parent_.get(), nameNow_.c_str(), files_->work()));
+  if (!released_ && !movedFrom) static_cast<void>(tree::remove(parent_.get(), nameNow_.c_str(), files_->work()));
 }
 
-Status NewContainer::writeFile(std::string_view name, ByteView bytes) {
+Status PendingContainer::writeFile(std::string_view name, ByteView bytes) {
   const std::string file(name);
   const int removed = sys::removeFile(folder(), file.c_str());
   if (removed != 0 && removed != ENOENT) return Error::fromErrno(removed, name);
   return outcome(tree::create(folder(), file.c_str(), bytes), name);
 }
 
-Status NewContainer::settle(Durability durability) {
-  int number = sys::rename(parent_.get(), nameNow_.c_str(), parent_.get(), name_.c_str(), sys::Replace::no);
-  if (number == 0) nameNow_ = name_;
-  if (number == 0 && durability == Durability::power) number = sys::syncFileSystem(folder());
-  return outcome(number, "the app's container");
+Status PendingContainer::commit(Durability durability) {
+  int error = sys::rename(parent_.get(), nameNow_.c_str(), parent_.get(), name_.c_str(), sys::Replace::no);
+  if (error == 0) nameNow_ = name_;
+  if (error == 0 && durability == Durability::power) error = sys::syncFileSystem(folder());
+  return outcome(error, "the app's container");
 }
 
 void removeContainer(DeviceFileSystem& files, const std::string& name) {

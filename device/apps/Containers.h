@@ -6,19 +6,19 @@
 
 #include "base/Bytes.h"
 #include "base/Error.h"
-#include "device/storage/Database.h"
 #include "device/storage/DeviceFileSystem.h"
+#include "device/storage/Durability.h"
 #include "device/storage/FileDescriptor.h"
 
 namespace appsync::device {
 
 /// A container that is being filled, under a name that says so. Unless it is settled and kept, its end removes it.
-class NewContainer {
+class PendingContainer {
  public:
-  [[nodiscard]] static Result<NewContainer> make(DeviceFileSystem& files);
-  NewContainer(NewContainer&&) = default;
-  NewContainer& operator=(NewContainer&&) = delete;
-  ~NewContainer();
+  [[nodiscard]] static Result<PendingContainer> make(DeviceFileSystem& files);
+  PendingContainer(PendingContainer&&) = default;
+  PendingContainer& operator=(PendingContainer&&) = delete;
+  ~PendingContainer();
 
   /// The container's open folder.
   [[nodiscard]] int folder() const noexcept { return folder_.get(); }
@@ -28,19 +28,19 @@ class NewContainer {
   /// Makes a file of it, in place of one that is there.
   [[nodiscard]] Status writeFile(std::string_view name, ByteView bytes);
   /// Gives it its name; with `Durability::power` the name and all in it are on the disk then.
-  [[nodiscard]] Status settle(Durability durability);
+  [[nodiscard]] Status commit(Durability durability);
   /// It belongs to a record now.
-  void keep() noexcept { kept_ = true; }
+  void release() noexcept { released_ = true; }
 
  private:
-  NewContainer(DeviceFileSystem& files, FileDescriptor parent);
+  PendingContainer(DeviceFileSystem& files, FileDescriptor parent);
 
   DeviceFileSystem* files_;
   FileDescriptor parent_;
   FileDescriptor folder_;
   std::string name_;
   std::string nameNow_;
-  bool kept_ = false;
+  bool released_ = false;
 };
 
 /// Removes a container that no record has any more. What cannot be removed is left to the next opening of the device.

@@ -74,20 +74,20 @@ Status Installer::demote(std::string_view bundleIdentifier, TSInstallType type) 
   }
   Result<PlaceholderContainer> remains = makePlaceholder(files_, demotedPlaceholder(files_, app, type));
   if (!remains) return remains.error();
-  NewContainer& container = remains->container;
+  PendingContainer& container = remains->container;
   if (const auto artwork = readIfThere(files_, containerOf(*app.installed) + '/' + std::string(kArtworkFile))) {
     RETURN_IF_ERROR(container.writeFile(kArtworkFile, *artwork));
   }
-  RETURN_IF_ERROR(container.settle(Durability::power));
+  RETURN_IF_ERROR(container.commit(Durability::power));
   remains->bundle.container = container.name();
   {
     Database::Transaction transaction(database_, Durability::power);
     app_table::put(transaction, app.identifier, app.applicationType, BundleRole::placeholder, remains->bundle, {})
         .ignore();
     app_table::remove(transaction, app, BundleRole::installed).ignore();
-    if (Status committed = transaction.commit(); !committed) return asSystemError(committed.error());
+    RETURN_IF_ERROR(asSystemError(transaction.commit()));
   }
-  container.keep();
+  container.release();
   removeContainer(files_, app.installed->container);
   return {};
 }
@@ -99,9 +99,8 @@ Status Installer::setPlaceholderType(std::string_view bundleIdentifier, TSInstal
   if (!app.placeholder || app.installed) return unknownApp(bundleIdentifier, "change the placeholder of");
   {
     Database::Session session(database_);
-    Status set = session.run("update bundles set install_type = ? where app = ? and role = ?", type, app.position,
-                             BundleRole::placeholder);
-    if (!set) return asSystemError(set.error());
+    RETURN_IF_ERROR(asSystemError(session.run("update bundles set install_type = ? where app = ? and role = ?", type,
+                                              app.position, BundleRole::placeholder)));
   }
   if (isDemotion(type)) {
     running_.end(bundleIdentifier, TSInstallState::Finished);
@@ -129,10 +128,8 @@ Status Installer::renamePlaceholder(std::string_view bundleIdentifier, std::stri
   if (!document) return document.error();
   RETURN_IF_ERROR(files_.writeFileAtomically(path, *document));
   Database::Session session(database_);
-  Status set = session.run("update bundles set name = ? where app = ? and role = ?", name, app.position,
-                           BundleRole::placeholder);
-  if (!set) return asSystemError(set.error());
-  return {};
+  return asSystemError(session.run("update bundles set name = ? where app = ? and role = ?", name, app.position,
+                                   BundleRole::placeholder));
 }
 
 bool Installer::isDemoted(std::string_view bundleIdentifier) {
@@ -140,7 +137,7 @@ bool Installer::isDemoted(std::string_view bundleIdentifier) {
   return app && app->placeholder && !app->installed && isDemotion(app->placeholder->installType);
 }
 
-Status Installer::beginReturn(std::string_view bundleIdentifier, const Alongside& alongside) {
+Status Installer::beginReturn(std::string_view bundleIdentifier, const TransactionHook& transactionHook) {
   AppRow app;
   {
     Database::Transaction transaction(database_);
@@ -148,8 +145,8 @@ Status Installer::beginReturn(std::string_view bundleIdentifier, const Alongside
     if (!found) return asSystemError(found.error());
     if (!*found || !(*found)->placeholder) return unknownApp(bundleIdentifier, "bring back");
     app = **std::move(found);
-    alongside(transaction);
-    if (Status committed = transaction.commit(); !committed) return asSystemError(committed.error());
+    transactionHook(transaction);
+    RETURN_IF_ERROR(asSystemError(transaction.commit()));
   }
   running_.begin(std::move(app), {});
   return {};

@@ -13,7 +13,7 @@
 namespace appsync::device {
 
 /// Runs in the transaction that records what an install or removal did; a statement of it that fails makes that fail.
-using Alongside = std::function<void(Database::Session& session)>;
+using TransactionHook = std::function<void(Database::Session& session)>;
 
 /// The install options, each checked, and what other services of the device add.
 struct InstallRequest {
@@ -25,7 +25,7 @@ struct InstallRequest {
   /// Store metadata for a package that has none of its own.
   std::optional<Bytes> defaultStoreMetadata;
   /// May be empty.
-  Alongside alongside;
+  TransactionHook transactionHook;
 };
 
 /// Keys that installing does not know are passed over. Errors: platform::InstallerErrorDomain.

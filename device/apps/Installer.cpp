@@ -49,16 +49,16 @@ StoredBundle describe(const BundleInfo& info, const std::string& folder, std::ui
 Result<BundleInfo> readInfoOf(int container, const std::string& appFolder) {
   FileDescriptor file;
   const std::string path = appFolder + '/' + std::string(kInfoFile);
-  int number = openBeneath(container, path, O_RDONLY | O_NONBLOCK, 0, Resolution::kernel, file);
+  int error = openBeneath(container, path, O_RDONLY | O_NONBLOCK, 0, Resolution::kernel, file);
   Bytes document;
-  if (number == 0) number = tree::read(file.get(), kMaximumMetadataBytes, document);
-  if (number == ENOENT) return missingInfo(appFolder);
-  if (number != 0) return Error::fromErrno(number, path);
+  if (error == 0) error = tree::read(file.get(), kMaximumMetadataBytes, document);
+  if (error == ENOENT) return missingInfo(appFolder);
+  if (error != 0) return Error::fromErrno(error, path);
   return readBundleInfo(document);
 }
 
 /// Puts the store metadata that was asked for beside the app folder.
-Status keepStoreMetadata(NewContainer& container, const InstallRequest& request) {
+Status keepStoreMetadata(PendingContainer& container, const InstallRequest& request) {
   if (request.storeMetadata) return container.writeFile(kStoreMetadataFile, *request.storeMetadata);
   const std::string name(kStoreMetadataFile);
   const bool hasOwn = faccessat(container.folder(), name.c_str(), F_OK, AT_SYMLINK_NOFOLLOW) == 0;
@@ -138,7 +138,7 @@ Status Installer::unpackAndRecord(const platform::FileLocation& location, const 
   if (!file) return file.error();
   Result<PackageReader> package = PackageReader::open(std::move(file).value());
   if (!package) return package.error();
-  Result<NewContainer> container = NewContainer::make(files_);
+  Result<PendingContainer> container = PendingContainer::make(files_);
   if (!container) return container.error();
   const auto goOn = [&progress](double fraction) {
     progress.setCompletedUnitCount(static_cast<std::int64_t>(fraction * static_cast<double>(kProgressUnits)));
@@ -148,36 +148,36 @@ Status Installer::unpackAndRecord(const platform::FileLocation& location, const 
   if (!unpacked) return unpacked.error();
   RETURN_IF_ERROR(checkIdentifier(unpacked->info, request));
   RETURN_IF_ERROR(keepStoreMetadata(*container, request));
-  RETURN_IF_ERROR(app_data::giveBack(files_, database_, request.identifier));
-  RETURN_IF_ERROR(container->settle(Durability::power));
+  RETURN_IF_ERROR(app_data::commitRestoreData(files_, database_, request.identifier));
+  RETURN_IF_ERROR(container->commit(Durability::power));
   return record(*container, request, applicationType, describe(unpacked->info, unpacked->appFolder, unpacked->bytes));
 }
 
 Status Installer::installPlaceholder(const platform::FileLocation& location, const InstallRequest& request,
                                      std::string_view applicationType) {
-  const Result<RootFolder::Place> source = files_.root().place(location.path);
+  const Result<RootDirectory::Place> source = files_.root().place(location.path);
   if (!source) return source.error();
   const std::string& folder = source->name;
   if (!isAppFolder(folder)) {
     return installerError(InstallerFailure::notAPackage,
                           "a placeholder is a folder \"Name.app\", and \"" + folder + "\" is not");
   }
-  Result<NewContainer> container = NewContainer::make(files_);
+  Result<PendingContainer> container = PendingContainer::make(files_);
   if (!container) return container.error();
   std::uint64_t bytes = 0;
-  const int number = tree::copy(source->folder.get(), folder.c_str(), container->folder(), folder.c_str(), bytes);
-  if (number != 0) return Error::fromErrno(number, location.path);
+  const int error = tree::copy(source->folder.get(), folder.c_str(), container->folder(), folder.c_str(), bytes);
+  if (error != 0) return Error::fromErrno(error, location.path);
   const Result<BundleInfo> info = readInfoOf(container->folder(), folder);
   if (!info) return info.error();
   RETURN_IF_ERROR(checkIdentifier(*info, request));
   RETURN_IF_ERROR(keepStoreMetadata(*container, request));
   // A sync's placeholder does not survive a restart: there is no point in waiting until it is on the disk.
   const bool lasts = request.installType != TSInstallType::Sync;
-  RETURN_IF_ERROR(container->settle(lasts ? Durability::power : Durability::process));
+  RETURN_IF_ERROR(container->commit(lasts ? Durability::power : Durability::process));
   return recordPlaceholder(*container, request, applicationType, describe(*info, folder, bytes));
 }
 
-Status Installer::recordPlaceholder(NewContainer& container, const InstallRequest& request,
+Status Installer::recordPlaceholder(PendingContainer& container, const InstallRequest& request,
                                     std::string_view applicationType, StoredBundle bundle) {
   RETURN_IF_ERROR(record(container, request, applicationType, std::move(bundle)));
   if (request.installType && isDemotion(*request.installType)) {
@@ -190,7 +190,7 @@ Status Installer::recordPlaceholder(NewContainer& container, const InstallReques
   return {};
 }
 
-Status Installer::record(NewContainer& container, const InstallRequest& request, std::string_view applicationType,
+Status Installer::record(PendingContainer& container, const InstallRequest& request, std::string_view applicationType,
                          StoredBundle bundle) {
   const Result<AppRow> app = known(request.identifier);
   if (!app) return app.error();
@@ -210,19 +210,19 @@ Status Installer::record(NewContainer& container, const InstallRequest& request,
     if (request.role == BundleRole::installed) {
       app_table::remove(transaction, before, BundleRole::placeholder).ignore();
       UninstalledApps::remove(transaction, request.identifier).ignore();
-      app_data::forget(transaction, request.identifier).ignore();
+      app_data::deleteRestoreRecord(transaction, request.identifier).ignore();
     }
-    if (request.alongside) request.alongside(transaction);
-    if (Status committed = transaction.commit(); !committed) return asSystemError(committed.error());
+    if (request.transactionHook) request.transactionHook(transaction);
+    RETURN_IF_ERROR(asSystemError(transaction.commit()));
   }
-  container.keep();
+  container.release();
   for (const StoredBundle* replaced : replacedBy(request.role, before))
     removeContainer(files_, replaced->container);
   return {};
 }
 
 Status Installer::uninstall(std::string_view bundleIdentifier, const plist::Dictionary& options,
-                            const Alongside& alongside) {
+                            const TransactionHook& transactionHook) {
   const Result<AppRow> before = known(bundleIdentifier);
   if (!before) return before.error();
   AppRow app;
@@ -243,8 +243,8 @@ Status Installer::uninstall(std::string_view bundleIdentifier, const plist::Dict
     }
     app_table::remove(transaction, app, BundleRole::placeholder).ignore();
     if (role == BundleRole::installed) app_data::markRemoved(transaction, bundleIdentifier).ignore();
-    if (alongside) alongside(transaction);
-    if (Status committed = transaction.commit(); !committed) return asSystemError(committed.error());
+    if (transactionHook) transactionHook(transaction);
+    RETURN_IF_ERROR(asSystemError(transaction.commit()));
   }
   if (role == BundleRole::installed) app_data::sweepRemoved(files_, database_, bundleIdentifier);
   if (app.placeholder || role == BundleRole::installed) running_.end(bundleIdentifier, TSInstallState::Canceled);

@@ -31,7 +31,7 @@ class Installer {
                                       std::string_view applicationType);
 
   /// Makes a settled container the app's placeholder, whose install waits from now on unless the app is demoted.
-  [[nodiscard]] Status recordPlaceholder(NewContainer& container, const InstallRequest& request,
+  [[nodiscard]] Status recordPlaceholder(PendingContainer& container, const InstallRequest& request,
                                          std::string_view applicationType, StoredBundle bundle);
 
   // Of demoted apps, as in `AppRegistry`.
@@ -39,11 +39,11 @@ class Installer {
   [[nodiscard]] Status setPlaceholderType(std::string_view bundleIdentifier, platform::TSInstallType type);
   [[nodiscard]] Status renamePlaceholder(std::string_view bundleIdentifier, std::string_view name);
   [[nodiscard]] bool isDemoted(std::string_view bundleIdentifier);
-  [[nodiscard]] Status beginReturn(std::string_view bundleIdentifier, const Alongside& alongside);
+  [[nodiscard]] Status beginReturn(std::string_view bundleIdentifier, const TransactionHook& transactionHook);
 
   /// As `platform::AppRegistry::uninstallApplication`.
   [[nodiscard]] Status uninstall(std::string_view bundleIdentifier, const plist::Dictionary& options,
-                                 const Alongside& alongside = {});
+                                 const TransactionHook& transactionHook = {});
 
  private:
   [[nodiscard]] Status installPlaceholder(const platform::FileLocation& location, const InstallRequest& request,
@@ -51,8 +51,8 @@ class Installer {
   [[nodiscard]] Status unpackAndRecord(const platform::FileLocation& location, const InstallRequest& request,
                                        std::string_view applicationType, InstallProgress& progress);
   /// Makes a settled container the app's bundle in its role, and removes those that it takes the place of.
-  [[nodiscard]] Status record(NewContainer& container, const InstallRequest& request, std::string_view applicationType,
-                              StoredBundle bundle);
+  [[nodiscard]] Status record(PendingContainer& container, const InstallRequest& request,
+                              std::string_view applicationType, StoredBundle bundle);
   /// The app's row, or one of an app that is new.
   [[nodiscard]] Result<AppRow> known(std::string_view identifier);
 

@@ -56,15 +56,15 @@ Result<Bytes> infoDocument(const PlaceholderContents& placeholder, const StoredB
   return plist::writeBinary(info);
 }
 
-Status writeApp(const NewContainer& container, const std::string& folder, ByteView info,
+Status writeApp(const PendingContainer& container, const std::string& folder, ByteView info,
                 const std::optional<Bytes>& icon) {
-  int number = sys::makeFolder(container.folder(), folder.c_str());
-  if (number != 0) return Error::fromErrno(number, folder);
+  int error = sys::makeFolder(container.folder(), folder.c_str());
+  if (error != 0) return Error::fromErrno(error, folder);
   const FileDescriptor app(openat(container.folder(), folder.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
   if (!app.valid()) return Error::fromErrno(errno, folder);
-  number = tree::create(app.get(), std::string(kInfoFile).c_str(), info);
-  if (number == 0 && icon) number = tree::create(app.get(), std::string(kIconFile).c_str(), *icon);
-  if (number != 0) return Error::fromErrno(number, folder);
+  error = tree::create(app.get(), std::string(kInfoFile).c_str(), info);
+  if (error == 0 && icon) error = tree::create(app.get(), std::string(kIconFile).c_str(), *icon);
+  if (error != 0) return Error::fromErrno(error, folder);
   return {};
 }
 
@@ -81,7 +81,7 @@ Result<PlaceholderContainer> makePlaceholder(DeviceFileSystem& files, const Plac
   const Result<Bytes> info = infoDocument(placeholder, bundle, icon.has_value());
   if (!info) return info.error().in("the placeholder's Info.plist");
   bundle.bytes = info->size() + (icon ? icon->size() : 0);
-  Result<NewContainer> container = NewContainer::make(files);
+  Result<PendingContainer> container = PendingContainer::make(files);
   if (!container) return container.error();
   RETURN_IF_ERROR(writeApp(*container, bundle.folder, *info, icon));
   if (placeholder.storeMetadata) {

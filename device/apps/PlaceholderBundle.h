@@ -25,7 +25,7 @@ struct PlaceholderContents {
 };
 
 struct PlaceholderContainer {
-  NewContainer container;
+  PendingContainer container;
   StoredBundle bundle;
 };
 

@@ -18,8 +18,7 @@ std::vector<Receipt> receiptsDue(platform::AppRegistry& registry) {
 }  // namespace
 
 void SoftwareLibrary::refreshReceipts(std::function<void(const std::optional<Error>& error)> completion) {
-  const Status replaced = replaceReceipts();
-  completion(replaced.failure());
+  completion(replaceReceipts().failure());
 }
 
 Status SoftwareLibrary::replaceReceipts() {

@@ -30,7 +30,7 @@ struct PromiseState {
   /// What it belonged to has ended.
   bool isOver = false;
   /// Its path or fraction are still to be stored.
-  bool isAhead = false;
+  bool hasUnsavedChanges = false;
   /// None while it is attached to nothing.
   std::optional<PromiseRole> role;
   /// Null until it, or the placeholder that has it, is a coordinator's.

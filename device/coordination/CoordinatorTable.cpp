@@ -122,9 +122,8 @@ Result<Coordinators> all(Database::Session& session) {
 }
 
 Status insert(Database::Session& session, CoordinatorState& state) {
-  Status made = session.run("insert or replace into coordinators (identifier, kind, creator) values (?, ?, ?)",
-                            state.identifier, state.kind, state.creator);
-  if (!made) return made;
+  RETURN_IF_ERROR(session.run("insert or replace into coordinators (identifier, kind, creator) values (?, ?, ?)",
+                              state.identifier, state.kind, state.creator));
   Statement number = session.prepare("select last_insert_rowid()");
   if (number.next()) state.number = number.integer(0);
   return number.status();

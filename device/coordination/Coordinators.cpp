@@ -82,8 +82,8 @@ Result<Coordinators::Coordinator> Coordinators::findOrMake(CoordinatorKind kind,
   coordinator->creator = client;
   {
     Database::Transaction transaction(database_);
-    if (Status made = coordinator_table::insert(transaction, *coordinator); !made) return asSystemError(made.error());
-    if (Status committed = transaction.commit(); !committed) return asSystemError(committed.error());
+    RETURN_IF_ERROR(asSystemError(coordinator_table::insert(transaction, *coordinator)));
+    RETURN_IF_ERROR(asSystemError(transaction.commit()));
   }
   coordinators_[coordinator->identifier].push_back(coordinator);
   isNew = true;
@@ -107,7 +107,7 @@ Status Coordinators::store(const CoordinatorState& coordinator, const Store& sto
   if (coordinator.stage != CoordinatorStage::waiting) return {};
   Database::Transaction transaction(database_);
   store(transaction);
-  if (Status committed = transaction.commit(); !committed) return asSystemError(committed.error());
+  RETURN_IF_ERROR(asSystemError(transaction.commit()));
   return {};
 }
 
@@ -169,16 +169,15 @@ Status Coordinators::setPromise(const Coordinator& coordinator, ClientIdentity c
   auto& place = isAppAsset ? coordinator->appAsset : coordinator->userData;
   const ClientIdentity responsible = coordinator->responsibleClient.value_or(coordinator->creator);
   const bool mayDrive = isAppAsset && client == responsible;
-  if (Status may = mayChange(*coordinator, mayDrive ? coordinator->creator : client, place != nullptr); !may)
-    return may;
-  if (Status usable = checkPromise(promise); !usable) return usable;
+  RETURN_IF_ERROR(mayChange(*coordinator, mayDrive ? coordinator->creator : client, place != nullptr));
+  RETURN_IF_ERROR(checkPromise(promise));
   if (isAppAsset && promise->client != responsible) {
     return coordinationError(CoordinationFailure::foreignClient, "another client is to make the app-asset promise");
   }
   const auto store = [&](Database::Session& session) {
     coordinator_table::storePromise(session, coordinator->number, role, *promise).ignore();
   };
-  if (Status stored = this->store(*coordinator, store); !stored) return stored;
+  RETURN_IF_ERROR(this->store(*coordinator, store));
   promise->role = role;
   promise->coordinator = coordinator;
   place = std::move(promise);
@@ -190,7 +189,7 @@ Status Coordinators::setPromise(const Coordinator& coordinator, ClientIdentity c
 Status Coordinators::setPlaceholder(const Coordinator& coordinator, ClientIdentity client,
                                     const std::shared_ptr<PlaceholderState>& placeholder) {
   const std::lock_guard lock(mutex_);
-  if (Status may = mayChange(*coordinator, client, coordinator->placeholder != nullptr); !may) return may;
+  RETURN_IF_ERROR(mayChange(*coordinator, client, coordinator->placeholder != nullptr));
   if (placeholder == nullptr || placeholder->isAttached || placeholder->identifier != coordinator->identifier) {
     return coordinationError(CoordinationFailure::notUsable, "this is no placeholder for the coordinator");
   }
@@ -198,8 +197,7 @@ Status Coordinators::setPlaceholder(const Coordinator& coordinator, ClientIdenti
   const auto store = [&](Database::Session& session) {
     coordinator_table::storePlaceholder(session, coordinator->number, *placeholder).ignore();
   };
-  Status stored = placeholder->isConfigured ? show(*placeholder, store) : this->store(*coordinator, store);
-  if (!stored) return stored;
+  RETURN_IF_ERROR(placeholder->isConfigured ? show(*placeholder, store) : this->store(*coordinator, store));
   coordinator->placeholder = placeholder;
   placeholder->isAttached = true;
   placeholder->coordinator = coordinator;
@@ -223,21 +221,21 @@ void Coordinators::endIfDemoted(const Coordinator& coordinator) {
   if (transaction.commit()) close(coordinator, std::nullopt);
 }
 
-bool Coordinators::bringsBack(const PlaceholderState& placeholder) const {
+bool Coordinators::reinstallsDemotedApp(const PlaceholderState& placeholder) const {
   return !isDemotion(placeholder.installType) && registry_.isDemoted(placeholder.identifier);
 }
 
 Status Coordinators::show(const PlaceholderState& placeholder, const Store& store) {
-  if (bringsBack(placeholder)) return registry_.beginReturn(placeholder.identifier, store);
+  if (reinstallsDemotedApp(placeholder)) return registry_.beginReturn(placeholder.identifier, store);
   Result<PlaceholderContainer> made = makePlaceholder(files_, contentsOf(placeholder));
   if (!made) return made.error();
-  RETURN_IF_ERROR(made->container.settle(Durability::process));
+  RETURN_IF_ERROR(made->container.commit(Durability::process));
   InstallRequest request;
   request.role = BundleRole::placeholder;
   request.identifier = placeholder.identifier;
   request.installType = placeholder.installType;
   request.licenceData = placeholder.licence;
-  request.alongside = store;
+  request.transactionHook = store;
   return registry_.recordPlaceholder(made->container, request, std::move(made->bundle));
 }
 
@@ -288,7 +286,7 @@ Status Coordinators::erase(const CoordinatorState& coordinator) {
   const bool isShownByAnother = std::ranges::any_of(
       coordinators, [&](const Coordinator& other) { return other.get() != &coordinator && other->showsPlaceholder(); });
   const bool goesAlone = coordinator.showsPlaceholder() && !isShownByAnother;
-  const bool staysDemoted = goesAlone && bringsBack(*coordinator.placeholder);
+  const bool staysDemoted = goesAlone && reinstallsDemotedApp(*coordinator.placeholder);
   if (goesAlone && !staysDemoted) {
     Status removed = registry_.removePlaceholder(coordinator.identifier, remove);
     const bool isGone = !removed && removed.error().domain == platform::InstallerErrorDomain;
@@ -297,7 +295,7 @@ Status Coordinators::erase(const CoordinatorState& coordinator) {
   {
     Database::Transaction transaction(database_);
     remove(transaction);
-    if (Status committed = transaction.commit(); !committed) return asSystemError(committed.error());
+    RETURN_IF_ERROR(asSystemError(transaction.commit()));
   }
   if (staysDemoted) registry_.runningInstalls().end(coordinator.identifier, platform::TSInstallState::Canceled);
   return {};

@@ -106,7 +106,7 @@ class Coordinators : public std::enable_shared_from_this<Coordinators> {
   [[nodiscard]] CoordinatorObservers& observers() noexcept { return *observers_; }
 
  private:
-  using Store = Alongside;
+  using Store = TransactionHook;
   using Report = std::function<void(platform::InstallObserverDelegate&, platform::InstallCoordinator&)>;
 
   // With the lock held.
@@ -119,7 +119,7 @@ class Coordinators : public std::enable_shared_from_this<Coordinators> {
   [[nodiscard]] Status choose(const Coordinator& coordinator, CoordinatorChoices choices);
   [[nodiscard]] Status show(const PlaceholderState& placeholder, const Store& store);
   /// Whether it is a demoted app's, whose own placeholder stays: it is what is left if the install comes to nothing.
-  [[nodiscard]] bool bringsBack(const PlaceholderState& placeholder) const;
+  [[nodiscard]] bool reinstallsDemotedApp(const PlaceholderState& placeholder) const;
   void followPromise(const CoordinatorState& coordinator);
   /// Installs the app if all conditions are met.
   void advance(const Coordinator& coordinator);
@@ -133,7 +133,7 @@ class Coordinators : public std::enable_shared_from_this<Coordinators> {
   /// Ends one that restores a demoted app, once its placeholder is shown: nobody brings a package.
   void endIfDemoted(const Coordinator& coordinator);
   /// Shows the placeholder again if nothing does.
-  void keepShown(const CoordinatorState& coordinator);
+  void ensurePlaceholderShown(const CoordinatorState& coordinator);
   void tell(const Coordinator& coordinator, Report report);
 
   // With it or without.
@@ -145,7 +145,7 @@ class Coordinators : public std::enable_shared_from_this<Coordinators> {
 
   void install(const Coordinator& coordinator);
   [[nodiscard]] std::optional<Error> uninstallNow(const std::string& identifier);
-  void storeWhatIsAhead();
+  void flushUnsavedPromises();
 
   Database& database_;
   DeviceFileSystem& files_;

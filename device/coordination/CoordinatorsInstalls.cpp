@@ -41,7 +41,7 @@ void Coordinators::begin() {
   for (const Coordinator& coordinator : *left)
     coordinators_[coordinator->identifier].push_back(coordinator);
   for (const Coordinator& coordinator : *left) {
-    keepShown(*coordinator);
+    ensurePlaceholderShown(*coordinator);
     // Nobody sends its package just now.
     const auto progress = registry_.runningInstalls().find(coordinator->identifier);
     if (progress != nullptr) progress->setInstallState(TSInstallState::Waiting);
@@ -50,7 +50,7 @@ void Coordinators::begin() {
   }
 }
 
-void Coordinators::keepShown(const CoordinatorState& coordinator) {
+void Coordinators::ensurePlaceholderShown(const CoordinatorState& coordinator) {
   if (!coordinator.showsPlaceholder() || coordinator.stage != CoordinatorStage::waiting) return;
   const auto app = registry_.recordForIdentifier(coordinator.identifier, platform::PlaceholderLookup::on);
   const bool isShown = app != nullptr && app->isPlaceholder() && app->installProgress() != nullptr;
@@ -68,15 +68,15 @@ void Coordinators::end() {
   removalQueue_.reset();
   installs_.reset();
   observers_->end();
-  storeWhatIsAhead();
+  flushUnsavedPromises();
 }
 
-void Coordinators::storeWhatIsAhead() {
+void Coordinators::flushUnsavedPromises() {
   const std::lock_guard lock(mutex_);
   std::vector<const CoordinatorState*> ahead;
   for (const auto& [identifier, ofApp] : coordinators_) {
     for (const Coordinator& coordinator : ofApp) {
-      if (coordinator->appAsset && coordinator->appAsset->isAhead) ahead.push_back(coordinator.get());
+      if (coordinator->appAsset && coordinator->appAsset->hasUnsavedChanges) ahead.push_back(coordinator.get());
     }
   }
   if (ahead.empty()) return;
@@ -108,7 +108,9 @@ void Coordinators::install(const Coordinator& coordinator) {
     request = requestOf(*coordinator);
   }
   // Nobody changes the package's promise from here on.
-  request.alongside = [&](Database::Session& session) { coordinator_table::remove(session, *coordinator).ignore(); };
+  request.transactionHook = [&](Database::Session& session) {
+    coordinator_table::remove(session, *coordinator).ignore();
+  };
   const auto& path = coordinator->appAsset->transferPath;
   const Status installed = path ? registry_.installPackage(*path, request)
                                 : coordinationError(CoordinationFailure::noPackage,
@@ -123,7 +125,7 @@ void Coordinators::install(const Coordinator& coordinator) {
   close(coordinator, installed.failure());
   // The end of one coordinator's install is the end of the app's placeholder.
   for (const Coordinator& other : ofApp(coordinator->identifier))
-    keepShown(*other);
+    ensurePlaceholderShown(*other);
   tell(coordinator, &InstallObserverDelegate::coordinatorDidCompleteSuccessfully);
   --installing_;
   changed_.notify_all();
@@ -132,7 +134,7 @@ void Coordinators::install(const Coordinator& coordinator) {
 void Coordinators::removePackage(const CoordinatorState& coordinator) {
   const auto path = coordinator.ownPackage();
   if (!path) return;
-  const Result<RootFolder::Place> place = files_.root().place(*path);
+  const Result<RootDirectory::Place> place = files_.root().place(*path);
   // A folder in a package's place is not the service's to remove.
   if (place) static_cast<void>(sys::removeFile(place->folder.get(), place->name.c_str()));
   Database::Session session(database_);
@@ -180,9 +182,8 @@ std::optional<Error> Coordinators::uninstallNow(const std::string& identifier) {
     const Error reason = coordinationError(CoordinationFailure::appRemoved, "the app is being removed");
     for (const Coordinator& coordinator : ofApp(identifier)) {
       hadCoordinators = true;
-      if (Status cancelled = cancelNow(coordinator, reason, ClientIdentity::CXClientUser); !cancelled) {
-        return cancelled.failure();
-      }
+      const Status status = cancelNow(coordinator, reason, ClientIdentity::CXClientUser);
+      if (!status) return status.failure();
     }
   }
   if (hadCoordinators && !registry_.applicationIsInstalled(identifier)) return std::nullopt;

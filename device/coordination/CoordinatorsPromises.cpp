@@ -28,7 +28,7 @@ void Coordinators::setFraction(const std::shared_ptr<PromiseState>& promise, dou
   const std::lock_guard lock(mutex_);
   if (isEnding_ || !promise->canChange()) return;
   promise->fraction = std::isnan(fraction) ? 0 : std::clamp(fraction, 0.0, 1.0);
-  promise->isAhead = true;
+  promise->hasUnsavedChanges = true;
   if (promise->role != PromiseRole::appAsset) return;
   if (const Coordinator coordinator = promise->coordinator.lock()) followPromise(*coordinator);
 }
@@ -47,7 +47,7 @@ void Coordinators::setTransferPath(const std::shared_ptr<PromiseState>& promise,
   const bool isTheServices = promise->isComplete && promise->role;
   if (isEnding_ || !promise->canChange() || isTheServices) return;
   promise->transferPath = path;
-  promise->isAhead = true;
+  promise->hasUnsavedChanges = true;
 }
 
 void Coordinators::fulfil(const std::shared_ptr<PromiseState>& promise) {
@@ -115,8 +115,7 @@ Status Coordinators::configure(const std::shared_ptr<PlaceholderState>& placehol
     const auto store = [&](Database::Session& session) {
       coordinator_table::storePlaceholder(session, coordinator->number, copy).ignore();
     };
-    Status stored = isToShow ? show(copy, store) : this->store(*coordinator, store);
-    if (!stored) return stored;
+    RETURN_IF_ERROR(isToShow ? show(copy, store) : this->store(*coordinator, store));
   }
   if (copy.icon) {
     copy.icon->role = PromiseRole::icon;

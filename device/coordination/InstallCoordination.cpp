@@ -97,7 +97,7 @@ std::shared_ptr<platform::Placeholder> InstallCoordination::initAppPlaceholder(s
   state->identifier = bundleIdentifier;
   state->installType = installType;
   state->client = client;
-  return std::make_shared<AppPlaceholder>(coordinators_, state);
+  return std::make_shared<PlaceholderHandle>(coordinators_, state);
 }
 
 std::shared_ptr<platform::PromisedTransferToPath> InstallCoordination::makePromisedTransferToPath(

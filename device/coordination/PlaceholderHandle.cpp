@@ -8,11 +8,11 @@ namespace appsync::device {
 
 std::shared_ptr<PlaceholderState> stateOf(const Coordinators& coordinators,
                                           const std::shared_ptr<platform::Placeholder>& placeholder) {
-  const auto* own = dynamic_cast<const AppPlaceholder*>(placeholder.get());
+  const auto* own = dynamic_cast<const PlaceholderHandle*>(placeholder.get());
   return own == nullptr ? nullptr : own->stateIn(coordinators);
 }
 
-Status AppPlaceholder::setIconPromise(std::shared_ptr<platform::PromisedTransferToPath> promise) {
+Status PlaceholderHandle::setIconPromise(std::shared_ptr<platform::PromisedTransferToPath> promise) {
   const auto icon = stateOf(*coordinators_, promise);
   return coordinators_->configure(state_, [&](PlaceholderState& copy) -> Status {
     const bool isUsable = icon != nullptr && !icon->role && !icon->isCancelled && copy.icon == nullptr;
@@ -22,7 +22,7 @@ Status AppPlaceholder::setIconPromise(std::shared_ptr<platform::PromisedTransfer
   });
 }
 
-Status AppPlaceholder::setPlaceholderAttributes(const platform::PlaceholderAttributes& attributes) {
+Status PlaceholderHandle::setPlaceholderAttributes(const platform::PlaceholderAttributes& attributes) {
   Result<Bytes> document = plist::writeBinary(attributes.infoDictionary());
   if (!document) return document.error().in("the placeholder's info dictionary");
   return coordinators_->configure(state_, [&](PlaceholderState& copy) -> Status {
@@ -32,7 +32,7 @@ Status AppPlaceholder::setPlaceholderAttributes(const platform::PlaceholderAttri
   });
 }
 
-Status AppPlaceholder::setMetadata(const std::optional<platform::StoreMetadata>& metadata) {
+Status PlaceholderHandle::setMetadata(const std::optional<platform::StoreMetadata>& metadata) {
   std::optional<Bytes> kept;
   if (metadata) {
     Result<Bytes> document = plist::writeBinary(metadata->dictionary());
@@ -45,21 +45,21 @@ Status AppPlaceholder::setMetadata(const std::optional<platform::StoreMetadata>&
   });
 }
 
-Status AppPlaceholder::setSinfData(ByteView licence) {
+Status PlaceholderHandle::setSinfData(ByteView licence) {
   return coordinators_->configure(state_, [&](PlaceholderState& copy) -> Status {
     copy.licence = Bytes(licence.begin(), licence.end());
     return {};
   });
 }
 
-Status AppPlaceholder::setConfigurationComplete() {
+Status PlaceholderHandle::setConfigurationComplete() {
   return coordinators_->configure(state_, [](PlaceholderState& copy) -> Status {
     copy.isConfigured = true;
     return {};
   });
 }
 
-Status AppPlaceholder::cancelForReason(const Error&, platform::ClientIdentity client) {
+Status PlaceholderHandle::cancelForReason(const Error&, platform::ClientIdentity client) {
   return coordinators_->takeBack(state_, client);
 }
 

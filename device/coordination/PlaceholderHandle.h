@@ -10,7 +10,7 @@
 
 namespace appsync::device {
 
-class AppPlaceholder final : public ServiceHandle<platform::Placeholder, PlaceholderState> {
+class PlaceholderHandle final : public ServiceHandle<platform::Placeholder, PlaceholderState> {
  public:
   using ServiceHandle::ServiceHandle;
 

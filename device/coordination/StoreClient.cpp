@@ -142,11 +142,10 @@ Status StoreClient::copy(const std::string& hostPath, StoreDelivery& delivery, P
   struct stat status {};
   if (fstat(from.get(), &status) != 0) return Error::fromErrno(errno, hostPath);
   const auto size = static_cast<std::uint64_t>(status.st_size);
-  Status made = files_.createDirectory(kPackagesPath, platform::IntermediateDirectories::create, {});
-  if (!made) return made;
+  RETURN_IF_ERROR(files_.createDirectory(kPackagesPath, platform::IntermediateDirectories::create, {}));
   const std::string name = fileNameOf(delivery.identifier);
   delivery.path = std::string(kPackagesPath) + '/' + name;
-  const Result<RootFolder::Place> place = files_.root().place(delivery.path);
+  const Result<RootDirectory::Place> place = files_.root().place(delivery.path);
   if (!place) return place.error();
   FileDescriptor to;
   int failed = sys::createFile(place->folder.get(), name.c_str(), sys::kFileMode, to);

@@ -5,6 +5,7 @@
 
 #include <fcntl.h>
 
+#include "base/ReturnIfError.h"
 #include "device/packages/InstallerError.h"
 
 namespace appsync::device {
@@ -61,8 +62,7 @@ Result<PackageInfo> readInfo(const std::string& hostPath, PackageLimits limits) 
   info.packageBytes = package->packageBytes();
   const auto iconName = stringIn(info.info.find(platform::BundleIconFileKey));
   if (!iconName || iconName->empty()) return info;
-  const Status read = readIcon(hostPath, package->appFolder() + '/' + std::string(*iconName), limits, info);
-  if (!read) return read.error();
+  RETURN_IF_ERROR(readIcon(hostPath, package->appFolder() + '/' + std::string(*iconName), limits, info));
   return info;
 }
 

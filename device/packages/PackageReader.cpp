@@ -100,8 +100,8 @@ Result<PackageReader> PackageReader::open(FileDescriptor file, PackageLimits lim
 
 Error PackageReader::failure() const {
   const char* reason = archive_error_string(reader_.get());
-  const int number = archive_errno(reader_.get());
-  if (number > 0 && number != EINVAL && number != EILSEQ) return Error::fromErrno(number, "package");
+  const int error = archive_errno(reader_.get());
+  if (error > 0 && error != EINVAL && error != EILSEQ) return Error::fromErrno(error, "package");
   std::string text = "the package is damaged";
   if (!current_.empty()) text += " at " + quoted(current_);
   if (reason != nullptr) text += std::string(": ") + reason;

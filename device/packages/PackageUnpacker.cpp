@@ -22,13 +22,12 @@ class Unpacking {
     if (entry.kind == PackageReader::Kind::folder) return outcome(enter(entry.path), entry.path);
     const std::size_t slash = entry.path.rfind('/');
     const bool top = slash == entry.path.npos;
-    if (const int number = top ? 0 : enter(entry.path.substr(0, slash)); number != 0)
-      return outcome(number, entry.path);
+    if (const int error = top ? 0 : enter(entry.path.substr(0, slash)); error != 0) return outcome(error, entry.path);
     FileDescriptor file;
     const mode_t mode = entry.executable ? 0755 : sys::kFileMode;
-    const int number = top ? sys::createFile(container_, entry.path.c_str(), mode, file)
-                           : sys::createFile(folder_.get(), entry.path.c_str() + slash + 1, mode, file);
-    if (number != 0) return outcome(number, entry.path);
+    const int error = top ? sys::createFile(container_, entry.path.c_str(), mode, file)
+                          : sys::createFile(folder_.get(), entry.path.c_str() + slash + 1, mode, file);
+    if (error != 0) return outcome(error, entry.path);
     return fill(file.get(), entry.path);
   }
 
@@ -40,9 +39,9 @@ class Unpacking {
   int enter(const std::string& path) {
     if (path == path_ && folder_.valid()) return 0;
     FileDescriptor opened;
-    int number = open(container_, path, opened);
-    if (number == ENOENT) number = make(path, opened);
-    if (number != 0) return number;
+    int error = open(container_, path, opened);
+    if (error == ENOENT) error = make(path, opened);
+    if (error != 0) return error;
     folder_ = std::move(opened);
     path_ = path;
     return 0;
@@ -55,12 +54,12 @@ class Unpacking {
   int make(const std::string& path, FileDescriptor& opened) {
     const std::size_t slash = path.rfind('/');
     if (slash == path.npos) {
-      if (const int number = sys::makeFolder(container_, path.c_str()); number != 0) return number;
+      if (const int error = sys::makeFolder(container_, path.c_str()); error != 0) return error;
       return open(container_, path, opened);
     }
-    if (const int number = enter(path.substr(0, slash)); number != 0) return number;
+    if (const int error = enter(path.substr(0, slash)); error != 0) return error;
     const std::string name = path.substr(slash + 1);
-    if (const int number = sys::makeFolder(folder_.get(), name.c_str()); number != 0) return number;
+    if (const int error = sys::makeFolder(folder_.get(), name.c_str()); error != 0) return error;
     return open(folder_.get(), name, opened);
   }
 
@@ -72,16 +71,16 @@ class Unpacking {
       const Result<bool> more = package_.nextBlock(block);
       if (!more) return more.error();
       if (!*more) return {};
-      if (const int number = sys::writeAt(file, block.bytes, block.offset); number != 0) return outcome(number, path);
+      if (const int error = sys::writeAt(file, block.bytes, block.offset); error != 0) return outcome(error, path);
       if (isInfo && info_->size() <= kMaximumMetadataBytes) {
         info_->insert(info_->end(), block.bytes.begin(), block.bytes.end());
       }
     }
   }
 
-  static Status outcome(int number, const std::string& path) {
-    if (number == 0) return {};
-    if (number != EEXIST && number != ENOTDIR && number != ELOOP) return Error::fromErrno(number, path);
+  static Status outcome(int error, const std::string& path) {
+    if (error == 0) return {};
+    if (error != EEXIST && error != ENOTDIR && error != ELOOP) return Error::fromErrno(error, path);
     return installerError(InstallerFailure::duplicateEntry,
                           "the package holds \"" + path + "\" as a file and as a folder; make the package again");
   }

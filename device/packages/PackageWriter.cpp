@@ -43,9 +43,9 @@ Error refused(const std::string& path, const char* reason) {
 }
 
 Error failed(const Writer& writer, const std::string& path) {
-  const int number = archive_errno(writer.get());
+  const int error = archive_errno(writer.get());
   const char* text = archive_error_string(writer.get());
-  return Error::fromErrno(number > 0 ? number : EIO,
+  return Error::fromErrno(error > 0 ? error : EIO,
                           path + " cannot be packed" + (text ? ": " : "") + (text ? text : ""));
 }
 
@@ -64,8 +64,7 @@ Status collect(const fs::path& path, const std::string& name, std::vector<Item>&
   items.push_back({name + "/", path.string()});
   fs::directory_iterator children(path, failure);
   for (; !failure && children != fs::directory_iterator(); children.increment(failure)) {
-    Status added = collect(children->path(), name + "/" + children->path().filename().string(), items);
-    if (!added) return added;
+    RETURN_IF_ERROR(collect(children->path(), name + "/" + children->path().filename().string(), items));
   }
   if (failure) return Error::fromErrno(failure.value(), path.string() + " cannot be read");
   return {};
@@ -138,9 +137,9 @@ Status writePackage(const std::vector<std::string>& items, const std::string& pa
     RETURN_IF_ERROR(collect(path, path.filename().string(), all));
   }
   std::sort(all.begin(), all.end());
-  return writeHostFile(package, [&](int file) {
-    Status written = writeItems(all, file, package);
-    return written ? check(file, package) : written;
+  return writeHostFile(package, [&](int file) -> Status {
+    RETURN_IF_ERROR(writeItems(all, file, package));
+    return check(file, package);
   });
 }
 

@@ -28,7 +28,7 @@ void appendMessage(std::string& line, std::string_view message) {
   while (!message.empty()) {
     const Character character = firstCharacter(message);
     const std::string_view bytes = message.substr(0, character.length);
-    if (character.valid && !isTreacherous(character.code) && character.code != '\\') {
+    if (character.valid && !isUnsafeForDisplay(character.code) && character.code != '\\') {
       line += bytes;
     } else {
       for (const char byte : bytes)

@@ -32,9 +32,9 @@ Status execute(sqlite3* connection, const char* sql) {
 
 /// What a step that a test makes fail looks like from the outside.
 std::optional<Error> injectedFailure(const char* name) {
-  const int number = step(name);
-  if (number == 0) return std::nullopt;
-  return Error::fromErrno(number, "database");
+  const int error = faultPoint(name);
+  if (error == 0) return std::nullopt;
+  return Error::fromErrno(error, "database");
 }
 
 // With the write-ahead log, "normal" writes a commit without waiting for the disk. What is in the file is never torn,

@@ -14,6 +14,7 @@
 #include "base/Bytes.h"
 #include "base/Error.h"
 #include "device/storage/Access.h"
+#include "device/storage/Durability.h"
 
 struct sqlite3;
 struct sqlite3_stmt;
@@ -22,10 +23,6 @@ namespace appsync::device {
 
 /// Error domain of the database; codes are SQLite's extended result codes.
 inline constexpr std::string_view kSQLiteDomain = "SQLite";
-
-/// What a committed transaction survives. A kill of the process it always does, and a loss of power never leaves half
-/// of one; `power` also waits until the disk has it.
-enum class Durability { process, power };
 
 /// One connection, which threads take in turn. Write-ahead log: readers in other processes neither wait nor make wait.
 ///

@@ -44,6 +44,10 @@ Error asSystemError(Error error) {
   return system;
 }
 
+Status asSystemError(Status status) {
+  return status ? status : asSystemError(std::move(status).error());
+}
+
 bool isDatabaseDamage(const Error& error) {
   return error.domain == kSQLiteDomain &&
          (primaryCodeOf(error) == SQLITE_CORRUPT || primaryCodeOf(error) == SQLITE_NOTADB);

@@ -10,6 +10,7 @@ namespace appsync::device {
 
 /// An error of the database as one of the system, with the former as its underlying error; any other unchanged.
 [[nodiscard]] Error asSystemError(Error error);
+[[nodiscard]] Status asSystemError(Status status);
 
 /// Whether the error says that the file is damaged, or not a database.
 [[nodiscard]] bool isDatabaseDamage(const Error& error);

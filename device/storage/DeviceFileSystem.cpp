@@ -18,9 +18,9 @@ namespace {
 constexpr const char* kOwnerAttribute = "user.appsync.owner";
 constexpr const char* kGroupAttribute = "user.appsync.group";
 
-Status outcome(int number, std::string_view path) {
-  if (number == 0) return {};
-  return Error::fromErrno(number, path);
+Status outcome(int error, std::string_view path) {
+  if (error == 0) return {};
+  return Error::fromErrno(error, path);
 }
 
 void keepName(int file, const char* attribute, const std::optional<std::string>& name) {
@@ -52,10 +52,10 @@ class Draft {
 
   [[nodiscard]] const char* name() const noexcept { return name_.c_str(); }
 
-  [[nodiscard]] int place(const RootFolder::Place& place, sys::Replace replace) {
-    const int number = sys::rename(work_, name(), place.folder.get(), place.name.c_str(), replace);
-    placed_ = number == 0;
-    return number;
+  [[nodiscard]] int place(const RootDirectory::Place& place, sys::Replace replace) {
+    const int error = sys::rename(work_, name(), place.folder.get(), place.name.c_str(), replace);
+    placed_ = error == 0;
+    return error;
   }
 
  private:
@@ -66,15 +66,15 @@ class Draft {
 
 int writeDraft(int work, const char* name, ByteView bytes, const platform::OwnerAttributes& owners,
                FileDescriptor& file) {
-  if (const int number = sys::createFile(work, name, sys::kFileMode, file); number != 0) return number;
-  if (const int number = sys::writeAt(file.get(), bytes, 0); number != 0) return number;
+  if (const int error = sys::createFile(work, name, sys::kFileMode, file); error != 0) return error;
+  if (const int error = sys::writeAt(file.get(), bytes, 0); error != 0) return error;
   keepOwners(file.get(), owners);
   return 0;
 }
 
 }  // namespace
 
-Result<RootFolder::Place> DeviceFileSystem::placeToChange(std::string_view path) const {
+Result<RootDirectory::Place> DeviceFileSystem::placeToChange(std::string_view path) const {
   if (access_ == Access::readOnly) return Error::fromErrno(EROFS, path);
   return root_.place(path);
 }
@@ -96,37 +96,37 @@ Result<Bytes> DeviceFileSystem::readFile(std::string_view path) {
   const Result<FileDescriptor> file = root_.open(path, O_RDONLY | O_NONBLOCK);
   if (!file) return file.error();
   Bytes bytes;
-  const int number = tree::read(file->get(), std::numeric_limits<std::uint64_t>::max(), bytes);
-  if (number != 0) return Error::fromErrno(number, path);
+  const int error = tree::read(file->get(), std::numeric_limits<std::uint64_t>::max(), bytes);
+  if (error != 0) return Error::fromErrno(error, path);
   return bytes;
 }
 
 Status DeviceFileSystem::writeFileAtomically(std::string_view path, ByteView bytes) {
-  return writeNew(path, bytes, {}, Survival::powerLoss);
+  return writeNew(path, bytes, {}, Durability::power);
 }
 
 Status DeviceFileSystem::createFile(std::string_view path, ByteView bytes,
                                     const platform::OwnerAttributes& attributes) {
-  return writeNew(path, bytes, attributes, Survival::kill);
+  return writeNew(path, bytes, attributes, Durability::process);
 }
 
 Status DeviceFileSystem::writeNew(std::string_view path, ByteView bytes, const platform::OwnerAttributes& attributes,
-                                  Survival survival) {
-  const Result<RootFolder::Place> place = placeToChange(path);
+                                  Durability durability) {
+  const Result<RootDirectory::Place> place = placeToChange(path);
   if (!place) return place.error();
   Draft draft(work());
   FileDescriptor file;
-  int number = writeDraft(work(), draft.name(), bytes, attributes, file);
-  if (number == 0 && survival == Survival::powerLoss) number = sys::writeOut(file.get());
-  if (number == 0) number = draft.place(*place, sys::Replace::yes);
-  return outcome(number, path);
+  int error = writeDraft(work(), draft.name(), bytes, attributes, file);
+  if (error == 0 && durability == Durability::power) error = sys::writeOut(file.get());
+  if (error == 0) error = draft.place(*place, sys::Replace::yes);
+  return outcome(error, path);
 }
 
 Status DeviceFileSystem::createDirectory(std::string_view path, platform::IntermediateDirectories intermediates,
                                          const platform::OwnerAttributes& attributes) {
   const bool createParents = intermediates == platform::IntermediateDirectories::create;
   if (createParents && path.find_first_not_of('/') == path.npos && !path.empty()) return {};
-  Result<RootFolder::Place> place = placeToChange(path);
+  Result<RootDirectory::Place> place = placeToChange(path);
   if (!place && place.error().code == ENOENT && createParents) {
     const std::string_view parent = path.substr(0, path.find_last_of('/', path.find_last_not_of('/')));
     RETURN_IF_ERROR(createDirectory(parent.empty() ? "/" : parent, intermediates, attributes));
@@ -135,39 +135,39 @@ Status DeviceFileSystem::createDirectory(std::string_view path, platform::Interm
   if (!place) return place.error();
   const int folder = place->folder.get();
   const char* name = place->name.c_str();
-  const int number = sys::makeFolder(folder, name);
-  if (number == EEXIST && createParents && root_.open(path, O_PATH | O_DIRECTORY).ok()) return {};
-  if (number != 0) return Error::fromErrno(number, path);
+  const int error = sys::makeFolder(folder, name);
+  if (error == EEXIST && createParents && root_.open(path, O_PATH | O_DIRECTORY).ok()) return {};
+  if (error != 0) return Error::fromErrno(error, path);
   const FileDescriptor made(openat(folder, name, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
   if (made.valid()) keepOwners(made.get(), attributes);
   return {};
 }
 
 Status DeviceFileSystem::copyItem(std::string_view from, std::string_view to) {
-  const Result<RootFolder::Place> source = root_.place(from);
+  const Result<RootDirectory::Place> source = root_.place(from);
   if (!source) return source.error();
-  const Result<RootFolder::Place> place = placeToChange(to);
+  const Result<RootDirectory::Place> place = placeToChange(to);
   if (!place) return place.error();
   Draft draft(work());
   std::uint64_t bytes = 0;
-  int number = tree::copy(source->folder.get(), source->name.c_str(), work(), draft.name(), bytes);
-  if (number != 0) return Error::fromErrno(number, from);
-  number = draft.place(*place, sys::Replace::no);
-  return outcome(number, to);
+  int error = tree::copy(source->folder.get(), source->name.c_str(), work(), draft.name(), bytes);
+  if (error != 0) return Error::fromErrno(error, from);
+  error = draft.place(*place, sys::Replace::no);
+  return outcome(error, to);
 }
 
 Status DeviceFileSystem::moveItem(std::string_view from, std::string_view to) {
-  const Result<RootFolder::Place> source = placeToChange(from);
+  const Result<RootDirectory::Place> source = placeToChange(from);
   if (!source) return source.error();
-  const Result<RootFolder::Place> place = placeToChange(to);
+  const Result<RootDirectory::Place> place = placeToChange(to);
   if (!place) return place.error();
-  const int number = sys::rename(source->folder.get(), source->name.c_str(), place->folder.get(), place->name.c_str(),
-                                 sys::Replace::no);
-  return outcome(number, number == EEXIST ? to : from);
+  const int error = sys::rename(source->folder.get(), source->name.c_str(), place->folder.get(), place->name.c_str(),
+                                sys::Replace::no);
+  return outcome(error, error == EEXIST ? to : from);
 }
 
 Status DeviceFileSystem::removeItem(std::string_view path) {
-  const Result<RootFolder::Place> place = placeToChange(path);
+  const Result<RootDirectory::Place> place = placeToChange(path);
   if (!place) return place.error();
   return outcome(tree::remove(place->folder.get(), place->name.c_str(), work()), path);
 }

@@ -5,6 +5,7 @@
 #include <string_view>
 
 #include "device/storage/Access.h"
+#include "device/storage/Durability.h"
 #include "device/storage/RootDirectory.h"
 #include "platform/FileSystem.h"
 
@@ -20,7 +21,7 @@ class DeviceFileSystem final : public platform::FileSystem {
   static constexpr std::string_view kTemporaryDirectory = "/tmp";
 
   /// `work` is the open work folder. With `Access::readOnly` everything that would write fails with EROFS.
-  DeviceFileSystem(RootFolder root, FileDescriptor work, Access access)
+  DeviceFileSystem(RootDirectory root, FileDescriptor work, Access access)
       : root_(std::move(root)), work_(std::move(work)), access_(access) {}
 
   [[nodiscard]] bool fileExists(std::string_view path) override;
@@ -40,20 +41,17 @@ class DeviceFileSystem final : public platform::FileSystem {
   /// The owners that an item was made with.
   [[nodiscard]] Result<platform::OwnerAttributes> ownersOfItem(std::string_view path);
 
-  [[nodiscard]] const RootFolder& root() const noexcept { return root_; }
+  [[nodiscard]] const RootDirectory& root() const noexcept { return root_; }
   /// The open work folder.
   [[nodiscard]] int work() const noexcept { return work_.get(); }
 
  private:
   /// The place of something that is about to change.
-  [[nodiscard]] Result<RootFolder::Place> placeToChange(std::string_view path) const;
-  /// What a file whose name is found must have outlived with all its bytes.
-  enum class Survival : std::uint8_t { kill, powerLoss };
-
+  [[nodiscard]] Result<RootDirectory::Place> placeToChange(std::string_view path) const;
   [[nodiscard]] Status writeNew(std::string_view path, ByteView bytes, const platform::OwnerAttributes& attributes,
-                                Survival survival);
+                                Durability durability);
 
-  RootFolder root_;
+  RootDirectory root_;
   FileDescriptor work_;
   Access access_;
 };

@@ -20,11 +20,11 @@ int killWhenDue(const char*) {
 
 void installKillHookFromEnvironment() {
   const char* text = std::getenv("APPSYNC_KILL_AT");
-  if (text == nullptr || detail::stepHook.load() != nullptr) return;
+  if (text == nullptr || detail::faultHook.load() != nullptr) return;
   const long number = std::strtol(text, nullptr, 10);
   if (number < 1) return;
   stepsUntilKill = number;
-  setStepHook(killWhenDue);
+  setFaultHook(killWhenDue);
 }
 
 }  // namespace appsync::device

@@ -7,20 +7,20 @@ namespace appsync::device {
 
 /// Called in front of each step with its name; answers 0 to go on, or the error number the step is to fail with. May
 /// end the process. Any thread.
-using StepHook = int (*)(const char* name);
+using FaultHook = int (*)(const char* name);
 
 namespace detail {
-inline std::atomic<StepHook> stepHook{nullptr};
+inline std::atomic<FaultHook> faultHook{nullptr};
 }
 
 /// Puts a hook in place; null takes it out again.
-inline void setStepHook(StepHook hook) {
-  detail::stepHook.store(hook, std::memory_order_release);
+inline void setFaultHook(FaultHook hook) {
+  detail::faultHook.store(hook, std::memory_order_release);
 }
 
 /// To be called in front of a step. Anything but 0 is the error number that the step fails with, undone.
-[[nodiscard]] inline int step(const char* name) {
-  const StepHook hook = detail::stepHook.load(std::memory_order_acquire);
+[[nodiscard]] inline int faultPoint(const char* name) {
+  const FaultHook hook = detail::faultHook.load(std::memory_order_acquire);
   return hook == nullptr ? 0 : hook(name);
 }
 

@@ -11,22 +11,22 @@ namespace appsync::device {
 class FileDescriptor {
  public:
   FileDescriptor() = default;
-  explicit FileDescriptor(int number) noexcept : number_(number) {}
-  FileDescriptor(FileDescriptor&& other) noexcept : number_(std::exchange(other.number_, -1)) {}
+  explicit FileDescriptor(int descriptor) noexcept : descriptor_(descriptor) {}
+  FileDescriptor(FileDescriptor&& other) noexcept : descriptor_(std::exchange(other.descriptor_, -1)) {}
   FileDescriptor& operator=(FileDescriptor&& other) noexcept {
-    std::swap(number_, other.number_);
+    std::swap(descriptor_, other.descriptor_);
     return *this;
   }
   ~FileDescriptor() {
-    if (number_ >= 0) close(number_);
+    if (descriptor_ >= 0) close(descriptor_);
   }
 
-  [[nodiscard]] int get() const noexcept { return number_; }
-  [[nodiscard]] bool valid() const noexcept { return number_ >= 0; }
-  [[nodiscard]] int release() noexcept { return std::exchange(number_, -1); }
+  [[nodiscard]] int get() const noexcept { return descriptor_; }
+  [[nodiscard]] bool valid() const noexcept { return descriptor_ >= 0; }
+  [[nodiscard]] int release() noexcept { return std::exchange(descriptor_, -1); }
 
  private:
-  int number_ = -1;
+  int descriptor_ = -1;
 };
 
 }  // namespace appsync::device

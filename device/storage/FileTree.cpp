@@ -42,12 +42,12 @@ namespace {
 
 int copyFolder(int from, const struct stat& status, int toFolder, const char* to, std::uint64_t& bytes,
                std::uint64_t* leftOut) {
-  if (const int number = sys::makeFolder(toFolder, to); number != 0) return number;
+  if (const int error = sys::makeFolder(toFolder, to); error != 0) return error;
   const FileDescriptor made(openat(toFolder, to, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
   if (!made.valid()) return errno;
   FolderEntries entries(from);
   while (const char* name = entries.next()) {
-    if (const int number = copy(from, name, made.get(), name, bytes, leftOut); number != 0) return number;
+    if (const int error = copy(from, name, made.get(), name, bytes, leftOut); error != 0) return error;
   }
   if (entries.failure() != 0) return entries.failure();
   // What may not be entered or changed could not be moved or removed either.
@@ -57,8 +57,8 @@ int copyFolder(int from, const struct stat& status, int toFolder, const char* to
 int copyFile(int from, const struct stat& status, int toFolder, const char* to, std::uint64_t& bytes) {
   const mode_t mode = status.st_mode & 0777;
   FileDescriptor made;
-  if (const int number = sys::createFile(toFolder, to, mode, made); number != 0) return number;
-  if (const int number = sys::copyContents(from, made.get(), bytes); number != 0) return number;
+  if (const int error = sys::createFile(toFolder, to, mode, made); error != 0) return error;
+  if (const int error = sys::copyContents(from, made.get(), bytes); error != 0) return error;
   return sys::setAttributes(made.get(), mode, status);
 }
 
@@ -75,13 +75,13 @@ int copyLink(int fromFolder, const char* from, int toFolder, const char* to) {
 int flatten(int folder, int work, std::vector<std::string>& pending) {
   FolderEntries entries(folder);
   while (const char* name = entries.next()) {
-    int number = sys::removeFile(folder, name);
-    if (number == EISDIR || number == EPERM) {  // What a folder answers depends on the system.
+    int error = sys::removeFile(folder, name);
+    if (error == EISDIR || error == EPERM) {  // What a folder answers depends on the system.
       std::string moved = sys::temporaryName();
-      number = sys::rename(folder, name, work, moved.c_str(), sys::Replace::yes);
-      if (number == 0) pending.push_back(std::move(moved));
+      error = sys::rename(folder, name, work, moved.c_str(), sys::Replace::yes);
+      if (error == 0) pending.push_back(std::move(moved));
     }
-    if (number != 0) return number;
+    if (error != 0) return error;
   }
   return entries.failure();
 }
@@ -93,8 +93,8 @@ int removeFolder(int work, std::string name) {
     pending.pop_back();
     const FileDescriptor opened(openat(work, folder.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
     if (!opened.valid()) return errno;
-    if (const int number = flatten(opened.get(), work, pending); number != 0) return number;
-    if (const int number = sys::removeEmptyFolder(work, folder.c_str()); number != 0) return number;
+    if (const int error = flatten(opened.get(), work, pending); error != 0) return error;
+    if (const int error = sys::removeEmptyFolder(work, folder.c_str()); error != 0) return error;
   }
   return 0;
 }
@@ -119,23 +119,23 @@ int copy(int fromFolder, const char* from, int toFolder, const char* to, std::ui
 
 int create(int folder, const char* name, ByteView bytes) {
   FileDescriptor file;
-  if (const int number = sys::createFile(folder, name, sys::kFileMode, file); number != 0) return number;
-  const int number = sys::writeAt(file.get(), bytes, 0);
-  if (number != 0) unlinkat(folder, name, 0);
-  return number;
+  if (const int error = sys::createFile(folder, name, sys::kFileMode, file); error != 0) return error;
+  const int error = sys::writeAt(file.get(), bytes, 0);
+  if (error != 0) unlinkat(folder, name, 0);
+  return error;
 }
 
 int remove(int folder, const char* name, int work) {
   std::string moved = sys::temporaryName();
-  if (const int number = sys::rename(folder, name, work, moved.c_str(), sys::Replace::yes); number != 0) return number;
-  const int number = sys::removeFile(work, moved.c_str());
-  return number == EISDIR || number == EPERM ? removeFolder(work, std::move(moved)) : number;
+  if (const int error = sys::rename(folder, name, work, moved.c_str(), sys::Replace::yes); error != 0) return error;
+  const int error = sys::removeFile(work, moved.c_str());
+  return error == EISDIR || error == EPERM ? removeFolder(work, std::move(moved)) : error;
 }
 
 int empty(int folder, int work) {
   FolderEntries entries(folder);
   while (const char* name = entries.next()) {
-    if (const int number = remove(folder, name, work); number != 0) return number;
+    if (const int error = remove(folder, name, work); error != 0) return error;
   }
   return entries.failure();
 }

@@ -29,12 +29,12 @@ constexpr int kDraftAttempts = 8;
 /// As many as the system follows.
 constexpr int kMostLinks = 40;
 
-Error cannotWrite(const std::string& path, int number) {
-  return Error::fromErrno(number, path + " cannot be written");
+Error cannotWrite(const std::string& path, int error) {
+  return Error::fromErrno(error, path + " cannot be written");
 }
 
-Error cannotRead(const std::string& path, int number) {
-  return Error::fromErrno(number, path + " cannot be read");
+Error cannotRead(const std::string& path, int error) {
+  return Error::fromErrno(error, path + " cannot be read");
 }
 
 Error tooLarge(const std::string& path, std::uint64_t most) {
@@ -52,12 +52,12 @@ class Stream {
  public:
   Stream(const std::string& path, int standard, int flags)
       : opened_(path == kStandardStream ? -1 : ::open(path.c_str(), flags | O_NOCTTY | O_CLOEXEC)),
-        number_(path == kStandardStream ? standard : opened_.get()) {}
-  [[nodiscard]] int number() const { return number_; }
+        descriptor_(path == kStandardStream ? standard : opened_.get()) {}
+  [[nodiscard]] int descriptor() const { return descriptor_; }
 
  private:
   FileDescriptor opened_;
-  int number_;
+  int descriptor_;
 };
 
 int copyAll(int from, int to) {
@@ -77,7 +77,7 @@ int copyAll(int from, int to) {
 template <class Write>
 Status writeStream(const std::string& path, const Write& write) {
   const Stream stream(path, STDOUT_FILENO, O_WRONLY);
-  const int failed = stream.number() < 0 ? errno : write(stream.number());
+  const int failed = stream.descriptor() < 0 ? errno : write(stream.descriptor());
   if (failed == 0 || failed == EPIPE) return {};
   return cannotWrite(path == kStandardStream ? "standard output" : path, failed);
 }
@@ -181,11 +181,11 @@ Result<Bytes> readHostFile(const std::string& path, std::uint64_t most) {
 Result<Bytes> readHostStream(const std::string& path, std::uint64_t most) {
   constexpr std::size_t kStep = std::size_t{256} * 1024;
   const Stream stream(path, STDIN_FILENO, O_RDONLY);
-  if (stream.number() < 0) return cannotRead(path, errno);
+  if (stream.descriptor() < 0) return cannotRead(path, errno);
   Bytes bytes;
   for (std::size_t held = 0;;) {
     bytes.resize(held + kStep);
-    const ssize_t count = ::read(stream.number(), bytes.data() + held, kStep);
+    const ssize_t count = ::read(stream.descriptor(), bytes.data() + held, kStep);
     if (count < 0 && errno == EINTR) continue;
     if (count < 0) return cannotRead(path, errno);
     held += static_cast<std::size_t>(count);

@@ -26,9 +26,9 @@ int openByKernel(int folder, const char* path, int flags, mode_t mode, FileDescr
   how.mode = mode;
   how.resolve = RESOLVE_BENEATH | RESOLVE_NO_MAGICLINKS;
   for (;;) {
-    const long number = syscall(SYS_openat2, folder, path, &how, sizeof how);
-    if (number >= 0) {
-      file = FileDescriptor(static_cast<int>(number));
+    const long descriptor = syscall(SYS_openat2, folder, path, &how, sizeof how);
+    if (descriptor >= 0) {
+      file = FileDescriptor(static_cast<int>(descriptor));
       return 0;
     }
     // EAGAIN: something on the way was moved meanwhile, so that ".." could not be vouched for.
@@ -63,16 +63,16 @@ class Walk {
 
   int open(int flags, mode_t mode, FileDescriptor& file) {
     while (components_.size() > 1 || (components_.size() == 1 && components_.front() == "..")) {
-      if (const int number = enterNext(); number != 0) return number;
+      if (const int error = enterNext(); error != 0) return error;
     }
     if (components_.empty()) return openIn(".", flags, mode, file);
     const std::string name = components_.front();
     const bool follow = (flags & O_NOFOLLOW) == 0;
-    const int number = openIn(name.c_str(), flags | O_NOFOLLOW, mode, file);
-    const bool link = number == ELOOP || (number == 0 && (flags & O_PATH) != 0) || number == ENOTDIR;
-    if (!follow || !link) return number;
+    const int error = openIn(name.c_str(), flags | O_NOFOLLOW, mode, file);
+    const bool link = error == ELOOP || (error == 0 && (flags & O_PATH) != 0) || error == ENOTDIR;
+    if (!follow || !link) return error;
     std::string target;
-    if (readLink(folder(), name.c_str(), target) != 0) return number;
+    if (readLink(folder(), name.c_str(), target) != 0) return error;
     if (const int failed = followLink(target); failed != 0) return failed;
     return open(flags, mode, file);
   }
@@ -95,13 +95,13 @@ class Walk {
       return 0;
     }
     FileDescriptor next;
-    const int number = openIn(name.c_str(), O_PATH | O_DIRECTORY | O_NOFOLLOW, 0, next);
-    if (number == 0) {
+    const int error = openIn(name.c_str(), O_PATH | O_DIRECTORY | O_NOFOLLOW, 0, next);
+    if (error == 0) {
       entered_.push_back(std::move(next));
       return 0;
     }
     std::string target;
-    if (number != ENOTDIR || readLink(folder(), name.c_str(), target) != 0) return number;
+    if (error != ENOTDIR || readLink(folder(), name.c_str(), target) != 0) return error;
     components_.push_front({});  // followLink replaces the first component.
     return followLink(target);
   }
@@ -126,8 +126,8 @@ std::string_view withoutSlashesAtEnd(std::string_view path) {
   return path;
 }
 
-Error pathError(int number, std::string_view path) {
-  if (number != EXDEV) return Error::fromErrno(number, path);
+Error pathError(int error, std::string_view path) {
+  if (error != EXDEV) return Error::fromErrno(error, path);
   return {std::string(domains::kPOSIX), EXDEV, std::string(path) + ": leads out of the device", nullptr};
 }
 
@@ -136,34 +136,34 @@ Error pathError(int number, std::string_view path) {
 int openBeneath(int folder, const std::string& path, int flags, mode_t mode, Resolution resolution,
                 FileDescriptor& file) {
   if (resolution == Resolution::kernel && kernelResolves.load(std::memory_order_relaxed)) {
-    const int number = openByKernel(folder, path.c_str(), flags, mode, file);
-    if (number != ENOSYS && number != EPERM) return number;
-    if (number == ENOSYS) kernelResolves = false;
+    const int error = openByKernel(folder, path.c_str(), flags, mode, file);
+    if (error != ENOSYS && error != EPERM) return error;
+    if (error == ENOSYS) kernelResolves = false;
   }
   return Walk(folder, path).open(flags, mode, file);
 }
 
-Result<RootFolder> RootFolder::open(const std::string& hostPath, Resolution resolution) {
+Result<RootDirectory> RootDirectory::open(const std::string& hostPath, Resolution resolution) {
   FileDescriptor root(::open(hostPath.c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC));
   if (!root.valid()) return Error::fromErrno(errno, hostPath);
-  return RootFolder(std::move(root), resolution);
+  return RootDirectory(std::move(root), resolution);
 }
 
-Result<FileDescriptor> RootFolder::open(std::string_view path, int flags) const {
+Result<FileDescriptor> RootDirectory::open(std::string_view path, int flags) const {
   return resolve(path, path, flags);
 }
 
-Result<FileDescriptor> RootFolder::resolve(std::string_view whole, std::string_view path, int flags) const {
+Result<FileDescriptor> RootDirectory::resolve(std::string_view whole, std::string_view path, int flags) const {
   if (path.empty()) return Error::fromErrno(ENOENT, "an empty path");
   if (!path.starts_with('/') || path.find('\0') != path.npos) return Error::fromErrno(EINVAL, whole);
   path.remove_prefix(std::min(path.find_first_not_of('/'), path.size()));
   FileDescriptor file;
-  const int number = openBeneath(root_.get(), path.empty() ? "." : std::string(path), flags, 0, resolution_, file);
-  if (number != 0) return pathError(number, whole);
+  const int error = openBeneath(root_.get(), path.empty() ? "." : std::string(path), flags, 0, resolution_, file);
+  if (error != 0) return pathError(error, whole);
   return file;
 }
 
-Result<RootFolder::Place> RootFolder::place(std::string_view path) const {
+Result<RootDirectory::Place> RootDirectory::place(std::string_view path) const {
   const std::string_view whole = withoutSlashesAtEnd(path);
   const std::size_t slash = whole.rfind('/');
   if (slash == whole.npos) return Error::fromErrno(whole.empty() ? ENOENT : EINVAL, path);

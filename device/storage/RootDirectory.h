@@ -18,9 +18,10 @@ enum class Resolution { kernel, componentwise };
 /// nothing outside is opened: ".." above the root and absolute links fail.
 ///
 /// Threads: any. Errors: POSIX; EXDEV for a path that leads out. The text starts with the path.
-class RootFolder {
+class RootDirectory {
  public:
-  [[nodiscard]] static Result<RootFolder> open(const std::string& hostPath, Resolution resolution = Resolution::kernel);
+  [[nodiscard]] static Result<RootDirectory> open(const std::string& hostPath,
+                                                  Resolution resolution = Resolution::kernel);
 
   /// Opens what is at an absolute device path, as open(2) does.
   [[nodiscard]] Result<FileDescriptor> open(std::string_view path, int flags) const;
@@ -35,7 +36,7 @@ class RootFolder {
   [[nodiscard]] Result<Place> place(std::string_view path) const;
 
  private:
-  RootFolder(FileDescriptor root, Resolution resolution) : root_(std::move(root)), resolution_(resolution) {}
+  RootDirectory(FileDescriptor root, Resolution resolution) : root_(std::move(root)), resolution_(resolution) {}
 
   [[nodiscard]] Result<FileDescriptor> resolve(std::string_view whole, std::string_view path, int flags) const;
 

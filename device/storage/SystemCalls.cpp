@@ -16,7 +16,7 @@ namespace {
 /// One step: the call, unless a test wants it to fail. Calls return -1 on failure.
 template <class Call>
 int perform(const char* name, Call call) {
-  if (const int injected = step(name); injected != 0) return injected;
+  if (const int injected = faultPoint(name); injected != 0) return injected;
   for (;;) {
     if (call() != -1) return 0;
     if (errno != EINTR) return errno;
@@ -38,20 +38,19 @@ int makeFolder(int folder, const char* name) {
 
 int createFile(int folder, const char* name, mode_t mode, FileDescriptor& file) {
   return perform("create file", [&] {
-    const int number = openat(folder, name, O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, mode);
-    file = FileDescriptor(number);
-    return number;
+    file = FileDescriptor(openat(folder, name, O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, mode));
+    return file.get();
   });
 }
 
 int writeAt(int file, ByteView bytes, std::int64_t offset) {
   while (!bytes.empty()) {
     ssize_t written = 0;
-    const int number = perform("write", [&] {
+    const int error = perform("write", [&] {
       written = pwrite(file, bytes.data(), bytes.size(), offset);
       return written < 0 ? -1 : 0;
     });
-    if (number != 0) return number;
+    if (error != 0) return error;
     if (written == 0) return ENOSPC;
     bytes = bytes.subspan(static_cast<std::size_t>(written));
     offset += written;
@@ -67,8 +66,8 @@ int rename(int fromFolder, const char* from, int toFolder, const char* to, Repla
   if (replace == Replace::yes) {
     return perform("rename", [&] { return renameat(fromFolder, from, toFolder, to); });
   }
-  const int number = perform("rename", [&] { return renameat2(fromFolder, from, toFolder, to, RENAME_NOREPLACE); });
-  return number == EINVAL || number == ENOSYS ? renameUnlessThere(fromFolder, from, toFolder, to) : number;
+  const int error = perform("rename", [&] { return renameat2(fromFolder, from, toFolder, to, RENAME_NOREPLACE); });
+  return error == EINVAL || error == ENOSYS ? renameUnlessThere(fromFolder, from, toFolder, to) : error;
 }
 
 int removeFile(int folder, const char* name) {
@@ -84,8 +83,8 @@ int writeOut(int file) {
   // the order holds without waiting for a commit, which costs up to fifty times as much while packages are being
   // unpacked.
   constexpr unsigned kAll = SYNC_FILE_RANGE_WAIT_BEFORE | SYNC_FILE_RANGE_WRITE | SYNC_FILE_RANGE_WAIT_AFTER;
-  const int number = perform("write out", [&] { return sync_file_range(file, 0, 0, kAll); });
-  if (number != ENOSYS && number != EINVAL && number != EOPNOTSUPP) return number;
+  const int error = perform("write out", [&] { return sync_file_range(file, 0, 0, kAll); });
+  if (error != ENOSYS && error != EINVAL && error != EOPNOTSUPP) return error;
   return perform("write out", [&] { return fdatasync(file); });
 }
 
@@ -99,24 +98,24 @@ int touch(int file) {
 
 int setAttributes(int file, mode_t mode, const struct stat& status) {
   const timespec times[] = {status.st_atim, status.st_mtim};
-  const int number = perform("set attributes", [&] { return fchmod(file, mode) == 0 ? futimens(file, times) : -1; });
-  return number == EPERM || number == EOPNOTSUPP ? 0 : number;
+  const int error = perform("set attributes", [&] { return fchmod(file, mode) == 0 ? futimens(file, times) : -1; });
+  return error == EPERM || error == EOPNOTSUPP ? 0 : error;
 }
 
 int copyContents(int from, int to, std::uint64_t& bytes) {
   constexpr std::size_t kMost = std::size_t{1} << 30;
   for (;;) {
     ssize_t copied = 0;
-    const int number = perform("copy", [&] {
+    const int error = perform("copy", [&] {
       copied = copy_file_range(from, nullptr, to, nullptr, kMost, 0);
       return copied < 0 ? -1 : 0;
     });
-    if (number == 0 && copied == 0) return 0;
-    if (number == 0) {
+    if (error == 0 && copied == 0) return 0;
+    if (error == 0) {
       bytes += static_cast<std::uint64_t>(copied);
       continue;
     }
-    if (number != EXDEV && number != ENOSYS && number != EINVAL && number != EOPNOTSUPP) return number;
+    if (error != EXDEV && error != ENOSYS && error != EINVAL && error != EOPNOTSUPP) return error;
     // Not between these two file systems: by hand, from where it stopped.
     Bytes buffer(std::size_t{1} << 17);
     const ssize_t got = read(from, buffer.data(), buffer.size());
@@ -126,7 +125,7 @@ int copyContents(int from, int to, std::uint64_t& bytes) {
     const auto end = lseek(to, 0, SEEK_END);
     if (end < 0) return errno;
     const auto size = static_cast<std::size_t>(got);
-    if (const int failed = writeAt(to, ByteView(buffer).first(size), end); failed != 0) return failed;
+    if (const int unwritten = writeAt(to, ByteView(buffer).first(size), end); unwritten != 0) return unwritten;
     bytes += size;
   }
 }

@@ -119,9 +119,9 @@ TEST_F(DeviceAtPath, IsNotMadeOfAFile) {
 }
 
 TEST_F(DeviceAtPath, IsNotMadeOnAFullDisk) {
-  device::setStepHook(failWithNoSpace);
+  device::setFaultHook(failWithNoSpace);
   const auto device = Device::create(path());
-  device::setStepHook(nullptr);
+  device::setFaultHook(nullptr);
   EXPECT_EQ(refusal(device), failure(DeviceFailure::noSpace, path() + ": the disk is full; make room and try again"));
 }
 

@@ -20,12 +20,12 @@ std::atomic<StepHold*> currentHold = nullptr;
 StepHold::StepHold(std::string_view step, std::size_t time) : step_(step), due_(time) {
   gate_.close();
   currentHold = this;
-  device::setStepHook(passStep);
+  device::setFaultHook(passStep);
 }
 
 StepHold::~StepHold() {
   letGo();
-  device::setStepHook(nullptr);
+  device::setFaultHook(nullptr);
   currentHold = nullptr;
 }
 

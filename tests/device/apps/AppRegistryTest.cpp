@@ -41,9 +41,9 @@ int noteStep(const char* name) {
 /// power.
 std::vector<std::string> lastingStepsOf(const std::function<void()>& work) {
   stepsTaken.clear();
-  device::setStepHook(noteStep);
+  device::setFaultHook(noteStep);
   work();
-  device::setStepHook(nullptr);
+  device::setFaultHook(nullptr);
   std::erase_if(stepsTaken, [](const std::string& name) {
     return name != "rename" && name != "sync" && name != "database to disk";
   });
@@ -252,9 +252,9 @@ TEST_F(AppRegistryTest, LeavesNoTraceWhenAnyStepFails) {
   const auto package = device_.stage("b.zip", appPackage("com.a", "2.0"));
   for (long step = 1;; ++step) {
     stepsUntilFailure = step;
-    device::setStepHook(failWhenDue);
+    device::setFaultHook(failWhenDue);
     const Status installed = registry().installApplication(package, TestDevice::customer("com.a"));
-    device::setStepHook(nullptr);
+    device::setFaultHook(nullptr);
     if (installed) break;
     EXPECT_EQ(installed.error().domain, domains::kPOSIX) << installed.error().text;
     EXPECT_EQ(installed.error().code, ENOSPC) << installed.error().text;

@@ -21,11 +21,11 @@ class Fault {
 
   Fault(long step, Extent extent) {
     stepsUntilFault = step;
-    device::setStepHook(extent == Extent::oneStep
-                            ? [](const char*) { return stepsUntilFault.fetch_sub(1) == 1 ? ENOSPC : 0; }
-                            : [](const char*) { return stepsUntilFault.fetch_sub(1) <= 1 ? ENOSPC : 0; });
+    device::setFaultHook(extent == Extent::oneStep
+                             ? [](const char*) { return stepsUntilFault.fetch_sub(1) == 1 ? ENOSPC : 0; }
+                             : [](const char*) { return stepsUntilFault.fetch_sub(1) <= 1 ? ENOSPC : 0; });
   }
-  ~Fault() { device::setStepHook(nullptr); }
+  ~Fault() { device::setFaultHook(nullptr); }
   Fault(const Fault&) = delete;
   Fault& operator=(const Fault&) = delete;
 

@@ -27,14 +27,14 @@ class HeldInstalls {
  public:
   HeldInstalls() {
     gate().close();
-    device::setStepHook([](const char* name) {
+    device::setFaultHook([](const char* name) {
       if (std::string_view(name) == "sync") gate().pass();
       return 0;
     });
   }
   ~HeldInstalls() {
     gate().open();
-    device::setStepHook(nullptr);
+    device::setFaultHook(nullptr);
   }
   HeldInstalls(const HeldInstalls&) = delete;
   HeldInstalls& operator=(const HeldInstalls&) = delete;
@@ -326,10 +326,10 @@ TEST_F(CoordinatedInstall, IsCancelledWithItsPackage) {
 
 TEST_F(CoordinatedInstall, CannotBeCancelledWhileTheDatabaseFails) {
   const auto coordinator = client_.prepare("com.a");
-  device::setStepHook([](const char* name) { return std::string_view(name).starts_with("database") ? ENOSPC : 0; });
+  device::setFaultHook([](const char* name) { return std::string_view(name).starts_with("database") ? ENOSPC : 0; });
   const Status cancelled = coordinator->cancelForReason(kEnough, kSync);
   const auto none = client_.make("com.b");
-  device::setStepHook(nullptr);
+  device::setFaultHook(nullptr);
   EXPECT_FALSE(cancelled.ok());
   EXPECT_EQ(none, nullptr);
   EXPECT_EQ(state("com.a"), "0.9 placeholder");

@@ -104,9 +104,9 @@ TEST_F(CoordinatedPlaceholder, DoesWithoutAnIconThatCannotBeRead) {
 TEST_F(CoordinatedPlaceholder, ChangesNothingWhenThePlaceholderCannotBeMade) {
   const auto coordinator = client_.make("com.a");
   const auto placeholder = client_.placeholder("com.a");
-  device::setStepHook([](const char* name) { return std::string_view(name) == "create file" ? ENOSPC : 0; });
+  device::setFaultHook([](const char* name) { return std::string_view(name) == "create file" ? ENOSPC : 0; });
   const Status refused = coordinator->setPlaceholderPromise(placeholder);
-  device::setStepHook(nullptr);
+  device::setFaultHook(nullptr);
   ASSERT_FALSE(refused.ok());
   EXPECT_EQ(refused.error().code, ENOSPC);
   EXPECT_FALSE(coordinator->hasPlaceholderPromise());

@@ -45,7 +45,7 @@ int failTheCommit(const char*) {
 }
 
 int failTheBeginning(const char*) {
-  device::setStepHook(nullptr);
+  device::setFaultHook(nullptr);
   return ENOSPC;
 }
 
@@ -143,7 +143,7 @@ TEST_F(DatabaseTest, TakesBackATransactionWithAFailure) {
 }
 
 TEST_F(DatabaseTest, DoesNothingInATransactionThatCouldNotBegin) {
-  device::setStepHook(failTheBeginning);
+  device::setFaultHook(failTheBeginning);
   {
     Database::Transaction transaction(database_);
     transaction.run("insert into things (size) values (1)").ignore();
@@ -153,13 +153,13 @@ TEST_F(DatabaseTest, DoesNothingInATransactionThatCouldNotBegin) {
 }
 
 TEST_F(DatabaseTest, TakesBackATransactionWhoseCommitFails) {
-  device::setStepHook(failTheCommit);
+  device::setFaultHook(failTheCommit);
   {
     Database::Transaction transaction(database_);
     transaction.run("insert into things (size) values (1)").ignore();
     EXPECT_EQ(transaction.commit().error().code, ENOSPC);
   }
-  device::setStepHook(nullptr);
+  device::setFaultHook(nullptr);
   EXPECT_EQ(count(), 0);
 }
 

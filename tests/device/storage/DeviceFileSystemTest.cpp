@@ -107,11 +107,11 @@ TEST_F(DeviceFileSystemTest, LeavesEverythingAsItWasWhenAStepFails) {
   for (long step = 1;; ++step) {
     write("/var/file", "old");
     stepsUntilFailure = step;
-    device::setStepHook(failWhenDue);
+    device::setFaultHook(failWhenDue);
     const Status written = files().writeFileAtomically("/var/file", bytesOf("new"));
     const Status copied = files().copyItem("/var/from", "/var/to");
     const Status moved = files().moveItem("/var/to", "/var/moved");
-    device::setStepHook(nullptr);
+    device::setFaultHook(nullptr);
     EXPECT_EQ(readHostFile(device_.host("/var/file")), written ? "new" : "old");
     EXPECT_EQ(files().fileExists("/var/moved/deep/file"), copied.ok() && moved.ok()) << step;
     EXPECT_EQ(files().fileExists("/var/to"), copied.ok() && !moved.ok()) << step;

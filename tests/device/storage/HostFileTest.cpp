@@ -70,22 +70,22 @@ TEST(ReplaceHostFile, ANameThatIsTakenIsDrawnAgain) {
   static int takenTimes;
   takenTimes = 2;
   const TemporaryFolder folder;
-  device::setStepHook(
+  device::setFaultHook(
       [](const char* name) { return std::string_view(name) == "create file" && takenTimes-- > 0 ? EEXIST : 0; });
   const Status replaced = device::replaceHostFile(folder.path("file"), bytesOf("x"));
-  device::setStepHook(nullptr);
+  device::setFaultHook(nullptr);
   EXPECT_TRUE(replaced) << replaced.error().text;
   EXPECT_EQ(readHostFile(folder.path("file")), "x");
 }
 
 TEST(ReplaceHostFile, WhatAKillLeavesIsSweptAndNothingElse) {
   const TemporaryFolder folder;
-  device::setStepHook([](const char* name) {
+  device::setFaultHook([](const char* name) {
     const std::string_view step = name;
     return step == "rename" || step == "remove file" ? EIO : 0;
   });
   EXPECT_FALSE(device::replaceHostFile(folder.path("file"), bytesOf("x")));
-  device::setStepHook(nullptr);
+  device::setFaultHook(nullptr);
   ASSERT_EQ(filesIn(folder.path()), 1);
   for (const char* name : {".draft-0123456789abcdef", "file.draft-0123456789abcdeg", "file.draft-0123456789abcde",
                            "file.0123456789abcdef", "file.draft-0123456789abcdef.plist"}) {

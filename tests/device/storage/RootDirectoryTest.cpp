@@ -17,15 +17,15 @@ namespace appsync::test {
 
 using device::FileDescriptor;
 using device::Resolution;
-using device::RootFolder;
+using device::RootDirectory;
 
 namespace {
 
 namespace fs = std::filesystem;
 
-class RootFolderTest : public testing::TestWithParam<Resolution> {
+class RootDirectoryTest : public testing::TestWithParam<Resolution> {
  protected:
-  RootFolderTest() {
+  RootDirectoryTest() {
     fs::create_directories(host("var/mobile"));
     writeHostFile(host("var/mobile/file"), "inside");
     writeHostFile(folder_.path("secret"), "outside");
@@ -34,8 +34,8 @@ class RootFolderTest : public testing::TestWithParam<Resolution> {
   }
 
   [[nodiscard]] std::string host(const std::string& path) const { return folder_.path("root/" + path); }
-  [[nodiscard]] RootFolder root() const {
-    Result<RootFolder> opened = RootFolder::open(folder_.path("root"), GetParam());
+  [[nodiscard]] RootDirectory root() const {
+    Result<RootDirectory> opened = RootDirectory::open(folder_.path("root"), GetParam());
     EXPECT_TRUE(opened.ok());
     return std::move(opened).value();
   }
@@ -57,12 +57,12 @@ constexpr auto nameOfResolution = [](const auto& resolution) {
   return std::string(resolution.param == Resolution::kernel ? "Kernel" : "Componentwise");
 };
 
-INSTANTIATE_TEST_SUITE_P(EachWay, RootFolderTest, testing::Values(Resolution::kernel, Resolution::componentwise),
+INSTANTIATE_TEST_SUITE_P(EachWay, RootDirectoryTest, testing::Values(Resolution::kernel, Resolution::componentwise),
                          nameOfResolution);
 
 }  // namespace
 
-TEST_P(RootFolderTest, PathsLeadInside) {
+TEST_P(RootDirectoryTest, PathsLeadInside) {
   EXPECT_EQ(at("/var/mobile/file"), "inside");
   EXPECT_EQ(at("//var///mobile/./file"), "inside");
   EXPECT_EQ(at("/var/mobile/../mobile/file"), "inside");
@@ -71,7 +71,7 @@ TEST_P(RootFolderTest, PathsLeadInside) {
   EXPECT_EQ(at("/var/mobile/file/below"), number(ENOTDIR));
 }
 
-TEST_P(RootFolderTest, PathsDoNotLeadOut) {
+TEST_P(RootDirectoryTest, PathsDoNotLeadOut) {
   for (const char* path :
        {"/../secret", "/..", "/var/../../secret", "/var/mobile/../../../secret", "/../root/var/mobile/file"}) {
     EXPECT_EQ(at(path), number(EXDEV)) << path;
@@ -80,13 +80,13 @@ TEST_P(RootFolderTest, PathsDoNotLeadOut) {
   EXPECT_EQ(opened.error().text, "/../secret: leads out of the device");
 }
 
-TEST_P(RootFolderTest, PathsThatAreNoneFail) {
+TEST_P(RootDirectoryTest, PathsThatAreNoneFail) {
   EXPECT_EQ(at(""), number(ENOENT));
   EXPECT_EQ(at("var/mobile/file"), number(EINVAL));
   EXPECT_EQ(at(std::string("/var\0/x", 7)), number(EINVAL));
 }
 
-TEST_P(RootFolderTest, LinksLeadInside) {
+TEST_P(RootDirectoryTest, LinksLeadInside) {
   link("var/file", "mobile/file");
   link("var/folder", "mobile");
   link("var/mobile/up", "../mobile/file");
@@ -98,7 +98,7 @@ TEST_P(RootFolderTest, LinksLeadInside) {
   EXPECT_EQ(at("/var/folder/../mobile/file"), "inside");
 }
 
-TEST_P(RootFolderTest, LinksDoNotLeadOut) {
+TEST_P(RootDirectoryTest, LinksDoNotLeadOut) {
   link("relative", "../secret");
   link("absolute", folder_.path("secret"));
   link("home", "/var/mobile/file");
@@ -111,7 +111,7 @@ TEST_P(RootFolderTest, LinksDoNotLeadOut) {
   }
 }
 
-TEST_P(RootFolderTest, LinksInACircleFail) {
+TEST_P(RootDirectoryTest, LinksInACircleFail) {
   link("a", "b");
   link("b", "a");
   link("c", "c/x");
@@ -120,12 +120,12 @@ TEST_P(RootFolderTest, LinksInACircleFail) {
   EXPECT_EQ(at("/a/file"), number(ELOOP));
 }
 
-TEST_P(RootFolderTest, DanglingLinksLeadNowhere) {
+TEST_P(RootDirectoryTest, DanglingLinksLeadNowhere) {
   link("dangling", "missing/file");
   EXPECT_EQ(at("/dangling"), number(ENOENT));
 }
 
-TEST_P(RootFolderTest, PlacesAreNamesInFolders) {
+TEST_P(RootDirectoryTest, PlacesAreNamesInFolders) {
   const auto place = root().place("/var/mobile/new/");
   ASSERT_TRUE(place.ok());
   EXPECT_EQ(place->name, "new");
@@ -139,17 +139,17 @@ TEST_P(RootFolderTest, PlacesAreNamesInFolders) {
   EXPECT_EQ(root().place("/missing/new").error().code, ENOENT);
 }
 
-TEST_P(RootFolderTest, APlaceMayBeALinkWhoseTargetDoesNotMatter) {
+TEST_P(RootDirectoryTest, APlaceMayBeALinkWhoseTargetDoesNotMatter) {
   link("out", "../secret");
   EXPECT_EQ(root().place("/out")->name, "out");
 }
 
-TEST_P(RootFolderTest, WhatChangesOnTheWayDoesNotLeadOut) {
+TEST_P(RootDirectoryTest, WhatChangesOnTheWayDoesNotLeadOut) {
   // One thread keeps exchanging a folder for a link that leads out; the other must never come out where that leads.
   fs::create_directory(host("swap"));
   writeHostFile(host("swap/file"), "inside");
   link("way", folder_.path("elsewhere"));
-  const RootFolder opened = root();
+  const RootDirectory opened = root();
   const FileDescriptor folder(::open(folder_.path("root").c_str(), O_RDONLY | O_DIRECTORY));
   std::atomic<bool> isDone = false;
   runOnThreads(2, [&](std::size_t index) {
