@@ -14,6 +14,7 @@
 #include "device/packages/PackageWriter.h"
 #include "device/storage/HostFile.h"
 #include "platform/Keys.h"
+#include "platform/SyncFiles.h"
 
 namespace appsync::cli {
 namespace {
@@ -70,7 +71,7 @@ Result<AppFolder> findApp(const std::string& given) {
     return wrong(given, "is no app and holds none; give a folder named Name.app, or one that holds it");
   if (apps->size() > 1) return wrong(given, "holds several apps; give one of them");
   AppFolder found = {apps->front(), {apps->front().string()}};
-  for (const std::string_view beside : {device::kStoreMetadataFile, device::kArtworkFile}) {
+  for (const std::string_view beside : {kStoreMetadataName, kArtworkName}) {
     if (fs::exists(folder / beside, failure)) found.items.push_back((folder / beside).string());
   }
   return found;
@@ -90,11 +91,11 @@ Status requireFile(const plist::Dictionary& info, std::string_view key, const fs
   const auto file = device::namedFileIn(app.string(), value);
   std::error_code failure;
   if (file && fs::is_regular_file(*file, failure)) return {};
-  return wrong(app / device::kInfoFile, "names under " + std::string(key) + " a file that the app does not have");
+  return wrong(app / kInfoPlistName, "names under " + std::string(key) + " a file that the app does not have");
 }
 
 Result<device::BundleInfo> checkedInfo(const fs::path& app) {
-  const fs::path path = app / device::kInfoFile;
+  const fs::path path = app / kInfoPlistName;
   const Result<Bytes> bytes = device::readHostFile(path.string());
   if (!bytes) return bytes.error();
   Result<device::BundleInfo> info = device::readBundleInfo(*bytes);

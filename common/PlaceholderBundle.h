@@ -7,6 +7,7 @@
 #include "common/PlugInLog.h"
 #include "platform/FileSystem.h"
 #include "platform/InstallTypes.h"
+#include "platform/SyncFiles.h"
 #include "plist/PropertyList.h"
 
 namespace appsync {
@@ -14,9 +15,8 @@ namespace appsync {
 /// Whose a placeholder bundle is.
 inline const platform::OwnerAttributes kMobileOwner{"mobile", "mobile"};
 
-/// Keys that a host's info dictionary or store metadata hands on to the placeholder.
+/// Key that, like `kLaunchProhibitedKey`, a host's info dictionary or store metadata hands on to the placeholder.
 inline constexpr std::string_view kPeriodicalKey = "UIPeriodixApp";
-inline constexpr std::string_view kLaunchProhibitedKey = "TSApplicationLaunchProhibited";
 
 /// Said of a placeholder bundle with its info dictionary.
 inline constexpr PlugInLog::Format<std::string, plist::Value> kCreatingPlaceholder =

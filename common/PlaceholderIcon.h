@@ -7,11 +7,9 @@
 
 #include "base/Error.h"
 #include "platform/FileSystem.h"
+#include "platform/SyncFiles.h"
 
 namespace appsync {
-
-/// The name of its file.
-inline constexpr std::string_view kPlaceholderIconName = "Icon.png";
 
 /// Where the placeholder bundle in `folder` has it.
 [[nodiscard]] inline std::string placeholderIconPath(std::string_view folder) {

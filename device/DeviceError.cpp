@@ -6,7 +6,7 @@
 #include <memory>
 #include <utility>
 
-#include "device/storage/DatabaseError.h"
+#include "device/storage/Database.h"
 
 namespace appsync::device {
 

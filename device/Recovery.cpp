@@ -17,6 +17,7 @@
 #include "device/packages/BundleInfo.h"
 #include "device/storage/FileTree.h"
 #include "device/storage/SystemCalls.h"
+#include "platform/SyncFiles.h"
 
 namespace appsync::device {
 
@@ -62,7 +63,7 @@ bool containerExists(int containers, const StoredBundle& bundle) {
 
 /// A loss of power may leave an empty file of one that was not waited for.
 bool hasInfo(int containers, const StoredBundle& bundle) {
-  const std::string path = bundle.container + '/' + bundle.folder + '/' + std::string(kInfoFile);
+  const std::string path = bundle.container + '/' + bundle.folder + '/' + std::string(kInfoPlistName);
   struct stat status {};
   return fstatat(containers, path.c_str(), &status, AT_SYMLINK_NOFOLLOW) == 0 && status.st_size > 0;
 }

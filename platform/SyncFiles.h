@@ -1,6 +1,7 @@
 // The files through which host and plug-in meet, and what stands in them.
 #pragma once
 
+#include <cstdint>
 #include <string_view>
 
 #include "plist/PropertyList.h"
@@ -32,6 +33,12 @@ inline constexpr std::string_view kIconScratchFolder = "/var/mobile/Library/Appl
 inline constexpr std::string_view kInfoPlistName = "Info.plist";
 inline constexpr std::string_view kStoreMetadataName = "HarvoMetadata.plist";
 inline constexpr std::string_view kArtworkName = "HarvoArtwork";
+/// The icon's file in a placeholder bundle.
+inline constexpr std::string_view kPlaceholderIconName = "Icon.png";
+/// Info dictionaries, store metadata and pictures of more bytes than this are not read.
+inline constexpr std::uint64_t kMaximumMetadataBytes = std::uint64_t{16} << 20;
+/// Key of the flag in "Info.plist" that keeps an app from being launched.
+inline constexpr std::string_view kLaunchProhibitedKey = "TSApplicationLaunchProhibited";
 
 /// Keys of a todo-list entry, and the words of its "operation".
 namespace todo {

@@ -14,7 +14,7 @@ std::optional<std::string> storeMetadataPath(const platform::AppRecord& app) {
 plist::Value readStoreMetadata(platform::FileSystem& files, const std::optional<std::string>& path) {
   if (!path) return {};
   const auto attributes = files.attributesOfItem(*path);
-  if (!attributes || attributes->size > kMaximumStoreMetadataBytes) return {};
+  if (!attributes || attributes->size > kMaximumMetadataBytes) return {};
   return readDictionary(files, path);
 }
 

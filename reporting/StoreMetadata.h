@@ -1,7 +1,6 @@
 // What the store said of an installed app: a file beside the app's bundle.
 #pragma once
 
-#include <cstdint>
 #include <optional>
 #include <string>
 
@@ -10,9 +9,6 @@
 #include "plist/PropertyList.h"
 
 namespace appsync {
-
-/// Larger files count as unreadable. No store writes one, and one app's must not take the memory of the daemon.
-inline constexpr std::uint64_t kMaximumStoreMetadataBytes = std::uint64_t{16} << 20;
 
 /// Device path of the app's file, which may be missing; none for an app without a container.
 [[nodiscard]] std::optional<std::string> storeMetadataPath(const platform::AppRecord& app);

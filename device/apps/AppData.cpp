@@ -9,6 +9,7 @@
 #include "base/ReturnIfError.h"
 #include "device/packages/BundleIdentifier.h"
 #include "device/storage/FileTree.h"
+#include "device/storage/RandomNames.h"
 #include "device/storage/SystemCalls.h"
 
 namespace appsync::device {
@@ -51,7 +52,7 @@ Status copyToKept(DeviceFileSystem& files, const std::string& identifier, const 
   if (!source.valid()) return Error::fromErrno(errno, hostFolder);
   const Result<FileDescriptor> kept = openFolder(files, kRestoreDataPath);
   if (!kept) return kept.error();
-  const std::string draft = sys::temporaryName();
+  const std::string draft = temporaryName();
   int error = tree::copy(source.get(), ".", files.work(), draft.c_str(), bytes);
   if (error == 0) error = sys::syncFileSystem(kept->get());
   if (error == 0) error = moveInto(files.work(), draft.c_str(), kept->get(), identifier.c_str(), files.work());

@@ -3,7 +3,7 @@
 #include <utility>
 
 #include "device/packages/InstallerError.h"
-#include "device/storage/DatabaseError.h"
+#include "device/storage/Database.h"
 
 namespace appsync::device {
 

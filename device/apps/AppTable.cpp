@@ -1,9 +1,17 @@
 #include "device/apps/AppTable.h"
 
 #include "base/ReturnIfError.h"
-#include "device/apps/Licence.h"
+#include "plist/PropertyList.h"
 
-namespace appsync::device::app_table {
+namespace appsync::device {
+
+bool isDeviceBound(ByteView licence) {
+  if (licence.empty()) return false;
+  const auto document = plist::read(licence);
+  return document && stringIn(document->find("DeviceIdentifier"));
+}
+
+namespace app_table {
 
 namespace {
 
@@ -125,4 +133,6 @@ Status storeProgress(Database::Session& session, std::string_view identifier,
                      identifier);
 }
 
-}  // namespace appsync::device::app_table
+}  // namespace app_table
+
+}  // namespace appsync::device

@@ -55,6 +55,10 @@ struct AppRow {
   }
 };
 
+/// Returns whether the licence is a property-list dictionary with a string under "DeviceIdentifier". The embedded
+/// device has no identifier and accepts any; all other licences, including an empty one, are valid on any device.
+[[nodiscard]] bool isDeviceBound(ByteView licence);
+
 /// Each runs in the session, or transaction, that it is given; an identifier is looked up by index.
 namespace app_table {
 

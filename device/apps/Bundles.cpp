@@ -3,6 +3,7 @@
 #include <utility>
 
 #include "device/packages/BundleInfo.h"
+#include "platform/SyncFiles.h"
 #include "plist/PropertyList.h"
 
 namespace appsync::device {
@@ -37,7 +38,8 @@ plist::Value readInfo(platform::FileSystem& fileSystem, const std::string& path)
 std::unique_ptr<platform::Bundle> Bundles::openBundle(const platform::FileLocation& location) {
   const auto attributes = fileSystem_.attributesOfItem(location.path);
   if (!attributes || !attributes->isDirectory) return nullptr;
-  return std::make_unique<FolderBundle>(location, readInfo(fileSystem_, location.path + "/" + std::string(kInfoFile)));
+  return std::make_unique<FolderBundle>(location,
+                                        readInfo(fileSystem_, location.path + "/" + std::string(kInfoPlistName)));
 }
 
 }  // namespace appsync::device

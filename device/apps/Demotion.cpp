@@ -12,8 +12,9 @@
 #include "device/packages/BundleInfo.h"
 #include "device/packages/InstallerError.h"
 #include "device/packages/PackageReader.h"
-#include "device/storage/DatabaseError.h"
+#include "device/storage/Database.h"
 #include "device/storage/FileTree.h"
+#include "platform/SyncFiles.h"
 
 namespace appsync::device {
 
@@ -21,8 +22,6 @@ using platform::TSInstallState;
 using platform::TSInstallType;
 
 namespace {
-
-constexpr std::string_view kLaunchProhibitedKey = "TSApplicationLaunchProhibited";
 
 std::string containerOf(const StoredBundle& bundle) {
   return std::string(kContainersPath) + '/' + bundle.container;
@@ -43,7 +42,7 @@ PlaceholderContents demotedPlaceholder(DeviceFileSystem& files, const AppRow& ap
   remains.identifier = app.identifier;
   remains.bundleName = bundle.name;
   remains.installType = type;
-  if (const auto document = readIfThere(files, appPath + '/' + std::string(kInfoFile))) {
+  if (const auto document = readIfThere(files, appPath + '/' + std::string(kInfoPlistName))) {
     if (Result<BundleInfo> info = readBundleInfo(*document)) {
       const plist::Value* prohibited = info->dictionary.find(kLaunchProhibitedKey);
       remains.iconPath = namedFileIn(appPath, info->dictionary.find(platform::BundleIconFileKey));
@@ -52,7 +51,7 @@ PlaceholderContents demotedPlaceholder(DeviceFileSystem& files, const AppRow& ap
     }
   }
   remains.attributes.setBundleVersion(bundle.version);
-  remains.storeMetadata = readIfThere(files, containerOf(bundle) + '/' + std::string(kStoreMetadataFile));
+  remains.storeMetadata = readIfThere(files, containerOf(bundle) + '/' + std::string(kStoreMetadataName));
   return remains;
 }
 
@@ -75,8 +74,8 @@ Status Installer::demote(std::string_view bundleIdentifier, TSInstallType type) 
   Result<PlaceholderContainer> remains = makePlaceholder(files_, demotedPlaceholder(files_, app, type));
   if (!remains) return remains.error();
   PendingContainer& container = remains->container;
-  if (const auto artwork = readIfThere(files_, containerOf(*app.installed) + '/' + std::string(kArtworkFile))) {
-    RETURN_IF_ERROR(container.writeFile(kArtworkFile, *artwork));
+  if (const auto artwork = readIfThere(files_, containerOf(*app.installed) + '/' + std::string(kArtworkName))) {
+    RETURN_IF_ERROR(container.writeFile(kArtworkName, *artwork));
   }
   RETURN_IF_ERROR(container.commit(Durability::power));
   remains->bundle.container = container.name();
@@ -118,7 +117,8 @@ Status Installer::renamePlaceholder(std::string_view bundleIdentifier, std::stri
   const AppRow& app = *found;
   if (!app.placeholder || app.installed) return unknownApp(bundleIdentifier, "rename the placeholder of");
   if (app.placeholder->name == name) return {};
-  const std::string path = containerOf(*app.placeholder) + '/' + app.placeholder->folder + '/' + std::string(kInfoFile);
+  const std::string path =
+      containerOf(*app.placeholder) + '/' + app.placeholder->folder + '/' + std::string(kInfoPlistName);
   Result<Bytes> document = files_.readFile(path);
   if (!document) return document.error();
   Result<BundleInfo> info = readBundleInfo(*document);

@@ -10,9 +10,10 @@
 #include "device/apps/AppData.h"
 #include "device/apps/UninstalledApps.h"
 #include "device/packages/InstallerError.h"
-#include "device/packages/Package.h"
-#include "device/storage/DatabaseError.h"
+#include "device/packages/PackageUnpacker.h"
+#include "device/storage/Database.h"
 #include "device/storage/FileTree.h"
+#include "platform/SyncFiles.h"
 
 namespace appsync::device {
 
@@ -48,7 +49,7 @@ StoredBundle describe(const BundleInfo& info, const std::string& folder, std::ui
 /// Reads the "Info.plist" of an app folder in a container.
 Result<BundleInfo> readInfoOf(int container, const std::string& appFolder) {
   FileDescriptor file;
-  const std::string path = appFolder + '/' + std::string(kInfoFile);
+  const std::string path = appFolder + '/' + std::string(kInfoPlistName);
   int error = openBeneath(container, path, O_RDONLY | O_NONBLOCK, 0, Resolution::kernel, file);
   Bytes document;
   if (error == 0) error = tree::read(file.get(), kMaximumMetadataBytes, document);
@@ -59,8 +60,8 @@ Result<BundleInfo> readInfoOf(int container, const std::string& appFolder) {
 
 /// Puts the store metadata that was asked for beside the app folder.
 Status keepStoreMetadata(PendingContainer& container, const InstallRequest& request) {
-  if (request.storeMetadata) return container.writeFile(kStoreMetadataFile, *request.storeMetadata);
-  const std::string name(kStoreMetadataFile);
+  if (request.storeMetadata) return container.writeFile(kStoreMetadataName, *request.storeMetadata);
+  const std::string name(kStoreMetadataName);
   const bool hasOwn = faccessat(container.folder(), name.c_str(), F_OK, AT_SYMLINK_NOFOLLOW) == 0;
   if (hasOwn || !request.defaultStoreMetadata) return {};
   return container.writeFile(name, *request.defaultStoreMetadata);
@@ -140,11 +141,11 @@ Status Installer::unpackAndRecord(const platform::FileLocation& location, const 
   if (!package) return package.error();
   Result<PendingContainer> container = PendingContainer::make(files_);
   if (!container) return container.error();
-  const auto goOn = [&progress](double fraction) {
+  const auto shouldContinue = [&progress](double fraction) {
     progress.setCompletedUnitCount(static_cast<std::int64_t>(fraction * static_cast<double>(kProgressUnits)));
     return progress.installState() != TSInstallState::Canceled;
   };
-  const Result<UnpackedPackage> unpacked = unpackPackage(*package, container->folder(), goOn);
+  const Result<UnpackedPackage> unpacked = unpackPackage(*package, container->folder(), shouldContinue);
   if (!unpacked) return unpacked.error();
   RETURN_IF_ERROR(checkIdentifier(unpacked->info, request));
   RETURN_IF_ERROR(keepStoreMetadata(*container, request));

@@ -14,14 +14,12 @@
 #include "device/storage/FileTree.h"
 #include "device/storage/SystemCalls.h"
 #include "platform/Keys.h"
+#include "platform/SyncFiles.h"
 #include "plist/PropertyList.h"
 
 namespace appsync::device {
 
 namespace {
-
-constexpr std::string_view kIconFile = "Icon.png";
-constexpr std::string_view kLaunchProhibitedKey = "TSApplicationLaunchProhibited";
 
 std::optional<Bytes> readIcon(DeviceFileSystem& files, const PlaceholderContents& placeholder) {
   if (!placeholder.iconPath) return std::nullopt;
@@ -49,7 +47,7 @@ Result<Bytes> infoDocument(const PlaceholderContents& placeholder, const StoredB
   info.set(kLaunchProhibitedKey, placeholder.attributes.launchProhibited());
   if (bundle.version) info.set(platform::BundleVersionKey, *bundle.version);
   if (hasIcon) {
-    info.set(platform::BundleIconFileKey, kIconFile);
+    info.set(platform::BundleIconFileKey, kPlaceholderIconName);
   } else {
     info.erase(platform::BundleIconFileKey);
   }
@@ -62,8 +60,8 @@ Status writeApp(const PendingContainer& container, const std::string& folder, By
   if (error != 0) return Error::fromErrno(error, folder);
   const FileDescriptor app(openat(container.folder(), folder.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
   if (!app.valid()) return Error::fromErrno(errno, folder);
-  error = tree::create(app.get(), std::string(kInfoFile).c_str(), info);
-  if (error == 0 && icon) error = tree::create(app.get(), std::string(kIconFile).c_str(), *icon);
+  error = tree::create(app.get(), std::string(kInfoPlistName).c_str(), info);
+  if (error == 0 && icon) error = tree::create(app.get(), std::string(kPlaceholderIconName).c_str(), *icon);
   if (error != 0) return Error::fromErrno(error, folder);
   return {};
 }
@@ -85,7 +83,7 @@ Result<PlaceholderContainer> makePlaceholder(DeviceFileSystem& files, const Plac
   if (!container) return container.error();
   RETURN_IF_ERROR(writeApp(*container, bundle.folder, *info, icon));
   if (placeholder.storeMetadata) {
-    RETURN_IF_ERROR(container->writeFile(kStoreMetadataFile, *placeholder.storeMetadata));
+    RETURN_IF_ERROR(container->writeFile(kStoreMetadataName, *placeholder.storeMetadata));
   }
   return PlaceholderContainer{std::move(container).value(), std::move(bundle)};
 }

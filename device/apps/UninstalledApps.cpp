@@ -2,7 +2,7 @@
 
 #include <chrono>
 
-#include "device/storage/DatabaseError.h"
+#include "device/storage/Database.h"
 
 namespace appsync::device {
 

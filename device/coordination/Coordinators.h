@@ -20,7 +20,6 @@
 #include "device/coordination/CoordinatorState.h"
 #include "device/coordination/CoordinatorTable.h"
 #include "device/storage/Database.h"
-#include "device/storage/DatabaseError.h"
 #include "device/storage/DeviceFileSystem.h"
 
 namespace appsync::device {

@@ -2,6 +2,7 @@
 
 #include "device/packages/BundleIdentifier.h"
 #include "device/packages/InstallerError.h"
+#include "platform/SyncFiles.h"
 
 namespace appsync::device {
 
@@ -29,8 +30,8 @@ std::optional<std::string> namedFileIn(const std::string& appPath, const plist::
 }
 
 bool isInfoFile(std::string_view path, std::string_view appFolder) {
-  return path.size() == appFolder.size() + 1 + kInfoFile.size() && path.starts_with(appFolder) &&
-         path[appFolder.size()] == '/' && path.ends_with(kInfoFile);
+  return path.size() == appFolder.size() + 1 + kInfoPlistName.size() && path.starts_with(appFolder) &&
+         path[appFolder.size()] == '/' && path.ends_with(kInfoPlistName);
 }
 
 Error missingInfo(const std::string& appFolder) {

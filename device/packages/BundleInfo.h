@@ -1,7 +1,6 @@
 // What an app's "Info.plist" says.
 #pragma once
 
-#include <cstdint>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -11,11 +10,6 @@
 #include "plist/PropertyList.h"
 
 namespace appsync::device {
-
-/// The info dictionary's file in an app folder.
-inline constexpr std::string_view kInfoFile = "Info.plist";
-/// Info dictionaries, metadata and pictures of more bytes than this are not read.
-inline constexpr std::uint64_t kMaximumMetadataBytes = std::uint64_t{16} << 20;
 
 struct BundleInfo {
   std::string identifier;

@@ -1,12 +1,15 @@
 #include "device/packages/Package.h"
 
 #include <cerrno>
+#include <functional>
 #include <utility>
 
 #include <fcntl.h>
 
 #include "base/ReturnIfError.h"
+#include "device/packages/BundleInfo.h"
 #include "device/packages/InstallerError.h"
+#include "platform/SyncFiles.h"
 
 namespace appsync::device {
 
@@ -47,8 +50,8 @@ Result<PackageInfo> readInfo(const std::string& hostPath, PackageLimits limits) 
   PackageInfo info;
   std::optional<Bytes> document;
   const Status walked = collect(*package, [&](const PackageReader::Entry& entry) -> std::optional<Bytes>* {
-    if (entry.path == kStoreMetadataFile) return &info.storeMetadata;
-    if (entry.path == kArtworkFile) return &info.artwork;
+    if (entry.path == kStoreMetadataName) return &info.storeMetadata;
+    if (entry.path == kArtworkName) return &info.artwork;
     return isInfoFile(entry.path, package->appFolder()) ? &document : nullptr;
   });
   if (!walked) return walked.error();

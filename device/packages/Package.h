@@ -1,14 +1,12 @@
-// App packages: unpacked into a container, or only looked at.
+// The description of an app package, read without unpacking it.
 #pragma once
 
 #include <cstdint>
-#include <functional>
 #include <optional>
 #include <string>
 
 #include "base/Bytes.h"
 #include "base/Error.h"
-#include "device/packages/BundleInfo.h"
 #include "device/packages/PackageReader.h"
 #include "plist/PropertyList.h"
 
@@ -30,17 +28,5 @@ struct PackageInfo {
 /// list of entries is checked; bytes of the app's files are not. Errors: as `PackageReader`; the text starts with the
 /// path.
 [[nodiscard]] Result<PackageInfo> readPackageInfo(const std::string& hostPath, PackageLimits limits = {});
-
-/// What has been unpacked.
-struct UnpackedPackage {
-  std::string appFolder;
-  BundleInfo info;
-  std::uint64_t bytes = 0;  ///< of all files
-};
-
-/// Unpacks a package into an open, empty folder, without waiting for the disk. `goOn` hears how far it is, from 0 to 1,
-/// after each entry; false from it ends the work with `InstallerFailure::cancelled`. A failure leaves part of it.
-[[nodiscard]] Result<UnpackedPackage> unpackPackage(PackageReader& package, int folder,
-                                                    const std::function<bool(double fraction)>& goOn);
 
 }  // namespace appsync::device

@@ -12,6 +12,7 @@
 #include "base/ReturnIfError.h"
 #include "device/packages/BundleInfo.h"
 #include "device/packages/InstallerError.h"
+#include "platform/SyncFiles.h"
 
 namespace appsync::device {
 
@@ -169,7 +170,7 @@ Status PackageReader::checkPlace(std::string_view path, Kind kind) {
     return installerError(InstallerFailure::severalApps, "the package holds two apps, " + quoted(appFolder_) + " and " +
                                                              quoted(top) + "; make a package of each");
   }
-  if (kind == Kind::file && (path == kStoreMetadataFile || path == kArtworkFile)) return {};
+  if (kind == Kind::file && (path == kStoreMetadataName || path == kArtworkName)) return {};
   return installerError(InstallerFailure::strayEntry,
                         "the package holds " + quoted(path) + ", which belongs to no app; take it out of the package");
 }

@@ -25,12 +25,9 @@ struct PackageLimits {
   std::uint64_t freeBytes = std::uint64_t{64} << 20;
 };
 
-/// The names beside the app folder.
-inline constexpr std::string_view kStoreMetadataFile = "HarvoMetadata.plist";
-inline constexpr std::string_view kArtworkFile = "HarvoArtwork";
-
-/// A package is a zip archive that holds one folder "Name.app" and, beside it, at most the two files above. Names are
-/// relative, in UTF-8, with plain components; entries are files and folders, each once; nothing is encrypted.
+/// A package is a zip archive that holds one folder "Name.app" and, beside it, at most the files `kStoreMetadataName`
+/// and `kArtworkName`. Names are relative, in UTF-8, with plain components; entries are files and folders, each once;
+/// nothing is encrypted.
 ///
 /// Errors: platform::InstallerErrorDomain, each saying which entry and what to do; "POSIX" where the system failed.
 /// Threads: one at a time; any number of readers side by side.

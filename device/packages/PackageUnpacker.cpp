@@ -1,13 +1,16 @@
+#include "device/packages/PackageUnpacker.h"
+
 #include <cerrno>
+#include <optional>
 #include <utility>
 
 #include <fcntl.h>
 
 #include "base/ReturnIfError.h"
 #include "device/packages/InstallerError.h"
-#include "device/packages/Package.h"
 #include "device/storage/RootDirectory.h"
 #include "device/storage/SystemCalls.h"
+#include "platform/SyncFiles.h"
 
 namespace appsync::device {
 
@@ -95,7 +98,7 @@ class Unpacking {
 }  // namespace
 
 Result<UnpackedPackage> unpackPackage(PackageReader& package, int folder,
-                                      const std::function<bool(double fraction)>& goOn) {
+                                      const std::function<bool(double fraction)>& shouldContinue) {
   Unpacking unpacking(package, folder);
   PackageReader::Entry entry;
   for (;;) {
@@ -103,7 +106,7 @@ Result<UnpackedPackage> unpackPackage(PackageReader& package, int folder,
     if (!more) return more.error();
     if (!*more) break;
     RETURN_IF_ERROR(unpacking.unpack(entry));
-    if (!goOn(package.fraction())) {
+    if (!shouldContinue(package.fraction())) {
       return installerError(InstallerFailure::cancelled, "the install was cancelled; start it again to have the app");
     }
   }

@@ -1,6 +1,9 @@
 #include "device/storage/Database.h"
 
+#include <algorithm>
+#include <array>
 #include <cassert>
+#include <cerrno>
 #include <utility>
 
 #include <sqlite3.h>
@@ -51,6 +54,12 @@ Status configure(sqlite3* connection, Access access) {
   int keepLog = 1;
   sqlite3_file_control(connection, "main", SQLITE_FCNTL_PERSIST_WAL, &keepLog);
   return execute(connection, kWriterSettings);
+}
+
+/// Returns the low byte of an extended result code.
+long primaryCodeOf(const Error& error) {
+  constexpr long kPrimary = 0xFF;
+  return error.code & kPrimary;
 }
 
 }  // namespace
@@ -216,6 +225,37 @@ Status Database::Transaction::commit() {
   RETURN_IF_ERROR(run("commit"));
   open_ = false;
   return {};
+}
+
+int systemErrorOf(const Error& error) {
+  if (error.domain == domains::kPOSIX) return static_cast<int>(error.code);
+  constexpr std::array<std::pair<int, int>, 7> kMeanings{{
+      {SQLITE_FULL, ENOSPC},
+      {SQLITE_READONLY, EROFS},
+      {SQLITE_PERM, EACCES},
+      {SQLITE_CANTOPEN, EACCES},
+      {SQLITE_NOMEM, ENOMEM},
+      {SQLITE_BUSY, EBUSY},
+      {SQLITE_LOCKED, EBUSY},
+  }};
+  const auto found = std::ranges::find(kMeanings, static_cast<int>(primaryCodeOf(error)), &std::pair<int, int>::first);
+  return error.domain != kSQLiteDomain || found == kMeanings.end() ? EIO : found->second;
+}
+
+Error asSystemError(Error error) {
+  if (error.domain != kSQLiteDomain) return error;
+  Error system{std::string(domains::kPOSIX), systemErrorOf(error), error.text, nullptr};
+  system.underlying = std::make_shared<const Error>(std::move(error));
+  return system;
+}
+
+Status asSystemError(Status status) {
+  return status ? status : asSystemError(std::move(status).error());
+}
+
+bool isDatabaseDamage(const Error& error) {
+  return error.domain == kSQLiteDomain &&
+         (primaryCodeOf(error) == SQLITE_CORRUPT || primaryCodeOf(error) == SQLITE_NOTADB);
 }
 
 }  // namespace appsync::device

@@ -177,4 +177,14 @@ class Database::Transaction : public Database::Session {
   bool open_ = false;
 };
 
+/// Returns the errno value that matches a database or system error, or EIO if there is no match.
+[[nodiscard]] int systemErrorOf(const Error& error);
+
+/// Returns a database error as a "POSIX" error with the former as its underlying error; others are returned unchanged.
+[[nodiscard]] Error asSystemError(Error error);
+[[nodiscard]] Status asSystemError(Status status);
+
+/// Returns whether the error means that the file is damaged or not a database.
+[[nodiscard]] bool isDatabaseDamage(const Error& error);
+
 }  // namespace appsync::device

@@ -9,6 +9,7 @@
 
 #include "base/ReturnIfError.h"
 #include "device/storage/FileTree.h"
+#include "device/storage/RandomNames.h"
 #include "device/storage/SystemCalls.h"
 
 namespace appsync::device {
@@ -43,7 +44,7 @@ std::optional<std::string> keptName(int file, const char* attribute) {
 /// An item of the work folder that goes away again unless it reaches its place.
 class Draft {
  public:
-  explicit Draft(int work) : work_(work), name_(sys::temporaryName()) {}
+  explicit Draft(int work) : work_(work), name_(temporaryName()) {}
   ~Draft() {
     if (!placed_) static_cast<void>(tree::remove(work_, name_.c_str(), work_));
   }

@@ -9,6 +9,7 @@
 #include <limits.h>
 #include <sys/stat.h>
 
+#include "device/storage/RandomNames.h"
 #include "device/storage/SystemCalls.h"
 
 namespace appsync::device {
@@ -77,7 +78,7 @@ int flatten(int folder, int work, std::vector<std::string>& pending) {
   while (const char* name = entries.next()) {
     int error = sys::removeFile(folder, name);
     if (error == EISDIR || error == EPERM) {  // What a folder answers depends on the system.
-      std::string moved = sys::temporaryName();
+      std::string moved = temporaryName();
       error = sys::rename(folder, name, work, moved.c_str(), sys::Replace::yes);
       if (error == 0) pending.push_back(std::move(moved));
     }
@@ -126,7 +127,7 @@ int create(int folder, const char* name, ByteView bytes) {
 }
 
 int remove(int folder, const char* name, int work) {
-  std::string moved = sys::temporaryName();
+  std::string moved = temporaryName();
   if (const int error = sys::rename(folder, name, work, moved.c_str(), sys::Replace::yes); error != 0) return error;
   const int error = sys::removeFile(work, moved.c_str());
   return error == EISDIR || error == EPERM ? removeFolder(work, std::move(moved)) : error;

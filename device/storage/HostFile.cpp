@@ -15,6 +15,7 @@
 #include "base/ReturnIfError.h"
 #include "device/storage/FileDescriptor.h"
 #include "device/storage/FileTree.h"
+#include "device/storage/RandomNames.h"
 #include "device/storage/SystemCalls.h"
 
 namespace appsync::device {
@@ -94,7 +95,7 @@ Status fillStream(const std::string& path, const HostFileFill& fill) {
 int createDraft(const std::string& path, mode_t mode, std::string& draft, FileDescriptor& file) {
   int failed = EEXIST;
   for (int attempt = 0; failed == EEXIST && attempt < kDraftAttempts; ++attempt) {
-    draft = path + std::string(kDraftMark) + sys::temporaryName();
+    draft = path + std::string(kDraftMark) + temporaryName();
     failed = sys::createFile(AT_FDCWD, draft.c_str(), mode, file);
   }
   return failed;
@@ -150,8 +151,8 @@ HostFileFill filledWith(ByteView bytes, const std::string& path) {
 }
 
 bool isDraft(std::string_view name) {
-  if (name.size() <= kDraftMark.size() + sys::kTemporaryNameDigits) return false;
-  const std::size_t end = name.size() - sys::kTemporaryNameDigits;
+  if (name.size() <= kDraftMark.size() + kTemporaryNameDigits) return false;
+  const std::size_t end = name.size() - kTemporaryNameDigits;
   return name.substr(0, end).ends_with(kDraftMark) &&
          name.substr(end).find_first_not_of("0123456789abcdef") == name.npos;
 }

@@ -1,11 +1,8 @@
 #include "device/storage/SystemCalls.h"
 
 #include <cerrno>
-#include <cinttypes>
-#include <cstdio>
 
 #include <fcntl.h>
-#include <sys/random.h>
 
 #include "device/storage/FaultPoint.h"
 
@@ -128,15 +125,6 @@ int copyContents(int from, int to, std::uint64_t& bytes) {
     if (const int unwritten = writeAt(to, ByteView(buffer).first(size), end); unwritten != 0) return unwritten;
     bytes += size;
   }
-}
-
-std::string temporaryName() {
-  std::uint64_t number = 0;
-  while (getrandom(&number, sizeof number, 0) != static_cast<ssize_t>(sizeof number)) {
-  }
-  char name[kTemporaryNameDigits + 1];
-  std::snprintf(name, sizeof name, "%016" PRIx64, number);
-  return name;
 }
 
 }  // namespace appsync::device::sys

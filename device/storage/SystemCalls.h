@@ -2,7 +2,6 @@
 #pragma once
 
 #include <cstdint>
-#include <string>
 
 #include <sys/stat.h>
 #include <sys/types.h>
@@ -44,10 +43,5 @@ enum class Replace { no, yes };
 [[nodiscard]] int setAttributes(int file, mode_t mode, const struct stat& status);
 /// Copies what is left of one file to the end of another, sharing blocks where the file system can; adds to `bytes`.
 [[nodiscard]] int copyContents(int from, int to, std::uint64_t& bytes);
-
-inline constexpr std::size_t kTemporaryNameDigits = 16;
-/// A random name for something half done, of hexadecimal digits: no process makes it twice, nor another one, though
-/// processes that do not see each other may have one number.
-[[nodiscard]] std::string temporaryName();
 
 }  // namespace appsync::device::sys

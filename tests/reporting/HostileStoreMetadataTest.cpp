@@ -7,6 +7,7 @@
 
 #include <gtest/gtest.h>
 
+#include "platform/SyncFiles.h"
 #include "reporting/StoreMetadata.h"
 #include "tests/reporting/StoreMetadataFixture.h"
 
@@ -213,9 +214,9 @@ TEST_F(HostileStoreMetadata, AFileOfAHundredMegabytesIsNotRead) {
 
 TEST_F(HostileStoreMetadata, AFileOfTheLargestSizeIsReadAndOneByteMoreIsTooMuch) {
   put(plist::Dictionary{{"corvelId", "x"}});
-  OtherSize files(platform, kPath, kMaximumStoreMetadataBytes);
+  OtherSize files(platform, kPath, kMaximumMetadataBytes);
   EXPECT_EQ(makeClient().corvelIDsForAssets(), (Identifiers{"first", "last", "x"}));
-  files.size = kMaximumStoreMetadataBytes + 1;
+  files.size = kMaximumMetadataBytes + 1;
   EXPECT_EQ(makeClient().corvelIDsForAssets(), (Identifiers{"first", "last"}));
 }
 

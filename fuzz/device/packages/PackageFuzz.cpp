@@ -12,6 +12,7 @@
 #include <unistd.h>
 
 #include "device/packages/Package.h"
+#include "platform/SyncFiles.h"
 
 namespace {
 
@@ -39,7 +40,7 @@ void checkEntries(device::FileDescriptor file) {
     if (!more) return require(!more.error().text.empty());
     if (!*more) return;
     require(isPlain(entry.path) && names.insert(entry.path).second && names.size() <= kLimits.entries);
-    const bool isExtra = entry.path == device::kStoreMetadataFile || entry.path == device::kArtworkFile;
+    const bool isExtra = entry.path == kStoreMetadataName || entry.path == kArtworkName;
     require(isExtra || (entry.path + '/').starts_with(package->appFolder() + '/'));
     if (entry.kind == device::PackageReader::Kind::folder) continue;
     const Result<Bytes> bytes = package->readAll(kLimits.unpackedBytes);

@@ -6,6 +6,7 @@
 #include "device/packages/BundleInfo.h"
 #include "kit/fakes/FakeFileSystem.h"
 #include "platform/Keys.h"
+#include "platform/SyncFiles.h"
 
 namespace appsync::test {
 namespace {
@@ -53,7 +54,7 @@ TEST_F(BundlesTest, AFolderWithoutUsableInfoOpensWithoutInfo) {
   files.put("/Garbage.app/Info.plist", "\x01\x02");
   files.put("/Array.app/Info.plist", "(BundleIdentifier)");
   files.putFolder("/Folder.app/Info.plist");
-  files.put("/Huge.app/Info.plist", "{BundleIdentifier = com.a;}" + std::string(device::kMaximumMetadataBytes, ' '));
+  files.put("/Huge.app/Info.plist", "{BundleIdentifier = com.a;}" + std::string(kMaximumMetadataBytes, ' '));
   for (const char* path : {"/Empty.app", "/Garbage.app", "/Array.app", "/Folder.app", "/Huge.app"}) {
     const auto bundle = open(path);
     ASSERT_NE(bundle, nullptr) << path;

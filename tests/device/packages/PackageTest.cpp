@@ -7,6 +7,7 @@
 
 #include "device/packages/InstallerError.h"
 #include "device/packages/Package.h"
+#include "device/packages/PackageUnpacker.h"
 #include "device/packages/PackageWriter.h"
 #include "tests/support/TestDevice.h"
 #include "tests/support/ZipArchive.h"

@@ -10,7 +10,6 @@
 #include <unistd.h>
 
 #include "device/storage/Database.h"
-#include "device/storage/DatabaseError.h"
 #include "device/storage/FaultPoint.h"
 #include "kit/fakes/Threads.h"
 #include "tests/support/ServiceDatabase.h"

@@ -3,7 +3,7 @@
 
 #include <gtest/gtest.h>
 
-#include "device/apps/Licence.h"
+#include "device/apps/AppTable.h"
 #include "plist/PropertyList.h"
 #include "tests/device/apps/AppRegistryFixture.h"
 
