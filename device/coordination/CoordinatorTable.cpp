@@ -96,7 +96,7 @@ Status readPromises(Database::Session& session, const ByNumber& coordinators) {
     if (!row.isNull(5)) state->transferPath = platform::FileLocation{std::string(row.text(5)), row.integer(6) != 0};
     state->fraction = row.real(7);
     state->isComplete = row.integer(8) != 0;
-    state->isCancelled = row.integer(9) != 0;
+    if (row.integer(9) != 0) state->stage = PromiseStage::withdrawn;
     state->coordinator = coordinator;
     if (state->role == PromiseRole::appAsset) coordinator->appAsset = state;
     if (state->role == PromiseRole::userData) coordinator->userData = state;
@@ -154,7 +154,7 @@ Status storePromise(Database::Session& session, std::int64_t coordinator, Promis
   }
   return session.run("insert or replace into coordinator_promises values (?, ?, ?, ?, ?, ?, ?, ?, ?, ?)", coordinator,
                      role, promise.name, promise.client, promise.diskSpaceNeeded, path, isFolder, promise.fraction,
-                     promise.isComplete, promise.isCancelled);
+                     promise.isComplete, promise.stage == PromiseStage::withdrawn);
 }
 
 Status storePlaceholder(Database::Session& session, std::int64_t coordinator, const PlaceholderState& placeholder) {

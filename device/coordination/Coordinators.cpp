@@ -21,7 +21,9 @@ Status checkPromise(const std::shared_ptr<PromiseState>& promise) {
   if (promise == nullptr) {
     return coordinationError(CoordinationFailure::notUsable, "this is no promise of the service");
   }
-  if (promise->isCancelled) return coordinationError(CoordinationFailure::ended, "the promise was taken back");
+  if (promise->stage == PromiseStage::withdrawn) {
+    return coordinationError(CoordinationFailure::ended, "the promise was withdrawn");
+  }
   if (promise->role)
     return coordinationError(CoordinationFailure::notUsable, "the promise is something else's already");
   return {};
@@ -40,6 +42,11 @@ PlaceholderContents contentsOf(const PlaceholderState& placeholder) {
 Status Coordinators::checkOpen() const {
   if (isEnding_) return coordinationError(CoordinationFailure::closed, "the install-coordination service has ended");
   return {};
+}
+
+Status Coordinators::checkOpen(const PlaceholderState& placeholder) {
+  if (placeholder.stage == PromiseStage::open) return {};
+  return coordinationError(CoordinationFailure::ended, "the placeholder has ended");
 }
 
 Coordinators::CoordinatorList Coordinators::ofApp(std::string_view identifier) const {
@@ -193,7 +200,7 @@ Status Coordinators::setPlaceholder(const Coordinator& coordinator, ClientIdenti
   if (placeholder == nullptr || placeholder->isAttached || placeholder->identifier != coordinator->identifier) {
     return coordinationError(CoordinationFailure::notUsable, "this is no placeholder for the coordinator");
   }
-  if (placeholder->isCancelled) return coordinationError(CoordinationFailure::ended, "the placeholder was given up");
+  RETURN_IF_ERROR(checkOpen(*placeholder));
   const auto store = [&](Database::Session& session) {
     coordinator_table::storePlaceholder(session, coordinator->number, *placeholder).ignore();
   };
@@ -214,7 +221,7 @@ void Coordinators::endIfDemoted(const Coordinator& coordinator) {
                        coordinator->appAsset == nullptr && coordinator->stage == CoordinatorStage::waiting;
   if (!hasDone) return;
   const auto& icon = coordinator->placeholder->icon;
-  if (icon && icon->canChange() && !icon->isComplete) return;
+  if (icon && icon->isOpen() && !icon->isComplete) return;
   Database::Transaction transaction(database_);
   coordinator_table::remove(transaction, *coordinator).ignore();
   // What cannot be stored now ends when the device is opened next.
@@ -304,16 +311,14 @@ Status Coordinators::erase(const CoordinatorState& coordinator) {
 void Coordinators::close(const Coordinator& coordinator, std::optional<Error> error) {
   coordinator->stage = CoordinatorStage::ended;
   coordinator->error = std::move(error);
-  const auto end = [](const std::shared_ptr<PromiseState>& promise) {
-    if (promise) promise->isOver = true;
+  const auto end = [](const auto& state) {
+    if (state && state->stage == PromiseStage::open) state->stage = PromiseStage::ended;
   };
   std::ranges::for_each(coordinator->initialODRAssets, end);
   end(coordinator->appAsset);
   end(coordinator->userData);
-  if (coordinator->placeholder) {
-    end(coordinator->placeholder->icon);
-    coordinator->placeholder->isCancelled = true;
-  }
+  end(coordinator->placeholder);
+  if (coordinator->placeholder) end(coordinator->placeholder->icon);
   const auto ofApp = coordinators_.find(coordinator->identifier);
   std::erase(ofApp->second, coordinator);
   if (ofApp->second.empty()) coordinators_.erase(ofApp);

@@ -84,14 +84,14 @@ class Coordinators : public std::enable_shared_from_this<Coordinators> {
   void setFraction(const std::shared_ptr<PromiseState>& promise, double fraction);
   void setTransferPath(const std::shared_ptr<PromiseState>& promise, const platform::FileLocation& path);
   void fulfil(const std::shared_ptr<PromiseState>& promise);
-  Status takeBack(const std::shared_ptr<PromiseState>& promise, platform::ClientIdentity client);
+  Status withdraw(const std::shared_ptr<PromiseState>& promise, platform::ClientIdentity client);
   [[nodiscard]] std::string describe(const PromiseState& promise) const;
 
   // Changes of placeholders.
 
   /// Makes a change to one that can still be configured. A failing change changes nothing.
   Status configure(const std::shared_ptr<PlaceholderState>& placeholder, const Configuration& change);
-  Status takeBack(const std::shared_ptr<PlaceholderState>& placeholder, platform::ClientIdentity client);
+  Status withdraw(const std::shared_ptr<PlaceholderState>& placeholder, platform::ClientIdentity client);
 
   /// Cancels all coordinators of an app; fails when there are none, or one that installs.
   Status cancelAll(std::string_view identifier, const Error& reason, platform::ClientIdentity client);
@@ -111,6 +111,7 @@ class Coordinators : public std::enable_shared_from_this<Coordinators> {
   // With the lock held.
 
   [[nodiscard]] Status checkOpen() const;
+  [[nodiscard]] static Status checkOpen(const PlaceholderState& placeholder);
   /// Whether `client` may set something of a coordinator, that was set before or not.
   [[nodiscard]] Status mayChange(const CoordinatorState& coordinator, platform::ClientIdentity client,
                                  bool wasSet) const;

@@ -1,4 +1,4 @@
-// What becomes of promises and placeholders that clients hold.
+// The operations of clients on promises and placeholders.
 #include <algorithm>
 #include <cmath>
 
@@ -19,14 +19,14 @@ constexpr double kProgressUnits = 1000;
 
 Error foreign(std::string_view what) {
   return coordinationError(CoordinationFailure::foreignClient,
-                           "only the client that made the " + std::string(what) + " takes it back");
+                           "only the client that made the " + std::string(what) + " withdraws it");
 }
 
 }  // namespace
 
 void Coordinators::setFraction(const std::shared_ptr<PromiseState>& promise, double fraction) {
   const std::lock_guard lock(mutex_);
-  if (isEnding_ || !promise->canChange()) return;
+  if (isEnding_ || !promise->isOpen()) return;
   promise->fraction = std::isnan(fraction) ? 0 : std::clamp(fraction, 0.0, 1.0);
   promise->hasUnsavedChanges = true;
   if (promise->role != PromiseRole::appAsset) return;
@@ -45,14 +45,14 @@ void Coordinators::followPromise(const CoordinatorState& coordinator) {
 void Coordinators::setTransferPath(const std::shared_ptr<PromiseState>& promise, const platform::FileLocation& path) {
   const std::lock_guard lock(mutex_);
   const bool isTheServices = promise->isComplete && promise->role;
-  if (isEnding_ || !promise->canChange() || isTheServices) return;
+  if (isEnding_ || !promise->isOpen() || isTheServices) return;
   promise->transferPath = path;
   promise->hasUnsavedChanges = true;
 }
 
 void Coordinators::fulfil(const std::shared_ptr<PromiseState>& promise) {
   const std::lock_guard lock(mutex_);
-  if (isEnding_ || !promise->canChange() || promise->isComplete) return;
+  if (isEnding_ || !promise->isOpen() || promise->isComplete) return;
   promise->isComplete = true;
   const Coordinator coordinator = promise->coordinator.lock();
   if (coordinator == nullptr || promise->role == PromiseRole::initialODRAsset) return;
@@ -70,10 +70,10 @@ void Coordinators::fulfil(const std::shared_ptr<PromiseState>& promise) {
   advance(coordinator);
 }
 
-Status Coordinators::takeBack(const std::shared_ptr<PromiseState>& promise, ClientIdentity client) {
+Status Coordinators::withdraw(const std::shared_ptr<PromiseState>& promise, ClientIdentity client) {
   const std::lock_guard lock(mutex_);
   RETURN_IF_ERROR(checkOpen());
-  if (!promise->canChange()) return coordinationError(CoordinationFailure::ended, "the promise is over");
+  if (!promise->isOpen()) return coordinationError(CoordinationFailure::ended, "the promise has ended");
   const Coordinator coordinator = promise->coordinator.lock();
   if (promise->role && client != promise->client) return foreign("promise");
   if (coordinator && promise->role == PromiseRole::appAsset && coordinator->stage == CoordinatorStage::installing) {
@@ -81,13 +81,13 @@ Status Coordinators::takeBack(const std::shared_ptr<PromiseState>& promise, Clie
   }
   if (coordinator && promise->role != PromiseRole::initialODRAsset) {
     PromiseState copy = *promise;
-    copy.isCancelled = true;
+    copy.stage = PromiseStage::withdrawn;
     const auto store = [&](Database::Session& session) {
       coordinator_table::storePromise(session, coordinator->number, *promise->role, copy).ignore();
     };
     RETURN_IF_ERROR(this->store(*coordinator, store));
   }
-  promise->isCancelled = true;
+  promise->stage = PromiseStage::withdrawn;
   return {};
 }
 
@@ -96,14 +96,14 @@ std::string Coordinators::describe(const PromiseState& promise) const {
   std::string text = "<promise " + promise.name + ' ' + description(promise.fraction);
   if (promise.transferPath) text += " at " + promise.transferPath->path;
   if (promise.isComplete) text += " complete";
-  if (promise.isCancelled) text += " cancelled";
+  if (promise.stage == PromiseStage::withdrawn) text += " cancelled";
   return text + '>';
 }
 
 Status Coordinators::configure(const std::shared_ptr<PlaceholderState>& placeholder, const Configuration& change) {
   const std::lock_guard lock(mutex_);
   RETURN_IF_ERROR(checkOpen());
-  if (placeholder->isCancelled) return coordinationError(CoordinationFailure::ended, "the placeholder was given up");
+  RETURN_IF_ERROR(checkOpen(*placeholder));
   if (placeholder->isConfigured) {
     return coordinationError(CoordinationFailure::setBefore, "the placeholder's configuration is complete");
   }
@@ -129,15 +129,16 @@ Status Coordinators::configure(const std::shared_ptr<PlaceholderState>& placehol
   return {};
 }
 
-Status Coordinators::takeBack(const std::shared_ptr<PlaceholderState>& placeholder, ClientIdentity client) {
+Status Coordinators::withdraw(const std::shared_ptr<PlaceholderState>& placeholder, ClientIdentity client) {
   const std::lock_guard lock(mutex_);
-  if (placeholder->isCancelled) return coordinationError(CoordinationFailure::ended, "the placeholder was given up");
+  RETURN_IF_ERROR(checkOpen(*placeholder));
   if (placeholder->isAttached) {
-    return coordinationError(CoordinationFailure::notUsable, "the placeholder goes with its coordinator only");
+    return coordinationError(CoordinationFailure::notUsable,
+                             "the placeholder belongs to a coordinator; cancel that instead");
   }
   if (client != placeholder->client) return foreign("placeholder");
-  placeholder->isCancelled = true;
-  if (placeholder->icon) placeholder->icon->isCancelled = true;
+  placeholder->stage = PromiseStage::withdrawn;
+  if (placeholder->icon) placeholder->icon->stage = PromiseStage::withdrawn;
   return {};
 }
 

@@ -15,7 +15,8 @@ std::shared_ptr<PlaceholderState> stateOf(const Coordinators& coordinators,
 Status PlaceholderHandle::setIconPromise(std::shared_ptr<platform::PromisedTransferToPath> promise) {
   const auto icon = stateOf(*coordinators_, promise);
   return coordinators_->configure(state_, [&](PlaceholderState& copy) -> Status {
-    const bool isUsable = icon != nullptr && !icon->role && !icon->isCancelled && copy.icon == nullptr;
+    const bool isUsable =
+        icon != nullptr && !icon->role && icon->stage != PromiseStage::withdrawn && copy.icon == nullptr;
     if (!isUsable) return coordinationError(CoordinationFailure::notUsable, "this is no icon for the placeholder");
     copy.icon = icon;
     return {};
@@ -60,7 +61,7 @@ Status PlaceholderHandle::setConfigurationComplete() {
 }
 
 Status PlaceholderHandle::cancelForReason(const Error&, platform::ClientIdentity client) {
-  return coordinators_->takeBack(state_, client);
+  return coordinators_->withdraw(state_, client);
 }
 
 }  // namespace appsync::device

@@ -32,7 +32,7 @@ class PromiseHandle : public ServiceHandle<Interface, PromiseState> {
     if (complete) coordinators_->fulfil(state_);
   }
   Status cancelForReason(const Error&, platform::ClientIdentity client) override {
-    return coordinators_->takeBack(state_, client);
+    return coordinators_->withdraw(state_, client);
   }
   /// "<promise com.example.notes-Asset 0.5>"
   [[nodiscard]] std::string description() const override { return coordinators_->describe(*state_); }
