@@ -101,10 +101,10 @@ Result<device::BundleInfo> checkedInfo(const fs::path& app) {
   Result<device::BundleInfo> info = device::readBundleInfo(*bytes);
   if (!info) return info.error().in(path.string());
   Status good;
-  for (const std::string_view key : {platform::BundleVersionKey, platform::BundleDisplayNameKey}) {
+  for (const std::string_view key : {platform::kBundleVersionKey, platform::kBundleDisplayNameKey}) {
     if (good) good = requireText(info->dictionary, key, path);
   }
-  for (const std::string_view key : {platform::BundleExecutableKey, platform::BundleIconFileKey}) {
+  for (const std::string_view key : {platform::kBundleExecutableKey, platform::kBundleIconFileKey}) {
     if (good) good = requireFile(info->dictionary, key, app);
   }
   if (!good) return good.error();

@@ -95,7 +95,7 @@ ExitStatus run(const SetOptions& options, device::Device& device) {
     const Status set = assign(device, assignment);
     if (set) continue;
     const bool isWrongUsage =
-        set.error().domain == device::kSettingsDomain || set.error().domain == platform::InstallerErrorDomain;
+        set.error().domain == device::kSettingsDomain || set.error().domain == platform::kInstallerErrorDomain;
     if (!isWrongUsage) return reportUnusable(set.error());
     printError(set.error().text);
     return ExitStatus::wrongUsage;

@@ -9,20 +9,20 @@ plist::Dictionary PlaceholderInfo::dictionary() const {
   const plist::Value name = displayName ? plist::Value(*displayName) : plist::Value();
   plist::Dictionary info{
       {platform::BundleIdentifierKey, bundleIdentifier},
-      {platform::BundleExecutableKey, name},  // There is no code: the name has to serve.
-      {platform::BundleDisplayNameKey, name},
-      {platform::BundleIconFileKey, kPlaceholderIconName},
+      {platform::kBundleExecutableKey, name},  // There is no code: the name has to serve.
+      {platform::kBundleDisplayNameKey, name},
+      {platform::kBundleIconFileKey, kPlaceholderIconName},
       {kPeriodicalKey, isPeriodical},
       {kLaunchProhibitedKey, isLaunchProhibited},
   };
-  if (version != nullptr) info.set(platform::BundleVersionKey, *version);
+  if (version != nullptr) info.set(platform::kBundleVersionKey, *version);
   return info;
 }
 
 plist::Dictionary PlaceholderInfo::installOptions(platform::TSInstallType type) const {
   return {{platform::PackageTypeKey, platform::PackageTypePlaceholder},
           {platform::BundleIdentifierKey, bundleIdentifier},
-          {platform::InstallTypeKey, static_cast<std::uint64_t>(type)}};
+          {platform::kInstallTypeKey, static_cast<std::uint64_t>(type)}};
 }
 
 }  // namespace appsync

@@ -106,7 +106,7 @@ class AppWriter {
 
 bool isToBeSaved(const DeviceApp& app) {
   const bool comesWithSync = !app.isInstalled && app.installType == TSInstallType::Sync;
-  return app.type == platform::ApplicationTypeUser && !comesWithSync;
+  return app.type == platform::kApplicationTypeUser && !comesWithSync;
 }
 
 Status fill(const FolderDraft& draft, device::Device& device, Backup& backup) {

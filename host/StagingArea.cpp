@@ -71,7 +71,7 @@ Status writeList(FileSystem& files, const std::string& path, const plist::Value&
 
 /// The staged info dictionary names the icon as it is staged: the package's own name for it may be any path.
 Status writeFace(FileSystem& files, const std::string& folder, device::PackageInfo package) {
-  if (package.icon) package.info.set(platform::BundleIconFileKey, kIconName);
+  if (package.icon) package.info.set(platform::kBundleIconFileKey, kIconName);
   const Result<Bytes> info = plist::writeBinary(package.info);
   if (!info) return info.error();
   Status made = files.createDirectory(folder, IntermediateDirectories::create, {});

@@ -46,7 +46,7 @@ class AppRecord : public BundleRecord {
   /// Device path of the bundle itself, "…/Name.app".
   [[nodiscard]] virtual std::optional<std::string> bundlePath() const = 0;
 
-  /// `ApplicationTypeUser`, `ApplicationTypeSystem` or another word of the registry's.
+  /// `kApplicationTypeUser`, `kApplicationTypeSystem` or another word of the registry's.
   [[nodiscard]] virtual std::string applicationType() const = 0;
   /// Bytes that its bundle takes, as the installer counted them: the installed one's where there are two. What an app
   /// writes while it runs is not in it. Cheap: walks over all apps ask.

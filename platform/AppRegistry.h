@@ -64,20 +64,20 @@ class AppRegistry {
 
   /// Installs what is at `location` and returns when it is done or has failed.
   ///
-  /// A package (`PackageTypeKey` is `PackageTypeCustomer`) becomes an installed app, in place of an earlier version of
+  /// A package (`PackageTypeKey` is `kPackageTypeCustomer`) becomes an installed app, in place of an earlier version of
   /// it; a placeholder (`PackageTypePlaceholder`, `location` is an app folder) becomes a placeholder, and leaves an
   /// installed app of that identifier whole and usable until its package comes. `BundleIdentifierKey` names the app and
-  /// must agree with what is installed; `InstallTypeKey`, `StoreMetadataKey` and `LicenceDataKey` are kept with the
+  /// must agree with what is installed; `kInstallTypeKey`, `kStoreMetadataKey` and `kLicenceDataKey` are kept with the
   /// record; a null under one of these two is as none.
   ///
   /// The location is read, never changed, and needed only during the call. Atomic: after a failure, or a crash at any
-  /// moment, the app is as it was before. Errors: `InstallerErrorDomain`, or "POSIX" where the system failed.
+  /// moment, the app is as it was before. Errors: `kInstallerErrorDomain`, or "POSIX" where the system failed.
   [[nodiscard]] virtual Status installApplication(const FileLocation& location, const plist::Dictionary& options) = 0;
 
   /// Removes the placeholder or, if there is none, the app with its data. An installed app under a placeholder stays
   /// whole and usable, whatever the options: removing what a failed update leaves never removes the app. With
-  /// `UninstallPlaceholdersOnlyKey` true an app is never removed. Removing a real app, and nothing else, adds it to the
-  /// uninstalled-apps list. An unknown identifier fails.
+  /// `kUninstallPlaceholdersOnlyKey` true an app is never removed. Removing a real app, and nothing else, adds it to
+  /// the uninstalled-apps list. An unknown identifier fails.
   [[nodiscard]] virtual Status uninstallApplication(std::string_view bundleIdentifier,
                                                     const plist::Dictionary& options = {}) = 0;
 

@@ -40,11 +40,11 @@ enum class TSInstallPhase : std::uint64_t {
 /// Which bundles a walk of the registry visits.
 enum class BundleKind : std::uint32_t {
   /// Every bundle: apps and placeholders, of users and of the system; also bundles that are no apps.
-  All = 0,
+  all = 0,
   /// Every user bundle, installed or placeholder.
-  User = 1,
+  user = 1,
   /// The bundles of system apps, installed or placeholder.
-  System = 7,
+  system = 7,
 };
 
 }  // namespace appsync::platform

@@ -10,7 +10,7 @@ plist::Dictionary AppsClient::installedAssetMetrics() {
   std::int64_t count = 0;
   std::uint64_t bytes = 0;
   visitUserApps(_platform.defaultRegistry(), [&](const platform::AppRecord& app) {
-    if (app.applicationType() != platform::ApplicationTypeUser) return;
+    if (app.applicationType() != platform::kApplicationTypeUser) return;
     bytes += app.staticDiskUsage();
     ++count;
   });

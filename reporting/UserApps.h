@@ -9,7 +9,7 @@ namespace appsync {
 /// apps are passed over.
 template <class Visit>
 void visitUserApps(platform::AppRegistry& registry, const Visit& visit) {
-  registry.enumerateBundlesOfType(platform::BundleKind::User, [&visit](const platform::BundleRecord& bundle, bool&) {
+  registry.enumerateBundlesOfType(platform::BundleKind::user, [&visit](const platform::BundleRecord& bundle, bool&) {
     if (const platform::AppRecord* app = bundle.asAppRecord()) visit(*app);
   });
 }

@@ -21,7 +21,7 @@ bool AppsClient::_placeholderExistsForApplication(std::string_view bundleIdentif
   if (_useInstallCoordinator) return false;  // Coordinators own the placeholders then.
   bool found = userBundles != nullptr && userBundles->contains(bundleIdentifier);
   if (userBundles == nullptr) {
-    _platform.defaultRegistry().enumerateBundlesOfType(BundleKind::User, [&](const BundleRecord& bundle, bool& stop) {
+    _platform.defaultRegistry().enumerateBundlesOfType(BundleKind::user, [&](const BundleRecord& bundle, bool& stop) {
       found = bundle.applicationIdentifier() == bundleIdentifier;
       stop = found;
     });
@@ -33,19 +33,19 @@ bool AppsClient::_placeholderExistsForApplication(std::string_view bundleIdentif
 Identifiers AppsClient::_userBundles() {
   Identifiers identifiers;
   _platform.defaultRegistry().enumerateBundlesOfType(
-      BundleKind::User, [&](const BundleRecord& bundle, bool&) { identifiers.insert(bundle.applicationIdentifier()); });
+      BundleKind::user, [&](const BundleRecord& bundle, bool&) { identifiers.insert(bundle.applicationIdentifier()); });
   return identifiers;
 }
 
 void AppsClient::_enumeratePlaceholdersWithBlock(const PlaceholderVisitor& visit) {
-  _platform.defaultRegistry().enumerateBundlesOfType(BundleKind::All, [&](const BundleRecord& bundle, bool& stop) {
+  _platform.defaultRegistry().enumerateBundlesOfType(BundleKind::all, [&](const BundleRecord& bundle, bool& stop) {
     if (const AppRecord* record = asPlaceholder(bundle)) visit(*record, stop);
   });
 }
 
 Identifiers AppsClient::_getSystemAppPlaceholders() {
   Identifiers identifiers;
-  _platform.defaultRegistry().enumerateBundlesOfType(BundleKind::System, [&](const BundleRecord& bundle, bool&) {
+  _platform.defaultRegistry().enumerateBundlesOfType(BundleKind::system, [&](const BundleRecord& bundle, bool&) {
     if (const AppRecord* record = asPlaceholder(bundle)) identifiers.insert(record->applicationIdentifier());
   });
   _log.message("%s|SystemAppPlaceholders %{public}@", identifiers);

@@ -28,8 +28,8 @@ PlaceholderInfo describePlaceholder(std::string_view identifier, const RestoreMe
 plist::Dictionary installOptions(const PlaceholderInfo& placeholder, ByteView metadata,
                                  const std::optional<ByteView>& sinf) {
   plist::Dictionary options = placeholder.installOptions(platform::TSInstallType::Restore);
-  options.set(platform::StoreMetadataKey, plist::Value::data(metadata));
-  options.set(platform::LicenceDataKey, sinf ? plist::Value::data(*sinf) : plist::Value());
+  options.set(platform::kStoreMetadataKey, plist::Value::data(metadata));
+  options.set(platform::kLicenceDataKey, sinf ? plist::Value::data(*sinf) : plist::Value());
   return options;
 }
 

@@ -96,7 +96,7 @@ void AppsClient::_performAssetInstall(const std::shared_ptr<ZTAsset>& asset) {
 
 void AppsClient::_installPackage(const ZTAsset& asset) {
   const platform::FileLocation package{asset.path().value_or("")};
-  const plist::Dictionary options{{platform::PackageTypeKey, platform::PackageTypeCustomer},
+  const plist::Dictionary options{{platform::PackageTypeKey, platform::kPackageTypeCustomer},
                                   {platform::BundleIdentifierKey, asset.identifier()}};
   const Status installed = _platform.defaultRegistry().installApplication(package, options);
   if (installed) {
@@ -178,7 +178,7 @@ bool AppsClient::_isRecoverableError(const std::optional<Error>& error) {
     return false;
   }
   if (!error || !_platform.syncFramework().ZTIsRecoverableError(*error)) return false;
-  return error->domain != platform::InstallerErrorDomain && error->domain != "TessalyError";
+  return error->domain != platform::kInstallerErrorDomain && error->domain != "TessalyError";
 }
 
 }  // namespace appsync

@@ -71,7 +71,7 @@ void emptyIconScratchFolder(platform::FileSystem& files, const PlugInLog& log) {
 std::optional<std::string> displayNameOfBundle(platform::Bundles& bundles, const std::optional<std::string>& path) {
   const auto location = path ? FileLocation::directory(*path) : std::nullopt;
   const auto bundle = location ? bundles.openBundle(*location) : nullptr;
-  return bundle ? ownedStringIn(bundle->infoDictionaryValue(platform::BundleDisplayNameKey)) : std::nullopt;
+  return bundle ? ownedStringIn(bundle->infoDictionaryValue(platform::kBundleDisplayNameKey)) : std::nullopt;
 }
 
 std::optional<std::string> inFolder(const std::optional<std::string>& folder, std::string_view name) {

@@ -183,7 +183,7 @@ void AppsClient::_handleFailedTransfer(const ZTAsset& asset, const std::optional
     return;
   }
   const Status uninstalled =
-      registry.uninstallApplication(identifier, {{platform::UninstallPlaceholdersOnlyKey, true}});
+      registry.uninstallApplication(identifier, {{platform::kUninstallPlaceholdersOnlyKey, true}});
   _log.message("%s|Uninstalling app using TS %{public}@ %s", identifier, uninstalled ? "secceeded" : "failed");
 }
 

@@ -32,8 +32,8 @@ WantedEntry WantedEntry::fromPlaceholder(const platform::AppRecord& record) {
   plist::Dictionary values{{kIsRestore, flag(type == TSInstallType::Restore)},
                            {kIntentionallyDemoted, flag(type == TSInstallType::IntentionalDowngrade)},
                            {kAutomaticallyDemoted, flag(type == TSInstallType::Downgrade)},
-                           {kSystemApp, record.applicationType() == platform::ApplicationTypeSystem}};
-  setIfPresent(values, platform::BundleVersionKey, record.bundleVersion());
+                           {kSystemApp, record.applicationType() == platform::kApplicationTypeSystem}};
+  setIfPresent(values, platform::kBundleVersionKey, record.bundleVersion());
   setIfPresent(values, platform::BundleIdentifierKey, record.bundleIdentifier());
   setIfPresent(values, kContainer, record.bundleContainerPath());
   setIfPresent(values, kPath, record.bundlePath());
@@ -43,7 +43,7 @@ WantedEntry WantedEntry::fromPlaceholder(const platform::AppRecord& record) {
 WantedEntry WantedEntry::fromTodoEntry(const plist::Value& entry, std::string_view identifier) {
   const std::string staged = std::string(kWorkArea) + "/" + std::string(identifier);
   plist::Dictionary values{{platform::BundleIdentifierKey, identifier}, {kContainer, staged}, {kPath, staged}};
-  if (const plist::Value* version = entry.find(todo::kVersion)) values.set(platform::BundleVersionKey, *version);
+  if (const plist::Value* version = entry.find(todo::kVersion)) values.set(platform::kBundleVersionKey, *version);
   if (const plist::Value* name = entry.find(todo::kName)) values.set(kNameFromHost, *name);
   return WantedEntry(std::move(values));
 }
@@ -53,7 +53,7 @@ std::string WantedEntry::identifier() const {
 }
 
 const plist::Value* WantedEntry::version() const {
-  return values_.find(platform::BundleVersionKey);
+  return values_.find(platform::kBundleVersionKey);
 }
 
 std::optional<std::string> WantedEntry::path() const {

@@ -93,7 +93,7 @@ class DeviceWithApps {
                                         .name = "Waiting",
                                         .version = {},
                                         .installType = platform::TSInstallType::Restore};
-      device::app_table::put(transaction, waiting, platform::ApplicationTypeUser, device::BundleRole::placeholder,
+      device::app_table::put(transaction, waiting, platform::kApplicationTypeUser, device::BundleRole::placeholder,
                              bundle, {})
           .ignore();
       device::UninstalledApps::add(transaction, identifier("removed", number)).ignore();

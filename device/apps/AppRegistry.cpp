@@ -60,8 +60,8 @@ void AppRegistry::enumerateBundlesOfType(
     Database::Session session(database_);
     Result<std::vector<AppRow>> found = kind == BundleKind::All ? app_table::all(session)
                                         : kind == BundleKind::User
-                                            ? app_table::ofType(session, platform::ApplicationTypeUser)
-                                            : app_table::ofType(session, platform::ApplicationTypeSystem);
+                                            ? app_table::ofType(session, platform::kApplicationTypeUser)
+                                            : app_table::ofType(session, platform::kApplicationTypeSystem);
     if (!found) return;
     rows = std::move(found).value();
   }
@@ -73,14 +73,14 @@ void AppRegistry::enumerateBundlesOfType(
 }
 
 Status AppRegistry::installApplication(const platform::FileLocation& location, const plist::Dictionary& options) {
-  Status installed = installer_.install(location, options, platform::ApplicationTypeUser);
+  Status installed = installer_.install(location, options, platform::kApplicationTypeUser);
   if (const auto identifier = stringIn(options.find(platform::BundleIdentifierKey)))
     noteOutcome(*identifier, installed);
   return installed;
 }
 
 Status AppRegistry::installPackage(const platform::FileLocation& location, const InstallRequest& request) {
-  Status installed = installer_.installPackage(location, request, platform::ApplicationTypeUser);
+  Status installed = installer_.installPackage(location, request, platform::kApplicationTypeUser);
   noteOutcome(request.identifier, installed);
   return installed;
 }
@@ -95,11 +95,11 @@ void AppRegistry::noteOutcome(std::string_view bundleIdentifier, const Status& i
 }
 
 Status AppRegistry::recordPlaceholder(PendingContainer& container, const InstallRequest& request, StoredBundle bundle) {
-  return installer_.recordPlaceholder(container, request, platform::ApplicationTypeUser, std::move(bundle));
+  return installer_.recordPlaceholder(container, request, platform::kApplicationTypeUser, std::move(bundle));
 }
 
 Status AppRegistry::removePlaceholder(std::string_view bundleIdentifier, const TransactionHook& transactionHook) {
-  return installer_.uninstall(bundleIdentifier, {{platform::UninstallPlaceholdersOnlyKey, true}}, transactionHook);
+  return installer_.uninstall(bundleIdentifier, {{platform::kUninstallPlaceholdersOnlyKey, true}}, transactionHook);
 }
 
 std::optional<Error> AppRegistry::lastInstallFailure(std::string_view bundleIdentifier) {
@@ -109,7 +109,7 @@ std::optional<Error> AppRegistry::lastInstallFailure(std::string_view bundleIden
 }
 
 Status AppRegistry::installSystemApplication(const platform::FileLocation& location, const plist::Dictionary& options) {
-  return installer_.install(location, options, platform::ApplicationTypeSystem);
+  return installer_.install(location, options, platform::kApplicationTypeSystem);
 }
 
 Status AppRegistry::uninstallApplication(std::string_view bundleIdentifier, const plist::Dictionary& options) {

@@ -45,7 +45,7 @@ PlaceholderContents demotedPlaceholder(DeviceFileSystem& files, const AppRow& ap
   if (const auto document = readIfThere(files, appPath + '/' + std::string(kInfoPlistName))) {
     if (Result<BundleInfo> info = readBundleInfo(*document)) {
       const plist::Value* prohibited = info->dictionary.find(kLaunchProhibitedKey);
-      remains.iconPath = namedFileIn(appPath, info->dictionary.find(platform::BundleIconFileKey));
+      remains.iconPath = namedFileIn(appPath, info->dictionary.find(platform::kBundleIconFileKey));
       remains.attributes = platform::PlaceholderAttributes::initWithInfoPlistDictionary(std::move(info->dictionary));
       remains.attributes.setLaunchProhibited(prohibited != nullptr && plist::truth(*prohibited).value_or(false));
     }
@@ -123,7 +123,7 @@ Status Installer::renamePlaceholder(std::string_view bundleIdentifier, std::stri
   if (!document) return document.error();
   Result<BundleInfo> info = readBundleInfo(*document);
   if (!info) return info.error();
-  info->dictionary.set(platform::BundleDisplayNameKey, name);
+  info->dictionary.set(platform::kBundleDisplayNameKey, name);
   document = plist::writeBinary(info->dictionary);  // which, unlike XML, has a form for every name
   if (!document) return document.error();
   RETURN_IF_ERROR(files_.writeFileAtomically(path, *document));

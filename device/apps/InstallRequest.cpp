@@ -25,10 +25,10 @@ Result<std::optional<Bytes>> bytesUnder(const plist::Dictionary& options, std::s
 Result<InstallRequest> readInstallOptions(const plist::Dictionary& options) {
   InstallRequest request;
   const auto typeName = stringIn(options.find(platform::PackageTypeKey));
-  if (typeName != platform::PackageTypeCustomer && typeName != platform::PackageTypePlaceholder) {
+  if (typeName != platform::kPackageTypeCustomer && typeName != platform::PackageTypePlaceholder) {
     return badOption(platform::PackageTypeKey, "must be \"Customer\" or \"Placeholder\"");
   }
-  request.role = typeName == platform::PackageTypeCustomer ? BundleRole::installed : BundleRole::placeholder;
+  request.role = typeName == platform::kPackageTypeCustomer ? BundleRole::installed : BundleRole::placeholder;
 
   const auto identifier = stringIn(options.find(platform::BundleIdentifierKey));
   if (!identifier) return badOption(platform::BundleIdentifierKey, "must name the app");
@@ -40,15 +40,15 @@ Result<InstallRequest> readInstallOptions(const plist::Dictionary& options) {
   }
   request.identifier = *identifier;
 
-  if (const plist::Value* installType = options.find(platform::InstallTypeKey)) {
+  if (const plist::Value* installType = options.find(platform::kInstallTypeKey)) {
     const auto number = installType->uint64();
-    if (!number) return badOption(platform::InstallTypeKey, "must be a number");
+    if (!number) return badOption(platform::kInstallTypeKey, "must be a number");
     request.installType = static_cast<platform::TSInstallType>(*number);
   }
-  Result<std::optional<Bytes>> metadata = bytesUnder(options, platform::StoreMetadataKey);
+  Result<std::optional<Bytes>> metadata = bytesUnder(options, platform::kStoreMetadataKey);
   if (!metadata) return metadata.error();
   request.storeMetadata = std::move(metadata).value();
-  Result<std::optional<Bytes>> licence = bytesUnder(options, platform::LicenceDataKey);
+  Result<std::optional<Bytes>> licence = bytesUnder(options, platform::kLicenceDataKey);
   if (!licence) return licence.error();
   request.licenceData = std::move(licence).value();
   return request;

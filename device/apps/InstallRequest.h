@@ -28,7 +28,7 @@ struct InstallRequest {
   TransactionHook transactionHook;
 };
 
-/// Keys that installing does not know are passed over. Errors: platform::InstallerErrorDomain.
+/// Keys that installing does not know are passed over. Errors: platform::kInstallerErrorDomain.
 [[nodiscard]] Result<InstallRequest> readInstallOptions(const plist::Dictionary& options);
 
 }  // namespace appsync::device

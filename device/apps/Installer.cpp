@@ -77,7 +77,7 @@ std::vector<const StoredBundle*> replacedBy(BundleRole role, const AppRow& app) 
 
 /// Returns what a removal may remove at most: a placeholder alone, or all that belongs to the app.
 BundleRole requestedRole(const plist::Dictionary& options) {
-  const plist::Value* only = options.find(platform::UninstallPlaceholdersOnlyKey);
+  const plist::Value* only = options.find(platform::kUninstallPlaceholdersOnlyKey);
   return only != nullptr && plist::truth(*only).value_or(false) ? BundleRole::placeholder : BundleRole::installed;
 }
 

@@ -35,21 +35,21 @@ const std::string& shownName(const PlaceholderContents& placeholder) {
 
 std::optional<std::string> versionOf(const PlaceholderContents& placeholder) {
   if (placeholder.attributes.bundleVersion()) return placeholder.attributes.bundleVersion();
-  return ownedStringIn(placeholder.attributes.infoDictionary().find(platform::BundleVersionKey));
+  return ownedStringIn(placeholder.attributes.infoDictionary().find(platform::kBundleVersionKey));
 }
 
 /// The app's own info dictionary, with what the placeholder says of it.
 Result<Bytes> infoDocument(const PlaceholderContents& placeholder, const StoredBundle& bundle, bool hasIcon) {
   plist::Dictionary info = placeholder.attributes.infoDictionary();
   info.set(platform::BundleIdentifierKey, placeholder.identifier);
-  info.set(platform::BundleDisplayNameKey, bundle.name);
-  info.set(platform::BundleExecutableKey, bundle.name);
+  info.set(platform::kBundleDisplayNameKey, bundle.name);
+  info.set(platform::kBundleExecutableKey, bundle.name);
   info.set(kLaunchProhibitedKey, placeholder.attributes.launchProhibited());
-  if (bundle.version) info.set(platform::BundleVersionKey, *bundle.version);
+  if (bundle.version) info.set(platform::kBundleVersionKey, *bundle.version);
   if (hasIcon) {
-    info.set(platform::BundleIconFileKey, kPlaceholderIconName);
+    info.set(platform::kBundleIconFileKey, kPlaceholderIconName);
   } else {
-    info.erase(platform::BundleIconFileKey);
+    info.erase(platform::kBundleIconFileKey);
   }
   return plist::writeBinary(info);
 }

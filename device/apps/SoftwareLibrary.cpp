@@ -8,7 +8,7 @@ namespace {
 
 std::vector<Receipt> receiptsDue(platform::AppRegistry& registry) {
   std::vector<Receipt> due;
-  registry.enumerateBundlesOfType(platform::BundleKind::User, [&](const platform::BundleRecord& bundle, bool&) {
+  registry.enumerateBundlesOfType(platform::BundleKind::user, [&](const platform::BundleRecord& bundle, bool&) {
     const platform::AppRecord* app = bundle.asAppRecord();
     if (app != nullptr && app->isInstalled()) due.push_back({app->applicationIdentifier(), app->bundleVersion()});
   });

@@ -296,7 +296,7 @@ Status Coordinators::erase(const CoordinatorState& coordinator) {
   const bool staysDemoted = goesAlone && reinstallsDemotedApp(*coordinator.placeholder);
   if (goesAlone && !staysDemoted) {
     Status removed = registry_.removePlaceholder(coordinator.identifier, remove);
-    const bool isGone = !removed && removed.error().domain == platform::InstallerErrorDomain;
+    const bool isGone = !removed && removed.error().domain == platform::kInstallerErrorDomain;
     if (!isGone) return removed;
   }
   {

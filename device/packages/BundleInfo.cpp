@@ -65,8 +65,8 @@ Result<BundleInfo> readBundleInfo(ByteView document) {
         "the app's bundle identifier \"" + *identifier +
             "\" may have only letters, digits, '-', '.' and '_', at most 200 and no dot first; choose another");
   }
-  return BundleInfo{*std::move(identifier), ownedStringIn(dictionary->find(platform::BundleVersionKey)),
-                    ownedStringIn(dictionary->find(platform::BundleDisplayNameKey)), *dictionary};
+  return BundleInfo{*std::move(identifier), ownedStringIn(dictionary->find(platform::kBundleVersionKey)),
+                    ownedStringIn(dictionary->find(platform::kBundleDisplayNameKey)), *dictionary};
 }
 
 }  // namespace appsync::device

@@ -19,7 +19,7 @@ struct BundleInfo {
 };
 
 /// Reads an "Info.plist" in any of its forms. The identifier is there and well formed, or it is an error of
-/// platform::InstallerErrorDomain.
+/// platform::kInstallerErrorDomain.
 [[nodiscard]] Result<BundleInfo> readBundleInfo(ByteView document);
 
 /// Where the file is that an app names in its info dictionary: none when `name`, which may be null, is none of a file

@@ -8,7 +8,7 @@
 
 namespace appsync::device {
 
-/// The codes of errors in platform::InstallerErrorDomain. Each text says what is wrong and what to do.
+/// The codes of errors in platform::kInstallerErrorDomain. Each text says what is wrong and what to do.
 enum class InstallerFailure : long {
   badOptions = 1,      ///< the install options lack something or contradict each other
   notAPackage,         ///< not a zip archive, or no app folder where a placeholder should be
@@ -28,7 +28,7 @@ enum class InstallerFailure : long {
 };
 
 [[nodiscard]] inline Error installerError(InstallerFailure failure, std::string text) {
-  return {std::string(platform::InstallerErrorDomain), static_cast<long>(failure), std::move(text), nullptr};
+  return {std::string(platform::kInstallerErrorDomain), static_cast<long>(failure), std::move(text), nullptr};
 }
 
 }  // namespace appsync::device

@@ -63,7 +63,7 @@ Result<PackageInfo> readInfo(const std::string& hostPath, PackageLimits limits) 
   info.name = bundle->displayName ? *std::move(bundle->displayName) : std::string(appFolderStem(package->appFolder()));
   info.info = std::move(bundle->dictionary);
   info.packageBytes = package->packageBytes();
-  const auto iconName = stringIn(info.info.find(platform::BundleIconFileKey));
+  const auto iconName = stringIn(info.info.find(platform::kBundleIconFileKey));
   if (!iconName || iconName->empty()) return info;
   RETURN_IF_ERROR(readIcon(hostPath, package->appFolder() + '/' + std::string(*iconName), limits, info));
   return info;

@@ -29,7 +29,7 @@ struct PackageLimits {
 /// and `kArtworkName`. Names are relative, in UTF-8, with plain components; entries are files and folders, each once;
 /// nothing is encrypted.
 ///
-/// Errors: platform::InstallerErrorDomain, each saying which entry and what to do; "POSIX" where the system failed.
+/// Errors: platform::kInstallerErrorDomain, each saying which entry and what to do; "POSIX" where the system failed.
 /// Threads: one at a time; any number of readers side by side.
 class PackageReader {
  public:

@@ -60,7 +60,7 @@ Status appendLayout(Database& database, IconOrder& icons) {
 }
 
 void appendApps(platform::AppRegistry& registry, IconOrder& icons) {
-  registry.enumerateBundlesOfType(platform::BundleKind::All, [&](const platform::BundleRecord& bundle, bool&) {
+  registry.enumerateBundlesOfType(platform::BundleKind::all, [&](const platform::BundleRecord& bundle, bool&) {
     if (bundle.asAppRecord() != nullptr) icons.append(bundle.applicationIdentifier());
   });
 }

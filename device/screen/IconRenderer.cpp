@@ -40,7 +40,7 @@ void addRoundedRectangle(cairo_t* context, double width, double height, double c
 }
 
 std::optional<std::string> iconPathIn(const platform::Bundle& bundle) {
-  return namedFileIn(bundle.location().path, bundle.infoDictionaryValue(platform::BundleIconFileKey));
+  return namedFileIn(bundle.location().path, bundle.infoDictionaryValue(platform::kBundleIconFileKey));
 }
 
 std::unique_ptr<platform::Image> IconRenderer::createHomeScreenIconImage(const platform::Bundle& bundle) {

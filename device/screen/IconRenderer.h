@@ -22,7 +22,7 @@ class IconRenderer final : public platform::IconRenderer {
   /// `fileSystem` must outlive the renderer.
   explicit IconRenderer(platform::FileSystem& fileSystem) : fileSystem_(fileSystem) {}
 
-  /// The PNG file that the bundle's info dictionary names under `BundleIconFileKey`, a path inside the bundle. The
+  /// The PNG file that the bundle's info dictionary names under `kBundleIconFileKey`, a path inside the bundle. The
   /// picture fills the square; what stands over on its longer side is cut off.
   [[nodiscard]] std::unique_ptr<platform::Image> createHomeScreenIconImage(const platform::Bundle& bundle) override;
 

@@ -124,7 +124,7 @@ double fractionOf(const platform::InstallProgress* progress) {
 }
 
 std::string nameOf(const platform::AppRecord& app, const platform::Bundle* bundle) {
-  const plist::Value* name = bundle == nullptr ? nullptr : bundle->infoDictionaryValue(platform::BundleDisplayNameKey);
+  const plist::Value* name = bundle == nullptr ? nullptr : bundle->infoDictionaryValue(platform::kBundleDisplayNameKey);
   const auto text = stringIn(name);
   return text && !text->empty() ? std::string(*text) : app.applicationIdentifier();
 }

@@ -28,12 +28,12 @@ plist::Dictionary AppRegistryContract::options(std::string_view packageType, std
 }
 
 Status AppRegistryContract::tryInstall(const FileLocation& package, std::string_view identifier) {
-  return registry().installApplication(package, options(platform::PackageTypeCustomer, identifier));
+  return registry().installApplication(package, options(platform::kPackageTypeCustomer, identifier));
 }
 
 Status AppRegistryContract::tryPlaceholder(const FileLocation& folder, std::string_view identifier) {
   plist::Dictionary withType = options(platform::PackageTypePlaceholder, identifier);
-  withType.set(platform::InstallTypeKey, static_cast<std::uint64_t>(TSInstallType::Sync));
+  withType.set(platform::kInstallTypeKey, static_cast<std::uint64_t>(TSInstallType::Sync));
   return registry().installApplication(folder, withType);
 }
 
@@ -122,7 +122,7 @@ TEST_P(AppRegistryContract, ARecordDescribesTheApp) {
   EXPECT_EQ(found->applicationIdentifier(), "com.a");
   EXPECT_EQ(found->bundleIdentifier(), "com.a");
   EXPECT_EQ(found->bundleVersion(), "1.2.3");
-  EXPECT_EQ(found->applicationType(), platform::ApplicationTypeUser);
+  EXPECT_EQ(found->applicationType(), platform::kApplicationTypeUser);
   EXPECT_EQ(found->asAppRecord(), found.get());
   EXPECT_FALSE(found->description().empty());
   ASSERT_TRUE(found->bundlePath());
@@ -162,27 +162,27 @@ TEST_P(AppRegistryContract, AWalkMeetsEveryUserBundle) {
   placeholder("com.placeholder");
   install("com.both");
   placeholder("com.both", "2.0");
-  for (const BundleKind kind : {BundleKind::All, BundleKind::User}) {
+  for (const BundleKind kind : {BundleKind::all, BundleKind::user}) {
     Identifiers met = walk(kind);
     std::ranges::sort(met);
     EXPECT_EQ(met, (Identifiers{"com.app", "com.both", "com.placeholder"}));
   }
-  EXPECT_EQ(walk(BundleKind::System), Identifiers());
+  EXPECT_EQ(walk(BundleKind::system), Identifiers());
 }
 
 TEST_P(AppRegistryContract, AWalkOfTheSystemsBundlesMeetsThemAlone) {
   install("com.user");
   if (!subject().addSystemApp("com.system")) GTEST_SKIP() << "no system apps";
-  EXPECT_EQ(walk(BundleKind::System), Identifiers{"com.system"});
-  EXPECT_EQ(walk(BundleKind::User), Identifiers{"com.user"});
-  EXPECT_EQ(walk(BundleKind::All).size(), 2U);
+  EXPECT_EQ(walk(BundleKind::system), Identifiers{"com.system"});
+  EXPECT_EQ(walk(BundleKind::user), Identifiers{"com.user"});
+  EXPECT_EQ(walk(BundleKind::all).size(), 2U);
 }
 
 TEST_P(AppRegistryContract, AWalkMeetsBundlesThatAreNoAppsToo) {
   install("com.app");
   if (!subject().addExtension("com.app.extension")) GTEST_SKIP() << "nothing but apps";
   Identifiers met;
-  registry().enumerateBundlesOfType(BundleKind::All, [&](const BundleRecord& bundle, bool&) {
+  registry().enumerateBundlesOfType(BundleKind::all, [&](const BundleRecord& bundle, bool&) {
     met.push_back(bundle.applicationIdentifier());
     EXPECT_EQ(bundle.asAppRecord() != nullptr, met.back() == "com.app") << met.back();
     EXPECT_FALSE(bundle.description().empty());
@@ -194,13 +194,13 @@ TEST_P(AppRegistryContract, AWalkMeetsBundlesThatAreNoAppsToo) {
 TEST_P(AppRegistryContract, TwoWalksMeetBundlesInOneOrder) {
   for (const char* identifier : {"com.c", "com.a", "com.b"})
     install(identifier);
-  EXPECT_EQ(walk(BundleKind::All), walk(BundleKind::All));
+  EXPECT_EQ(walk(BundleKind::all), walk(BundleKind::all));
 }
 
 TEST_P(AppRegistryContract, AWalkVisitsWithWholeRecords) {
   install("com.app", "1.5");
   placeholder("com.placeholder");
-  registry().enumerateBundlesOfType(BundleKind::User, [](const BundleRecord& bundle, bool&) {
+  registry().enumerateBundlesOfType(BundleKind::user, [](const BundleRecord& bundle, bool&) {
     const AppRecord* app = bundle.asAppRecord();
     ASSERT_NE(app, nullptr);
     const bool isApp = bundle.applicationIdentifier() == "com.app";
@@ -214,13 +214,13 @@ TEST_P(AppRegistryContract, AWalkEndsWhenItIsTold) {
   for (const char* identifier : {"com.a", "com.b", "com.c"})
     install(identifier);
   int visits = 0;
-  registry().enumerateBundlesOfType(BundleKind::All, [&](const BundleRecord&, bool& stop) { stop = ++visits == 2; });
+  registry().enumerateBundlesOfType(BundleKind::all, [&](const BundleRecord&, bool& stop) { stop = ++visits == 2; });
   EXPECT_EQ(visits, 2);
 }
 
 TEST_P(AppRegistryContract, AWalkVisitsOnTheCallersThread) {
   install("com.a");
-  registry().enumerateBundlesOfType(BundleKind::All, [caller = std::this_thread::get_id()](const BundleRecord&, bool&) {
+  registry().enumerateBundlesOfType(BundleKind::all, [caller = std::this_thread::get_id()](const BundleRecord&, bool&) {
     EXPECT_EQ(std::this_thread::get_id(), caller);
   });
 }
@@ -229,7 +229,7 @@ TEST_P(AppRegistryContract, AWalkSeesTheRegistryAsItWasWhenItBegan) {
   for (const char* identifier : {"com.a", "com.b", "com.c"})
     install(identifier);
   Identifiers met;
-  registry().enumerateBundlesOfType(BundleKind::All, [&](const BundleRecord& bundle, bool&) {
+  registry().enumerateBundlesOfType(BundleKind::all, [&](const BundleRecord& bundle, bool&) {
     if (met.empty()) {
       install("com.d");
       for (const char* identifier : {"com.a", "com.b", "com.c"}) {
@@ -240,7 +240,7 @@ TEST_P(AppRegistryContract, AWalkSeesTheRegistryAsItWasWhenItBegan) {
   });
   std::ranges::sort(met);
   EXPECT_EQ(met, (Identifiers{"com.a", "com.b", "com.c"}));
-  EXPECT_EQ(walk(BundleKind::All), Identifiers{"com.d"});
+  EXPECT_EQ(walk(BundleKind::all), Identifiers{"com.d"});
 }
 
 }  // namespace appsync::test

@@ -17,13 +17,13 @@ namespace {
 using Identifiers = std::vector<std::string>;
 
 const plist::Dictionary& placeholdersOnly() {
-  static const plist::Dictionary options{{platform::UninstallPlaceholdersOnlyKey, true}};
+  static const plist::Dictionary options{{platform::kUninstallPlaceholdersOnlyKey, true}};
   return options;
 }
 
 bool isInstallersError(const Status& status) {
   return !status &&
-         (status.error().domain == platform::InstallerErrorDomain || status.error().domain == domains::kPOSIX);
+         (status.error().domain == platform::kInstallerErrorDomain || status.error().domain == domains::kPOSIX);
 }
 
 }  // namespace
@@ -37,7 +37,7 @@ TEST_P(AppRegistryContract, ALaterPackageTakesTheEarliersPlace) {
   install("com.a", "1.0");
   install("com.a", "2.0");
   EXPECT_EQ(versionOf("com.a"), "2.0");
-  EXPECT_EQ(walk(BundleKind::All), Identifiers{"com.a"});
+  EXPECT_EQ(walk(BundleKind::all), Identifiers{"com.a"});
   EXPECT_TRUE(subject().isUsable(*record("com.a")->bundlePath()));
 }
 
@@ -74,15 +74,15 @@ TEST_P(AppRegistryContract, APackageTakesThePlaceOfAppAndPlaceholder) {
 
 TEST_P(AppRegistryContract, TheInstallTypeIsKept) {
   plist::Dictionary restoring = options(platform::PackageTypePlaceholder, "com.a");
-  restoring.set(platform::InstallTypeKey, static_cast<std::uint64_t>(TSInstallType::Restore));
+  restoring.set(platform::kInstallTypeKey, static_cast<std::uint64_t>(TSInstallType::Restore));
   ASSERT_TRUE(registry().installApplication(subject().makePlaceholderFolder("com.a", "1.0"), restoring).ok());
   EXPECT_EQ(record("com.a")->installType(), TSInstallType::Restore);
 }
 
 TEST_P(AppRegistryContract, ARestoredAppsStoreMetadataAndLicenceAreKept) {
-  plist::Dictionary restored = options(platform::PackageTypeCustomer, "com.a");
-  restored.set(platform::StoreMetadataKey, plist::Value::data(bytesOf("metadata")));
-  restored.set(platform::LicenceDataKey, plist::Value::data(bytesOf("licence")));
+  plist::Dictionary restored = options(platform::kPackageTypeCustomer, "com.a");
+  restored.set(platform::kStoreMetadataKey, plist::Value::data(bytesOf("metadata")));
+  restored.set(platform::kLicenceDataKey, plist::Value::data(bytesOf("licence")));
   ASSERT_TRUE(registry().installApplication(subject().makePackage("com.a", "1.0"), restored).ok());
   const std::optional<std::string> metadata = subject().storeMetadataOf("com.a");
   const std::optional<std::string> licence = subject().licenceDataOf("com.a");
@@ -94,8 +94,8 @@ TEST_P(AppRegistryContract, ARestoredAppsStoreMetadataAndLicenceAreKept) {
 TEST_P(AppRegistryContract, ALicenceThatIsBoundToTheDeviceIsToldSo) {
   const std::optional<std::string> licence = subject().deviceBoundLicence();
   if (!licence) GTEST_SKIP() << "no licences for one device";
-  plist::Dictionary restored = options(platform::PackageTypeCustomer, "com.a");
-  restored.set(platform::LicenceDataKey, plist::Value::data(bytesOf(*licence)));
+  plist::Dictionary restored = options(platform::kPackageTypeCustomer, "com.a");
+  restored.set(platform::kLicenceDataKey, plist::Value::data(bytesOf(*licence)));
   ASSERT_TRUE(registry().installApplication(subject().makePackage("com.a", "1.0"), restored).ok());
   install("com.b");
   EXPECT_TRUE(record("com.a")->hasMIDBasedSINF());
@@ -104,8 +104,8 @@ TEST_P(AppRegistryContract, ALicenceThatIsBoundToTheDeviceIsToldSo) {
 
 TEST_P(AppRegistryContract, ANullForMetadataOrLicenceIsAsNone) {
   plist::Dictionary restored = options(platform::PackageTypePlaceholder, "com.a");
-  restored.set(platform::StoreMetadataKey, nullptr);
-  restored.set(platform::LicenceDataKey, nullptr);
+  restored.set(platform::kStoreMetadataKey, nullptr);
+  restored.set(platform::kLicenceDataKey, nullptr);
   ASSERT_TRUE(registry().installApplication(subject().makePlaceholderFolder("com.a", "1.0"), restored).ok());
   EXPECT_FALSE(record("com.a")->hasMIDBasedSINF());
 }
@@ -133,12 +133,12 @@ TEST_P(AppRegistryContract, TheLocationIsNeededDuringTheCallOnly) {
 
 TEST_P(AppRegistryContract, APackageOfAnotherAppFails) {
   EXPECT_TRUE(isInstallersError(tryInstall(subject().makePackage("com.other", "1.0"), "com.a")));
-  EXPECT_EQ(walk(BundleKind::All), Identifiers());
+  EXPECT_EQ(walk(BundleKind::all), Identifiers());
 }
 
 TEST_P(AppRegistryContract, APlaceholderOfAnotherAppFails) {
   EXPECT_TRUE(isInstallersError(tryPlaceholder(subject().makePlaceholderFolder("com.other", "1.0"), "com.a")));
-  EXPECT_EQ(walk(BundleKind::All), Identifiers());
+  EXPECT_EQ(walk(BundleKind::all), Identifiers());
 }
 
 TEST_P(AppRegistryContract, AMissingPackageFails) {
@@ -174,7 +174,7 @@ TEST_P(AppRegistryContract, TenAppsMayBeInstalledAtOnce) {
   runOnThreads(kApps, [&](std::size_t index) {
     EXPECT_TRUE(tryInstall(packages[index], "com.a" + std::to_string(index)).ok());
   });
-  EXPECT_EQ(walk(BundleKind::User).size(), kApps);
+  EXPECT_EQ(walk(BundleKind::user).size(), kApps);
 }
 
 TEST_P(AppRegistryContract, OneAppMayBeInstalledByManyAtOnce) {
@@ -184,7 +184,7 @@ TEST_P(AppRegistryContract, OneAppMayBeInstalledByManyAtOnce) {
     packages.push_back(subject().makePackage("com.a", std::to_string(index)));
   }
   runOnThreads(kThreads, [&](std::size_t index) { EXPECT_TRUE(tryInstall(packages[index], "com.a").ok()); });
-  EXPECT_EQ(walk(BundleKind::User), Identifiers{"com.a"});
+  EXPECT_EQ(walk(BundleKind::user), Identifiers{"com.a"});
   EXPECT_EQ(stateOf("com.a"), "installed");
   EXPECT_TRUE(subject().isUsable(*record("com.a")->bundlePath()));
 }
@@ -269,7 +269,7 @@ TEST_P(AppRegistryContract, RemovingPlaceholdersOnlyNeverRemovesAnApp) {
 
 TEST_P(AppRegistryContract, RemovingNotOnlyPlaceholdersRemovesTheApp) {
   install("com.a");
-  EXPECT_TRUE(registry().uninstallApplication("com.a", {{platform::UninstallPlaceholdersOnlyKey, false}}).ok());
+  EXPECT_TRUE(registry().uninstallApplication("com.a", {{platform::kUninstallPlaceholdersOnlyKey, false}}).ok());
   EXPECT_EQ(stateOf("com.a"), "absent");
 }
 

@@ -21,23 +21,23 @@ constexpr long kRefused = 2;
 
 /// The install options of the registry that say what the coordinator was told.
 plist::Dictionary installerOptions(const FakeCoordinator& coordinator) {
-  plist::Dictionary options{{platform::PackageTypeKey, platform::PackageTypeCustomer},
+  plist::Dictionary options{{platform::PackageTypeKey, platform::kPackageTypeCustomer},
                             {platform::BundleIdentifierKey, coordinator.identifier}};
   platform::TSInstallType type = platform::TSInstallType::None;
   std::optional<platform::StoreMetadata> metadata;
   if (coordinator.placeholder) {
     type = coordinator.placeholder->installType;
     metadata = coordinator.placeholder->metadata.value_or(std::nullopt);
-    if (coordinator.placeholder->sinfData) options.set(platform::LicenceDataKey, *coordinator.placeholder->sinfData);
+    if (coordinator.placeholder->sinfData) options.set(platform::kLicenceDataKey, *coordinator.placeholder->sinfData);
   }
   if (coordinator.options) {
     type = coordinator.options->installType();
     if (coordinator.options->storeMetadata()) metadata = coordinator.options->storeMetadata();
   }
-  options.set(platform::InstallTypeKey, static_cast<std::uint64_t>(type));
+  options.set(platform::kInstallTypeKey, static_cast<std::uint64_t>(type));
   if (!metadata) return options;
   if (Result<Bytes> bytes = plist::writeBinary(metadata->dictionary())) {
-    options.set(platform::StoreMetadataKey, *std::move(bytes));
+    options.set(platform::kStoreMetadataKey, *std::move(bytes));
   }
   return options;
 }

@@ -21,7 +21,7 @@ FakeApp::FakeApp(std::string appIdentifier)
       version("1.0"),
       containerPath("/var/mobile/Containers/Bundle/" + identifier),
       bundlePath(*containerPath + "/" + identifier + ".app"),
-      applicationType(platform::ApplicationTypeUser) {}
+      applicationType(platform::kApplicationTypeUser) {}
 
 FakeApp FakeApp::installed(std::string identifier) {
   return changed(FakeApp(std::move(identifier)), [](FakeApp& app) { app.isInstalled = true; });

@@ -15,7 +15,7 @@
 namespace appsync::test {
 
 /// One app of the registry. Made by what it is, then adapted:
-/// `FakeApp::placeholder("com.a").ofType(ApplicationTypeSystem).withVersion("2")`.
+/// `FakeApp::placeholder("com.a").ofType(kApplicationTypeSystem).withVersion("2")`.
 struct FakeApp {
   std::string identifier;
   std::optional<std::string> bundleIdentifier;

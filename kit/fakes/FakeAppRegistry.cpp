@@ -17,13 +17,13 @@ namespace {
 
 /// Whether a walk of kind `walked` meets a bundle of kind `kind`.
 bool meets(BundleKind walked, BundleKind kind) {
-  return walked == BundleKind::All || walked == kind;
+  return walked == BundleKind::all || walked == kind;
 }
 
 BundleKind kindOf(const FakeApp& app) {
   if (app.kind) return *app.kind;
-  if (app.applicationType == platform::ApplicationTypeUser) return BundleKind::User;
-  return app.applicationType == platform::ApplicationTypeSystem ? BundleKind::System : BundleKind::All;
+  if (app.applicationType == platform::kApplicationTypeUser) return BundleKind::user;
+  return app.applicationType == platform::kApplicationTypeSystem ? BundleKind::system : BundleKind::all;
 }
 
 bool isTrue(const plist::Dictionary& options, std::string_view key) {
@@ -212,7 +212,7 @@ Status FakeAppRegistry::install(const platform::FileLocation& location, const pl
 
 void FakeAppRegistry::showPlaceholder(const std::string& identifier, platform::TSInstallType type) {
   apply(identifier, {PackageKind::placeholder, std::nullopt, 0},
-        {{platform::InstallTypeKey, static_cast<std::uint64_t>(type)}});
+        {{platform::kInstallTypeKey, static_cast<std::uint64_t>(type)}});
 }
 
 void FakeAppRegistry::apply(const std::string& identifier, const FakePackage& package,
@@ -229,7 +229,7 @@ void FakeAppRegistry::apply(const std::string& identifier, const FakePackage& pa
 }
 
 Status FakeAppRegistry::uninstallApplication(std::string_view bundleIdentifier, const plist::Dictionary& options) {
-  const bool placeholdersOnly = isTrue(options, platform::UninstallPlaceholdersOnlyKey);
+  const bool placeholdersOnly = isTrue(options, platform::kUninstallPlaceholdersOnlyKey);
   const std::string arguments = std::string(bundleIdentifier) + (placeholdersOnly ? " placeholder only" : "");
   if (auto failure = journal_.beforeCall("registry.uninstallApplication", arguments)) return *std::move(failure);
   {
@@ -247,7 +247,7 @@ void FakeAppRegistry::removePlaceholder(std::string_view identifier) {
 
 Status FakeAppRegistry::uninstall(std::string_view identifier, const plist::Dictionary& options) {
   if (auto failure = failures.take(RegistryOperation::uninstallApplication, identifier)) return *std::move(failure);
-  const bool placeholdersOnly = isTrue(options, platform::UninstallPlaceholdersOnlyKey);
+  const bool placeholdersOnly = isTrue(options, platform::kUninstallPlaceholdersOnlyKey);
   const std::scoped_lock lock(mutex_);
   const auto found = apps_.find(identifier);
   if (found == apps_.end()) return installerError("no such app: " + std::string(identifier));

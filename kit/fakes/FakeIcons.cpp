@@ -56,7 +56,7 @@ class FakePNGEncoder final : public platform::PNGEncoder {
 std::unique_ptr<platform::Image> FakeIconRenderer::createHomeScreenIconImage(const platform::Bundle& bundle) {
   const std::string& folder = bundle.location().path;
   if (journal_.beforeCall("iconRenderer.createHomeScreenIconImage", folder)) return nullptr;
-  const auto name = stringIn(bundle.infoDictionaryValue(platform::BundleIconFileKey));
+  const auto name = stringIn(bundle.infoDictionaryValue(platform::kBundleIconFileKey));
   if (!name) return nullptr;
   const std::optional<std::string> icon = files_.text(folder + "/" + std::string(*name));
   if (!icon || icon->empty()) return nullptr;

@@ -14,7 +14,7 @@ constexpr long kInstallerFailure = 1;
 
 std::optional<PackageKind> kindIn(const plist::Dictionary& options) {
   const std::optional<std::string> word = ownedStringIn(options.find(platform::PackageTypeKey));
-  if (word == platform::PackageTypeCustomer) return PackageKind::app;
+  if (word == platform::kPackageTypeCustomer) return PackageKind::app;
   if (word == platform::PackageTypePlaceholder) return PackageKind::placeholder;
   return std::nullopt;
 }
@@ -22,12 +22,12 @@ std::optional<PackageKind> kindIn(const plist::Dictionary& options) {
 }  // namespace
 
 Bytes packageOf(std::string_view identifier, std::string_view version) {
-  const plist::Dictionary content{{platform::BundleIdentifierKey, identifier}, {platform::BundleVersionKey, version}};
+  const plist::Dictionary content{{platform::BundleIdentifierKey, identifier}, {platform::kBundleVersionKey, version}};
   return plist::writeBinary(content).value();
 }
 
 Error installerError(std::string text) {
-  return {std::string(platform::InstallerErrorDomain), kInstallerFailure, std::move(text), nullptr};
+  return {std::string(platform::kInstallerErrorDomain), kInstallerFailure, std::move(text), nullptr};
 }
 
 std::string identifierIn(const plist::Dictionary& options) {
@@ -48,7 +48,8 @@ Result<FakePackage> readPackage(FakeFileSystem& files, const platform::FileLocat
   if (isPlaceholder ? named != identifier : named && named != identifier) {
     return installerError(location.path + " does not hold " + identifier);
   }
-  return FakePackage{*kind, info ? ownedStringIn(info->find(platform::BundleVersionKey)) : std::nullopt, bytes->size()};
+  return FakePackage{*kind, info ? ownedStringIn(info->find(platform::kBundleVersionKey)) : std::nullopt,
+                     bytes->size()};
 }
 
 void applyPackage(FakeApp& app, const FakePackage& package, const plist::Dictionary& options) {
@@ -56,7 +57,7 @@ void applyPackage(FakeApp& app, const FakePackage& package, const plist::Diction
   if (package.version && !leavesTheApp) app.version = package.version;
   if (!leavesTheApp) app.staticDiskUsage = package.size;
   app.installOptions = options;
-  const plist::Value* type = options.find(platform::InstallTypeKey);
+  const plist::Value* type = options.find(platform::kInstallTypeKey);
   const std::optional<std::uint64_t> number = type == nullptr ? std::nullopt : type->uint64();
   if (number) app.installType = static_cast<TSInstallType>(*number);
   app.isPlaceholder = package.kind == PackageKind::placeholder;

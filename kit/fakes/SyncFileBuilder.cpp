@@ -54,10 +54,10 @@ void putAppFolder(FakeFileSystem& files, std::string_view folder, std::string_vi
   const std::string path(folder);
   putPropertyList(files, path + "/Info.plist",
                   plist::Dictionary{{platform::BundleIdentifierKey, identifier},
-                                    {platform::BundleVersionKey, "1.0"},
-                                    {platform::BundleDisplayNameKey, displayName},
-                                    {platform::BundleExecutableKey, displayName},
-                                    {platform::BundleIconFileKey, "Icon.png"}});
+                                    {platform::kBundleVersionKey, "1.0"},
+                                    {platform::kBundleDisplayNameKey, displayName},
+                                    {platform::kBundleExecutableKey, displayName},
+                                    {platform::kBundleIconFileKey, "Icon.png"}});
   files.put(path + "/Icon.png", "icon of " + std::string(identifier));
 }
 

@@ -66,8 +66,8 @@ TEST_P(HostileLibrary, AnInfoListInBadUTF8IsRefused) {
 
 TEST_P(HostileLibrary, AnEscapeSequenceInANameNeverReachesTheTerminal) {
   publishInfo("app.zip", {{platform::BundleIdentifierKey, "org.a"},
-                          {platform::BundleVersionKey, "1\x1b[2J"},
-                          {platform::BundleDisplayNameKey, "\x1b]0;owned\x07\n"}});
+                          {platform::kBundleVersionKey, "1\x1b[2J"},
+                          {platform::kBundleDisplayNameKey, "\x1b]0;owned\x07\n"}});
   const Finished run = sync();
   EXPECT_EQ(run.status, 0);
   EXPECT_THAT(run.out, Not(HasSubstr("\x1b")));
@@ -85,8 +85,8 @@ TEST_P(HostileLibrary, AFileNameWithAnEscapeSequenceIsShownSafely) {
 
 TEST_P(HostileLibrary, AnIconOutsideTheAppStagesNothingElsewhere) {
   publishInfo("app.zip", {{platform::BundleIdentifierKey, "org.a"},
-                          {platform::BundleVersionKey, "1.0"},
-                          {platform::BundleIconFileKey, "../../../../../Library/ApplicationSync/RestoreState.plist"}});
+                          {platform::kBundleVersionKey, "1.0"},
+                          {platform::kBundleIconFileKey, "../../../../../Library/ApplicationSync/RestoreState.plist"}});
   EXPECT_EQ(sync().status, 0);
   EXPECT_FALSE(std::filesystem::exists(device() + "/root/var/mobile/Library/ApplicationSync/RestoreState.plist"));
 }

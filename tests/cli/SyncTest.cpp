@@ -29,7 +29,7 @@ class Sync : public ToolFixtureOfEachMode {
     const plist::Dictionary options{
         {platform::PackageTypeKey, platform::PackageTypePlaceholder},
         {platform::BundleIdentifierKey, identifier},
-        {platform::InstallTypeKey, static_cast<std::uint64_t>(platform::TSInstallType::Restore)}};
+        {platform::kInstallTypeKey, static_cast<std::uint64_t>(platform::TSInstallType::Restore)}};
     ASSERT_TRUE((*opened)->platform().defaultRegistry().installApplication({folder, true}, options).ok());
   }
   [[nodiscard]] plist::Dictionary removedApps() const {

@@ -85,18 +85,18 @@ class FakeRegistrySubject final : public AppRegistrySubject {
     platform_.registry.setInstallOrder({"com.first"});
   }
   bool addExtension(std::string_view identifier) override {
-    platform_.registry.addBundle(std::string(identifier), platform::BundleKind::User);
+    platform_.registry.addBundle(std::string(identifier), platform::BundleKind::user);
     return true;
   }
   bool addSystemApp(std::string_view identifier) override {
-    platform_.registry.add(FakeApp::installed(std::string(identifier)).ofType(platform::ApplicationTypeSystem));
+    platform_.registry.add(FakeApp::installed(std::string(identifier)).ofType(platform::kApplicationTypeSystem));
     return true;
   }
   std::optional<std::string> storeMetadataOf(std::string_view identifier) override {
-    return optionOf(identifier, platform::StoreMetadataKey);
+    return optionOf(identifier, platform::kStoreMetadataKey);
   }
   std::optional<std::string> licenceDataOf(std::string_view identifier) override {
-    return optionOf(identifier, platform::LicenceDataKey);
+    return optionOf(identifier, platform::kLicenceDataKey);
   }
 
  private:
@@ -275,7 +275,7 @@ class FakeCoordinatedInstalls final : public CoordinatedInstallSubject {
   void waitUntilIdle() override { platform_.coordination.waitUntilIdle(); }
   std::optional<plist::Dictionary> storeMetadataOf(std::string_view identifier) override {
     const FakeApp app = *platform_.registry.app(identifier);
-    const plist::Value* kept = app.installOptions.find(platform::StoreMetadataKey);
+    const plist::Value* kept = app.installOptions.find(platform::kStoreMetadataKey);
     if (kept == nullptr || !kept->data()) return plist::Dictionary();
     return *plist::read(*kept->data()).value().dictionary();
   }

@@ -80,7 +80,7 @@ void WholeSync::restartDevice() {
     const auto app = platform.registry.app(identifier);
     if (!app->isPlaceholder || app->installType != TSInstallType::Sync) continue;
     EXPECT_TRUE(
-        platform.registry.uninstallApplication(identifier, {{platform::UninstallPlaceholdersOnlyKey, true}}).ok());
+        platform.registry.uninstallApplication(identifier, {{platform::kUninstallPlaceholdersOnlyKey, true}}).ok());
   }
 }
 

@@ -30,7 +30,7 @@ class DeviceSyncTest : public testing::TestWithParam<device::InstallMode> {
   [[nodiscard]] std::map<std::string, Seen> appsOnDevice() {
     std::map<std::string, Seen> apps;
     device.registry().enumerateBundlesOfType(
-        platform::BundleKind::All, [&](const platform::BundleRecord& bundle, bool&) {
+        platform::BundleKind::all, [&](const platform::BundleRecord& bundle, bool&) {
           const platform::AppRecord* app = bundle.asAppRecord();
           if (app == nullptr) return;
           apps[app->applicationIdentifier()] = {app->bundleVersion().value_or(""), app->isInstalled(),

@@ -45,7 +45,7 @@ class FakeAppRegistryTest : public testing::Test {
     platform.files.put("/packages/" + identifier, "package");
     return platform.registry.installApplication(
         {"/packages/" + identifier, false},
-        {{platform::PackageTypeKey, platform::PackageTypeCustomer}, {platform::BundleIdentifierKey, identifier}});
+        {{platform::PackageTypeKey, platform::kPackageTypeCustomer}, {platform::BundleIdentifierKey, identifier}});
   }
 
   FakePlatform platform;
@@ -150,8 +150,8 @@ TEST_F(FakeAppRegistryTest, ACancelledInstallIsReportedAfterItsStateChanged) {
 
 TEST_F(FakeAppRegistryTest, BundlesThatAreNoAppsAreWalkedByTheirKind) {
   platform.registry.add(FakeApp::installed("com.app"));
-  platform.registry.addBundle("com.app", BundleKind::User);
-  platform.registry.addBundle("com.extension", BundleKind::System);
+  platform.registry.addBundle("com.app", BundleKind::user);
+  platform.registry.addBundle("com.extension", BundleKind::system);
   const auto walk = [&](BundleKind kind) {
     Lines met;
     platform.registry.enumerateBundlesOfType(kind, [&](const platform::BundleRecord& bundle, bool&) {
@@ -159,9 +159,9 @@ TEST_F(FakeAppRegistryTest, BundlesThatAreNoAppsAreWalkedByTheirKind) {
     });
     return met;
   };
-  EXPECT_EQ(walk(BundleKind::All), (Lines{"app com.app", "other com.app", "other com.extension"}));
-  EXPECT_EQ(walk(BundleKind::User), (Lines{"app com.app", "other com.app"}));
-  EXPECT_EQ(walk(BundleKind::System), Lines{"other com.extension"});
+  EXPECT_EQ(walk(BundleKind::all), (Lines{"app com.app", "other com.app", "other com.extension"}));
+  EXPECT_EQ(walk(BundleKind::user), (Lines{"app com.app", "other com.app"}));
+  EXPECT_EQ(walk(BundleKind::system), Lines{"other com.extension"});
 }
 
 TEST_F(FakeAppRegistryTest, EveryOperationFailsWhenTheJournalSaysSo) {
@@ -171,7 +171,7 @@ TEST_F(FakeAppRegistryTest, EveryOperationFailsWhenTheJournalSaysSo) {
   platform.journal.setHook([](std::string_view, std::string_view) -> std::optional<Error> { return kFailure; });
   EXPECT_FALSE(platform.registry.applicationIsInstalled("com.a"));
   EXPECT_EQ(platform.registry.recordForIdentifier("com.a", platform::PlaceholderLookup::on), nullptr);
-  platform.registry.enumerateBundlesOfType(BundleKind::All, [](const platform::BundleRecord&, bool&) { FAIL(); });
+  platform.registry.enumerateBundlesOfType(BundleKind::all, [](const platform::BundleRecord&, bool&) { FAIL(); });
   EXPECT_EQ(install("com.a").failure(), kFailure);
   EXPECT_EQ(platform.registry.uninstallApplication("com.a").failure(), kFailure);
   EXPECT_EQ(platform.registry.installProgressForApplication(*record, TSInstallPhase::Loading), nullptr);

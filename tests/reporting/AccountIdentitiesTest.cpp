@@ -182,14 +182,14 @@ TEST_F(AccountIdentities, AnyNumberIsAPersonIdentifier) {
 // Both.
 
 TEST_F(AccountIdentities, ABundleThatIsNoAppIsPassedOver) {
-  platform.registry.addBundle("com.extension", platform::BundleKind::User);
+  platform.registry.addBundle("com.extension", platform::BundleKind::user);
   EXPECT_EQ(identifiers(), Identifiers{});
   EXPECT_EQ(accounts(), ZTAccountInfos{});
   EXPECT_EQ(platform.log.lines().size(), 4U);
 }
 
 TEST_F(AccountIdentities, EveryRecordOfTheWalkIsLookedAtWhateverItsType) {
-  platform.registry.add(FakeApp::placeholder("com.a").ofType("Internal").metByWalksOf(platform::BundleKind::User));
+  platform.registry.add(FakeApp::placeholder("com.a").ofType("Internal").metByWalksOf(platform::BundleKind::user));
   putPropertyList(platform.files, pathOf("com.a"), plist::Dictionary{{"corvelId", "x"}});
   EXPECT_EQ(identifiers(), Identifiers{"x"});
   EXPECT_EQ(accounts(), ZTAccountInfos{account("x")});

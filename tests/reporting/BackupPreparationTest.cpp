@@ -108,7 +108,7 @@ TEST_F(BackupPreparation, AFileThatIsMissingOrUnreadableIsPassedOver) {
 }
 
 TEST_F(BackupPreparation, ABundleThatIsNoAppAndAnAppWithoutAContainerArePassedOver) {
-  platform.registry.addBundle("com.extension", platform::BundleKind::User);
+  platform.registry.addBundle("com.extension", platform::BundleKind::user);
   platform.registry.add(FakeApp::installed("com.b").withContainerPath(std::nullopt).withMIDBasedSINF());
   prepare();
   EXPECT_EQ(platform.journal.count("fileSystem."), 0U);
@@ -117,7 +117,7 @@ TEST_F(BackupPreparation, ABundleThatIsNoAppAndAnAppWithoutAContainerArePassedOv
 
 TEST_F(BackupPreparation, ASystemAppIsNotVisited) {
   putPropertyList(platform.files, kMetadata, plist::Dictionary{{"is-auto-download", true}});
-  platform.registry.add(FakeApp::installed("com.a").ofType(platform::ApplicationTypeSystem));
+  platform.registry.add(FakeApp::installed("com.a").ofType(platform::kApplicationTypeSystem));
   prepare();
   EXPECT_FALSE(wasRewritten());
 }

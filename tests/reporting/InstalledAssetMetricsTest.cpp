@@ -17,7 +17,7 @@ class InstalledAssetMetrics : public ClientFixture {
   void add(std::string identifier, std::string_view type, std::uint64_t bytes) {
     platform.registry.add(FakeApp::installed(std::move(identifier))
                               .ofType(type)
-                              .metByWalksOf(BundleKind::User)
+                              .metByWalksOf(BundleKind::user)
                               .withStaticDiskUsage(bytes));
   }
   [[nodiscard]] static plist::Dictionary metrics(std::uint64_t count, std::uint64_t bytes) {
@@ -72,7 +72,7 @@ TEST_F(InstalledAssetMetrics, APlaceholderIsAnAppOfItsUser) {
 }
 
 TEST_F(InstalledAssetMetrics, ABundleThatIsNoAppDoesNotCount) {
-  platform.registry.addBundle("com.extension", BundleKind::User);
+  platform.registry.addBundle("com.extension", BundleKind::user);
   EXPECT_EQ(makeClient().installedAssetMetrics(), metrics(0, 0));
 }
 

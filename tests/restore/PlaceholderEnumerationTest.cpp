@@ -13,8 +13,8 @@ namespace appsync::test {
 
 namespace {
 
-using platform::ApplicationTypeSystem;
 using platform::BundleKind;
+using platform::kApplicationTypeSystem;
 
 class PlaceholderExists : public ClientFixture {};
 
@@ -72,8 +72,8 @@ TEST_F(PlaceholderExists, WithInstallCoordinationTheAnswerIsNoWithoutAskingTheRe
 
 TEST_F(PlaceholderExists, TheWalkStopsAtTheFirstOfTwoBundlesWithOneIdentifier) {
   AppsClient& client = makeClient();
-  platform.registry.addBundle("com.a", BundleKind::User);
-  platform.registry.addBundle("com.a", BundleKind::User);
+  platform.registry.addBundle("com.a", BundleKind::user);
+  platform.registry.addBundle("com.a", BundleKind::user);
   EXPECT_TRUE(client._placeholderExistsForApplication("com.a"));
   EXPECT_TRUE(sameLines(LogLines{logged("Found placeholder for bundle com.a")}, platform.log.lines()));
 }
@@ -81,15 +81,15 @@ TEST_F(PlaceholderExists, TheWalkStopsAtTheFirstOfTwoBundlesWithOneIdentifier) {
 TEST_F(PlaceholderExists, AnyUserBundleCountsPlaceholderOrNot) {
   AppsClient& client = makeClient();
   platform.registry.add(FakeApp::installed("com.installed"));
-  platform.registry.addBundle("com.bundle", BundleKind::User);
+  platform.registry.addBundle("com.bundle", BundleKind::user);
   EXPECT_TRUE(client._placeholderExistsForApplication("com.installed"));
   EXPECT_TRUE(client._placeholderExistsForApplication("com.bundle"));
 }
 
 TEST_F(PlaceholderExists, BundlesOfOtherKindsDoNotCount) {
   AppsClient& client = makeClient();
-  platform.registry.add(FakeApp::placeholder("com.system").ofType(ApplicationTypeSystem));
-  platform.registry.addBundle("com.other", BundleKind::All);
+  platform.registry.add(FakeApp::placeholder("com.system").ofType(kApplicationTypeSystem));
+  platform.registry.addBundle("com.other", BundleKind::all);
   EXPECT_FALSE(client._placeholderExistsForApplication("com.system"));
   EXPECT_FALSE(client._placeholderExistsForApplication("com.other"));
 }
@@ -105,7 +105,7 @@ TEST_F(PlaceholderExists, IdentifiersThatDifferInCaseOnlyDoNotMatch) {
 
 TEST_F(EnumeratePlaceholders, PlaceholdersOfUsersAndOfTheSystemAreVisited) {
   platform.registry.add(FakeApp::placeholder("com.a"));
-  platform.registry.add(FakeApp::placeholder("com.s").ofType(ApplicationTypeSystem));
+  platform.registry.add(FakeApp::placeholder("com.s").ofType(kApplicationTypeSystem));
   platform.registry.add(FakeApp::updating("com.u"));
   platform.journal.clear();
   EXPECT_EQ(visited(), (std::vector<std::string>{"com.a", "com.s", "com.u"}));
@@ -114,8 +114,8 @@ TEST_F(EnumeratePlaceholders, PlaceholdersOfUsersAndOfTheSystemAreVisited) {
 }
 
 TEST_F(EnumeratePlaceholders, ABundleThatIsNoAppIsNotVisited) {
-  platform.registry.addBundle("com.extension", BundleKind::All);
-  platform.registry.addBundle("com.bundle", BundleKind::User);
+  platform.registry.addBundle("com.extension", BundleKind::all);
+  platform.registry.addBundle("com.bundle", BundleKind::user);
   EXPECT_TRUE(visited().empty());
 }
 
@@ -149,11 +149,11 @@ TEST_F(EnumeratePlaceholders, TheCallbackMayUninstallWhatItVisits) {
 }
 
 TEST_F(SystemAppPlaceholders, OnlyPlaceholdersOfSystemAppsAreCollected) {
-  platform.registry.add(FakeApp::placeholder("com.s2").ofType(ApplicationTypeSystem));
-  platform.registry.add(FakeApp::placeholder("com.s1").ofType(ApplicationTypeSystem));
-  platform.registry.add(FakeApp::installed("com.s3").ofType(ApplicationTypeSystem));
+  platform.registry.add(FakeApp::placeholder("com.s2").ofType(kApplicationTypeSystem));
+  platform.registry.add(FakeApp::placeholder("com.s1").ofType(kApplicationTypeSystem));
+  platform.registry.add(FakeApp::installed("com.s3").ofType(kApplicationTypeSystem));
   platform.registry.add(FakeApp::placeholder("com.user"));
-  platform.registry.addBundle("com.bundle", BundleKind::System);
+  platform.registry.addBundle("com.bundle", BundleKind::system);
   logCalls(platform);
   EXPECT_EQ(client._getSystemAppPlaceholders(), (Identifiers{"com.s1", "com.s2"}));
   EXPECT_TRUE(

@@ -58,8 +58,8 @@ TEST_F(RestorePlaceholder, TheInstallerGetsMetadataAndLicenceAsTheyWereRead) {
             (plist::Dictionary{{platform::PackageTypeKey, platform::PackageTypePlaceholder},
                                {platform::BundleIdentifierKey, "com.a"},
                                {"TSInstallType", 2},
-                               {platform::StoreMetadataKey, plist::Value(xmlForm(storeMetadata()))},
-                               {platform::LicenceDataKey, dataOf("a licence")}}));
+                               {platform::kStoreMetadataKey, plist::Value(xmlForm(storeMetadata()))},
+                               {platform::kLicenceDataKey, dataOf("a licence")}}));
   EXPECT_EQ(platform.transactions.scenarios(), (Scenarios{entry(Success::yes, "Installed placeholder")}));
 }
 
@@ -69,8 +69,8 @@ TEST_F(RestorePlaceholder, AnAppWithoutALicenceIsInstalledWithAnExplicitNull) {
   const auto installs = platform.registry.installs();
   ASSERT_EQ(installs.size(), 1U);
   EXPECT_EQ(installs[0].options.size(), 5U);
-  ASSERT_TRUE(installs[0].options.contains(platform::LicenceDataKey));
-  EXPECT_TRUE(installs[0].options.find(platform::LicenceDataKey)->isNull());
+  ASSERT_TRUE(installs[0].options.contains(platform::kLicenceDataKey));
+  EXPECT_TRUE(installs[0].options.find(platform::kLicenceDataKey)->isNull());
 }
 
 TEST_F(RestorePlaceholder, AnAppWithoutAnIconGetsItsPlaceholderAllTheSame) {

@@ -157,7 +157,7 @@ TEST_F(RestoreReconcile, AppsAreTakenInTheOrderOfTheirKeys) {
 TEST_F(RestoreReconcile, AnAppThatIsThereAlreadyIsLeftAlone) {
   platform.registry.add(FakeApp::placeholder("com.a"));
   platform.registry.add(FakeApp::installed("com.b"));
-  platform.registry.addBundle("com.c", platform::BundleKind::User);
+  platform.registry.addBundle("com.c", platform::BundleKind::user);
   putRestoreInfo(
       {{"com.a", restoredApp()}, {"com.b", restoredApp()}, {"com.c", restoredApp()}, {"com.D", restoredApp()}});
   EXPECT_TRUE(makeClient()._processHarvoRestoreInfo());

@@ -49,7 +49,7 @@ class NumberedApp final : public platform::AppRecord {
   [[nodiscard]] std::optional<std::string> bundleVersion() const override { return std::nullopt; }
   [[nodiscard]] std::optional<std::string> bundleContainerPath() const override { return "/var/apps/" + identifier_; }
   [[nodiscard]] std::optional<std::string> bundlePath() const override { return std::nullopt; }
-  [[nodiscard]] std::string applicationType() const override { return std::string(platform::ApplicationTypeUser); }
+  [[nodiscard]] std::string applicationType() const override { return std::string(platform::kApplicationTypeUser); }
   [[nodiscard]] std::uint64_t staticDiskUsage() const override { return 1000; }
   [[nodiscard]] platform::TSInstallType installType() const override { return platform::TSInstallType::None; }
   [[nodiscard]] bool isInstalled() const override { return true; }

@@ -82,13 +82,13 @@ class TestDevice {
   }
 
   [[nodiscard]] static plist::Dictionary customer(std::string_view identifier) {
-    return {{platform::PackageTypeKey, platform::PackageTypeCustomer}, {platform::BundleIdentifierKey, identifier}};
+    return {{platform::PackageTypeKey, platform::kPackageTypeCustomer}, {platform::BundleIdentifierKey, identifier}};
   }
   [[nodiscard]] static plist::Dictionary placeholderOptions(
       std::string_view identifier, platform::TSInstallType type = platform::TSInstallType::Sync) {
     return {{platform::PackageTypeKey, platform::PackageTypePlaceholder},
             {platform::BundleIdentifierKey, identifier},
-            {platform::InstallTypeKey, static_cast<std::uint64_t>(type)}};
+            {platform::kInstallTypeKey, static_cast<std::uint64_t>(type)}};
   }
 
   [[nodiscard]] std::shared_ptr<const platform::AppRecord> record(std::string_view identifier) {

@@ -65,9 +65,9 @@ std::string zipArchive(const std::vector<ZipEntry>& entries) {
 
 std::string infoPlist(std::string_view identifier, std::string_view version) {
   const plist::Value info = plist::Dictionary{{platform::BundleIdentifierKey, identifier},
-                                              {platform::BundleVersionKey, version},
-                                              {platform::BundleDisplayNameKey, "Notes"},
-                                              {platform::BundleIconFileKey, "Icon.png"}};
+                                              {platform::kBundleVersionKey, version},
+                                              {platform::kBundleDisplayNameKey, "Notes"},
+                                              {platform::kBundleIconFileKey, "Icon.png"}};
   const Result<Bytes> document = plist::writeXML(info);
   return document ? std::string(textOf(*document)) : std::string();
 }

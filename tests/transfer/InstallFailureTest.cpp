@@ -126,7 +126,7 @@ TEST_F(InstallQueue, ErrorsAreRecoverableOnlyWhenTheFrameworkSaysSoAndNoInstalle
   EXPECT_TRUE(client._isRecoverableError(Error{"POSIX", 5, "", nullptr}));
   EXPECT_FALSE(client._isRecoverableError(std::nullopt));
   EXPECT_FALSE(client._isRecoverableError(Error{"TessalyError", 5, "", nullptr}));
-  EXPECT_FALSE(client._isRecoverableError(Error{std::string(platform::InstallerErrorDomain), 5, "", nullptr}));
+  EXPECT_FALSE(client._isRecoverableError(Error{std::string(platform::kInstallerErrorDomain), 5, "", nullptr}));
 }
 
 TEST_F(InstallQueue, AnErrorOfTheTessalyDomainIsUnrecoverableWhateverTheFrameworkSays) {

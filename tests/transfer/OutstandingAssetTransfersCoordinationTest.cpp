@@ -106,7 +106,7 @@ TEST_F(OutstandingAssetTransfersCoordination, AnAutomaticallyDemotedAppIsReturne
 
 TEST_F(OutstandingAssetTransfersCoordination, RestoresAndSystemAppsAreNotPrepared) {
   platform.registry.add(FakeApp::placeholder("com.a", TSInstallType::Restore));
-  platform.registry.add(FakeApp::placeholder("com.b").ofType(platform::ApplicationTypeSystem));
+  platform.registry.add(FakeApp::placeholder("com.b").ofType(platform::kApplicationTypeSystem));
   EXPECT_TRUE(outstanding().empty());
   EXPECT_TRUE(platform.coordination.coordinators().empty());
   EXPECT_TRUE(said("com.a is currenlty marked to be restored and will be handled by bazaarlyd - skipping"));

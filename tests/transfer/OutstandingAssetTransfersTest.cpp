@@ -226,7 +226,7 @@ TEST_F(OutstandingAssetTransfers, WithInstallationForbiddenAWantedAppIsSkipped) 
 }
 
 TEST_F(OutstandingAssetTransfers, ASystemAppsPlaceholderIsSkipped) {
-  platform.registry.add(FakeApp::placeholder("com.sys").ofType(platform::ApplicationTypeSystem));
+  platform.registry.add(FakeApp::placeholder("com.sys").ofType(platform::kApplicationTypeSystem));
   EXPECT_TRUE(outstanding().empty());
   EXPECT_TRUE(said("com.sys is system app placeholder - skipping"));
 }

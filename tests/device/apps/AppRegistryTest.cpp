@@ -72,11 +72,11 @@ TEST_F(AppRegistryTest, SaysWhichOptionIsWrong) {
       install(TestDevice::customer("com/a")), InstallerFailure::badIdentifier,
       "\"com/a\" is no bundle identifier: it may have only letters, digits, '-', '.' and '_', at most 200 and no dot first");
   options = TestDevice::customer("com.a");
-  options.set(platform::InstallTypeKey, "4");
+  options.set(platform::kInstallTypeKey, "4");
   expectFailure(install(options), InstallerFailure::badOptions,
                 "the install option \"TSInstallType\" must be a number");
   options = TestDevice::customer("com.a");
-  options.set(platform::LicenceDataKey, "text");
+  options.set(platform::kLicenceDataKey, "text");
   expectFailure(install(options), InstallerFailure::badOptions, "the install option \"LicenceData\" must be data");
   EXPECT_EQ(device_.record("com.a"), nullptr);
 }
@@ -129,8 +129,8 @@ TEST_F(AppRegistryTest, KeepsMetadataBesideTheBundle) {
 
 TEST_F(AppRegistryTest, KeepsMetadataAndLicenceOfTheOptions) {
   plist::Dictionary options = TestDevice::placeholderOptions("com.a", TSInstallType::Restore);
-  options.set(platform::StoreMetadataKey, plist::Value::data(bytesOf("given")));
-  options.set(platform::LicenceDataKey, plist::Value::data(bytesOf("licence")));
+  options.set(platform::kStoreMetadataKey, plist::Value::data(bytesOf("given")));
+  options.set(platform::kLicenceDataKey, plist::Value::data(bytesOf("licence")));
   ASSERT_TRUE(registry().installApplication(device_.stagePlaceholder("com.a"), options).ok());
   EXPECT_EQ(inContainer("com.a", "HarvoMetadata.plist"), "given");
   const auto licence = registry().licenceData("com.a");
@@ -143,7 +143,7 @@ TEST_F(AppRegistryTest, KeepsMetadataAndLicenceOfTheOptions) {
 
 TEST_F(AppRegistryTest, PrefersTheOptionsMetadataToThePackages) {
   plist::Dictionary options = TestDevice::customer("com.a");
-  options.set(platform::StoreMetadataKey, plist::Value::data(bytesOf("given")));
+  options.set(platform::kStoreMetadataKey, plist::Value::data(bytesOf("given")));
   const auto package = device_.stage("a.zip", appPackage("com.a", "1.0", {{"HarvoMetadata.plist", "packed"}}));
   ASSERT_TRUE(registry().installApplication(package, options).ok());
   EXPECT_EQ(inContainer("com.a", "HarvoMetadata.plist"), "given");
@@ -153,7 +153,7 @@ TEST_F(AppRegistryTest, WalksInTheOrderInWhichAppsCame) {
   for (const char* identifier : {"com.c", "com.a", "com.b"})
     device_.install(identifier);
   device_.install("com.c", "2.0");
-  EXPECT_EQ(walk(BundleKind::All), (Identifiers{"com.c", "com.a", "com.b"}));
+  EXPECT_EQ(walk(BundleKind::all), (Identifiers{"com.c", "com.a", "com.b"}));
 }
 
 TEST_F(AppRegistryTest, KeepsAppsOfTheSystemApart) {
@@ -162,11 +162,11 @@ TEST_F(AppRegistryTest, KeepsAppsOfTheSystemApart) {
                   .installSystemApplication(device_.stagePlaceholder("com.system"),
                                             TestDevice::placeholderOptions("com.system", TSInstallType::Downgrade))
                   .ok());
-  EXPECT_EQ(walk(BundleKind::System), Identifiers{"com.system"});
-  EXPECT_EQ(walk(BundleKind::User), Identifiers{"com.user"});
+  EXPECT_EQ(walk(BundleKind::system), Identifiers{"com.system"});
+  EXPECT_EQ(walk(BundleKind::user), Identifiers{"com.user"});
   device_.install("com.system");
-  EXPECT_EQ(device_.record("com.system")->applicationType(), platform::ApplicationTypeSystem);
-  EXPECT_EQ(walk(BundleKind::System), Identifiers{"com.system"});
+  EXPECT_EQ(device_.record("com.system")->applicationType(), platform::kApplicationTypeSystem);
+  EXPECT_EQ(walk(BundleKind::system), Identifiers{"com.system"});
 }
 
 // Containers.
@@ -182,7 +182,7 @@ TEST_F(AppRegistryTest, AnUpdateSwapsContainers) {
 
 TEST_F(AppRegistryTest, AnUpdateIsOnTheDiskBeforeTheOldVersionGoes) {
   plist::Dictionary options = TestDevice::customer("com.a");
-  options.set(platform::InstallTypeKey, static_cast<std::uint64_t>(TSInstallType::Sync));
+  options.set(platform::kInstallTypeKey, static_cast<std::uint64_t>(TSInstallType::Sync));
   const auto install = [&](std::string_view version) {
     const auto package = device_.stage("package.zip", appPackage("com.a", version));
     return lastingStepsOf([&] { EXPECT_TRUE(registry().installApplication(package, options).ok()); });
@@ -287,7 +287,7 @@ TEST_F(AppRegistryTest, TenInstallsAndRemovalsAtOnceLeaveWhatTheyShould) {
       }
     }
   });
-  EXPECT_EQ(walk(BundleKind::All).size(), 5U);
+  EXPECT_EQ(walk(BundleKind::all).size(), 5U);
   EXPECT_EQ(device_.containers(), 5);
   EXPECT_EQ(device_.services().uninstalledApps().lookupUninstalled()->size(), 5U);
   EXPECT_TRUE(device_.isTidy());

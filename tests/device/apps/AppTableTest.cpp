@@ -31,7 +31,7 @@ class LicensedApp : public AppRegistryTest {
  protected:
   void install(std::string_view version, const plist::Value& licence) {
     plist::Dictionary options = TestDevice::customer("com.a");
-    options.set(platform::LicenceDataKey, licence);
+    options.set(platform::kLicenceDataKey, licence);
     ASSERT_TRUE(registry().installApplication(device_.stage("a.zip", appPackage("com.a", version)), options).ok());
   }
   [[nodiscard]] bool isBound() { return device_.record("com.a")->hasMIDBasedSINF(); }

@@ -138,7 +138,7 @@ TEST_F(BackupManagerTest, AnUpdateKeepsTheDataAndARemovalTakesAllOfIt) {
 TEST_F(BackupManagerTest, RemovingAPlaceholderOnlyLeavesTheData) {
   EXPECT_TRUE(manager.keepRestoreData("com.a", data(9)));
   device_.placeholder("com.a", platform::TSInstallType::Restore);
-  EXPECT_TRUE(device_.registry().uninstallApplication("com.a", {{platform::UninstallPlaceholdersOnlyKey, true}}));
+  EXPECT_TRUE(device_.registry().uninstallApplication("com.a", {{platform::kUninstallPlaceholdersOnlyKey, true}}));
   EXPECT_TRUE(manager.restoreDataExists("com.a", nullptr));
 }
 

@@ -30,7 +30,7 @@ TEST_F(BundlesTest, OpensAFolderWithAnInfoDictionary) {
   const auto bundle = open("/apps/A.app");
   ASSERT_NE(bundle, nullptr);
   EXPECT_EQ(bundle->location(), FileLocation::directory("/apps/A.app"));
-  const plist::Value* name = bundle->infoDictionaryValue(platform::BundleDisplayNameKey);
+  const plist::Value* name = bundle->infoDictionaryValue(platform::kBundleDisplayNameKey);
   ASSERT_NE(name, nullptr);
   EXPECT_EQ(*name, plist::Value("An App"));
   EXPECT_EQ(bundle->infoDictionaryValue("Other"), nullptr);

@@ -31,7 +31,7 @@ class Demotion : public testing::Test {
                                             {"HarvoMetadata.plist", "{title = Notes;}"},
                                             {"HarvoArtwork", "artwork"}});
     plist::Dictionary options = TestDevice::customer("com.a");
-    options.set(platform::LicenceDataKey, kLicence);
+    options.set(platform::kLicenceDataKey, kLicence);
     const Status installed = device_.registry().installApplication(device_.stage("a.zip", package), options);
     ASSERT_TRUE(installed.ok()) << installed.error().text;
   }

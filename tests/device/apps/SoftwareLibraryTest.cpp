@@ -41,8 +41,8 @@ TEST_F(SoftwareLibraryTest, KeepsAReceiptForEveryInstalledUserApp) {
   registry.add(FakeApp::installed("com.a").withVersion(std::nullopt));
   registry.add(FakeApp::updating("com.c").withVersion("3"));
   registry.add(FakeApp::placeholder("com.d"));
-  registry.add(FakeApp::installed("com.e").ofType(platform::ApplicationTypeSystem));
-  registry.addBundle("com.f", platform::BundleKind::User);
+  registry.add(FakeApp::installed("com.e").ofType(platform::kApplicationTypeSystem));
+  registry.addBundle("com.f", platform::BundleKind::user);
   EXPECT_EQ(refresh(), std::vector<std::optional<Error>>{std::nullopt});
   EXPECT_EQ(receipts(), (std::vector<Receipt>{{"com.a", std::nullopt}, {"com.b", "2.1"}, {"com.c", "3"}}));
 }

@@ -145,7 +145,7 @@ TEST_P(RefusedPackage, IsNotInstalledAndLeavesNoTrace) {
   TestDevice device;
   const Status installed = device.tryInstall("com.a", GetParam().bytes);
   ASSERT_FALSE(installed.ok());
-  EXPECT_EQ(installed.error().domain, platform::InstallerErrorDomain) << installed.error().text;
+  EXPECT_EQ(installed.error().domain, platform::kInstallerErrorDomain) << installed.error().text;
   EXPECT_EQ(installed.error().code, static_cast<long>(GetParam().failure)) << installed.error().text;
   if (!GetParam().text.empty()) {
     EXPECT_EQ(installed.error().text, GetParam().text);
@@ -260,7 +260,7 @@ TEST_F(Package, IsLookedAtWithoutUnpacking) {
   EXPECT_EQ(textOf(info->artwork.value_or(Bytes())), "art");
   EXPECT_EQ(textOf(info->icon.value_or(Bytes())), "a picture");
   EXPECT_EQ(info->packageBytes, bytes.size());
-  EXPECT_NE(info->info.find(platform::BundleIconFileKey), nullptr);
+  EXPECT_NE(info->info.find(platform::kBundleIconFileKey), nullptr);
 }
 
 TEST_F(Package, WithoutExtrasHasNoneOfThem) {

@@ -63,8 +63,8 @@ TEST_F(HomeScreenTest, AnEmptyDeviceHasAnEmptyOrder) {
 TEST_F(HomeScreenTest, WithoutALayoutAppsStandInTheRegistrysOrder) {
   registry.add(FakeApp::installed("com.a"));
   registry.add(FakeApp::placeholder("com.b"));
-  registry.add(FakeApp::installed("com.c").ofType(platform::ApplicationTypeSystem));
-  registry.addBundle("com.extension", platform::BundleKind::User);
+  registry.add(FakeApp::installed("com.c").ofType(platform::kApplicationTypeSystem));
+  registry.addBundle("com.extension", platform::BundleKind::user);
   EXPECT_EQ(order(), (Identifiers{"com.a", "com.b", "com.c"}));
 }
 

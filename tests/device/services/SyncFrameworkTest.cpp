@@ -134,7 +134,7 @@ INSTANTIATE_TEST_SUITE_P(
     SyncFramework, UnrecoverableError,
     testing::Values(errorOf("POSIX", EINVAL), errorOf("POSIX", ENOENT), errorOf("POSIX", EIO), errorOf("POSIX", 0),
                     errorOf("ZTError", 1), errorOf("ZTError", 2), errorOf("ZTError", 29), errorOf("ZTError", 30),
-                    errorOf("ZTError", EAGAIN), errorOf("", EAGAIN), errorOf(platform::InstallerErrorDomain, EAGAIN),
+                    errorOf("ZTError", EAGAIN), errorOf("", EAGAIN), errorOf(platform::kInstallerErrorDomain, EAGAIN),
                     Error{"Other", 1, "text", std::make_shared<const Error>(errorOf("POSIX", EAGAIN))}),
     [](const auto& test) { return "Number" + std::to_string(test.index); });
 
