@@ -1,7 +1,7 @@
 // Passing on to a coordinator how its app's package comes, or that it does not.
 #include "common/SyncError.h"
 #include "core/AppsClient.h"
-#include "platform/PromiseFulfilment.h"
+#include "platform/InstallPromise.h"
 
 namespace appsync {
 

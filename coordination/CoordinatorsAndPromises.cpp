@@ -2,7 +2,7 @@
 #include "common/SyncError.h"
 #include "common/TransactionSteps.h"
 #include "core/AppsClient.h"
-#include "platform/PromiseFulfilment.h"
+#include "platform/InstallPromise.h"
 
 namespace appsync {
 

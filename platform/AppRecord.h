@@ -1,4 +1,4 @@
-// What the registry knows of one bundle.
+// Records of the app registry.
 #pragma once
 
 #include <cstdint>
@@ -13,10 +13,10 @@ namespace appsync::platform {
 
 class AppRecord;
 
-/// One bundle of the registry: an app, a placeholder, or something else that has an identifier (an extension, say).
+/// One bundle of the registry: an app, a placeholder, or another bundle with an identifier, such as an extension.
 ///
-/// A record is a snapshot: it keeps answering as on the day it was taken, whatever happens to the bundle.
-/// Threads: any. Nothing fails; what is not known is absent or empty.
+/// A record is a snapshot: later changes to the bundle do not change it. Thread-safe. No operation fails; unknown
+/// values are nullopt or empty.
 class BundleRecord {
  public:
   virtual ~BundleRecord() = default;
@@ -24,44 +24,45 @@ class BundleRecord {
   /// The bundle identifier, never empty.
   [[nodiscard]] virtual std::string applicationIdentifier() const = 0;
 
-  /// This record as an app's, or null when it is none.
+  /// Returns this record if the bundle is an app or a placeholder, else null.
   [[nodiscard]] virtual const AppRecord* asAppRecord() const { return nullptr; }
 
   /// For logs.
   [[nodiscard]] virtual std::string description() const = 0;
 };
 
-/// One app: installed, or a placeholder whose package is still to come, or both (an installed app that is being updated
-/// has a placeholder over it and is reported as installed and as placeholder).
+/// One app: installed, a placeholder whose package is not installed yet, or both: an installed app that is being
+/// updated has a placeholder as well.
 class AppRecord : public BundleRecord {
  public:
   [[nodiscard]] const AppRecord* asAppRecord() const final { return this; }
 
-  /// The same as `applicationIdentifier` unless the bundle's info dictionary says otherwise; may be absent.
+  /// The identifier in the info dictionary; usually equal to `applicationIdentifier`.
   [[nodiscard]] virtual std::optional<std::string> bundleIdentifier() const = 0;
-  /// The info dictionary's version text, if any.
+  /// The version in the info dictionary.
   [[nodiscard]] virtual std::optional<std::string> bundleVersion() const = 0;
-  /// Device path of the container: the folder that holds the bundle and, beside it, store metadata and artwork.
+  /// Device path of the container: the directory of the bundle, its store metadata and its artwork.
   [[nodiscard]] virtual std::optional<std::string> bundleContainerPath() const = 0;
-  /// Device path of the bundle itself, "…/Name.app".
+  /// Device path of the bundle, "…/Name.app".
   [[nodiscard]] virtual std::optional<std::string> bundlePath() const = 0;
 
-  /// `kApplicationTypeUser`, `kApplicationTypeSystem` or another word of the registry's.
+  /// `kApplicationTypeUser`, `kApplicationTypeSystem` or another type that the registry defines.
   [[nodiscard]] virtual std::string applicationType() const = 0;
-  /// Bytes that its bundle takes, as the installer counted them: the installed one's where there are two. What an app
-  /// writes while it runs is not in it. Cheap: walks over all apps ask.
+  /// Bytes of the bundle as the installer counted them; of the installed bundle if there is a placeholder too. Excludes
+  /// data that the app writes. Must be cheap: it is read for every app of an enumeration.
   [[nodiscard]] virtual std::uint64_t staticDiskUsage() const = 0;
-  /// Why it is, or was last, being installed.
+  /// The reason for the running install, or else for the last one.
   [[nodiscard]] virtual TSInstallType installType() const = 0;
-  /// A package is installed and can be launched.
+  /// Returns true if a package is installed and can be launched.
   [[nodiscard]] virtual bool isInstalled() const = 0;
-  /// A package is still to come.
+  /// Returns true if a package is yet to be installed.
   [[nodiscard]] virtual bool isPlaceholder() const = 0;
 
-  /// Whether its licence data is bound to this device: such an app cannot be used on another one it is restored to.
+  /// Returns true if the licence data is bound to this device. Such an app cannot be used after a restore to another
+  /// one.
   [[nodiscard]] virtual bool hasMIDBasedSINF() const = 0;
 
-  /// Live progress of the running install, or null when none runs.
+  /// Returns the live progress of the running install, or null if no install is running.
   [[nodiscard]] virtual std::shared_ptr<InstallProgress> installProgress() const = 0;
 };
 

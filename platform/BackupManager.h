@@ -1,4 +1,4 @@
-// The device's backup service, as far as restoring apps' data goes.
+// The part of the device's backup service that restores apps' data.
 #pragma once
 
 #include <cstdint>
@@ -8,16 +8,17 @@
 
 namespace appsync::platform {
 
-/// A connection to the backup service. Threads: every operation may be called from any thread.
+/// A connection to the backup service. Thread-safe.
 class BackupManager {
  public:
   virtual ~BackupManager() = default;
 
-  /// Whether the restore that is going on still holds data for the app. `size`, which may be null, receives the data's
-  /// bytes.
+  /// Returns true if the running restore still holds data for the app. `size`, which may be null, then receives the
+  /// number of bytes.
   [[nodiscard]] virtual bool restoreDataExists(std::string_view bundleIdentifier, std::uint64_t* size) = 0;
 
-  /// Gives up restoring the app's data; it is dropped. An app without data is a success. `error` may be null.
+  /// Cancels the restore of the app's data and deletes the data. Succeeds if there is no data. Returns false and sets
+  /// `error`, which may be null, if the data could not be deleted.
   virtual bool cancelApplicationRestore(std::string_view bundleIdentifier, ErrorSlot error) = 0;
 };
 

@@ -1,4 +1,4 @@
-// App bundles as folders, whether the registry knows them or not.
+// Access to app bundles on disk, registered or not.
 #pragma once
 
 #include <memory>
@@ -11,27 +11,27 @@
 
 namespace appsync::platform {
 
-/// An opened bundle: a folder with an "Info.plist". Threads: any.
+/// An open bundle: a directory with an "Info.plist". Thread-safe.
 class Bundle {
  public:
   virtual ~Bundle() = default;
 
   [[nodiscard]] virtual const FileLocation& location() const = 0;
 
-  /// A value of the bundle's info dictionary; null when there is none under that key. Lives as long as the bundle.
+  /// Returns the value of `key` in the info dictionary, or null if there is none. Valid as long as the bundle.
   [[nodiscard]] virtual const plist::Value* infoDictionaryValue(std::string_view key) const = 0;
 };
 
-/// Threads: any.
+/// Thread-safe.
 class Bundles {
  public:
   virtual ~Bundles() = default;
 
-  /// The bundle in that folder; null when there is no such folder or it cannot be read. A folder whose info dictionary
-  /// is missing or unusable opens as a bundle without info.
+  /// Opens the bundle in the directory `location`. Returns null if the directory does not exist or cannot be read. If
+  /// the info dictionary is missing or cannot be parsed, the bundle opens with an empty one.
   [[nodiscard]] virtual std::unique_ptr<Bundle> openBundle(const FileLocation& location) = 0;
 
-  /// The bundle identifier of the process that this code runs in; absent when the process has no bundle.
+  /// Returns the bundle identifier of the current process, or nullopt if the process has no bundle.
   [[nodiscard]] virtual std::optional<std::string> mainBundleIdentifier() = 0;
 };
 

@@ -1,14 +1,14 @@
-// Who asks the install-coordination service for something.
+// Clients of the install-coordination service.
 #pragma once
 
 #include <cstdint>
 
 namespace appsync::platform {
 
-/// A client of the install-coordination service. Services know others too; their numbers are passed on as they are.
+/// A client of the install-coordination service. A service may define others; the plug-in passes their numbers on.
 enum class ClientIdentity : std::uint64_t {
   CXClientBazaarly = 1,  ///< the device's app store
-  CXClientUser = 2,      ///< the person who holds the device
+  CXClientUser = 2,      ///< the user of the device
   CXClientSync = 3,      ///< this plug-in
 };
 

@@ -1,4 +1,4 @@
-// Where a file or folder is, as services want to be told.
+// A device path together with its kind.
 #pragma once
 
 #include <optional>
@@ -7,12 +7,12 @@
 
 namespace appsync::platform {
 
-/// A device path that services accept, together with whether a folder is meant.
+/// A device path and whether it denotes a directory. Nothing needs to exist at the path.
 struct FileLocation {
   std::string path;
   bool isDirectory = false;
 
-  /// None when no file can have that path: it is empty or holds a NUL byte.
+  /// Return nullopt if `path` is empty or contains a NUL byte.
   [[nodiscard]] static std::optional<FileLocation> file(std::string_view path) { return make(path, false); }
   [[nodiscard]] static std::optional<FileLocation> directory(std::string_view path) { return make(path, true); }
 

@@ -1,4 +1,4 @@
-// The device's file system, as far as sync clients use it.
+// The part of the device's file system that sync clients use.
 #pragma once
 
 #include <cstdint>
@@ -11,72 +11,70 @@
 
 namespace appsync::platform {
 
-/// The accounts that a new file or folder, with the parents made on the way to it, is to belong to. An absent name
-/// leaves the creating process's own.
+/// Owner and group of a new file or directory, and of parents that are created with it. nullopt means the owner or
+/// group of the creating process.
 struct OwnerAttributes {
   std::optional<std::string> ownerAccountName;
   std::optional<std::string> groupOwnerAccountName;
   bool operator==(const OwnerAttributes&) const = default;
 };
 
-/// Whether missing parent folders are made as well.
+/// Whether missing parent directories are created as well.
 enum class IntermediateDirectories { create, require };
 
-/// What is known of an existing file.
 struct FileAttributes {
-  std::uint64_t size = 0;  ///< bytes; 0 for a folder
+  std::uint64_t size = 0;  ///< bytes; 0 for a directory
   bool isDirectory = false;
 };
 
-/// Files and folders by absolute device path ("/var/mobile/…"). No operation reaches anything outside the device's file
-/// system, whatever the path or the links in it say: such a path fails.
+/// Files and directories by absolute device path ("/var/mobile/…"). A path that leaves the device's file system,
+/// through ".." or symbolic links, fails.
 ///
-/// Threads: every operation may be called from any thread at any time. Two writers of one path do not mix: the file
-/// holds what one of them wrote.
-/// Errors: domain "POSIX" with the system's number wherever a number fits; the text names the path.
-/// Failure: unless an operation says otherwise, a failed one leaves everything as it was.
+/// Thread-safe. Concurrent writes to one path do not mix: the file holds the bytes of one of them. Errors: domain
+/// "POSIX" with the system's error number; the text names the path. Unless stated otherwise, a failed operation changes
+/// nothing.
 class FileSystem {
  public:
   virtual ~FileSystem() = default;
 
-  /// True for files, folders and links that lead to something.
+  /// Returns true for files, directories, and symbolic links whose target exists.
   [[nodiscard]] virtual bool fileExists(std::string_view path) = 0;
 
-  /// The size and kind of what is at `path`, links followed.
+  /// Returns size and kind of the item at `path`; follows symbolic links. Fails with ENOENT if it does not exist.
   [[nodiscard]] virtual Result<FileAttributes> attributesOfItem(std::string_view path) = 0;
 
-  /// The whole of a file, read in one go. Folders fail.
+  /// Returns the contents of a file. Fails for directories.
   [[nodiscard]] virtual Result<Bytes> readFile(std::string_view path) = 0;
 
-  /// Replaces the file at `path`, or makes it; the parent must exist. A reader, or a device that lost power, finds the
-  /// old bytes or the new, never a mixture and never nothing.
+  /// Creates or replaces the file at `path`, whose parent must exist. Atomic for readers, and across crashes and power
+  /// failures: the file has either the old or the new contents.
   [[nodiscard]] virtual Status writeFileAtomically(std::string_view path, ByteView bytes) = 0;
 
-  /// Makes a file with these bytes and owners; a file already there is replaced, the parent must exist.
+  /// Creates or replaces the file at `path`, whose parent must exist, with these contents and owners.
   [[nodiscard]] virtual Status createFile(std::string_view path, ByteView bytes, const OwnerAttributes& attributes) = 0;
 
-  /// Makes a folder. With `IntermediateDirectories::create` a folder already there is a success and keeps its owners,
-  /// and parents made on the way stay when a later one fails; with `require` an existing one is a failure.
+  /// Creates a directory. With `IntermediateDirectories::create`, an existing directory is a success and keeps its
+  /// owners; parents that were created remain after a failure. With `require`, an existing directory is an error.
   [[nodiscard]] virtual Status createDirectory(std::string_view path, IntermediateDirectories intermediates,
                                                const OwnerAttributes& attributes) = 0;
 
-  /// Copies a file, or a folder with all that is in it; the parent of `to` must exist. Something already at `to` stays,
-  /// and the copy fails with EEXIST. A copy that fails midway is removed.
+  /// Copies a file, or a directory with its contents, to `to`, whose parent must exist. Fails with EEXIST if `to`
+  /// exists; `to` is then unchanged. Removes an incomplete copy.
   [[nodiscard]] virtual Status copyItem(std::string_view from, std::string_view to) = 0;
 
-  /// Moves a file or folder in one step: at any moment it is whole at `from` or whole at `to`, whose parent must exist.
-  /// Something already at `to` is a failure, and stays.
+  /// Moves a file or directory to `to`, whose parent must exist. Atomic: the item is complete at either `from` or `to`.
+  /// Fails if `to` exists; `to` is then unchanged.
   [[nodiscard]] virtual Status moveItem(std::string_view from, std::string_view to) = 0;
 
-  /// Removes a file, a link (not what it leads to) or a folder with all that is in it. Nothing there is a failure. A
-  /// folder's removal that fails midway leaves the rest.
+  /// Removes a file, a symbolic link (not its target), or a directory with its contents. Fails with ENOENT if nothing
+  /// is at `path`. If removing a directory fails, part of its contents may remain.
   [[nodiscard]] virtual Status removeItem(std::string_view path) = 0;
 
-  /// Sets the times of last access and modification to now. The error's text is the system's own words.
+  /// Sets the times of last access and modification to the current time. The error's text is the system's message.
   [[nodiscard]] virtual Status touch(std::string_view path) = 0;
 
-  /// An existing folder for short-lived files of this process, without a slash at its end. The system may empty it
-  /// whenever the process does not run.
+  /// Returns an existing directory for temporary files of this process, without a trailing slash. The system may empty
+  /// it while the process is not running.
   [[nodiscard]] virtual std::string temporaryDirectory() = 0;
 };
 

@@ -1,4 +1,4 @@
-// From an app bundle to the picture that stands on the home screen, and from a picture to PNG bytes.
+// Renders home-screen icons of app bundles and encodes images as PNG.
 #pragma once
 
 #include <cstddef>
@@ -9,40 +9,42 @@
 
 namespace appsync::platform {
 
-/// A picture in the service's own form. It can be read from any thread.
+/// An image in the service's internal format. Immutable and thread-safe.
 class Image {
  public:
   virtual ~Image() = default;
 };
 
-/// Threads: any.
+/// Thread-safe.
 class IconRenderer {
  public:
   virtual ~IconRenderer() = default;
 
-  /// The bundle's icon in the size and shape of this device's home screen, or null when the bundle has none that can be
-  /// used.
+  /// Returns the bundle's icon in the size and shape of this device's home screen, or null if the bundle has no usable
+  /// icon. The image may outlive the bundle.
   [[nodiscard]] virtual std::unique_ptr<Image> createHomeScreenIconImage(const Bundle& bundle) = 0;
 };
 
-/// Writes images as PNG. One encoder, one thread.
+/// Encodes images as PNG. Not thread-safe. Destroying an encoder before `finalize` abandons the encoding.
 class PNGEncoder {
  public:
   virtual ~PNGEncoder() = default;
 
-  /// The image is copied or written before this returns.
+  /// Adds an image, which is needed only during the call.
   virtual void addImage(const Image& image) = 0;
 
-  /// Completes the encoding; only after a true result the destination holds a picture.
+  /// Completes the encoding. Returns false on failure, also if an image is missing; the contents of the destination are
+  /// then unspecified.
   [[nodiscard]] virtual bool finalize() = 0;
 };
 
+/// Thread-safe.
 class PNGEncoders {
  public:
   virtual ~PNGEncoders() = default;
 
-  /// An encoder of `imageCount` images into `destination`, which must outlive it; null when the service has no such
-  /// encoder.
+  /// Returns an encoder of `imageCount` images into `destination`, which must outlive it, or null if the service cannot
+  /// create one.
   [[nodiscard]] virtual std::unique_ptr<PNGEncoder> createEncoder(Bytes& destination, std::size_t imageCount) = 0;
 };
 

@@ -1,4 +1,4 @@
-// One app's install, as the install-coordination service carries it out.
+// The install of one app through the install-coordination service.
 #pragma once
 
 #include <cstdint>
@@ -16,72 +16,73 @@
 
 namespace appsync::platform {
 
-/// What a coordinator is to do. A service has at most one of each kind for an app, whoever made it.
+/// The purpose of a coordinator. An app has at most one coordinator of each kind, regardless of their creators.
 enum class CoordinatorKind : std::uint8_t {
-  any,               ///< in look-ups only: whichever there is
+  any,               ///< for look-ups only
   initiating,        ///< a new app
-  updating,          ///< a new version of an installed app, which stays usable until the new one is in
-  restoring,         ///< an app that a restored device had
-  restoringDemoted,  ///< the same for an app of which it had the icon and data only
+  updating,          ///< a new version of an installed app, which stays usable until then
+  restoring,         ///< an app of a restored device
+  restoringDemoted,  ///< an app that was demoted to icon and data on that device
 };
 
-/// A handle on the service's coordinator. Handles on one coordinator see the same state; dropping them all changes
-/// nothing: a coordinator lives in the service, also across restarts, until its app is installed, the install has
-/// failed, or it is cancelled. One that restores a demoted app may have ended as soon as its placeholder is shown, if
-/// it has no app-asset promise by then; the placeholder stays.
+/// A handle to a coordinator of the service. All handles to one coordinator share its state. The coordinator does not
+/// depend on its handles: it exists, also across restarts, until the app is installed, the install fails, or it is
+/// cancelled. A coordinator that restores a demoted app may end as soon as its placeholder is shown if it has no
+/// app-asset promise by then; the placeholder remains.
 ///
-/// The service installs the app once the coordinator has its install options (one that restores can do without) and its
-/// placeholder promise, its app-asset promise is complete and, where it has a user-data promise, that is complete too.
-/// From then on its app-asset promise cannot be taken back. When the install has ended the coordinator is gone, and the
-/// observers hear of it.
+/// The service installs the app once the coordinator has install options (optional for the restoring kinds), a
+/// placeholder promise and a complete app-asset promise, and its user-data promise, if any, is complete. From then on,
+/// the app-asset promise cannot be cancelled. The coordinator ends with the install, and its observers are notified.
 ///
-/// Each set operation is atomic and fails, changing nothing, when what it sets was set before, when the promise was
-/// cancelled or belongs to another app, or when the coordinator has ended. A promise that could not be set stays the
-/// caller's. Errors: `kInstallCoordinationErrorDomain`, or "POSIX" where the system failed. Threads: any.
+/// Each set operation is atomic. It fails and changes nothing if the value was already set, if the promise was
+/// cancelled or belongs to another app, or if the coordinator has ended. After a failure the caller still owns the
+/// promise. Errors: `kInstallCoordinationErrorDomain`, or "POSIX" for system errors. Thread-safe.
 class InstallCoordinator {
  public:
   virtual ~InstallCoordinator() = default;
 
-  /// The app; none when the service has lost it.
+  /// Returns the app's bundle identifier, or nullopt if the service no longer has it.
   [[nodiscard]] virtual std::optional<std::string> bundleID() const = 0;
   [[nodiscard]] virtual CoordinatorKind kind() const = 0;
-  /// Who made the coordinator. Only that client may drive it.
+  /// The client that created the coordinator. Other clients must not change it, except where an operation takes a
+  /// client.
   [[nodiscard]] virtual ClientIdentity creatorIdentifier() const = 0;
-  /// Why it ended, if it ended badly: the reason that it was cancelled for, or what the installer said.
+  /// Returns the reason for the cancellation or the installer's error, or nullopt if neither occurred.
   [[nodiscard]] virtual std::optional<Error> coordinatorError() const = 0;
 
-  /// Reports this coordinator to `observer`, in place of an earlier one, until it ends or the observer has gone. One
-  /// that has an observer connection too hears of everything once.
+  /// Reports this coordinator to `observer`, replacing an earlier observer, until the coordinator ends or the observer
+  /// is destroyed. An observer that also has an `InstallObserver` connection receives each callback once.
   virtual void setObserver(std::weak_ptr<InstallObserverDelegate> observer) = 0;
 
   [[nodiscard]] virtual bool hasInstallOptions() const = 0;
   [[nodiscard]] virtual Status setInstallOptions(const InstallOptions& options) = 0;
 
-  /// The on-demand resources that the app needs at its first launch; an empty list says that there are none.
+  /// The on-demand resources that the app needs at its first launch. An empty list means that it needs none.
   [[nodiscard]] virtual bool hasInitialODRAssetPromises() const = 0;
   [[nodiscard]] virtual Status setInitialODRAssetPromises(
       const std::vector<std::shared_ptr<InstallPromise>>& promises) = 0;
 
-  /// The package. `appAssetPromise` is null when there is none.
+  /// The promise of the package. `appAssetPromise` returns null if it is not set.
   [[nodiscard]] virtual bool hasAppAssetPromise() const = 0;
   [[nodiscard]] virtual std::shared_ptr<PromisedTransferToPath> appAssetPromise() const = 0;
   [[nodiscard]] virtual Status setAppAssetPromise(std::shared_ptr<PromisedTransferToPath> promise) = 0;
 
-  /// Who is to make and fulfil the app-asset promise: the creator unless another client was named, also when there is
-  /// an error because the service cannot tell.
+  /// The client that creates and fulfils the app-asset promise: the coordinator's creator unless another one was set.
+  /// If the service cannot determine it, returns the creator and sets `error`, which may be null.
   [[nodiscard]] virtual ClientIdentity appAssetPromiseResponsibleClient(ErrorSlot error) const = 0;
   [[nodiscard]] virtual Status setAppAssetPromiseResponsibleClient(ClientIdentity client) = 0;
 
-  /// The data that a restored app had.
+  /// The promise of a restored app's data.
   [[nodiscard]] virtual bool hasUserDataPromise() const = 0;
   [[nodiscard]] virtual Status setUserDataPromise(std::shared_ptr<PromisedOutOfBandTransfer> promise) = 0;
 
-  /// Null is a failure. Once set the placeholder is the coordinator's, and shown if its configuration is complete.
+  /// The placeholder, which belongs to the coordinator once set and is shown when its configuration is complete.
+  /// Setting null fails.
   [[nodiscard]] virtual bool hasPlaceholderPromise() const = 0;
   [[nodiscard]] virtual Status setPlaceholderPromise(std::shared_ptr<Placeholder> placeholder) = 0;
 
-  /// Ends the coordinator with all its promises, its placeholder and, for a complete app-asset promise, the package. An
-  /// app that is installed stays as it is. Fails when the coordinator has ended, or is just installing its app.
+  /// Cancels the coordinator, its promises and its placeholder, and deletes the package of a complete app-asset
+  /// promise. An installed app is unchanged. Fails if the coordinator has ended or is installing the app.
   virtual Status cancelForReason(const Error& reason, ClientIdentity client) = 0;
 
   /// For logs.

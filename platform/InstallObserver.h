@@ -1,4 +1,4 @@
-// How clients of the install-coordination service hear of their coordinators.
+// Callbacks of the install-coordination service.
 #pragma once
 
 #include <cstdint>
@@ -10,48 +10,47 @@ namespace appsync::platform {
 
 class InstallCoordinator;
 
-/// Hears of coordinators, on threads of the service's own: one callback at a time to each delegate, in the order in
-/// which things happened, and none with a lock of the service held, so that a callback may call the service. No
-/// operation of the service waits for a callback: a callback may wait until its client's operation has returned. A
-/// coordinator is the service's and valid during the callback. Each is optional.
+/// Receives events of coordinators, on threads of the service. Callbacks to one delegate never overlap and are in the
+/// order of the events. To avoid deadlocks, the service holds no lock during a callback, which may call the service,
+/// and no operation of the service waits for a callback, which may wait for an operation to return. The service owns
+/// the coordinator, a reference that is valid only during the callback. Implementing a callback is optional.
 class InstallObserverDelegate {
  public:
   virtual ~InstallObserverDelegate() = default;
 
-  /// coordinatorDidInstallPlaceholder: the home screen shows it now; or could not, and then the coordinator has an
-  /// error.
+  /// coordinatorDidInstallPlaceholder: the home screen shows the placeholder or, if the coordinator has an error, could
+  /// not show it.
   virtual void coordinatorDidInstallPlaceholder(InstallCoordinator& coordinator) { static_cast<void>(coordinator); }
 
-  /// coordinatorDidCompleteSuccessfully: the install has ended: badly, in spite of the name, when the coordinator has
-  /// an error.
+  /// coordinatorDidCompleteSuccessfully: the install has ended. Despite the name, it failed if the coordinator has an
+  /// error.
   virtual void coordinatorDidCompleteSuccessfully(InstallCoordinator& coordinator) { static_cast<void>(coordinator); }
 
-  /// coordinatorShouldPrioritize: somebody wants this app before the others.
+  /// coordinatorShouldPrioritize: this app is to be installed before the others.
   virtual void coordinatorShouldPrioritize(InstallCoordinator& coordinator) { static_cast<void>(coordinator); }
 
-  /// coordinatorShouldPause:, coordinatorShouldResume: somebody wants its package to wait, or not to wait any more.
+  /// coordinatorShouldPause:, coordinatorShouldResume: delivery of the package is to be suspended or resumed.
   virtual void coordinatorShouldPause(InstallCoordinator& coordinator) { static_cast<void>(coordinator); }
   virtual void coordinatorShouldResume(InstallCoordinator& coordinator) { static_cast<void>(coordinator); }
 
-  /// coordinatorShouldBeginRestoringUserData: the app is there, and its data may come.
+  /// coordinatorShouldBeginRestoringUserData: the app is installed; its data can be restored.
   virtual void coordinatorShouldBeginRestoringUserData(InstallCoordinator& coordinator) {
     static_cast<void>(coordinator);
   }
 
-  /// coordinator:canceledWithReason:client: `client` has ended the install. Not told to those whose coordinator it is
-  /// when `client` is its creator: who cancels knows it.
+  /// coordinator:canceledWithReason:client: `client` cancelled the install. Not delivered to the creator's observers if
+  /// the creator itself cancelled.
   virtual void coordinatorCanceledWithReason(InstallCoordinator& coordinator, const Error& reason,
                                              ClientIdentity client) {
     static_cast<void>(coordinator), static_cast<void>(reason), static_cast<void>(client);
   }
 
-  /// promiseDidBeginFulfillmentWithIdentifier: the first part of a promise has come.
+  /// promiseDidBeginFulfillmentWithIdentifier: the first part of a promise was delivered.
   virtual void promiseDidBeginFulfillmentWithIdentifier(std::uint64_t identifier) { static_cast<void>(identifier); }
 };
 
-/// A connection that reports the coordinators of some clients to a delegate for as long as it lives. When its
-/// destructor has returned no callback runs on another thread and none will begin; on a callback's own thread it
-/// returns at once.
+/// A connection that reports coordinators to a delegate. The destructor ends it: blocks until the running callback has
+/// returned, unless called from that callback; no further callback begins.
 class InstallObserver {
  public:
   virtual ~InstallObserver() = default;

@@ -1,4 +1,4 @@
-// How an app is to be installed.
+// Options of a coordinated install.
 #pragma once
 
 #include <cstdint>
@@ -11,7 +11,7 @@
 
 namespace appsync::platform {
 
-/// What the store says of an app, as its metadata file has it. The service keeps it with the installed app.
+/// The contents of an app's store metadata file. The service stores them with the installed app.
 class StoreMetadata {
  public:
   [[nodiscard]] static StoreMetadata initWithDictionary(plist::Dictionary dictionary) {
@@ -26,17 +26,17 @@ class StoreMetadata {
   plist::Dictionary dictionary_;
 };
 
-/// What a coordinator is told once, before its install begins.
+/// Set once for each coordinator, before its install begins. A plain value.
 class InstallOptions {
  public:
   [[nodiscard]] const std::optional<StoreMetadata>& storeMetadata() const { return storeMetadata_; }
   void setStoreMetadata(std::optional<StoreMetadata> metadata) { storeMetadata_ = std::move(metadata); }
 
-  /// Why the app is installed.
+  /// The reason for the install.
   [[nodiscard]] TSInstallType installType() const { return installType_; }
   void setInstallType(TSInstallType type) { installType_ = type; }
 
-  /// What the app is installed into, in the service's own numbering. It is kept, and shown to whoever asks.
+  /// The target of the install, a number defined by the service, which only stores it.
   [[nodiscard]] std::uint64_t installTargetType() const { return installTargetType_; }
   void setInstallTargetType(std::uint64_t type) { installTargetType_ = type; }
 

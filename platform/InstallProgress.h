@@ -1,4 +1,4 @@
-// The registry's record of how far one app's install is.
+// Progress of one app's install.
 #pragma once
 
 #include <cstdint>
@@ -8,11 +8,11 @@
 
 namespace appsync::platform {
 
-/// How far an install is, as the home screen shows it. Live: a change is seen by everyone who holds a record of the
-/// same app, and `completedUnitCount / totalUnitCount` is what a person sees.
+/// Progress of an install as the home screen shows it: `completedUnitCount / totalUnitCount`. All progress objects of
+/// one app share the same state.
 ///
-/// Shared ownership (the registry hands out shared pointers); it may outlive the install, and setters are then without
-/// effect. Threads: any, at any time. Nothing fails.
+/// Ownership is shared with the registry. A progress may outlive the install; its setters then have no effect.
+/// Thread-safe. No operation fails.
 class InstallProgress {
  public:
   virtual ~InstallProgress() = default;
@@ -23,14 +23,14 @@ class InstallProgress {
   [[nodiscard]] virtual TSInstallPhase installPhase() const = 0;
   virtual void setInstallPhase(TSInstallPhase phase) = 0;
 
-  /// Units in the whole of the current phase. A new record's count is the registry's choice.
+  /// Number of units of the current phase. The registry chooses the initial number.
   [[nodiscard]] virtual std::int64_t totalUnitCount() const = 0;
   virtual void setTotalUnitCount(std::int64_t units) = 0;
 
   [[nodiscard]] virtual std::int64_t completedUnitCount() const = 0;
   virtual void setCompletedUnitCount(std::int64_t units) = 0;
 
-  /// Gives the install up: its state becomes Canceled, and observers of the registry hear of it.
+  /// Cancels the install: sets the state to Canceled and notifies the registry's observers.
   virtual void cancel() = 0;
 
   /// For logs.

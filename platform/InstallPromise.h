@@ -1,4 +1,4 @@
-// What a client of the install-coordination service promises to deliver.
+// Deliveries that clients of the install-coordination service promise.
 #pragma once
 
 #include <cstdint>
@@ -11,48 +11,55 @@
 
 namespace appsync::platform {
 
-/// Something that an install waits for. Made by `InstallCoordination`, attached to one coordinator or placeholder, and
-/// shared by the client that made it and the service: either may let go of it at any time.
+/// A delivery that an install waits for. Created by `InstallCoordination` and attached to one coordinator or
+/// placeholder. Ownership is shared between the client and the service; either may release its share at any time.
 ///
-/// Threads: any. A change after the promise was cancelled, or after what it belongs to has ended, does nothing.
+/// Thread-safe. Setters have no effect once the promise is cancelled or the coordinator or placeholder that it is
+/// attached to has ended.
 class InstallPromise {
  public:
   virtual ~InstallPromise() = default;
 
   [[nodiscard]] virtual std::string name() const = 0;
-  /// Who made it.
+  /// The client that created the promise.
   [[nodiscard]] virtual ClientIdentity client() const = 0;
-  /// Bytes; 0 when not known.
+  /// In bytes; 0 if unknown.
   [[nodiscard]] virtual std::uint64_t diskSpaceNeeded() const = 0;
 
-  /// How much has been delivered, from 0 to 1, for people to see. What is out of range counts as the nearer end.
+  /// The fraction delivered, from 0 to 1, as shown to the user. Values out of range are clamped.
   [[nodiscard]] virtual double percentComplete() const = 0;
   virtual void setPercentComplete(double fraction) = 0;
 
-  /// Fulfilled. There is no way back: a promise once complete stays so.
+  /// Whether the promise is fulfilled. A complete promise stays complete; `setComplete(false)` then has no effect.
   [[nodiscard]] virtual bool isComplete() const = 0;
   virtual void setComplete(bool complete) = 0;
 
-  /// Takes the promise back. If it is attached, what it is attached to can no longer be completed by it and `client`
-  /// must be the one that made it.
+  /// Cancels the promise, which then can no longer be fulfilled. Fails if the promise is attached and `client` is not
+  /// its creator.
   virtual Status cancelForReason(const Error& reason, ClientIdentity client) = 0;
 
   /// For logs.
   [[nodiscard]] virtual std::string description() const = 0;
 };
 
-/// A promise that is fulfilled by a file or folder. While it is not complete the file is the client's. Once complete
-/// the file of an app asset is the service's, which removes it when the install has ended, well or badly; an icon's
-/// file is read until its placeholder ends, and stays the client's.
+/// A promise of a file or directory. The client owns the file until the promise is complete. The service then owns the
+/// file of an app asset and deletes it when the install has ended, successfully or not. The client keeps ownership of
+/// an icon's file, which the service reads until the placeholder ends.
 class PromisedTransferToPath : public InstallPromise {
  public:
-  /// A device path; none while it is not known. It is needed at the latest when the promise becomes complete: an app
-  /// whose package has none then, or one that leads to nothing, fails to install.
+  /// The device path, or nullopt if it is not known yet. It must be set before the promise is complete: the install
+  /// fails if there is no path by then, or nothing is at the path.
   [[nodiscard]] virtual std::optional<FileLocation> transferPath() const = 0;
   virtual void setTransferPath(const FileLocation& path) = 0;
 };
 
-/// A promise that somebody fulfils elsewhere: the service only hears that it is complete.
+/// A promise that is fulfilled outside the service, which only learns that it is complete.
 class PromisedOutOfBandTransfer : public InstallPromise {};
+
+/// Marks `promise` as delivered in full: fraction 1, then complete.
+inline void fulfil(InstallPromise& promise) {
+  promise.setPercentComplete(1.0);
+  promise.setComplete(true);
+}
 
 }  // namespace appsync::platform

@@ -1,12 +1,11 @@
-// The registry's enumerations: why an app is being installed, and how far it is.
+// The registry's enumerations.
 #pragma once
 
 #include <cstdint>
 
 namespace appsync::platform {
 
-/// Why an app is being installed. Registries report values beyond the named ones too: 8 stands for an app that was
-/// demoted on purpose.
+/// The reason for an install. A registry may report other values too.
 enum class TSInstallType : std::uint64_t {
   None = 0,
   StoreDownload = 1,
@@ -16,10 +15,10 @@ enum class TSInstallType : std::uint64_t {
   AutomaticUpdate = 5,
   Migration = 6,
   Downgrade = 7,
-  IntentionalDowngrade = 8,
+  IntentionalDowngrade = 8,  ///< the user demoted the app
 };
 
-/// Where an install stands. The order counts: what is below Canceled can still be cancelled.
+/// The state of an install. Values below Canceled are those that can be cancelled.
 enum class TSInstallState : std::uint64_t {
   Waiting = 0,
   Active = 1,
@@ -29,7 +28,7 @@ enum class TSInstallState : std::uint64_t {
   Finished = 5,
 };
 
-/// What an active install is doing.
+/// The phase of an active install.
 enum class TSInstallPhase : std::uint64_t {
   Loading = 0,
   Installing = 1,
@@ -37,9 +36,9 @@ enum class TSInstallPhase : std::uint64_t {
   InstallingPlaceholder = 3,
 };
 
-/// Which bundles a walk of the registry visits.
+/// The bundles that an enumeration visits.
 enum class BundleKind : std::uint32_t {
-  /// Every bundle: apps and placeholders, of users and of the system; also bundles that are no apps.
+  /// Every bundle: user and system apps, installed or placeholder, and bundles that are not apps.
   all = 0,
   /// Every user bundle, installed or placeholder.
   user = 1,

@@ -1,4 +1,4 @@
-// The platform's own key texts: what stands in info dictionaries, install options and registry records.
+// Keys and values of info dictionaries, install options and registry records.
 #pragma once
 
 #include <string_view>
@@ -12,22 +12,22 @@ inline constexpr std::string_view kBundleDisplayNameKey = "BundleDisplayName";
 inline constexpr std::string_view kBundleExecutableKey = "BundleExecutable";
 inline constexpr std::string_view kBundleIconFileKey = "BundleIconFile";
 
-/// Install options: what kind of package `AppRegistry::installApplication` is given.
+/// Install option: the kind of the package.
 inline constexpr std::string_view PackageTypeKey = "PackageType";
 inline constexpr std::string_view kPackageTypeCustomer = "Customer";
 inline constexpr std::string_view PackageTypePlaceholder = "Placeholder";
 
-/// Install option: the `TSInstallType` that the app's record is to carry, a number.
+/// Install option: a number, the `TSInstallType` of the app's record.
 inline constexpr std::string_view kInstallTypeKey = "TSInstallType";
 
-/// Install options of restored apps: store metadata and licence data, each as bytes.
+/// Install options of restored apps: store metadata and licence as data.
 inline constexpr std::string_view kStoreMetadataKey = "StoreMetadata";
 inline constexpr std::string_view kLicenceDataKey = "LicenceData";
 
-/// Uninstall option: a boolean; when true only a placeholder is removed, never an installed app.
+/// Uninstall option: a boolean; true removes a placeholder only, never an installed app.
 inline constexpr std::string_view kUninstallPlaceholdersOnlyKey = "UninstallPlaceholdersOnly";
 
-/// `AppRecord::applicationType` of apps that users and the system install.
+/// Values of `AppRecord::applicationType` for apps installed by the user and by the system.
 inline constexpr std::string_view kApplicationTypeUser = "User";
 inline constexpr std::string_view kApplicationTypeSystem = "System";
 

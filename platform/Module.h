@@ -1,4 +1,4 @@
-// How a daemon gets its client out of a loadable module.
+// The entry point through which a daemon creates the client of a loadable module.
 #pragma once
 
 #include <cstdint>
@@ -9,36 +9,36 @@
 
 namespace appsync::platform {
 
-/// Goes up with every change of base/ or platform/ after which both sides must be compiled anew: a virtual function, a
-/// field, what an inline function does.
+/// Incremented with every change to base/, plist/ or platform/ that requires both sides to be recompiled: to a virtual
+/// function, a data member, or the behaviour of an inline function.
 inline constexpr std::uint32_t kModuleInterfaceVersion = 1;
 
-/// The only symbol of a module, for `dlsym`. Its type is `ModuleEntryPoint`.
+/// The only symbol that a module exports, of type `ModuleEntryPoint`.
 inline constexpr const char* kModuleEntryPointName = "appsyncMakeClient";
 
-/// What a module says to a daemon. It keeps this form for ever: each side reads it before it knows that the two agree
-/// on anything else.
+/// The module's answer to a daemon. This layout never changes: both sides read it before they have compared versions.
 struct ModuleAnswer {
-  std::uint32_t interfaceVersion = 0;  ///< the one that the module was built for, whatever the daemon's
-  /// Why there is no client, in UTF-8 with a null behind; empty when there is one. A long text may be cut anywhere,
-  /// also in the middle of a character.
+  std::uint32_t interfaceVersion = 0;  ///< the module's `kModuleInterfaceVersion`
+  /// The reason why there is no client: null-terminated UTF-8, empty if there is one. A long text is truncated,
+  /// possibly within a character.
   char refusal[252] = {};
 };
 
 extern "C" {
 
-/// What a module defines: makes a new client at each call, or says why not in `answer`, which it always fills. Throws
-/// nothing. Threads: any.
+/// Defined by the module. Creates a new client with each call. Always fills in `*answer`; on failure `*client` stays
+/// null and `answer->refusal` gives the reason. Throws nothing. Thread-safe.
 ///
-/// Versions: `interfaceVersion` is the daemon's. A module of another one looks at nothing but `answer`, and refuses; a
-/// daemon uses no client of a module whose answer names another one. The two must be of one release and built with the
-/// same C++ standard library and ABI, whose objects and memory pass between them.
+/// Versions: `interfaceVersion` is the daemon's. If it differs from its own, the module accesses only `answer` and
+/// refuses; a daemon must not use a client if `answer->interfaceVersion` differs from its own version. Both must be
+/// built from the same release, with the same C++ standard library and ABI, because objects and memory pass between
+/// them.
 ///
-/// Ownership: `*client`, empty before, becomes a share of the client. Queued work and callbacks have shares too, so the
-/// client may outlive the daemon's, but never `platform`.
+/// Ownership: the daemon shares ownership of `*client`, which must be null before. Queued operations and callbacks hold
+/// shares too, so the client may outlive the daemon's share. `platform` must outlive the client.
 ///
-/// Loading: `dlopen` with RTLD_NOW | RTLD_LOCAL. `dlclose` may come at any time and frees nothing: threads and values
-/// of a module may outlive its clients, so its code stays until the process ends.
+/// Loading: `dlopen` with RTLD_NOW | RTLD_LOCAL. `dlclose` is allowed at any time and unloads nothing: the module's
+/// code stays until the process exits, because its threads and values may outlive its clients.
 [[gnu::visibility("default")]] void appsyncMakeClient(std::uint32_t interfaceVersion, Platform* platform,
                                                       std::shared_ptr<ZTClient>* client, ModuleAnswer* answer) noexcept;
 }

@@ -1,4 +1,4 @@
-// What stands on the home screen for an app whose package is still to come.
+// The home screen's representation of an app whose package is not installed yet.
 #pragma once
 
 #include <memory>
@@ -16,11 +16,11 @@
 
 namespace appsync::platform {
 
-/// What a placeholder shows of the app to come, beside its name and icon.
+/// Attributes of a placeholder in addition to name and icon. A plain value.
 class PlaceholderAttributes {
  public:
   PlaceholderAttributes() = default;
-  /// Seeded with the app's whole info dictionary, which may be empty.
+  /// `info` is the app's complete info dictionary; it may be empty.
   [[nodiscard]] static PlaceholderAttributes initWithInfoPlistDictionary(plist::Dictionary info) {
     PlaceholderAttributes attributes;
     attributes.infoDictionary_ = std::move(info);
@@ -29,7 +29,7 @@ class PlaceholderAttributes {
 
   [[nodiscard]] const plist::Dictionary& infoDictionary() const { return infoDictionary_; }
 
-  /// Whether the app may not be opened even when it is installed.
+  /// Whether the app must not be launched even after it is installed.
   [[nodiscard]] bool launchProhibited() const { return launchProhibited_; }
   void setLaunchProhibited(bool prohibited) { launchProhibited_ = prohibited; }
 
@@ -48,15 +48,15 @@ class PlaceholderAttributes {
   std::optional<std::string> bundleVersion_;
 };
 
-/// Made by `InstallCoordination`, configured by the client that made it, then given to a coordinator with
-/// `InstallCoordinator::setPlaceholderPromise`, after which only the coordinator ends it. One that is dropped without
-/// having been given away leaves nothing behind.
+/// Created by `InstallCoordination`, configured by its client and passed to
+/// `InstallCoordinator::setPlaceholderPromise`. From then on only the coordinator can end it. Destroying one that was
+/// never passed on leaves nothing behind.
 ///
-/// The home screen shows it once it is its coordinator's and its configuration is complete; one whose configuration
-/// never is complete is not shown, and does not keep the app from being installed.
+/// The home screen shows the placeholder once it belongs to a coordinator and its configuration is complete. If the
+/// configuration is never completed, the placeholder is not shown, but the app is installed nevertheless.
 ///
-/// Threads: one at a time. Every operation fails, and changes nothing, once the placeholder was cancelled; those that
-/// configure it also once its configuration is complete. Errors: `kInstallCoordinationErrorDomain`.
+/// Not thread-safe. Operations fail and change nothing once the placeholder is cancelled; the set operations also fail
+/// once the configuration is complete. Errors: `kInstallCoordinationErrorDomain`.
 class Placeholder {
  public:
   virtual ~Placeholder() = default;
@@ -66,17 +66,17 @@ class Placeholder {
   [[nodiscard]] virtual TSInstallType installType() const = 0;
   [[nodiscard]] virtual ClientIdentity client() const = 0;
 
-  /// The icon, a PNG picture. Without one the service draws something.
+  /// Sets the promise of the icon, a PNG file. Without it the service shows a default icon.
   [[nodiscard]] virtual Status setIconPromise(std::shared_ptr<PromisedTransferToPath> promise) = 0;
   [[nodiscard]] virtual Status setPlaceholderAttributes(const PlaceholderAttributes& attributes) = 0;
-  /// None says that there is no store metadata.
+  /// Sets the store metadata; nullopt means that the app has none.
   [[nodiscard]] virtual Status setMetadata(const std::optional<StoreMetadata>& metadata) = 0;
-  /// The app's licence. The bytes are needed only during the call.
+  /// Sets the app's licence; the bytes are needed only during the call.
   [[nodiscard]] virtual Status setSinfData(ByteView licence) = 0;
   [[nodiscard]] virtual Status setConfigurationComplete() = 0;
 
-  /// Gives the placeholder up, and its icon promise with it, in the name of the client that made it. One that is a
-  /// coordinator's goes with the coordinator only: then this fails.
+  /// Cancels the placeholder and its icon promise. `client` is the placeholder's creator. Fails if the placeholder
+  /// belongs to a coordinator, which alone can end it.
   virtual Status cancelForReason(const Error& reason, ClientIdentity client) = 0;
 
   /// For logs.

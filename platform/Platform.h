@@ -1,4 +1,4 @@
-// Every service that the plug-in reaches the world through, in one bundle.
+// All platform services that the plug-in uses.
 #pragma once
 
 #include <memory>
@@ -22,16 +22,16 @@
 
 namespace appsync::platform {
 
-/// A device maker implements this, and with it every service, to run the plug-in on their device.
+/// A port implements this interface and every service in it.
 ///
-/// Each accessor returns the same object every time; all live as long as the bundle, which outlives every object of the
-/// plug-in. Threads: accessors and factories may be called from any thread.
+/// Each accessor always returns the same object, which lives as long as the platform. The platform must outlive every
+/// object of the plug-in. Accessors and factories are thread-safe and never fail.
 class Platform {
  public:
   virtual ~Platform() = default;
 
   [[nodiscard]] virtual SyncFramework& syncFramework() = 0;
-  /// The one device service of the running daemon.
+  /// The daemon's device service.
   [[nodiscard]] virtual ZTDeviceService& sharedInstance() = 0;
   [[nodiscard]] virtual AppRegistry& defaultRegistry() = 0;
   [[nodiscard]] virtual UninstalledAppsList& uninstalledApps() = 0;
@@ -48,7 +48,7 @@ class Platform {
   [[nodiscard]] virtual Clock& clock() = 0;
   [[nodiscard]] virtual Scheduler& scheduler() = 0;
 
-  /// New connections, owned by the caller; never null.
+  /// Return a new connection, never null, owned by the caller.
   [[nodiscard]] virtual std::unique_ptr<BackupManager> makeBackupManager() = 0;
   [[nodiscard]] virtual std::unique_ptr<SoftwareLibrary> makeSoftwareLibrary() = 0;
 };

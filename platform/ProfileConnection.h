@@ -1,17 +1,17 @@
-// Restrictions that profiles place on the device.
+// Restrictions that configuration profiles impose on the device.
 #pragma once
 
 #include <cstdint>
 
 namespace appsync::platform {
 
-/// The restrictions that sync clients ask for.
+/// The settings that sync clients read.
 enum class RestrictionSetting { appInstallationAllowed, appRemovalAllowed };
 
-/// The effective answer over all profiles.
+/// The effective value over all profiles; `unset` if no profile sets it.
 enum class RestrictionValue : std::uint8_t { unset = 0, yes = 1, no = 2 };
 
-/// Threads: any. The answer may change from one call to the next.
+/// Thread-safe. Values may change between calls. No operation fails.
 class ProfileConnection {
  public:
   virtual ~ProfileConnection() = default;

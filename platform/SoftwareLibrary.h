@@ -8,14 +8,14 @@
 
 namespace appsync::platform {
 
-/// A connection to the store's library. Threads: any, one at a time for each connection. Destroying it after the
-/// completion has begun is allowed, also on the completion's thread.
+/// A connection to the store's library. Not thread-safe; different connections may be used concurrently. A connection
+/// must not be destroyed before its completion has begun; the completion may destroy it.
 class SoftwareLibrary {
  public:
   virtual ~SoftwareLibrary() = default;
 
-  /// Brings the receipts of installed apps up to date. Returns at once; `completion` runs exactly once, on a thread of
-  /// the library's own or before this returns, with the error if there was one.
+  /// Updates the receipts of installed apps asynchronously. Calls `completion` exactly once, on a thread of the library
+  /// or before this returns, with the error or nullopt.
   virtual void refreshReceipts(std::function<void(const std::optional<Error>& error)> completion) = 0;
 };
 

@@ -1,4 +1,4 @@
-// The files through which host and plug-in meet, and what stands in them.
+// Files and keys shared by the host and the plug-in. All paths are device paths.
 #pragma once
 
 #include <cstdint>
@@ -8,14 +8,14 @@
 
 namespace appsync {
 
-/// The one dataclass that this plug-in syncs.
+/// The only dataclass that the plug-in syncs.
 inline constexpr std::string_view kApplicationDataclass = "Application";
 
-/// Where the host puts its instructions for this dataclass, and packages beside it.
+/// The host writes packages to the public staging directory and its instructions for this dataclass to a subdirectory.
 inline constexpr std::string_view kPublicStaging = "/var/mobile/Media/PublicStaging";
 inline constexpr std::string_view kStagingFolder = "/var/mobile/Media/PublicStaging/ApplicationSync";
 
-/// The plug-in's own folder. In it, the work area: the host's staging folder as it was taken over.
+/// The plug-in's directory, and in it the work area: the host's staging directory, moved there by the plug-in.
 inline constexpr std::string_view kSyncFolder = "/var/mobile/Library/ApplicationSync";
 inline constexpr std::string_view kWorkArea = "/var/mobile/Library/ApplicationSync/HarvoStuff";
 
@@ -29,7 +29,7 @@ inline constexpr std::string_view kLastSyncStatePath = "/var/mobile/Library/Appl
 inline constexpr std::string_view kAssetSortOrderPath = "/var/mobile/Library/ApplicationSync/AssetSortOrder.plist";
 inline constexpr std::string_view kIconScratchFolder = "/var/mobile/Library/ApplicationSync/Icons";
 
-/// Files beside an app's bundle, or beside what the host staged for it.
+/// Names of files next to an app's bundle, or among the files that the host staged for it.
 inline constexpr std::string_view kInfoPlistName = "Info.plist";
 inline constexpr std::string_view kStoreMetadataName = "HarvoMetadata.plist";
 inline constexpr std::string_view kArtworkName = "HarvoArtwork";
@@ -40,7 +40,7 @@ inline constexpr std::uint64_t kMaximumMetadataBytes = std::uint64_t{16} << 20;
 /// Key of the flag in "Info.plist" that keeps an app from being launched.
 inline constexpr std::string_view kLaunchProhibitedKey = "TSApplicationLaunchProhibited";
 
-/// Keys of a todo-list entry, and the words of its "operation".
+/// Keys of a todo-list entry, and values of its "operation".
 namespace todo {
 inline constexpr std::string_view kIdentifier = "identifier";
 inline constexpr std::string_view kOperation = "operation";
@@ -55,8 +55,8 @@ inline constexpr std::string_view kInstalled = "INSTALLED";
 inline constexpr std::string_view kFailed = "FAILED";
 }  // namespace todo
 
-/// Whether `value`, which may be null, may serve as an identifier or a path from the host: a string without "/.." in
-/// it.
+/// Returns true if `value`, untrusted input that may be null, is acceptable as an identifier or path: a string that
+/// does not contain "/..".
 [[nodiscard]] bool isValidBundleIdentifier(const plist::Value* value);
 [[nodiscard]] bool isValidBundleIdentifier(std::string_view text);
 

@@ -1,4 +1,4 @@
-// What the daemon's sync framework offers to its clients.
+// The daemon's sync framework.
 #pragma once
 
 #include <memory>
@@ -12,21 +12,20 @@
 
 namespace appsync::platform {
 
-/// The sync framework's error domain.
 inline constexpr std::string_view kZTErrorDomain = "ZTError";
 
-/// Threads: every operation may be called from any thread at any time.
+/// Thread-safe. No operation fails.
 class SyncFramework {
  public:
   virtual ~SyncFramework() = default;
 
-  /// The log's category of that number; lives as long as the framework. Cheap: clients call it for every message.
+  /// Returns log category `number`, which lives as long as the framework. Must be cheap: called for every message.
   [[nodiscard]] virtual LogCategory& ZTGetLogCategory(int number) = 0;
 
-  /// Whether the framework expects that what failed with `error` may succeed when it is tried again.
+  /// Returns true if an operation that failed with `error` may succeed when retried.
   [[nodiscard]] virtual bool ZTIsRecoverableError(const Error& error) = 0;
 
-  /// A new record of a package that is to come to the device. Never null.
+  /// Returns a new asset for a package to be sent to the device. Never null.
   [[nodiscard]] virtual std::shared_ptr<ZTAsset> downloadAssetWithIdentifier(std::string_view identifier,
                                                                              std::string_view dataclass,
                                                                              std::optional<std::string> prettyName) = 0;

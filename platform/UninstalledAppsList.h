@@ -1,4 +1,4 @@
-// The installer's memory of removed apps.
+// The installer's list of removed apps.
 #pragma once
 
 #include <optional>
@@ -9,17 +9,17 @@
 
 namespace appsync::platform {
 
-/// Real apps that were removed from the device, by whomever, and not cleared since. Installing an app again takes it
-/// off. Outlives the process. Threads: any.
+/// Installed apps that were removed from the device, by any client, and not cleared since. Reinstalling an app removes
+/// it from the list; removed placeholders are never in it. Persistent. Thread-safe.
 class UninstalledAppsList {
  public:
   virtual ~UninstalledAppsList() = default;
 
-  /// The removed apps by bundle identifier; the values are the installer's own. Nothing when the list cannot be had.
-  /// The caller owns the answer.
+  /// Returns the removed apps; keys are bundle identifiers, values are defined by the installer. Returns nullopt if the
+  /// list is not available.
   [[nodiscard]] virtual std::optional<plist::Dictionary> lookupUninstalled() = 0;
 
-  /// Takes these identifiers off; unknown ones do not matter. All or none. Returns 0, or an error number.
+  /// Removes these identifiers from the list; ignores unknown ones. Atomic. Returns 0, or an error number on failure.
   [[nodiscard]] virtual int clearUninstalled(const std::vector<std::string>& bundleIdentifiers) = 0;
 };
 

@@ -1,4 +1,4 @@
-// The sync framework's record of one application package to transfer.
+// The sync framework's record of one app package to transfer.
 #pragma once
 
 #include <cstdint>
@@ -11,7 +11,7 @@
 
 namespace appsync::platform {
 
-/// Parts of an asset, as bits in the variant option "AssetParts" and in `completedAssetParts`.
+/// Parts of an asset: bits of the variant option "AssetParts" and of `completedAssetParts`.
 inline constexpr std::uint32_t kZTAssetPartApplication = 1;
 inline constexpr std::uint32_t kZTAssetPartApplicationData = 2;
 inline constexpr std::uint32_t kZTAssetPartsAll = kZTAssetPartApplication | kZTAssetPartApplicationData;
@@ -20,10 +20,10 @@ inline constexpr std::uint32_t kZTAssetPartsAll = kZTAssetPartApplication | kZTA
 inline constexpr std::string_view kAssetVersionKey = "Version";
 inline constexpr std::string_view kAssetPartsKey = "AssetParts";
 
-/// One application package that the host is to send, or has sent. Shared between plug-in and daemon; one thread at a
-/// time may change it, and after a transfer was reported as ended only the plug-in does.
+/// An app package that the host is to send or has sent. Ownership is shared between plug-in and daemon. Not
+/// thread-safe; only the plug-in may change an asset whose transfer was reported as ended.
 ///
-/// All paths are device paths; fractions run from 0 to 1.
+/// Paths are device paths; fractions range from 0 to 1.
 class ZTAsset {
  public:
   ZTAsset(std::string identifier, std::string dataclass, std::optional<std::string> prettyName)
@@ -35,32 +35,32 @@ class ZTAsset {
   /// The app's bundle identifier.
   [[nodiscard]] const std::string& identifier() const { return identifier_; }
   [[nodiscard]] const std::string& dataclass() const { return dataclass_; }
-  /// The name to show to people.
+  /// The name shown to the user.
   [[nodiscard]] const std::optional<std::string>& prettyName() const { return prettyName_; }
 
-  /// The received package. A relative path is relative to the public staging folder.
+  /// Path of the received package. A relative path is relative to the public staging directory.
   [[nodiscard]] const std::optional<std::string>& path() const { return path_; }
   void setPath(std::optional<std::string> path) { path_ = std::move(path); }
 
   [[nodiscard]] const std::optional<FileLocation>& icon() const { return icon_; }
   void setIcon(std::optional<FileLocation> icon) { icon_ = std::move(icon); }
 
-  /// Whether the asset belongs to a restore. A daemon that reclassifies assets while they are on their way may answer
-  /// differently from one call to the next.
+  /// Whether the asset belongs to a restore. The value may change between calls, because a daemon may reclassify an
+  /// asset during its transfer.
   [[nodiscard]] virtual bool isRestore() const { return isRestore_; }
   void setIsRestore(bool isRestore) { isRestore_ = isRestore; }
 
-  /// Whether the package comes to the device (rather than leaving it).
+  /// Whether the package is sent to the device, not from it.
   [[nodiscard]] bool isDownload() const { return isDownload_; }
   void setIsDownload(bool isDownload) { isDownload_ = isDownload; }
 
-  /// "Version" and "AssetParts".
+  /// The options "Version" and "AssetParts".
   [[nodiscard]] const plist::Dictionary& variantOptions() const { return variantOptions_; }
   void setVariantOptions(plist::Dictionary options) { variantOptions_ = std::move(options); }
-  /// The first of them, of whichever type it was given; null when there is none.
+  /// Returns the option "Version", of any type, or null if it is not set.
   [[nodiscard]] const plist::Value* version() const { return variantOptions_.find(kAssetVersionKey); }
 
-  /// The parts that have arrived.
+  /// The parts that were received.
   [[nodiscard]] std::uint32_t completedAssetParts() const { return completedAssetParts_; }
   void setCompletedAssetParts(std::uint32_t parts) { completedAssetParts_ = parts; }
 
@@ -70,7 +70,7 @@ class ZTAsset {
   [[nodiscard]] const std::optional<std::string>& storePlist() const { return storePlist_; }
   void setStorePlist(std::optional<std::string> path) { storePlist_ = std::move(path); }
 
-  /// The store's product identifier; 0 when there is none.
+  /// The store's product identifier, or 0 if there is none.
   [[nodiscard]] std::int64_t storePID() const { return storePID_; }
   void setStorePID(std::int64_t productIdentifier) { storePID_ = productIdentifier; }
 
@@ -79,7 +79,7 @@ class ZTAsset {
   [[nodiscard]] double installProgress() const { return installProgress_; }
   void setInstallProgress(double fraction) { installProgress_ = fraction; }
 
-  /// The asset in a few words, for logs.
+  /// For logs.
   [[nodiscard]] std::string shortDescription() const { return dataclass_ + "/" + identifier_; }
 
  private:

@@ -1,4 +1,4 @@
-// What the sync daemon asks of a client that syncs one dataclass.
+// The interface through which the sync daemon drives a client that syncs one dataclass.
 #pragma once
 
 #include <cstdint>
@@ -20,28 +20,28 @@ namespace appsync::platform {
 using Assets = std::vector<std::shared_ptr<ZTAsset>>;
 using ProgressCallback = std::function<void(double fraction)>;
 
-/// What the daemon posts, system-wide, once it is up and its clients are made.
+/// Posted by the daemon, system-wide, once it has started and created its clients.
 inline constexpr std::string_view kZTStartupCompleteNotification = "com.corvel.zeph.ZTStartupCompleteNotification";
 
-/// The restore type of a device that a host has restored. Others are the daemon's own.
+/// The restore type of a device that was restored by a host. The daemon defines the others.
 inline constexpr std::int32_t kRestoreTypeHost = 2;
 
 /// Keys of `installedAssetMetrics`, each with an unsigned 64-bit number.
 inline constexpr std::string_view kMetricCount = "_Count";                  ///< items of the dataclass
-inline constexpr std::string_view kMetricPhysicalSize = "_PhysicalSize";    ///< bytes that they take
+inline constexpr std::string_view kMetricPhysicalSize = "_PhysicalSize";    ///< bytes that they occupy
 inline constexpr std::string_view kMetricPurgeableSize = "_PurgeableSize";  ///< of these, bytes that can be freed
 
-/// The daemon drives a client with these calls, one sync at a time and in this order: `prepareForSyncWithHostAnchor`,
-/// `installedAssets`, `reconcileSync`, `outstandingAssetTransfers`, the transfers' reports,
-/// `assetTransferEndedWithSuccess`, `syncEndedWithSuccess`. A sync that breaks off, wherever it does, still gets the
-/// last two, with false: a sync that was refused as well. `clearSyncData` and the questions may come at any time
-/// between syncs. `reconcileRestoreOfType` comes once after a restore, before the first sync.
+/// A sync consists of these calls, in this order: `prepareForSyncWithHostAnchor`, `installedAssets`, `reconcileSync`,
+/// `outstandingAssetTransfers`, `assetTransferUpdatedProgress` and `assetTransferSucceeded` for each asset,
+/// `assetTransferEndedWithSuccess`, `syncEndedWithSuccess`. If a sync is aborted or refused at any point, the daemon
+/// still calls the last two, with false. Syncs do not overlap. `clearSyncData` and the queries may be called at any
+/// time between syncs; `reconcileRestoreOfType` is called once after a restore, before the first sync.
 ///
-/// Threads: calls come from the daemon's threads, not two at once, but for the reports on different assets' transfers
-/// of which several may run side by side. They run synchronously; `assetTransferEndedWithSuccess` blocks until all
-/// installs are done and `reconcileRestoreOfType` waits for placeholders, so none may be made from work of the client's
-/// own. Assets are never null, and a transfer that failed always comes with an error: without one a client would take
-/// the package for whole. Errors: slots may be null; only a false result makes what is in one an answer.
+/// Threads: the daemon calls from its own threads, one call at a time, except that the reports of different assets'
+/// transfers may be concurrent. All calls are synchronous. `assetTransferEndedWithSuccess` blocks until all installs
+/// have ended and `reconcileRestoreOfType` waits for placeholders; to avoid a deadlock, no call may be made from the
+/// client's own threads. Assets are never null. A failed transfer must have an error: without one the client treats the
+/// package as complete. Error slots may be null and are meaningful only if the result is false.
 class ZTClient {
  public:
   virtual ~ZTClient() = default;
@@ -50,11 +50,11 @@ class ZTClient {
   [[nodiscard]] virtual std::string currentSyncAnchor() = 0;
   virtual bool prepareForSyncWithHostAnchor(std::string_view hostAnchor, const ProgressCallback& progressCallback,
                                             ErrorSlot error) = 0;
-  /// The host's view of what the device holds; see `AppsClient` for the keys.
+  /// Returns the installed assets and the deleted ones, for the host; `AppsClient` documents the keys.
   [[nodiscard]] virtual plist::Dictionary installedAssets() = 0;
   virtual bool reconcileSync(const Assets& assets, std::string_view newAnchor, const ProgressCallback& progressCallback,
                              ErrorSlot error) = 0;
-  /// The packages that the host is to send, in the order in which they are wanted.
+  /// Returns the packages that the host is to send, in the requested order.
   [[nodiscard]] virtual Assets outstandingAssetTransfers() = 0;
   virtual void assetTransferUpdatedProgress(const std::shared_ptr<ZTAsset>& asset, double fraction) = 0;
   virtual void assetTransferSucceeded(const std::shared_ptr<ZTAsset>& asset, bool succeeded,
@@ -63,19 +63,19 @@ class ZTClient {
   virtual void syncEndedWithSuccess(bool success) = 0;
   virtual void clearSyncData() = 0;
 
-  /// Takes up what the host left on a restored device.
+  /// Processes the host's restore file on a restored device. Returns false and sets `error` on failure.
   virtual bool reconcileRestoreOfType(std::int32_t restoreType, ErrorSlot error) = 0;
 
-  /// What the dataclass takes on the device, by the keys above, and nothing else. The caller's own.
+  /// Returns the storage used by the dataclass: a dictionary of exactly the three keys above.
   [[nodiscard]] virtual plist::Dictionary installedAssetMetrics() = 0;
-  /// The identifiers of the store accounts that own what is on the device, as they were found there: empty, in other
-  /// letters or with blanks around them too. What cannot be read names no account and fails nothing.
+  /// Returns the identifiers of the store accounts that own the dataclass's assets, unmodified: they may be empty,
+  /// differ in case only, or have surrounding blanks. Ignores unreadable metadata.
   [[nodiscard]] virtual std::set<std::string> corvelIDsForAssets() = 0;
-  /// The same accounts with what is known of them, one of each identifier.
+  /// Returns the accounts of `corvelIDsForAssets` with their details, one for each identifier.
   [[nodiscard]] virtual ZTAccountInfos accountsForAssets() = 0;
-  /// The device is about to be backed up.
+  /// Called before the device is backed up.
   virtual void prepareForBackup() = 0;
-  /// The dataclasses that this device cannot sync at all as it is set up; none when there is no such.
+  /// Returns the dataclasses that this device's configuration disables, or nullopt if there are none.
   [[nodiscard]] virtual std::optional<std::set<std::string>> disabledAssetTypes() = 0;
 };
 

@@ -1,4 +1,4 @@
-// The sync daemon's service for the device it runs on.
+// The sync daemon's control over running transfers.
 #pragma once
 
 #include <cstdint>
@@ -11,29 +11,27 @@
 
 namespace appsync::platform {
 
-/// What a client asks of the transfers that the daemon has under way. Assets are matched by their identifier; one made
-/// for the call will do, and asking for one that is not to be transferred does nothing.
-///
-/// Threads: every operation may be called from any thread at any time.
+/// Lets a client reorder and cancel transfers. Assets are matched by identifier, so an asset created for the call is
+/// sufficient. Operations on an asset that is not to be transferred have no effect. Thread-safe.
 class ZTDeviceService {
  public:
-  /// Daemons of some ages lack one or both.
+  /// Operations that older daemons may lack.
   enum class Operation : std::uint8_t { prioritizeAsset, cancelAssetTransferForFailedAsset };
 
-  /// Called once, on a thread of the service's or before `prioritizeAsset` returns, at the latest before the service
-  /// ends; without an error when it was done.
+  /// Called exactly once, on a thread of the service or before `prioritizeAsset` returns, and before the service is
+  /// destroyed; with nullopt on success.
   using Completion = std::function<void(const std::optional<Error>& error)>;
 
   virtual ~ZTDeviceService() = default;
 
-  /// To be asked before one of them is called. The answer does not change.
+  /// Returns whether `operation` may be called. The result never changes.
   [[nodiscard]] virtual bool supports(Operation operation) = 0;
 
-  /// Sends this asset's package before all others whose turn has not come.
+  /// Moves this asset's package ahead of all others whose transfer has not begun.
   virtual void prioritizeAsset(const std::shared_ptr<ZTAsset>& asset, Completion completion) = 0;
 
-  /// Stops sending a package. A transfer that was under way ends as a failed one, reported as such to the client,
-  /// perhaps before this returns.
+  /// Cancels the transfer of this asset's package. A transfer in progress fails and is reported to the client as
+  /// failed, possibly before this returns.
   virtual void cancelAssetTransferForFailedAsset(const std::shared_ptr<ZTAsset>& asset) = 0;
 };
 

@@ -12,19 +12,18 @@
 
 namespace appsync::platform {
 
-/// A store account that owns apps of the device: made empty, filled by whoever reports it, and then the daemon's. A
-/// plain value: copies are independent, and different ones may be used on different threads. Nothing fails.
+/// A store account that owns apps of the device. A plain value.
 class ZTMutableAccountInfo {
  public:
-  /// The account's person identifier in the directory service: an integer or a real number, as it was found.
+  /// The account's person identifier in the directory service: an integer or a real number, unmodified.
   [[nodiscard]] const std::optional<plist::Value>& DSID() const { return dsid_; }
   void setDSID(std::optional<plist::Value> number) { dsid_ = std::move(number); }
 
-  /// The account's identifier, which may be any text, as it was found.
+  /// The account's identifier: any text, unmodified.
   [[nodiscard]] const std::string& corvelID() const { return corvelID_; }
   void setCorvelID(std::string identifier) { corvelID_ = std::move(identifier); }
 
-  /// Its alternative identifier in the directory service.
+  /// The alternative identifier in the directory service.
   [[nodiscard]] const std::optional<std::string>& altDSID() const { return altDSID_; }
   void setAltDSID(std::optional<std::string> identifier) { altDSID_ = std::move(identifier); }
 
@@ -42,7 +41,7 @@ class ZTMutableAccountInfo {
   std::optional<std::string> altDSID_;
 };
 
-/// Orders accounts by the bytes of `corvelID`, and finds one by it.
+/// Orders accounts by the bytes of `corvelID`; enables look-up by `corvelID`.
 struct ByCorvelID {
   using is_transparent = void;  // NOLINT(readability-identifier-naming): the standard library looks for this name.
 
@@ -56,7 +55,7 @@ struct ByCorvelID {
   static std::string_view identifier(const ZTMutableAccountInfo& account) { return account.corvelID(); }
 };
 
-/// At most one account of each `corvelID`, always in the same order.
+/// Accounts with distinct `corvelID`s, in the order of their bytes.
 using ZTAccountInfos = std::set<ZTMutableAccountInfo, ByCorvelID>;
 
 }  // namespace appsync::platform
