@@ -35,7 +35,7 @@ class Observer final : public platform::AppRegistryObserver {
     thread = std::this_thread::get_id();
     if (inReport_) inReport_();
     --inside_;
-    reports.happened();
+    reports.add();
   }
 
   void applicationInstallsDidCancel(const AppRecords& records) override {
@@ -46,7 +46,7 @@ class Observer final : public platform::AppRegistryObserver {
         cancelled_.push_back(record->applicationIdentifier());
     }
     --inside_;
-    cancellations.happened();
+    cancellations.add();
   }
 
   [[nodiscard]] std::vector<std::string> cancelled() {
@@ -54,8 +54,8 @@ class Observer final : public platform::AppRegistryObserver {
     return cancelled_;
   }
 
-  Occurrences reports;
-  Occurrences cancellations;
+  EventCounter reports;
+  EventCounter cancellations;
   std::atomic<std::thread::id> thread;
 
  private:
@@ -111,11 +111,11 @@ TEST_P(AppRegistryContract, AnObserverMayBeAddedAgain) {
 }
 
 TEST_P(AppRegistryContract, RemovalOfAnObserverWaitsForItsRunningCallback) {
-  Occurrences begun;
-  Occurrences mayEnd;
+  EventCounter begun;
+  EventCounter mayEnd;
   std::atomic<bool> hasEnded = false;
   Observer observer(registry(), [&] {
-    begun.happened();
+    begun.add();
     static_cast<void>(mayEnd.waitFor(1));
     hasEnded = true;
   });
@@ -124,19 +124,19 @@ TEST_P(AppRegistryContract, RemovalOfAnObserverWaitsForItsRunningCallback) {
     observer.stop();
     EXPECT_TRUE(hasEnded);
   });
-  mayEnd.happened();
+  mayEnd.add();
 }
 
 TEST_P(AppRegistryContract, AnObserverMayBeRemovedFromItsOwnCallback) {
   platform::AppRegistry& observed = registry();
   Observer* self = nullptr;
-  Occurrences mayBegin;
+  EventCounter mayBegin;
   Observer observer(observed, [&] {
     static_cast<void>(mayBegin.waitFor(1));
     self->stop();
   });
   self = &observer;
-  mayBegin.happened();
+  mayBegin.add();
   ASSERT_TRUE(observer.reports.waitFor(1));
   Observer witness(observed);
   ASSERT_TRUE(witness.reports.waitFor(1));

@@ -106,7 +106,7 @@ namespace {
 
 /// How an uninstall ended.
 struct Uninstalled {
-  Occurrences completions;
+  EventCounter completions;
   std::optional<Error> error;
   std::thread::id thread;
 
@@ -114,7 +114,7 @@ struct Uninstalled {
     return [this](const std::optional<Error>& outcome) {
       error = outcome;
       thread = std::this_thread::get_id();
-      completions.happened();
+      completions.add();
     };
   }
 };

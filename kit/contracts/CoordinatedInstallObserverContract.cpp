@@ -215,11 +215,11 @@ TEST_P(CoordinatedInstallContract, AClosedConnectionReportsNothingMore) {
 }
 
 TEST_P(CoordinatedInstallContract, ClosingAConnectionWaitsForItsRunningCallback) {
-  Occurrences begun;
-  Occurrences mayEnd;
+  EventCounter begun;
+  EventCounter mayEnd;
   std::atomic<bool> hasEnded = false;
   CoordinationListener listener([&](InstallCoordinator&) {
-    begun.happened();
+    begun.add();
     static_cast<void>(mayEnd.waitFor(1));
     hasEnded = true;
   });
@@ -231,7 +231,7 @@ TEST_P(CoordinatedInstallContract, ClosingAConnectionWaitsForItsRunningCallback)
     connection.reset();
     EXPECT_TRUE(hasEnded);
   });
-  mayEnd.happened();
+  mayEnd.add();
 }
 
 TEST_P(CoordinatedInstallContract, AConnectionMayCloseInItsOwnCallback) {

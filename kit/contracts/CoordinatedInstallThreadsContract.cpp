@@ -133,7 +133,7 @@ TEST_P(CoordinatedInstallContract, ManyAppsAreInstalledWhileObserversComeAndGo) 
 }
 
 TEST_P(CoordinatedInstallContract, OneAppMayBeDrivenByManyThreads) {
-  Occurrences completions;
+  EventCounter completions;
   runOnThreads(kThreads, [&](std::size_t index) {
     for (int round = 0; round < 5; ++round) {
       bool created = false;
@@ -147,7 +147,7 @@ TEST_P(CoordinatedInstallContract, OneAppMayBeDrivenByManyThreads) {
       if (index % 3 == 0) cancel(*handle).ignore();
       if (index % 3 == 1) {
         service().uninstallApp("com.a", UserConfirmation::skip,
-                               [&](const std::optional<Error>&) { completions.happened(); });
+                               [&](const std::optional<Error>&) { completions.add(); });
       }
       if (const Asset asset = handle->appAssetPromise()) asset->setPercentComplete(0.5);
     }

@@ -9,9 +9,9 @@
 namespace appsync::test {
 
 /// Threads: any.
-class Occurrences {
+class EventCounter {
  public:
-  void happened() {
+  void add() {
     const std::scoped_lock lock(mutex_);
     ++count_;
     changed_.notify_all();

@@ -9,13 +9,13 @@ namespace appsync::test {
 GTEST_ALLOW_UNINSTANTIATED_PARAMETERIZED_TEST(SoftwareLibraryContract);
 
 TEST_P(SoftwareLibraryContract, ARefreshCompletesOnce) {
-  Occurrences completions;
+  EventCounter completions;
   std::optional<Error> failure = Error{};
   auto library = subject().makeLibrary();
   ASSERT_NE(library, nullptr);
   library->refreshReceipts([&](const std::optional<Error>& error) {
     failure = error;
-    completions.happened();
+    completions.add();
   });
   ASSERT_TRUE(completions.waitFor(1));
   EXPECT_FALSE(failure);
@@ -25,12 +25,12 @@ TEST_P(SoftwareLibraryContract, ARefreshCompletesOnce) {
 
 TEST_P(SoftwareLibraryContract, AFailedRefreshTellsWhy) {
   if (!subject().failRefreshes()) GTEST_SKIP() << "cannot be made to fail";
-  Occurrences completions;
+  EventCounter completions;
   std::optional<Error> failure;
   const auto library = subject().makeLibrary();
   library->refreshReceipts([&](const std::optional<Error>& error) {
     failure = error;
-    completions.happened();
+    completions.add();
   });
   ASSERT_TRUE(completions.waitFor(1));
   ASSERT_TRUE(failure);
@@ -38,31 +38,31 @@ TEST_P(SoftwareLibraryContract, AFailedRefreshTellsWhy) {
 }
 
 TEST_P(SoftwareLibraryContract, EveryRefreshCompletes) {
-  Occurrences completions;
+  EventCounter completions;
   const auto library = subject().makeLibrary();
   for (int round = 0; round < 3; ++round) {
-    library->refreshReceipts([&](const std::optional<Error>&) { completions.happened(); });
+    library->refreshReceipts([&](const std::optional<Error>&) { completions.add(); });
   }
   EXPECT_TRUE(completions.waitFor(3));
 }
 
 TEST_P(SoftwareLibraryContract, TheLibraryMayBeDestroyedByItsCompletion) {
-  Occurrences completions;
+  EventCounter completions;
   std::shared_ptr<platform::SoftwareLibrary> library = subject().makeLibrary();
   platform::SoftwareLibrary& stillHeld = *library;
   stillHeld.refreshReceipts([&completions, owner = std::move(library)](const std::optional<Error>&) mutable {
     owner.reset();
-    completions.happened();
+    completions.add();
   });
   EXPECT_TRUE(completions.waitFor(1));
 }
 
 TEST_P(SoftwareLibraryContract, LibrariesAreIndependent) {
-  Occurrences completions;
+  EventCounter completions;
   const auto first = subject().makeLibrary();
   const auto second = subject().makeLibrary();
-  first->refreshReceipts([&](const std::optional<Error>&) { completions.happened(); });
-  second->refreshReceipts([&](const std::optional<Error>&) { completions.happened(); });
+  first->refreshReceipts([&](const std::optional<Error>&) { completions.add(); });
+  second->refreshReceipts([&](const std::optional<Error>&) { completions.add(); });
   EXPECT_TRUE(completions.waitFor(2));
 }
 

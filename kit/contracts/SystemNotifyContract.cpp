@@ -40,7 +40,7 @@ class Listener {
     return heard_;
   }
 
-  Occurrences calls;
+  EventCounter calls;
   /// Runs in each call; set before anything is posted.
   std::function<void()> inCall;
   std::thread::id thread;
@@ -56,7 +56,7 @@ class Listener {
     }
     if (self.inCall) self.inCall();
     --self.inside_;
-    self.calls.happened();
+    self.calls.add();
   }
 
   SystemNotify& notify_;
@@ -141,12 +141,12 @@ TEST_P(SystemNotifyContract, RemovingAnUnknownObserverDoesNothing) {
 }
 
 TEST_P(SystemNotifyContract, RemovalWaitsForTheRunningCall) {
-  Occurrences begun;
-  Occurrences mayEnd;
+  EventCounter begun;
+  EventCounter mayEnd;
   std::atomic<bool> hasEnded = false;
   Listener listener(subject().notify());
   listener.inCall = [&] {
-    begun.happened();
+    begun.add();
     static_cast<void>(mayEnd.waitFor(1));
     hasEnded = true;
   };
@@ -156,7 +156,7 @@ TEST_P(SystemNotifyContract, RemovalWaitsForTheRunningCall) {
     listener.stop();
     EXPECT_TRUE(hasEnded);
   });
-  mayEnd.happened();
+  mayEnd.add();
 }
 
 TEST_P(SystemNotifyContract, AnObserverMayBeRemovedFromItsOwnCall) {

@@ -54,12 +54,12 @@ TEST_P(TimeContract, AWaitWithoutADeadlineEndsWhenItIsTold) {
 }
 
 TEST_P(TimeContract, ATaskRunsWhenItIsDue) {
-  Occurrences runs;
+  EventCounter runs;
   const TimePoint due = subject().clock().now() + milliseconds(2);
   TimePoint ran;
   subject().scheduler().after(milliseconds(2), [&] {
     ran = subject().clock().now();
-    runs.happened();
+    runs.add();
   });
   subject().pass(milliseconds(2));
   ASSERT_TRUE(runs.waitFor(1));
@@ -67,14 +67,14 @@ TEST_P(TimeContract, ATaskRunsWhenItIsDue) {
 }
 
 TEST_P(TimeContract, ATaskNeverRunsInsideTheCall) {
-  Occurrences runs;
+  EventCounter runs;
   std::atomic<bool> hasReturned = false;
   std::mutex mutex;
   std::unique_lock lock(mutex);
   subject().scheduler().after(milliseconds(0), [&] {
     { const std::scoped_lock waitForTheCall(mutex); }  // Let go of before the test may end.
     EXPECT_TRUE(hasReturned);
-    runs.happened();
+    runs.add();
   });
   hasReturned = true;
   lock.unlock();
@@ -83,12 +83,12 @@ TEST_P(TimeContract, ATaskNeverRunsInsideTheCall) {
 }
 
 TEST_P(TimeContract, TasksRunInOrderOfDueTimeAndThenOfCalls) {
-  Occurrences runs;
+  EventCounter runs;
   std::vector<int> order;
   const auto task = [&](int number) {
     return [&, number] {
       order.push_back(number);
-      runs.happened();
+      runs.add();
     };
   };
   subject().scheduler().after(milliseconds(40), task(3));
@@ -100,34 +100,34 @@ TEST_P(TimeContract, TasksRunInOrderOfDueTimeAndThenOfCalls) {
 }
 
 TEST_P(TimeContract, ATaskMayScheduleTheNext) {
-  Occurrences runs;
+  EventCounter runs;
   subject().scheduler().after(milliseconds(1),
-                              [&] { subject().scheduler().after(milliseconds(1), [&] { runs.happened(); }); });
+                              [&] { subject().scheduler().after(milliseconds(1), [&] { runs.add(); }); });
   subject().pass(milliseconds(2));
   EXPECT_TRUE(runs.waitFor(1));
 }
 
 TEST_P(TimeContract, ADelayThatIsNotPositiveMeansAtOnce) {
-  Occurrences runs;
-  subject().scheduler().after(milliseconds(-5), [&] { runs.happened(); });
+  EventCounter runs;
+  subject().scheduler().after(milliseconds(-5), [&] { runs.add(); });
   subject().pass(milliseconds(0));
   EXPECT_TRUE(runs.waitFor(1));
 }
 
 TEST_P(TimeContract, WhatATaskHoldsGoesRightAfterItRan) {
-  Occurrences runs;
+  EventCounter runs;
   auto held = std::make_shared<int>(0);
   const std::weak_ptr<int> watched = held;
   subject().scheduler().after(milliseconds(0), [held = std::move(held)] {});
-  subject().scheduler().after(milliseconds(0), [&] { runs.happened(); });
+  subject().scheduler().after(milliseconds(0), [&] { runs.add(); });
   subject().pass(milliseconds(0));
   ASSERT_TRUE(runs.waitFor(1));
   EXPECT_TRUE(watched.expired());
 }
 
 TEST_P(TimeContract, ManyThreadsMayScheduleAtOnce) {
-  Occurrences runs;
-  runOnThreads(8, [&](std::size_t) { subject().scheduler().after(milliseconds(1), [&] { runs.happened(); }); });
+  EventCounter runs;
+  runOnThreads(8, [&](std::size_t) { subject().scheduler().after(milliseconds(1), [&] { runs.add(); }); });
   subject().pass(milliseconds(1));
   EXPECT_TRUE(runs.waitFor(8));
 }

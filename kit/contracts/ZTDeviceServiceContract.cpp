@@ -22,19 +22,19 @@ TEST_P(ZTDeviceServiceContract, WhatIsSupportedDoesNotChange) {
 
 TEST_P(ZTDeviceServiceContract, PrioritizingCompletesOnceAlsoWhenNothingIsToBeTransferred) {
   if (!service().supports(Operation::prioritizeAsset)) GTEST_SKIP() << "not supported";
-  Occurrences completions;
-  service().prioritizeAsset(asset("com.a"), [&](const std::optional<Error>&) { completions.happened(); });
+  EventCounter completions;
+  service().prioritizeAsset(asset("com.a"), [&](const std::optional<Error>&) { completions.add(); });
   EXPECT_TRUE(completions.waitFor(1));
-  service().prioritizeAsset(asset("com.a"), [&](const std::optional<Error>&) { completions.happened(); });
+  service().prioritizeAsset(asset("com.a"), [&](const std::optional<Error>&) { completions.add(); });
   EXPECT_TRUE(completions.waitFor(2));
   EXPECT_EQ(completions.count(), 2U);
 }
 
 TEST_P(ZTDeviceServiceContract, PrioritizingCompletesBeforeTheServiceEnds) {
   if (!service().supports(Operation::prioritizeAsset)) GTEST_SKIP() << "not supported";
-  Occurrences completions;
+  EventCounter completions;
   auto another = GetParam().make();
-  another->service().prioritizeAsset(asset("com.a"), [&](const std::optional<Error>&) { completions.happened(); });
+  another->service().prioritizeAsset(asset("com.a"), [&](const std::optional<Error>&) { completions.add(); });
   another.reset();
   EXPECT_EQ(completions.count(), 1U);
 }
@@ -48,9 +48,9 @@ TEST_P(ZTDeviceServiceContract, CancellingWhatIsNotToBeTransferredDoesNothing) {
 
 TEST_P(ZTDeviceServiceContract, ACompletionMayUseTheService) {
   if (!service().supports(Operation::prioritizeAsset)) GTEST_SKIP() << "not supported";
-  Occurrences completions;
+  EventCounter completions;
   service().prioritizeAsset(asset("com.a"), [&](const std::optional<Error>&) {
-    service().prioritizeAsset(asset("com.b"), [&](const std::optional<Error>&) { completions.happened(); });
+    service().prioritizeAsset(asset("com.b"), [&](const std::optional<Error>&) { completions.add(); });
   });
   EXPECT_TRUE(completions.waitFor(1));
 }
@@ -58,12 +58,12 @@ TEST_P(ZTDeviceServiceContract, ACompletionMayUseTheService) {
 TEST_P(ZTDeviceServiceContract, ManyThreadsMayAskAtOnce) {
   const bool prioritizes = service().supports(Operation::prioritizeAsset);
   const bool cancels = service().supports(Operation::cancelAssetTransferForFailedAsset);
-  Occurrences completions;
+  EventCounter completions;
   runOnThreads(4, [&](std::size_t index) {
     for (int round = 0; round < 10; ++round) {
       const auto wanted = asset("com.app" + std::to_string(index));
       if (prioritizes) {
-        service().prioritizeAsset(wanted, [&](const std::optional<Error>&) { completions.happened(); });
+        service().prioritizeAsset(wanted, [&](const std::optional<Error>&) { completions.add(); });
       }
       if (cancels) service().cancelAssetTransferForFailedAsset(wanted);
     }

@@ -5,7 +5,13 @@
 #include <memory>
 #include <utility>
 
+#include <gtest/gtest.h>
+
 namespace appsync::test {
+
+void misuse(std::string_view contract) {
+  ADD_FAILURE() << "misuse of the platform: " << contract;
+}
 
 std::optional<Error> CallJournal::beforeCall(std::string_view operation, std::string_view arguments) {
   Hook hook;

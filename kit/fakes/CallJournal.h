@@ -1,4 +1,4 @@
-// The one place through which every call of a fake passes.
+// Records the calls of all fakes of a platform in one order.
 #pragma once
 
 #include <cstddef>
@@ -13,6 +13,10 @@
 #include "base/Error.h"
 
 namespace appsync::test {
+
+/// For fakes: reports that the caller broke a platform contract. Fails the running test; without a running test, as in
+/// a daemon on fakes, prints the failure on standard output. Thread-safe.
+void misuse(std::string_view contract);
 
 /// What all fakes of a platform were asked, in one order: "registry.uninstallApplication com.a",
 /// "fileSystem.moveItem /a /b". Only questions that a client asks for every message (log categories, the time) are left

@@ -42,7 +42,7 @@ class CoordinationState : public std::enable_shared_from_this<CoordinationState>
     std::set<platform::ClientIdentity> clients;
     platform::InstallObserverDelegate* delegate = nullptr;
     bool isOpen = true;
-    CallbackThread::Subscription subscription = 0;
+    FakeCallbackThread::Subscription subscription = 0;
   };
 
   CoordinationState(CallJournal& journal, FakeFileSystem& files, FakeAppRegistry& registry)
@@ -98,11 +98,11 @@ class CoordinationState : public std::enable_shared_from_this<CoordinationState>
 
   [[nodiscard]] CallJournal& journal() { return journal_; }
   [[nodiscard]] FakeAppRegistry& registry() { return registry_; }
-  [[nodiscard]] CallbackThread& thread() { return thread_; }
+  [[nodiscard]] FakeCallbackThread& thread() { return thread_; }
 
  private:
   struct Delivery {
-    CallbackThread::Subscription subscription;
+    FakeCallbackThread::Subscription subscription;
     std::function<void()> call;
   };
 
@@ -118,8 +118,8 @@ class CoordinationState : public std::enable_shared_from_this<CoordinationState>
   mutable std::mutex mutex_;
   /// What the change under way has to tell.
   std::vector<Delivery> deliveries_;
-  CallbackThread thread_;
-  const CallbackThread::Subscription own_ = thread_.subscribe();
+  FakeCallbackThread thread_;
+  const FakeCallbackThread::Subscription own_ = thread_.subscribe();
 };
 
 }  // namespace appsync::test

@@ -2,7 +2,7 @@
 
 #include <algorithm>
 
-#include "kit/fakes/Misuse.h"
+#include "kit/fakes/CallJournal.h"
 #include "platform/Keys.h"
 
 namespace appsync::test {

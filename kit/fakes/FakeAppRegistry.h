@@ -100,7 +100,7 @@ class FakeAppRegistry final : public platform::AppRegistry {
   void installPhaseFinishedForProgress(platform::InstallProgress& progress) override;
 
  private:
-  using Subscription = CallbackThread::Subscription;
+  using Subscription = FakeCallbackThread::Subscription;
   using Report = std::function<void(platform::AppRegistryObserver&)>;
   using Apps = std::map<std::string, FakeApp, std::less<>>;
   struct OtherBundle {
@@ -132,7 +132,7 @@ class FakeAppRegistry final : public platform::AppRegistry {
   std::vector<Uninstall> uninstalls_;
   std::size_t running_ = 0;
   std::size_t mostAtOnce_ = 0;
-  CallbackThread reports_;
+  FakeCallbackThread reports_;
 };
 
 }  // namespace appsync::test

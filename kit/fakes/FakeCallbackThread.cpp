@@ -4,20 +4,20 @@
 
 namespace appsync::test {
 
-CallbackThread::Subscription CallbackThread::subscribe() {
+FakeCallbackThread::Subscription FakeCallbackThread::subscribe() {
   const std::scoped_lock lock(mutex_);
   subscriptions_.insert(++last_);
   return last_;
 }
 
-void CallbackThread::unsubscribe(Subscription subscription) {
+void FakeCallbackThread::unsubscribe(Subscription subscription) {
   std::unique_lock lock(mutex_);
   subscriptions_.erase(subscription);
   if (running_ == subscription && runner_ == std::this_thread::get_id()) return;
   changed_.wait(lock, [&] { return running_ != subscription; });
 }
 
-void CallbackThread::post(Subscription subscription, std::function<void()> callback) {
+void FakeCallbackThread::post(Subscription subscription, std::function<void()> callback) {
   {
     const std::scoped_lock lock(mutex_);
     ++pending_;
@@ -25,7 +25,7 @@ void CallbackThread::post(Subscription subscription, std::function<void()> callb
   queue_.add([this, subscription, callback = std::move(callback)] { run(subscription, callback); });
 }
 
-void CallbackThread::run(Subscription subscription, const std::function<void()>& callback) {
+void FakeCallbackThread::run(Subscription subscription, const std::function<void()>& callback) {
   std::unique_lock lock(mutex_);
   if (subscriptions_.contains(subscription)) {
     running_ = subscription;
@@ -39,12 +39,12 @@ void CallbackThread::run(Subscription subscription, const std::function<void()>&
   changed_.notify_all();
 }
 
-void CallbackThread::waitUntilIdle() {
+void FakeCallbackThread::waitUntilIdle() {
   std::unique_lock lock(mutex_);
   changed_.wait(lock, [this] { return pending_ == 0; });
 }
 
-std::size_t CallbackThread::subscriptions() const {
+std::size_t FakeCallbackThread::subscriptions() const {
   const std::scoped_lock lock(mutex_);
   return subscriptions_.size();
 }

@@ -14,7 +14,7 @@
 namespace appsync::test {
 
 /// Calls subscribers back one call at a time, never on the thread that asks for it. Threads: any.
-class CallbackThread {
+class FakeCallbackThread {
  public:
   using Subscription = std::uint64_t;
 

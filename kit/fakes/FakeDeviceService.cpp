@@ -3,7 +3,7 @@
 #include <string>
 #include <utility>
 
-#include "kit/fakes/Misuse.h"
+#include "kit/fakes/CallJournal.h"
 
 namespace appsync::test {
 

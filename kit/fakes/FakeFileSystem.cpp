@@ -5,7 +5,7 @@
 #include <memory>
 #include <utility>
 
-#include "kit/fakes/Misuse.h"
+#include "kit/fakes/CallJournal.h"
 
 namespace appsync::test {
 
@@ -40,10 +40,10 @@ FakeFileSystem::FakeFileSystem(CallJournal& journal) : journal_(journal) {
 void FakeFileSystem::put(std::string_view path, ByteView bytes) {
   putFolder(parentOf(path));
   const std::scoped_lock lock(mutex_);
-  const Result<FileTree::Place> place = tree_.find(path, LastLink::followed);
+  const Result<FakeFileTree::Place> place = tree_.find(path, LastLink::followed);
   const bool isTaken = place && place->node != nullptr && place->node->kind == FileKind::folder;
   if (!place || isTaken) return misuse("no file can be put at " + std::string(path));
-  FileTree::put(*place, makeFile(bytes, {}));
+  FakeFileTree::put(*place, makeFile(bytes, {}));
 }
 
 void FakeFileSystem::putFolder(std::string_view path) {
@@ -54,14 +54,14 @@ void FakeFileSystem::putFolder(std::string_view path) {
 void FakeFileSystem::putLink(std::string_view path, std::string_view target) {
   putFolder(parentOf(path));
   const std::scoped_lock lock(mutex_);
-  const Result<FileTree::Place> place = tree_.findFree(path);
+  const Result<FakeFileTree::Place> place = tree_.findFree(path);
   if (!place) return misuse("no link can be put at " + std::string(path));
-  FileTree::put(*place, makeLink(target));
+  FakeFileTree::put(*place, makeLink(target));
 }
 
 void FakeFileSystem::erase(std::string_view path) {
   const std::scoped_lock lock(mutex_);
-  const Result<FileTree::Place> place = tree_.findExisting(path, LastLink::itself);
+  const Result<FakeFileTree::Place> place = tree_.findExisting(path, LastLink::itself);
   if (place && place->parent != nullptr) place->parent->children.erase(place->name);
 }
 
@@ -72,13 +72,13 @@ bool FakeFileSystem::has(std::string_view path) {
 
 bool FakeFileSystem::hasFolder(std::string_view path) {
   const std::scoped_lock lock(mutex_);
-  const Result<FileTree::Place> place = tree_.findExisting(path, LastLink::followed);
+  const Result<FakeFileTree::Place> place = tree_.findExisting(path, LastLink::followed);
   return place && place->node->kind == FileKind::folder;
 }
 
 std::optional<Bytes> FakeFileSystem::contents(std::string_view path) {
   const std::scoped_lock lock(mutex_);
-  const Result<FileTree::Place> place = tree_.findExisting(path, LastLink::followed);
+  const Result<FakeFileTree::Place> place = tree_.findExisting(path, LastLink::followed);
   if (!place || place->node->kind != FileKind::file) return std::nullopt;
   return place->node->bytes;
 }
@@ -91,14 +91,14 @@ std::optional<std::string> FakeFileSystem::text(std::string_view path) {
 
 std::optional<platform::OwnerAttributes> FakeFileSystem::owners(std::string_view path) {
   const std::scoped_lock lock(mutex_);
-  const Result<FileTree::Place> place = tree_.findExisting(path, LastLink::followed);
+  const Result<FakeFileTree::Place> place = tree_.findExisting(path, LastLink::followed);
   if (!place) return std::nullopt;
   return place->node->owners;
 }
 
 std::size_t FakeFileSystem::touches(std::string_view path) {
   const std::scoped_lock lock(mutex_);
-  const Result<FileTree::Place> place = tree_.findExisting(path, LastLink::followed);
+  const Result<FakeFileTree::Place> place = tree_.findExisting(path, LastLink::followed);
   return place ? place->node->touches : 0;
 }
 
@@ -129,7 +129,7 @@ bool FakeFileSystem::fileExists(std::string_view path) {
 Result<platform::FileAttributes> FakeFileSystem::attributesOfItem(std::string_view path) {
   if (auto failure = begin(FileOperation::attributesOfItem, path)) return *std::move(failure);
   const std::scoped_lock lock(mutex_);
-  const Result<FileTree::Place> place = tree_.findExisting(path, LastLink::followed);
+  const Result<FakeFileTree::Place> place = tree_.findExisting(path, LastLink::followed);
   if (!place) return place.error();
   return platform::FileAttributes{place->node->bytes.size(), place->node->kind == FileKind::folder};
 }
@@ -137,7 +137,7 @@ Result<platform::FileAttributes> FakeFileSystem::attributesOfItem(std::string_vi
 Result<Bytes> FakeFileSystem::readFile(std::string_view path) {
   if (auto failure = begin(FileOperation::readFile, path)) return *std::move(failure);
   const std::scoped_lock lock(mutex_);
-  const Result<FileTree::Place> place = tree_.findExisting(path, LastLink::followed);
+  const Result<FakeFileTree::Place> place = tree_.findExisting(path, LastLink::followed);
   if (!place) return place.error();
   if (place->node->kind == FileKind::folder) return Error::fromErrno(EISDIR, path);
   return place->node->bytes;
@@ -155,10 +155,10 @@ Status FakeFileSystem::createFile(std::string_view path, ByteView bytes, const p
 
 Status FakeFileSystem::replaceFile(std::string_view path, ByteView bytes, const platform::OwnerAttributes& owners) {
   const std::scoped_lock lock(mutex_);
-  const Result<FileTree::Place> place = tree_.find(path, LastLink::itself);
+  const Result<FakeFileTree::Place> place = tree_.find(path, LastLink::itself);
   if (!place) return place.error();
   if (place->node != nullptr && place->node->kind == FileKind::folder) return Error::fromErrno(EISDIR, path);
-  FileTree::put(*place, makeFile(bytes, owners));
+  FakeFileTree::put(*place, makeFile(bytes, owners));
   ++writes_[std::string(path)];
   return {};
 }
@@ -168,41 +168,41 @@ Status FakeFileSystem::createDirectory(std::string_view path, platform::Intermed
   if (auto failure = begin(FileOperation::createDirectory, path)) return *std::move(failure);
   const std::scoped_lock lock(mutex_);
   if (intermediates == platform::IntermediateDirectories::create) return tree_.makeFolders(path, attributes);
-  const Result<FileTree::Place> place = tree_.findFree(path);
+  const Result<FakeFileTree::Place> place = tree_.findFree(path);
   if (!place) return place.error();
-  FileTree::put(*place, makeFolder(attributes));
+  FakeFileTree::put(*place, makeFolder(attributes));
   return {};
 }
 
 Status FakeFileSystem::copyItem(std::string_view from, std::string_view to) {
   if (auto failure = begin(FileOperation::copyItem, from, to)) return *std::move(failure);
   const std::scoped_lock lock(mutex_);
-  const Result<FileTree::Place> source = tree_.findExisting(from, LastLink::itself);
+  const Result<FakeFileTree::Place> source = tree_.findExisting(from, LastLink::itself);
   if (!source) return source.error();
-  const Result<FileTree::Place> destination = tree_.findFree(to);
+  const Result<FakeFileTree::Place> destination = tree_.findFree(to);
   if (!destination) return destination.error();
   if (holds(*source->node, destination->parent)) return Error::fromErrno(EINVAL, to);
-  FileTree::put(*destination, source->node->clone());
+  FakeFileTree::put(*destination, source->node->clone());
   return {};
 }
 
 Status FakeFileSystem::moveItem(std::string_view from, std::string_view to) {
   if (auto failure = begin(FileOperation::moveItem, from, to)) return *std::move(failure);
   const std::scoped_lock lock(mutex_);
-  const Result<FileTree::Place> source = tree_.findExisting(from, LastLink::itself);
+  const Result<FakeFileTree::Place> source = tree_.findExisting(from, LastLink::itself);
   if (!source) return source.error();
-  const Result<FileTree::Place> destination = tree_.findFree(to);
+  const Result<FakeFileTree::Place> destination = tree_.findFree(to);
   if (!destination) return destination.error();
   if (source->parent == nullptr || holds(*source->node, destination->parent)) return Error::fromErrno(EINVAL, to);
   auto taken = source->parent->children.extract(source->name);
-  FileTree::put(*destination, std::move(taken.mapped()));
+  FakeFileTree::put(*destination, std::move(taken.mapped()));
   return {};
 }
 
 Status FakeFileSystem::removeItem(std::string_view path) {
   if (auto failure = begin(FileOperation::removeItem, path)) return *std::move(failure);
   const std::scoped_lock lock(mutex_);
-  const Result<FileTree::Place> place = tree_.findExisting(path, LastLink::itself);
+  const Result<FakeFileTree::Place> place = tree_.findExisting(path, LastLink::itself);
   if (!place) return place.error();
   if (place->parent == nullptr) return Error::fromErrno(EBUSY, path);
   place->parent->children.erase(place->name);
@@ -212,7 +212,7 @@ Status FakeFileSystem::removeItem(std::string_view path) {
 Status FakeFileSystem::touch(std::string_view path) {
   if (auto failure = begin(FileOperation::touch, path)) return *std::move(failure);
   const std::scoped_lock lock(mutex_);
-  const Result<FileTree::Place> place = tree_.findExisting(path, LastLink::followed);
+  const Result<FakeFileTree::Place> place = tree_.findExisting(path, LastLink::followed);
   if (!place) return Error::fromErrno(static_cast<int>(place.error().code));
   ++place->node->touches;
   return {};

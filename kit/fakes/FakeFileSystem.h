@@ -79,7 +79,7 @@ class FakeFileSystem : public platform::FileSystem {
 
   CallJournal& journal_;
   mutable std::mutex mutex_;
-  FileTree tree_;
+  FakeFileTree tree_;
   std::map<std::string, std::size_t, std::less<>> writes_;
 };
 

@@ -41,7 +41,7 @@ class Walk {
     return 0;
   }
 
-  FileTree::Place place() && {
+  FakeFileTree::Place place() && {
     if (name_.empty()) return {nullptr, {}, folders_.back()};
     return {folders_.back(), std::move(name_), node_};
   }
@@ -114,30 +114,30 @@ std::unique_ptr<FileNode> FileNode::clone() const {
   return copy;
 }
 
-FileTree::FileTree() {
+FakeFileTree::FakeFileTree() {
   root_.kind = FileKind::folder;
 }
 
-Result<FileTree::Place> FileTree::find(std::string_view path, LastLink lastLink) {
+Result<FakeFileTree::Place> FakeFileTree::find(std::string_view path, LastLink lastLink) {
   if (const int fault = faultOf(path)) return Error::fromErrno(fault, path);
   Walk walk(root_, path, lastLink);
   if (const int error = walk.run()) return Error::fromErrno(error, path);
   return std::move(walk).place();
 }
 
-Result<FileTree::Place> FileTree::findExisting(std::string_view path, LastLink lastLink) {
+Result<FakeFileTree::Place> FakeFileTree::findExisting(std::string_view path, LastLink lastLink) {
   Result<Place> place = find(path, lastLink);
   if (place && place->node == nullptr) return Error::fromErrno(ENOENT, path);
   return place;
 }
 
-Result<FileTree::Place> FileTree::findFree(std::string_view path) {
+Result<FakeFileTree::Place> FakeFileTree::findFree(std::string_view path) {
   Result<Place> place = find(path, LastLink::itself);
   if (place && place->node != nullptr) return Error::fromErrno(EEXIST, path);
   return place;
 }
 
-Status FileTree::makeFolders(std::string_view path, const platform::OwnerAttributes& owners) {
+Status FakeFileTree::makeFolders(std::string_view path, const platform::OwnerAttributes& owners) {
   Result<Place> place = find(path, LastLink::followed);
   if (!place && place.error().code == ENOENT && path.size() > 1) {
     const std::string_view parent = path.substr(0, std::max<std::size_t>(path.find_last_of('/'), 1));
@@ -153,13 +153,13 @@ Status FileTree::makeFolders(std::string_view path, const platform::OwnerAttribu
   return {};
 }
 
-FileNode& FileTree::put(const Place& place, std::unique_ptr<FileNode> node) {
+FileNode& FakeFileTree::put(const Place& place, std::unique_ptr<FileNode> node) {
   std::unique_ptr<FileNode>& slot = place.parent->children[place.name];
   slot = std::move(node);
   return *slot;
 }
 
-std::vector<std::string> FileTree::paths(std::string_view folder) {
+std::vector<std::string> FakeFileTree::paths(std::string_view folder) {
   std::vector<std::string> paths;
   const Result<Place> place = findExisting(folder, LastLink::followed);
   if (place) appendPaths(paths, folder == "/" ? std::string() : std::string(folder), *place->node);

@@ -32,7 +32,7 @@ enum class LastLink { itself, followed };
 
 /// Paths are absolute; "." and ".." and links are understood as the system does, and leaving the root is an error.
 /// Errors: domain "POSIX", the text names the path. Not safe for use by several threads at once.
-class FileTree {
+class FakeFileTree {
  public:
   /// Where a path leads. `node` is null when nothing is there; `parent` is null for the root.
   struct Place {
@@ -41,7 +41,7 @@ class FileTree {
     FileNode* node = nullptr;
   };
 
-  FileTree();
+  FakeFileTree();
 
   /// Fails when the path cannot be, or a folder on the way is missing.
   [[nodiscard]] Result<Place> find(std::string_view path, LastLink lastLink);

@@ -3,7 +3,7 @@
 #include <optional>
 #include <utility>
 
-#include "kit/fakes/Misuse.h"
+#include "kit/fakes/CallJournal.h"
 #include "platform/Keys.h"
 
 namespace appsync::test {

@@ -3,8 +3,8 @@
 #include <algorithm>
 #include <utility>
 
+#include "kit/fakes/CallJournal.h"
 #include "kit/fakes/FakeInstallCoordinator.h"
-#include "kit/fakes/Misuse.h"
 
 namespace appsync::test {
 

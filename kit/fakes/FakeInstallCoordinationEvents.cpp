@@ -2,8 +2,8 @@
 #include <algorithm>
 #include <utility>
 
+#include "kit/fakes/CallJournal.h"
 #include "kit/fakes/FakeInstallCoordination.h"
-#include "kit/fakes/Misuse.h"
 
 namespace appsync::test {
 

@@ -3,7 +3,7 @@
 #include <algorithm>
 #include <utility>
 
-#include "kit/fakes/Misuse.h"
+#include "kit/fakes/CallJournal.h"
 
 namespace appsync::test {
 
@@ -68,7 +68,7 @@ void FakeStore::refresh(Connection& connection, Completion completion) {
       complete();
       break;
     case RefreshCompletion::onOwnThread: {
-      const CallbackThread::Subscription subscription = thread_.subscribe();
+      const FakeCallbackThread::Subscription subscription = thread_.subscribe();
       thread_.post(subscription, std::move(complete));
       break;
     }

@@ -59,7 +59,7 @@ class FakeStore {
   std::optional<Error> error_;
   std::vector<Pending> pending_;
   std::size_t connections_ = 0;
-  CallbackThread thread_;
+  FakeCallbackThread thread_;
 };
 
 }  // namespace appsync::test

@@ -3,7 +3,7 @@
 #include <algorithm>
 #include <utility>
 
-#include "kit/fakes/Misuse.h"
+#include "kit/fakes/CallJournal.h"
 
 namespace appsync::test {
 
@@ -70,7 +70,7 @@ void FakeSystemNotify::addObserver(void* observer, Callback callback, std::strin
 
 void FakeSystemNotify::removeObserver(void* observer, std::string_view name) {
   static_cast<void>(journal_.beforeCall("systemNotify.removeObserver", name));
-  std::vector<CallbackThread::Subscription> ended;
+  std::vector<FakeCallbackThread::Subscription> ended;
   {
     const std::scoped_lock lock(mutex_);
     std::erase_if(observations_, [&](const Observation& observation) {
@@ -79,7 +79,7 @@ void FakeSystemNotify::removeObserver(void* observer, std::string_view name) {
       return matches;
     });
   }
-  for (const CallbackThread::Subscription subscription : ended)
+  for (const FakeCallbackThread::Subscription subscription : ended)
     thread_.unsubscribe(subscription);
 }
 

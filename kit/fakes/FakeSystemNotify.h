@@ -58,7 +58,7 @@ class FakeSystemNotify final : public platform::SystemNotify {
     Callback callback;
     std::string name;
     const void* object;
-    CallbackThread::Subscription subscription;
+    FakeCallbackThread::Subscription subscription;
   };
 
   void tellObservers(std::string_view name, const void* sender);
@@ -70,7 +70,7 @@ class FakeSystemNotify final : public platform::SystemNotify {
   std::map<std::string, std::uint64_t, std::less<>> states_;
   std::vector<Post> posts_;
   std::vector<Observation> observations_;
-  CallbackThread thread_;
+  FakeCallbackThread thread_;
 };
 
 }  // namespace appsync::test

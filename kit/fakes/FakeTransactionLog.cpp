@@ -2,7 +2,7 @@
 
 #include <utility>
 
-#include "kit/fakes/Misuse.h"
+#include "kit/fakes/CallJournal.h"
 
 namespace appsync::test {
 

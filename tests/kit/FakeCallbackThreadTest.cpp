@@ -9,8 +9,8 @@
 namespace appsync::test {
 namespace {
 
-TEST(CallbackThread, CallsBackOnAThreadOfItsOwn) {
-  CallbackThread thread;
+TEST(FakeCallbackThread, CallsBackOnAThreadOfItsOwn) {
+  FakeCallbackThread thread;
   std::thread::id called;
   thread.post(thread.subscribe(), [&] { called = std::this_thread::get_id(); });
   thread.waitUntilIdle();
@@ -18,9 +18,9 @@ TEST(CallbackThread, CallsBackOnAThreadOfItsOwn) {
   EXPECT_NE(called, std::this_thread::get_id());
 }
 
-TEST(CallbackThread, DropsWhatIsPostedToAnEndedSubscription) {
-  CallbackThread thread;
-  const CallbackThread::Subscription subscription = thread.subscribe();
+TEST(FakeCallbackThread, DropsWhatIsPostedToAnEndedSubscription) {
+  FakeCallbackThread thread;
+  const FakeCallbackThread::Subscription subscription = thread.subscribe();
   Gate gate;
   gate.close();
   std::atomic<int> calls = 0;
@@ -34,9 +34,9 @@ TEST(CallbackThread, DropsWhatIsPostedToAnEndedSubscription) {
   EXPECT_EQ(thread.subscriptions(), 1U);
 }
 
-TEST(CallbackThread, EndingASubscriptionWaitsForItsRunningCallback) {
-  CallbackThread thread;
-  const CallbackThread::Subscription subscription = thread.subscribe();
+TEST(FakeCallbackThread, EndingASubscriptionWaitsForItsRunningCallback) {
+  FakeCallbackThread thread;
+  const FakeCallbackThread::Subscription subscription = thread.subscribe();
   Gate gate;
   gate.close();
   std::atomic<bool> hasEnded = false;
@@ -52,9 +52,9 @@ TEST(CallbackThread, EndingASubscriptionWaitsForItsRunningCallback) {
   gate.open();
 }
 
-TEST(CallbackThread, ACallbackMayEndItsOwnSubscription) {
-  CallbackThread thread;
-  const CallbackThread::Subscription subscription = thread.subscribe();
+TEST(FakeCallbackThread, ACallbackMayEndItsOwnSubscription) {
+  FakeCallbackThread thread;
+  const FakeCallbackThread::Subscription subscription = thread.subscribe();
   std::atomic<int> calls = 0;
   for (int round = 0; round < 2; ++round) {
     thread.post(subscription, [&] {

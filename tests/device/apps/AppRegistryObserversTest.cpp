@@ -111,9 +111,9 @@ TEST_F(AppRegistryTest, ReportsRecordsWithTheirProgress) {
       EXPECT_EQ(prioritized.front()->installType(), TSInstallType::Sync);
       ASSERT_NE(prioritized.front()->installProgress(), nullptr);
       EXPECT_EQ(prioritized.front()->installProgress()->installState(), TSInstallState::Waiting);
-      reports.happened();
+      reports.add();
     }
-    Occurrences reports;
+    EventCounter reports;
   };
   device_.placeholder("com.a");
   Checker checker;
@@ -148,9 +148,9 @@ TEST_F(AppRegistryTest, AnObserverMayRemoveAnotherFromItsCallback) {
     void applicationInstallsArePrioritized(const AppRecords&, const AppRecords&) override {
       registry_.removeObserver(other_);
       registry_.removeObserver(*this);
-      done.happened();
+      done.add();
     }
-    Occurrences done;
+    EventCounter done;
 
    private:
     device::AppRegistry& registry_;
