@@ -9,12 +9,9 @@
 namespace appsync::cli {
 namespace {
 
-using device::Character;
-using device::firstCharacter;
-
 /// Columns that a character takes, or a negative number when it must not reach a terminal.
 int columnsOf(const Character& character) {
-  if (!character.valid || device::isUnsafeForDisplay(character.code)) return -1;
+  if (!character.valid || isUnsafeForDisplay(character.code)) return -1;
   if (character.code < 0x7F) return 1;
   return wcwidth(static_cast<wchar_t>(character.code));
 }
@@ -49,7 +46,7 @@ std::string withReferences(std::string document, Notation notation) {
   std::size_t kept = 0;  // how much of the document `out` stands for
   for (std::size_t place = 0; place < document.size();) {
     const Character character = firstCharacter(std::string_view(document).substr(place));
-    if (character.valid && character.code >= 0x7F && device::isUnsafeForDisplay(character.code)) {
+    if (character.valid && character.code >= 0x7F && isUnsafeForDisplay(character.code)) {
       out.append(document, kept, place - kept).append(reference(character.code, notation));
       kept = place + character.length;
     }

@@ -1,10 +1,10 @@
 // The old text form, which people still write by hand.
 #include <array>
 
+#include "base/UTF8.h"
 #include "plist/internal/Encoding.h"
 #include "plist/internal/Failure.h"
 #include "plist/internal/Storage.h"
-#include "plist/internal/Text.h"
 
 namespace appsync::plist {
 

@@ -4,7 +4,8 @@
 #include <cstring>
 #include <utility>
 
-#include "plist/internal/Text.h"
+#include "base/UTF8.h"
+#include "plist/internal/Encoding.h"
 
 namespace appsync::plist {
 

@@ -1,9 +1,10 @@
 // Numbers, dates, uids and longer strings of the binary form.
 #include <bit>
 
+#include "base/UTF8.h"
 #include "plist/internal/BinaryReader.h"
 #include "plist/internal/Date.h"
-#include "plist/internal/Text.h"
+#include "plist/internal/Encoding.h"
 
 namespace appsync::plist {
 

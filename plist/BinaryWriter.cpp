@@ -5,12 +5,13 @@
 #include <span>
 #include <unordered_map>
 
+#include "base/UTF8.h"
 #include "plist/internal/BigEndian.h"
 #include "plist/internal/Date.h"
+#include "plist/internal/Encoding.h"
 #include "plist/internal/Failure.h"
 #include "plist/internal/ObjectTable.h"
 #include "plist/internal/Storage.h"
-#include "plist/internal/Text.h"
 
 namespace appsync::plist {
 

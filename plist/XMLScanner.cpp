@@ -5,8 +5,9 @@
 #include <charconv>
 #include <cstring>
 
+#include "base/UTF8.h"
+#include "plist/internal/Encoding.h"
 #include "plist/internal/Failure.h"
-#include "plist/internal/Text.h"
 
 namespace appsync::plist {
 

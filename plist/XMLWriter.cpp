@@ -3,11 +3,12 @@
 #include <charconv>
 #include <cmath>
 
+#include "base/UTF8.h"
 #include "plist/internal/Base64.h"
 #include "plist/internal/Date.h"
+#include "plist/internal/Encoding.h"
 #include "plist/internal/Failure.h"
 #include "plist/internal/Storage.h"
-#include "plist/internal/Text.h"
 
 namespace appsync::plist {
 
