@@ -21,7 +21,8 @@ class LogCategory {
   /// Whether messages of `level` are wanted now. Asked before each message, so it must be cheap.
   virtual bool isEnabled(LogLevel level) const noexcept = 0;
 
-  /// Takes a complete message, without a line end. `message` is the caller's and ends with the call.
+  /// Takes one message. Messages of log() are one line of printable text without a line end, whatever they print: a sink
+  /// writes them as they are, without escaping. `message` is valid during the call only.
   virtual void write(LogLevel level, std::string_view message) = 0;
 };
 

@@ -11,12 +11,16 @@
 
 namespace appsync {
 
-/// Appends `format`, its conversions replaced by `args`, to `out`. The text does not depend on the locale.
+/// Appends `format`, its conversions replaced by `args`, to `out`. The text does not depend on the locale. Whatever the
+/// arguments hold, it is one line and commands no terminal: control characters, line separators, bidirectional controls
+/// and bytes that are not UTF-8 are escaped, as `\n` or `\x1b`.
 template <class... Args>
 void appendMessage(std::string& out, MessageFormat<std::type_identity_t<Args>...> format, const Args&... args) {
+  const std::size_t start = out.size();
   const char* text = format.text();
   (detail::appendArgument(out, detail::appendUpToConversion(out, text), args), ...);
   detail::appendUpToConversion(out, text);
+  detail::escapeFrom(out, start);
 }
 
 /// The same as a new string.

@@ -94,6 +94,10 @@ char appendUpToConversion(std::string& out, const char*& text);
 /// Six digits after the point.
 void appendFixed(std::string& out, double value);
 
+/// Escapes in the text of `out` from `start` on what isUnsafeForDisplay, and bytes that are not UTF-8: `\n`, or `\x` and
+/// two hexadecimal digits for each byte. Other text, backslashes included, stays as it is.
+void escapeFrom(std::string& out, std::size_t start);
+
 template <class T>
 void appendArgument(std::string& out, [[maybe_unused]] char letter, const T& value) {
   if constexpr (std::same_as<T, bool>) {

@@ -103,7 +103,7 @@ std::string shown(std::string_view text) {
 
 std::string shown(const ZTMutableAccountInfo& account) {
   std::string line = shown(account.corvelID());
-  if (account.DSID()) line += "  DSID " + description(*account.DSID());
+  if (account.DSID()) line += "  DSID " + printable(description(*account.DSID()));
   if (account.altDSID()) line += "  altDSID " + shown(*account.altDSID());
   return line;
 }

@@ -21,33 +21,16 @@ bool isBareWord(std::string_view text) noexcept {
   return !text.empty() && text.find_first_not_of(kBare) == std::string_view::npos;
 }
 
-/// Keeps everything on one line: a name from outside cannot forge another.
-void appendEscaped(std::string& out, std::string_view text, std::string_view quoted) {
-  constexpr std::string_view kDigits = "0123456789abcdef";
-  for (const char c : text) {
-    const auto byte = static_cast<unsigned char>(c);
-    if (quoted.find(c) != std::string_view::npos) {
-      out += '\\';
-      out += c;
-    } else if (c == '\n') {
-      out += "\\n";
-    } else if (byte < 0x20 || byte == 0x7F) {
-      out += "\\U00";
-      out += kDigits[byte >> 4];
-      out += kDigits[byte & 0xF];
-    } else {
-      out += c;
-    }
-  }
-}
-
 void appendString(std::string& out, std::string_view text) {
   if (isBareWord(text)) {
     out += text;
     return;
   }
   out += '"';
-  appendEscaped(out, text, "\"\\");
+  for (const char c : text) {
+    if (c == '"' || c == '\\') out += '\\';
+    out += c;
+  }
   out += '"';
 }
 
@@ -155,8 +138,11 @@ void Describer::describeScalar(const Value& value) {
 }  // namespace
 
 void appendDescription(std::string& out, const Value& value) {
-  if (const auto text = value.string()) return appendEscaped(out, *text, {});
-  Describer(out).describe(value, 0);
+  if (const auto text = value.string()) {
+    out += *text;
+  } else {
+    Describer(out).describe(value, 0);
+  }
 }
 
 void appendDescription(std::string& out, const Array& array) {

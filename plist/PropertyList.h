@@ -84,8 +84,8 @@ inline constexpr std::size_t kMaximumExpandedSize = std::size_t{1} << 30;
 /// number that is not zero, false for all others. Nothing else does.
 [[nodiscard]] std::optional<bool> truth(const Value& value) noexcept;
 
-/// Appends `value` on one line in the style of the old text form, for logs. Dictionaries keep their order,
-/// long data is cut short and followed by its length, deep nesting and what is longer than a megabyte are cut to "…".
+/// Appends `value` in the style of the ASCII format, for logs, which escape control characters. Dictionaries keep their
+/// order, long data is cut short and followed by its length, deep nesting and text after a megabyte are cut to "…".
 void appendDescription(std::string& out, const Value& value);
 void appendDescription(std::string& out, const Array& array);
 inline void appendDescription(std::string& out, const Dictionary& dictionary) {

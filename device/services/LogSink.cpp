@@ -5,40 +5,9 @@
 #include <fcntl.h>
 
 #include "base/TimeText.h"
-#include "base/UTF8.h"
 #include "device/storage/HostFile.h"
 
 namespace appsync::device {
-
-namespace {
-
-void appendEscaped(std::string& line, char letter) {
-  constexpr std::string_view kDigits = "0123456789abcdef";
-  const auto code = static_cast<unsigned char>(letter);
-  if (letter == '\n') {
-    line += "\\n";
-  } else if (letter == '\\') {
-    line += "\\\\";
-  } else {
-    line += {'\\', 'x', kDigits[code >> 4U], kDigits[code & 15U]};
-  }
-}
-
-void appendMessage(std::string& line, std::string_view message) {
-  while (!message.empty()) {
-    const Character character = firstCharacter(message);
-    const std::string_view bytes = message.substr(0, character.length);
-    if (character.valid && !isUnsafeForDisplay(character.code) && character.code != '\\') {
-      line += bytes;
-    } else {
-      for (const char byte : bytes)
-        appendEscaped(line, byte);
-    }
-    message.remove_prefix(character.length);
-  }
-}
-
-}  // namespace
 
 Result<std::unique_ptr<FileLogSink>> FileLogSink::open(const std::string& hostPath) {
   // A pipe would wait for its reader; once there is one it is written to like a file.
@@ -63,7 +32,7 @@ void FileLogSink::write(std::chrono::system_clock::time_point time, int category
   line += ' ';
   line += std::to_string(category);
   line += level == LogLevel::error ? " error " : " default ";
-  appendMessage(line, message);
+  line += message;
   line += '\n';
   static_cast<void>(writeAll(file_.get(), bytesOf(line)));
 }

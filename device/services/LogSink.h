@@ -18,7 +18,8 @@ class LogSink {
  public:
   virtual ~LogSink() = default;
 
-  /// Takes one message. Nothing fails towards the caller: what cannot be kept is lost.
+  /// Takes one message, which is one line of printable text. Nothing fails towards the caller: a message that cannot be
+  /// written is lost.
   virtual void write(std::chrono::system_clock::time_point time, int category, LogLevel level,
                      std::string_view message) = 0;
 };
@@ -27,9 +28,8 @@ class LogSink {
 ///
 ///     2026-02-03T04:05:06.789012Z 8 default com.corvel.qor.Zephtra.AppSync|getting installed assets
 ///
-/// Times are UTC, levels "default" and "error". Backslashes, control characters, what changes the direction of writing
-/// and bytes that are no UTF-8 are escaped in the message, so that it is always one line, and safe to be shown. Each
-/// line is one write at the file's end: lines never mix, not even with those of another process.
+/// Times are UTC, levels "default" and "error". Messages are written as they are: each is one line already, see
+/// base/Log.h. Each line is one write at the file's end: lines never mix, not even with those of another process.
 class FileLogSink final : public LogSink {
  public:
   /// Opens the file for appending, or makes it. `hostPath` is a path of this machine. A pipe needs a reader already.

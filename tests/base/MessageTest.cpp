@@ -116,6 +116,36 @@ TEST(Message, ArgumentsAreNotCopied) {
   EXPECT_EQ(formatMessage("%{public}@", Uncopyable()), "one");
 }
 
+TEST(Message, EscapesControlCharactersInArguments) {
+  EXPECT_EQ(formatMessage("%s", std::string_view("a\nb\r\tc\x7f\0e", 9)), R"(a\nb\x0d\x09c\x7f\x00e)");
+  EXPECT_EQ(formatMessage("%c %{public}@", '\n', std::vector<std::string>{"a\nb", "c"}), R"(\n (a\nb, c))");
+  EXPECT_EQ(formatMessage("%{public}@", std::optional<Error>(Error{"a\n", 1, "b\n", nullptr})), R"(a\n 1 "b\n")");
+}
+
+TEST(Message, EscapesEachByteAtEachPlace) {
+  for (std::size_t place = 0; place < 20; ++place) {
+    for (int byte = 0; byte < 0x100; ++byte) {
+      std::string text(20, 'x');
+      text[place] = static_cast<char>(byte);
+      const bool isPrintable = byte >= 0x20 && byte < 0x7F;
+      EXPECT_EQ(formatMessage("%s", text) == text, isPrintable) << byte << " at " << place;
+    }
+  }
+}
+
+TEST(Message, EscapesC1BidirectionalAndSeparators) {
+  EXPECT_EQ(formatMessage("%s", "\xc2\x9b[2J \xe2\x80\xae \xe2\x80\xa8 \xe2\x81\xa6"),
+            R"(\xc2\x9b[2J \xe2\x80\xae \xe2\x80\xa8 \xe2\x81\xa6)");
+}
+
+TEST(Message, EscapesBytesThatAreNotUTF8) {
+  EXPECT_EQ(formatMessage("%s|%s", "\x9b", "\xe6\xbd"), R"(\x9b|\xe6\xbd)");
+}
+
+TEST(Message, KeepsPrintableTextAndItsFormat) {
+  EXPECT_EQ(formatMessage("…%s", "\xc3\xa9 \xe6\xbd\xae \\n \"x\""), "…\xc3\xa9 \xe6\xbd\xae \\n \"x\"");
+}
+
 /// A format as a template argument: whether it suits its arguments becomes a question instead of an error.
 template <std::size_t size>
 struct Literal {

@@ -1,5 +1,6 @@
 #include <gtest/gtest.h>
 
+#include "base/Message.h"
 #include "tests/plist/Samples.h"
 
 namespace appsync::test {
@@ -81,9 +82,9 @@ TEST(PropertyListDescription, PrintsContainersOnOneLineInOrder) {
             "{a = {}; b = (1, \"x y\", z); c = ();}");
 }
 
-TEST(PropertyListDescription, NoTextForgesALine) {
-  EXPECT_EQ(described("a\nb\r\x7F"), "a\\nb\\U000d\\U007f");
-  EXPECT_EQ(described(Array{"a\nb\"\\"}), "(\"a\\nb\\\"\\\\\")");
+TEST(PropertyListDescription, TakesOneLineInMessages) {
+  EXPECT_EQ(formatMessage("%{public}@", Value("a\nb\r\x7F")), R"(a\nb\x0d\x7f)");
+  EXPECT_EQ(formatMessage("%{public}@", Value(Array{"a\nb\"\\"})), R"(("a\nb\"\\"))");
 }
 
 TEST(PropertyListDescription, CutsLongDataAndDeepNesting) {
