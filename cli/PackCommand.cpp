@@ -15,6 +15,7 @@
 #include "device/storage/HostFile.h"
 #include "platform/Keys.h"
 #include "platform/SyncFiles.h"
+#include "plist/Access.h"
 
 namespace appsync::cli {
 namespace {

@@ -7,15 +7,6 @@
 
 namespace appsync {
 
-namespace {
-
-/// Lists are binary or XML. The old text form is none of them: almost any text would pass for it.
-Result<plist::Value> readBinaryOrXML(ByteView document) {
-  return textOf(document).starts_with("bplist") ? plist::readBinary(document) : plist::readXML(document);
-}
-
-}  // namespace
-
 bool isValidBundleIdentifier(const plist::Value* value) {
   const auto text = stringIn(value);
   return text && isValidBundleIdentifier(*text);
@@ -35,7 +26,7 @@ std::optional<plist::Array> AppsClient::_loadPlist(platform::Platform& platform,
   if (bytes->empty()) return std::nullopt;
 
   const PlugInLog log(platform.syncFramework());
-  auto list = readBinaryOrXML(*bytes);
+  auto list = plist::readBinaryOrXML(*bytes);
   if (!list) {
     setError(error, list.error());
     log.error("%s|couldn't parse todo list");

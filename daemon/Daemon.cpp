@@ -10,6 +10,7 @@
 #include "device/services/SyncFramework.h"
 #include "host/StagingArea.h"
 #include "platform/SyncFiles.h"
+#include "plist/Access.h"
 
 namespace appsync::daemon {
 namespace {

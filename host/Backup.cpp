@@ -5,6 +5,7 @@
 
 #include "device/packages/BundleIdentifier.h"
 #include "device/storage/HostFile.h"
+#include "plist/Access.h"
 
 namespace appsync::host {
 namespace {

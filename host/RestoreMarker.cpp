@@ -6,6 +6,7 @@
 
 #include "device/storage/HostFile.h"
 #include "device/storage/SystemCalls.h"
+#include "plist/Access.h"
 #include "plist/PropertyList.h"
 
 namespace appsync::host {

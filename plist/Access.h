@@ -1,4 +1,4 @@
-// Small questions to property lists that come from outside: every type may be wrong, and nothing fails.
+// Access to property lists from untrusted input: every type may be wrong, and nothing fails.
 #pragma once
 
 #include <optional>
@@ -8,24 +8,43 @@
 
 #include "plist/PropertyList.h"
 
-namespace appsync {
+namespace appsync::plist {
 
-/// The bytes of data that `value`, which may be null, holds; none for any other type.
-[[nodiscard]] inline std::optional<ByteView> dataIn(const plist::Value* value) {
+// Values passed by pointer may be null.
+
+/// Returns the value under `key`, or null if `value` is not a dictionary or has no such key.
+[[nodiscard]] inline const Value* find(const Value* value, std::string_view key) noexcept {
+  return value == nullptr ? nullptr : value->find(key);
+}
+
+/// Returns the text of a string, or nullopt for any other type. Valid as long as `value`.
+[[nodiscard]] inline std::optional<std::string_view> stringIn(const Value* value) noexcept {
+  return value == nullptr ? std::nullopt : value->string();
+}
+
+/// Returns a copy of the text of a string, or nullopt for any other type.
+[[nodiscard]] inline std::optional<std::string> ownedStringIn(const Value* value) {
+  const auto text = stringIn(value);
+  return text ? std::optional<std::string>(*text) : std::nullopt;
+}
+
+/// Returns the bytes of data, or nullopt for any other type. Valid as long as `value`.
+[[nodiscard]] inline std::optional<ByteView> dataIn(const Value* value) noexcept {
   return value == nullptr ? std::nullopt : value->data();
 }
 
-/// False for what is absent or cannot give a boolean.
-[[nodiscard]] inline bool booleanIn(const plist::Value* value) {
-  return value != nullptr && plist::truth(*value).value_or(false);
+/// Returns the boolean that `value` converts to (see truth), or false if it does not convert.
+[[nodiscard]] inline bool booleanIn(const Value* value) noexcept {
+  return value != nullptr && truth(*value).value_or(false);
 }
 
 /// Whether `entry` is a dictionary whose `key` holds exactly the string `text`.
-[[nodiscard]] inline bool entryHas(const plist::Value& entry, std::string_view key, std::string_view text) {
+[[nodiscard]] inline bool entryHas(const Value& entry, std::string_view key, std::string_view text) noexcept {
   return stringIn(entry.find(key)) == text;
 }
 
-[[nodiscard]] inline std::vector<std::string> keysOf(const plist::Dictionary& dictionary) {
+/// Returns copies of all keys, in their order.
+[[nodiscard]] inline std::vector<std::string> keysOf(const Dictionary& dictionary) {
   std::vector<std::string> keys;
   keys.reserve(dictionary.size());
   for (const auto& [key, value] : dictionary)
@@ -33,4 +52,4 @@ namespace appsync {
   return keys;
 }
 
-}  // namespace appsync
+}  // namespace appsync::plist

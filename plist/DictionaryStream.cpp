@@ -3,13 +3,8 @@
 #include <utility>
 
 #include "plist/internal/BinaryReader.h"
-#include "plist/internal/Failure.h"
 
 namespace appsync::plist {
-
-Error rootIsNoDictionary() {
-  return failure(Failure::malformed, "The root is no dictionary");
-}
 
 DocumentEntries::DocumentEntries() = default;
 DocumentEntries::DocumentEntries(DocumentEntries&&) noexcept = default;

@@ -13,9 +13,6 @@ namespace appsync::plist {
 
 class BinaryReader;
 
-/// That a document holds something else.
-[[nodiscard]] Error rootIsNoDictionary();
-
 /// A document whose root is a dictionary. Of the binary form it keeps the document and a number for each entry, and
 /// what it hands out is read anew and dropped; the other forms are read as a whole.
 class DocumentEntries {

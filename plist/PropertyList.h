@@ -50,6 +50,12 @@ inline constexpr std::size_t kMaximumExpandedSize = std::size_t{1} << 30;
 /// The old text form: `{ key = value; }`, `( a, b )`, `<0f a0>`, "quoted" and bare words, comments; also the
 /// `key = value;` lines of a strings file. Every scalar in it is a string or data.
 [[nodiscard]] Result<Value> readText(ByteView document);
+/// Binary if the document begins like one, else XML: for files that programs wrote. Almost any text would pass for the
+/// ASCII format.
+[[nodiscard]] Result<Value> readBinaryOrXML(ByteView document);
+
+/// Returns the error for a document whose root should be a dictionary and is not.
+[[nodiscard]] Error rootIsNoDictionary();
 
 // Writing. Equal values give equal bytes. A null anywhere makes both fail.
 
@@ -63,22 +69,6 @@ inline constexpr std::size_t kMaximumExpandedSize = std::size_t{1} << 30;
 /// Estimates the size in bytes of a form that repeats shared content. Beyond kMaximumExpandedSize it only tells that it
 /// is larger.
 [[nodiscard]] std::size_t expandedSize(const Value& value);
-
-/// The value under `key` when `value` is a dictionary that has it, else null. `value` may be null.
-[[nodiscard]] inline const Value* find(const Value* value, std::string_view key) noexcept {
-  return value == nullptr ? nullptr : value->find(key);
-}
-
-/// The text of `value`, which may be null; none for any other type.
-[[nodiscard]] inline std::optional<std::string_view> stringIn(const Value* value) noexcept {
-  return value == nullptr ? std::nullopt : value->string();
-}
-
-/// The same as a string of one's own.
-[[nodiscard]] inline std::optional<std::string> ownedStringIn(const Value* value) {
-  const auto text = stringIn(value);
-  return text ? std::optional<std::string>(*text) : std::nullopt;
-}
 
 /// What gives a boolean: booleans, numbers (not zero) and strings: true for those that start with Y, y, T, t or a
 /// number that is not zero, false for all others. Nothing else does.

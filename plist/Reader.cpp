@@ -33,6 +33,14 @@ bool isXML(ByteView document) {
 
 }  // namespace
 
+Error rootIsNoDictionary() {
+  return failure(Failure::malformed, "The root is no dictionary");
+}
+
+Result<Value> readBinaryOrXML(ByteView document) {
+  return isBinary(document) ? readBinary(document) : readXML(document);
+}
+
 Result<Value> read(ByteView document) {
   if (isBinary(document)) return readBinary(document);
   return isXML(document) ? readXML(document) : readText(document);

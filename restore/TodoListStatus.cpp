@@ -4,6 +4,7 @@
 #include "common/TodoList.h"
 #include "core/AppsClient.h"
 #include "platform/SyncFiles.h"
+#include "plist/Access.h"
 
 namespace appsync {
 

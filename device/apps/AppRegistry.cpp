@@ -4,6 +4,7 @@
 
 #include "device/packages/InstallerError.h"
 #include "device/storage/Database.h"
+#include "plist/Access.h"
 
 namespace appsync::device {
 

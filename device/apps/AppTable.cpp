@@ -1,6 +1,7 @@
 #include "device/apps/AppTable.h"
 
 #include "base/ReturnIfError.h"
+#include "plist/Access.h"
 #include "plist/PropertyList.h"
 
 namespace appsync::device {

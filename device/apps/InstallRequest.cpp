@@ -2,6 +2,7 @@
 
 #include "device/packages/BundleIdentifier.h"
 #include "device/packages/InstallerError.h"
+#include "plist/Access.h"
 
 namespace appsync::device {
 

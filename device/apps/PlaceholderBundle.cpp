@@ -15,6 +15,7 @@
 #include "device/storage/SystemCalls.h"
 #include "platform/Keys.h"
 #include "platform/SyncFiles.h"
+#include "plist/Access.h"
 #include "plist/PropertyList.h"
 
 namespace appsync::device {

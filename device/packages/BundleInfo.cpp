@@ -3,6 +3,7 @@
 #include "device/packages/BundleIdentifier.h"
 #include "device/packages/InstallerError.h"
 #include "platform/SyncFiles.h"
+#include "plist/Access.h"
 
 namespace appsync::device {
 

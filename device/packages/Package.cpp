@@ -10,6 +10,7 @@
 #include "device/packages/BundleInfo.h"
 #include "device/packages/InstallerError.h"
 #include "platform/SyncFiles.h"
+#include "plist/Access.h"
 
 namespace appsync::device {
 

@@ -12,6 +12,7 @@
 #include "device/screen/ScreenIcon.h"
 #include "device/storage/HostFile.h"
 #include "platform/Keys.h"
+#include "plist/Access.h"
 
 namespace appsync::device {
 

@@ -5,6 +5,7 @@
 
 #include "kit/fakes/CallJournal.h"
 #include "platform/Keys.h"
+#include "plist/Access.h"
 
 namespace appsync::test {
 

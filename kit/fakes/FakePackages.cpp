@@ -1,6 +1,7 @@
 #include "kit/fakes/FakePackages.h"
 
 #include "platform/Keys.h"
+#include "plist/Access.h"
 
 namespace appsync::test {
 

@@ -8,6 +8,10 @@
 
 namespace appsync::test {
 
+using plist::booleanIn;
+using plist::entryHas;
+using plist::keysOf;
+
 TEST(PropertyListAccess, BooleansNumbersAndTrueWordsAreTrue) {
   for (const plist::Value& value : {plist::Value(true), plist::Value(1), plist::Value(-0.5), plist::Value("yes"),
                                     plist::Value("True"), plist::Value("12")})

@@ -5,6 +5,7 @@
 #include <gtest/gtest.h>
 
 #include "kit/fakes/Threads.h"
+#include "plist/Access.h"
 #include "plist/PropertyList.h"
 
 namespace appsync::test {
