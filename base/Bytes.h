@@ -1,4 +1,4 @@
-// Owned raw bytes, as they come from files and services.
+// Raw bytes: the owned buffer and the view.
 #pragma once
 
 #include <cstddef>
@@ -34,7 +34,7 @@ struct UninitializedAllocator : std::allocator<T> {
 /// An owned buffer. `resize` leaves new bytes unset.
 using Bytes = std::vector<std::byte, UninitializedAllocator<std::byte>>;
 
-/// Bytes that somebody else owns.
+/// Bytes owned by another object, which must outlive the view.
 using ByteView = std::span<const std::byte>;
 
 inline ByteView bytesOf(std::string_view text) noexcept {

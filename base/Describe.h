@@ -1,4 +1,4 @@
-// Prints any value for people: what `%{public}@` in a message stands for.
+// Descriptions of values for people: what `%{public}@` prints in a message.
 #pragma once
 
 #include <concepts>
@@ -21,11 +21,11 @@ concept OneOf = (std::same_as<T, Others> || ...);
 template <class T>
 concept Integer = std::integral<T> && !OneOf<T, bool, char, wchar_t, char8_t, char16_t, char32_t>;
 
-/// Strings, views, literals and C strings; a null C string prints as absent.
+/// Strings, views, literals and C strings. A null C string prints "(null)".
 template <class T>
 concept Text = !std::same_as<T, std::nullptr_t> && std::convertible_to<const T&, std::string_view>;
 
-/// Converts to `const T&` and nothing else: an overload for a type that T merely converts to does not count as T's own.
+/// Converts to `const T&` only, so that an overload for a type that T converts to is not taken for T's overload.
 template <class T>
 struct Exactly {
   operator const T&() const;
@@ -52,7 +52,7 @@ inline constexpr bool kIsHandle<std::unique_ptr<T, Deleter>> = true;
 template <class T>
 inline constexpr bool kIsHandle<std::shared_ptr<T>> = true;
 
-/// Holds one value or none.
+/// A pointer or optional: refers to one value, or is null.
 template <class T>
 concept Handle = kIsHandle<T> && requires(const T& handle) {
   *handle;
@@ -61,7 +61,7 @@ concept Handle = kIsHandle<T> && requires(const T& handle) {
 template <class T>
 concept Scalar = OneOf<T, bool, char, std::nullopt_t, std::nullptr_t> || Integer<T> || std::floating_point<T>;
 
-/// Elements of its own type, as file paths have, would never end.
+/// A range whose elements have the type of the range, such as a file path, is excluded: it would recurse forever.
 template <class T>
 concept Range = std::ranges::input_range<const T> && !std::same_as<std::ranges::range_value_t<const T>, T>;
 
@@ -87,19 +87,19 @@ inline constexpr std::string_view kAbsent = "(null)";
 
 void appendSigned(std::string& out, long long value);
 void appendUnsigned(std::string& out, unsigned long long value);
-/// The shortest text that reads back as the same number.
+/// Appends the shortest text that parses to the same number.
 void appendReal(std::string& out, double value);
 
 }  // namespace detail
 
 /// What describe() can print:
-/// - text prints itself, and so does a character; true is "1" and false "0"; integers are decimal; a real is the
-///   shortest text that reads back as the same number;
-/// - what is absent (nullopt, nullptr, an empty optional, a null pointer, plain or smart) is "(null)"; what is present
-///   is whatever the optional holds or the pointer points at;
-/// - a type with its own `void appendDescription(std::string& out, const T& value)`, declared in the namespace of T, is
-///   what that appends; one with a member `description()` is the text that this returns;
-/// - any other range is "(first, second)", its elements described likewise.
+/// - text and characters print unchanged; true prints "1" and false "0"; integers print in decimal; a real prints as
+///   the shortest text that parses to the same number;
+/// - nullopt, nullptr, an empty optional and a null pointer (plain or smart) print "(null)"; other optionals and
+///   pointers print the value they refer to;
+/// - a type with a function `void appendDescription(std::string& out, const T& value)` in its namespace prints what
+///   that appends, a type with a member `description()` prints what that returns;
+/// - any other range prints "(first, second)", its elements described by these rules.
 template <class T>
 concept Describable = detail::isDescribable<T>();
 
@@ -144,7 +144,7 @@ void describe(std::string& out, const T& value) {
   }
 }
 
-/// The description of `value` as a new string.
+/// Returns the description of `value`.
 template <Describable T>
 [[nodiscard]] std::string description(const T& value) {
   std::string out;

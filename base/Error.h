@@ -1,4 +1,4 @@
-// The one error value, and the result that carries it.
+// The error type, and the results that carry it.
 #pragma once
 
 #include <memory>
@@ -14,20 +14,21 @@ namespace domains {
 inline constexpr std::string_view kPOSIX = "POSIX";
 }
 
-/// Why something failed. A value: copies share nothing that changes, and any thread may read one.
+/// Why an operation failed. An immutable value: copies may be used on different threads.
 ///
-/// `domain` says whose numbering `code` belongs to; both keep their meaning however far the error climbs.
-/// `text` is for people. `underlying` is the error that led to this one, if any.
+/// `domain` is the namespace of `code`; callers that pass an error on keep both. `text` is for people, not for
+/// programs. `underlying` is the error that caused this one, or null.
 struct Error {
   std::string domain;
   long code = 0;
   std::string text;
   std::shared_ptr<const Error> underlying;
 
-  /// The same domain and code, with "context: " before the text: what a caller adds on the way up.
+  /// Returns a copy with "context: " before the text.
   [[nodiscard]] Error in(std::string_view context) const;
 
-  /// A system call's failure: POSIX domain, `number` as its errno, "context: " and the system's own words.
+  /// Returns the error of a failed system call: POSIX domain, errno `number` as the code, and the system's description
+  /// after "context: ".
   [[nodiscard]] static Error fromErrno(int number, std::string_view context = {});
 
   /// Equal domain, code and text; underlying errors are not compared.
@@ -39,15 +40,15 @@ struct Error {
 /// Appends `Domain code "text"`, then the underlying error in braces, to `out`.
 void appendDescription(std::string& out, const Error& error);
 
-/// An out-parameter for an error. May be null: the caller does not want to know.
-/// Operations that take one set it on failure only, unless they say otherwise.
+/// An out-parameter for an error. May be null if the caller does not need the error.
+/// Operations set it on failure only, unless documented otherwise.
 using ErrorSlot = std::optional<Error>*;
 
 inline void setError(ErrorSlot slot, Error error) {
   if (slot != nullptr) *slot = std::move(error);
 }
 
-/// A value, or the error that stands in its place.
+/// A value, or the error of the operation that should have returned it.
 template <class T>
 class [[nodiscard]] Result {
  public:
@@ -85,10 +86,10 @@ class [[nodiscard]] Status {
 
   /// Only when not ok().
   [[nodiscard]] const Error& error() const { return *error_; }
-  /// None on success.
+  /// Returns nullopt on success.
   [[nodiscard]] const std::optional<Error>& failure() const noexcept { return error_; }
 
-  /// For the callers who, by contract, do not care.
+  /// Discards the result explicitly.
   void ignore() const noexcept {}
 
  private:

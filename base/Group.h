@@ -1,4 +1,4 @@
-// Counts things under way, and waits for all of them.
+// Counts pending operations and waits for all of them.
 #pragma once
 
 #include <condition_variable>
@@ -11,7 +11,7 @@
 
 namespace appsync {
 
-/// All operations may be called on any thread. The group may be destroyed as soon as a wait has returned true, although
+/// Thread-safe. The group may be destroyed as soon as a wait has returned true, although
 /// the `leave` that ended it may still be returning on another thread.
 class Group {
  public:
@@ -22,16 +22,16 @@ class Group {
 
   void enter();
 
-  /// Throws std::logic_error, and changes nothing, if there is no enter left to take back.
+  /// Throws std::logic_error, and changes nothing, if the group is empty.
   void leave();
 
-  /// Returns once the group is empty, or has been since the call.
+  /// Blocks until the group is empty or has been empty since the call.
   void wait();
 
-  /// The same until the clock reads `deadline`; false if the group was not empty until then.
+  /// Blocks until the group is empty or has been empty since the call. Returns false if `deadline` is reached first.
   bool wait(TimePoint deadline);
 
-  /// How many enters have not been taken back.
+  /// Returns the number of enters without a leave.
   std::int64_t count() const;
 
  private:
@@ -39,11 +39,11 @@ class Group {
   mutable std::mutex mutex_;
   std::condition_variable emptied_;
   std::int64_t count_ = 0;
-  /// How often the group has become empty: a waiter returns even if it is entered anew before the waiter wakes.
+  /// How often the group became empty: a waiter returns even if the group is entered again before the waiter wakes.
   std::uint64_t timesEmptied_ = 0;
 };
 
-/// Enters a group now, leaves it when destroyed, and keeps it until then. Moving hands the duty to leave on.
+/// Enters a group, leaves it on destruction, and shares its ownership until then.
 class [[nodiscard]] GroupEntry {
  public:
   explicit GroupEntry(std::shared_ptr<Group> group) : group_(std::move(group)) { group_->enter(); }

@@ -1,4 +1,4 @@
-// Where messages go.
+// Logging.
 #pragma once
 
 #include <string_view>
@@ -9,24 +9,24 @@
 namespace appsync {
 
 enum class LogLevel {
-  standard,  ///< The course of work; logs call it "default".
+  standard,  ///< Progress; called "default" in logs.
   error,     ///< Failures.
 };
 
-/// One category of a log. All operations may be called on any thread, at any time.
+/// One category of a log. Thread-safe.
 class LogCategory {
  public:
   virtual ~LogCategory() = default;
 
-  /// Whether messages of `level` are wanted now. Asked before each message, so it must be cheap.
+  /// Whether messages of `level` are written. Called before each message, so it must be cheap.
   virtual bool isEnabled(LogLevel level) const noexcept = 0;
 
-  /// Takes one message. Messages of log() are one line of printable text without a line end, whatever they print: a sink
-  /// writes them as they are, without escaping. `message` is valid during the call only.
+  /// Writes one message. Messages of log() are one line of printable text without a line end, whatever values they
+  /// print, so implementations must not escape them again. `message` is valid during the call only.
   virtual void write(LogLevel level, std::string_view message) = 0;
 };
 
-/// Writes a message, see formatMessage, if its level is enabled; else nothing is formatted.
+/// Formats and writes a message (see appendMessage) if `level` is enabled; else nothing is formatted.
 template <class... Args>
 void log(LogCategory& category, LogLevel level, MessageFormat<std::type_identity_t<Args>...> format,
          const Args&... args) {

@@ -23,7 +23,7 @@ void appendMessage(std::string& out, MessageFormat<std::type_identity_t<Args>...
   detail::escapeFrom(out, start);
 }
 
-/// The same as a new string.
+/// Returns the message as a new string; see appendMessage.
 template <class... Args>
 [[nodiscard]] std::string formatMessage(MessageFormat<std::type_identity_t<Args>...> format, const Args&... args) {
   constexpr std::size_t kTypicalArgument = 24;

@@ -17,16 +17,16 @@ namespace detail {
 enum class ConversionKind { text, signedInteger, unsignedInteger, real, character, description, percentSign };
 
 struct Conversion {
-  std::string_view spelling;  ///< What follows the '%'.
+  std::string_view spelling;  ///< The characters after the '%'.
   ConversionKind kind;
-  std::size_t size = 0;  ///< Of numbers: the widest argument in bytes.
+  std::size_t size = 0;  ///< Of numbers: the size of the widest argument in bytes.
 };
 
-/// No spelling begins another.
+/// No spelling is a prefix of another.
 inline constexpr std::array kConversions{
     Conversion{"s", ConversionKind::text},
     Conversion{"d", ConversionKind::signedInteger, sizeof(int)},
-    // Long is as wide as it is anywhere, so that what compiles does not depend on the device.
+    // As wide as long is on any platform, so that a format compiles on all platforms or on none.
     Conversion{"ld", ConversionKind::signedInteger, sizeof(long long)},
     Conversion{"lld", ConversionKind::signedInteger, sizeof(long long)},
     Conversion{"u", ConversionKind::unsignedInteger, sizeof(unsigned)},
@@ -61,7 +61,7 @@ constexpr bool accepts(const Conversion& conversion) {
   return false;
 }
 
-// A wrong format does not compile; the compiler names the one of these that it cannot call.
+// A wrong format does not compile: the check calls one of these, none of which is constexpr, and the compiler names it.
 void theFormatHasAnUnknownConversion();
 void theFormatHasMoreConversionsThanArguments();
 void theFormatHasFewerConversionsThanArguments();
@@ -87,15 +87,16 @@ consteval void checkFormat(std::string_view text) {
   if (used != sizeof...(Args)) theFormatHasFewerConversionsThanArguments();
 }
 
-/// Appends the text before the next conversion, moves `text` behind that conversion and returns its last letter, which
-/// is 0 at the end of the text. `text` has passed checkFormat.
+/// Appends the text before the next conversion, moves `text` behind that conversion and returns its last letter, or 0
+/// at the end of the text. `text` must have passed checkFormat.
 char appendUpToConversion(std::string& out, const char*& text);
 
-/// Six digits after the point.
+/// Appends `value` with six digits after the point.
 void appendFixed(std::string& out, double value);
 
-/// Escapes in the text of `out` from `start` on what isUnsafeForDisplay, and bytes that are not UTF-8: `\n`, or `\x` and
-/// two hexadecimal digits for each byte. Other text, backslashes included, stays as it is.
+/// Escapes characters that are unsafe for display (see isUnsafeForDisplay) and bytes that are not UTF-8 in the text of
+/// `out` from `start` on: a newline as `\n`, others as `\x` and two hexadecimal digits for each byte. Other text,
+/// backslashes included, is not changed.
 void escapeFrom(std::string& out, std::size_t start);
 
 template <class T>
@@ -111,7 +112,7 @@ void appendArgument(std::string& out, [[maybe_unused]] char letter, const T& val
 
 }  // namespace detail
 
-/// A message's format, known at compile time to suit arguments of the types `Args`:
+/// A message format, checked at compile time against the argument types `Args`:
 ///
 ///     %s                text
 ///     %d %ld %lld       a signed integer no wider than the conversion's type; a truth value, as 1 or 0

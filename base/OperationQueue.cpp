@@ -27,7 +27,7 @@ class OperationQueue::Workers : public std::enable_shared_from_this<Workers> {
     added_.notify_one();
   }
 
-  /// The threads end when nothing is queued any more.
+  /// Makes the threads end when no operation is queued.
   void close() {
     {
       const std::lock_guard lock(mutex_);
@@ -50,7 +50,7 @@ class OperationQueue::Workers : public std::enable_shared_from_this<Workers> {
     try {
       threads_.emplace_back([self = shared_from_this()] { self->run(); });
     } catch (const std::system_error&) {
-      if (threads_.empty()) throw;  // Else those that there are take the operation in their turn.
+      if (threads_.empty()) throw;  // Otherwise the existing threads run the operation.
     }
   }
 
@@ -65,7 +65,7 @@ class OperationQueue::Workers : public std::enable_shared_from_this<Workers> {
       operations_.pop_front();
       lock.unlock();
       operation();
-      operation = nullptr;  // May destroy the queue. Unlocked: what it captured may add operations as it goes.
+      operation = nullptr;  // May destroy the queue. Unlocked: the destructors of its captures may add operations.
       lock.lock();
     }
   }
@@ -74,7 +74,7 @@ class OperationQueue::Workers : public std::enable_shared_from_this<Workers> {
   std::mutex mutex_;
   std::condition_variable added_;
   std::deque<std::function<void()>> operations_;
-  /// Threads that wait for an operation, also those that one has been added for but that have not woken yet.
+  /// Threads that wait for an operation, including notified ones that have not woken yet.
   std::size_t idle_ = 0;
   bool closed_ = false;
   std::vector<std::thread> threads_;

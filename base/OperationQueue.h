@@ -7,13 +7,12 @@
 
 namespace appsync {
 
-/// Operations start in the order in which they were added, at most `maxConcurrentOperations` run at once. Threads are
+/// Operations start in the order in which they were added; at most `maxConcurrentOperations` run at once. Threads are
 /// started on demand and then sleep between operations. An operation that throws ends the program.
 ///
-/// An operation, with everything it captures, is destroyed right after it ran and before its thread takes the next one.
-/// What it captures may be the last owner of the object that owns the queue. Destroyed on a thread of its own the queue
-/// returns at once, and operations that are still queued run on; destroyed on any other thread it returns when every
-/// operation has run.
+/// An operation and everything it captures are destroyed right after it ran and before its thread runs the next one.
+/// A capture may be the last owner of the object that owns the queue. On one of the queue's threads the destructor
+/// returns at once, and queued operations still run; on any other thread it returns when every operation has run.
 class OperationQueue {
  public:
   /// Throws std::invalid_argument if `maxConcurrentOperations` is 0.
@@ -24,8 +23,8 @@ class OperationQueue {
 
   std::size_t maxConcurrentOperations() const noexcept;
 
-  /// May be called on any thread, from operations too. Throws std::system_error, and does not add `operation`, if no
-  /// thread runs yet and none can be started.
+  /// Thread-safe; may be called by operations. Throws std::system_error, and does not add `operation`, if the queue has
+  /// no thread and cannot start one.
   void add(std::function<void()> operation);
 
  private:

@@ -13,7 +13,7 @@ std::uint64_t drawSecret() noexcept {
   try {
     std::random_device source;
     return std::uint64_t{source()} << 32 | source();
-  } catch (const std::exception&) {  // No source of chance; where this program lies is chance too.
+  } catch (const std::exception&) {  // No random device: use the randomised load address and the time.
     static const char place = 0;
     const auto now = static_cast<std::uint64_t>(std::chrono::steady_clock::now().time_since_epoch().count());
     return detail::mix(reinterpret_cast<std::uintptr_t>(&place), now | 1);

@@ -1,4 +1,4 @@
-// Hashes that nobody outside the process can foresee: keys from outside cannot be made to meet in one place.
+// Hashes with a random seed for each process, so that untrusted keys cannot be chosen to collide.
 #pragma once
 
 #include <array>
@@ -9,7 +9,7 @@
 
 namespace appsync {
 
-/// So many bytes are hashed at a time.
+/// The unit of hashing: 32 bytes.
 using HashedBlock = std::array<std::uint64_t, 4>;
 
 namespace detail {
@@ -28,7 +28,7 @@ __extension__ typedef unsigned __int128 Wide;
 
 }  // namespace detail
 
-/// The secret is in both factors of each product: else a block could make one of them zero, whatever the other.
+/// Both factors of each product contain the secret: otherwise a block could make one of them zero.
 [[nodiscard]] inline std::uint64_t hashBlock(const HashedBlock& block, std::uint64_t secret) noexcept {
   using detail::kHashFactors;
   const std::uint64_t turned = std::rotl(secret, 32);
@@ -38,11 +38,11 @@ __extension__ typedef unsigned __int128 Wide;
 
 [[nodiscard]] std::uint64_t hashText(std::string_view text, std::uint64_t secret) noexcept;
 
-/// The same number throughout the life of the process.
+/// Returns a random number that is constant during the life of the process.
 [[nodiscard]] std::uint64_t secretOfProcess() noexcept;
 
-/// For the standard library's containers of texts.
-struct SecretHash {
+/// Hash function for standard containers with text keys.
+struct SeededHash {
   [[nodiscard]] std::size_t operator()(std::string_view text) const noexcept {
     return static_cast<std::size_t>(hashText(text, secretOfProcess()));
   }

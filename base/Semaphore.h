@@ -9,7 +9,7 @@
 
 namespace appsync {
 
-/// All operations may be called on any thread. The semaphore may be destroyed as soon as the wait for its last signal
+/// Thread-safe. The semaphore may be destroyed as soon as the wait for its last signal
 /// has returned, although that `signal` may still be returning on another thread.
 class Semaphore {
  public:
@@ -20,7 +20,7 @@ class Semaphore {
 
   void signal();
 
-  /// Takes one signal, waiting for it if there is none; false if none came until the clock read `deadline`.
+  /// Consumes one signal, blocking until one is available. Returns false if `deadline` is reached first.
   bool wait(TimePoint deadline = kForever);
 
  private:

@@ -38,7 +38,7 @@ void SerialQueue::end() noexcept {
   Waiter& next = *waiters_.front();
   waiters_.pop_front();
   runner_ = next.thread;
-  next.turn.notify_one();  // Under the lock: the waiter, and its condition with it, goes once it has the lock.
+  next.turn.notify_one();  // Under the lock: the waiter destroys its condition variable as soon as it has the lock.
 }
 
 }  // namespace appsync

@@ -1,4 +1,4 @@
-// A labelled lock that hands itself on in the order of asking.
+// A labelled lock that is granted in the order of requests.
 #pragma once
 
 #include <atomic>
@@ -11,8 +11,8 @@
 
 namespace appsync {
 
-/// A serial queue that is only ever submitted to synchronously: pieces of work run one at a time, in the order in which
-/// they were submitted, each on the thread that submits it.
+/// A serial queue with synchronous submission only: work items run one at a time, in the order of submission, each on
+/// the submitting thread. Thread-safe.
 class SerialQueue {
  public:
   explicit SerialQueue(std::string label);
@@ -23,8 +23,8 @@ class SerialQueue {
   const std::string& label() const noexcept { return label_; }
 
   /// Runs `work` when all work submitted before has ended, and returns (or throws) what it does.
-  /// Throws std::logic_error, with the label in its text, if the calling thread is running this queue's work already:
-  /// waiting for itself it would never return.
+  /// Throws std::logic_error, with the label in its text, if the calling thread is already running work of this queue,
+  /// because it would deadlock.
   template <class F>
   auto sync(F&& work) -> decltype(work()) {
     const Turn turn(*this);
@@ -34,7 +34,7 @@ class SerialQueue {
   /// Whether the calling thread is running this queue's work.
   bool isCurrent() const noexcept { return runner_.load() == std::this_thread::get_id(); }
 
-  /// How many threads wait for their turn now.
+  /// Returns the number of threads that wait for their turn.
   std::size_t waiting() const;
 
  private:
@@ -56,10 +56,10 @@ class SerialQueue {
 
   const std::string label_;
   mutable std::mutex mutex_;
-  /// Threads that wait for their turn, in order; each waits on a condition of its own, so that one turn wakes one
+  /// Threads that wait for their turn, in order. Each has its own condition variable, so that each turn wakes one
   /// thread.
   std::deque<Waiter*> waiters_;
-  /// The thread whose turn it is; none if the queue is idle. Written under mutex_.
+  /// The thread whose turn it is, or the default id if the queue is idle. Written under mutex_.
   std::atomic<std::thread::id> runner_;
 };
 

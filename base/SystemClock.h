@@ -1,11 +1,11 @@
-// The clock of the machine.
+// The system clock.
 #pragma once
 
 #include "base/Clock.h"
 
 namespace appsync {
 
-/// Steady time: not moved by changes of the time of day.
+/// Monotonic time: not affected by changes of the time of day.
 class SystemClock final : public Clock {
  public:
   TimePoint now() const override;

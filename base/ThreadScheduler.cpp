@@ -21,7 +21,7 @@ class ThreadScheduler::Agenda : public std::enable_shared_from_this<Agenda> {
   }
 
   void close() {
-    dropWhatIsNotDue();
+    dropTasksNotDue();
     if (thread_.get_id() == std::this_thread::get_id()) {
       thread_.detach();
       run();
@@ -39,12 +39,12 @@ class ThreadScheduler::Agenda : public std::enable_shared_from_this<Agenda> {
       Tasks::node_type task = tasks_.extract(tasks_.begin());
       lock.unlock();
       task.mapped()();
-      task = {};  // May destroy the scheduler. Unlocked: what it captured may schedule tasks as it goes.
+      task = {};  // May destroy the scheduler. Unlocked: the destructors of its captures may schedule tasks.
       lock.lock();
     }
   }
 
-  /// Returns true when the first task is due, false when no more will come.
+  /// Blocks until the first task is due. Returns false if the scheduler is closed and no task is left.
   bool awaitTask(std::unique_lock<std::mutex>& lock) {
     while (!closed_) {
       const TimePoint due = nextDue();
@@ -56,8 +56,8 @@ class ThreadScheduler::Agenda : public std::enable_shared_from_this<Agenda> {
 
   TimePoint nextDue() const { return tasks_.empty() ? kForever : tasks_.begin()->first; }
 
-  void dropWhatIsNotDue() {
-    Tasks dropped;  // Destroyed last, unlocked: what the tasks captured may come back to the scheduler.
+  void dropTasksNotDue() {
+    Tasks dropped;  // Destroyed last, unlocked: the destructors of captures may call the scheduler.
     const std::lock_guard lock(mutex_);
     closed_ = true;
     for (auto task = tasks_.upper_bound(clock_.now()); task != tasks_.end();)

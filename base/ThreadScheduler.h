@@ -1,4 +1,4 @@
-// A scheduler with a thread.
+// A scheduler that runs tasks on one thread.
 #pragma once
 
 #include <memory>
@@ -9,12 +9,12 @@ namespace appsync {
 
 /// One thread, started by the first `after`, runs all tasks. A task that throws ends the program.
 ///
-/// Destruction drops the tasks that are not yet due and returns when those that are due have run: no task starts after
-/// it. It may happen on the scheduler's own thread, that is inside a task or in the destruction of what a task
-/// captured; that task is then the only one that is not waited for.
+/// The destructor drops the tasks that are not due and returns when the due ones have run: no task starts after it. It
+/// may run on the scheduler's thread, during a task or the destruction of a task's captures; it then waits for all
+/// tasks except that one.
 class ThreadScheduler final : public Scheduler {
  public:
-  /// `clock` tells the time and must outlive the scheduler.
+  /// `clock` must outlive the scheduler.
   explicit ThreadScheduler(Clock& clock);
   ~ThreadScheduler() override;
   ThreadScheduler(const ThreadScheduler&) = delete;
@@ -23,7 +23,7 @@ class ThreadScheduler final : public Scheduler {
   /// Throws std::system_error if the thread cannot be started.
   void after(Duration delay, std::function<void()> task) override;
 
-  /// Does already what destruction does. Of the tasks that come after it none runs; each is dropped as it comes.
+  /// Does what the destructor does. Tasks that are added later are dropped.
   void close();
 
  private:

@@ -2,7 +2,7 @@
 
 #include <ctime>
 
-namespace appsync::device {
+namespace appsync {
 
 void appendTime(std::string& out, std::chrono::sys_time<std::chrono::microseconds> time) {
   const auto seconds = std::chrono::floor<std::chrono::seconds>(time);
@@ -15,4 +15,4 @@ void appendTime(std::string& out, std::chrono::sys_time<std::chrono::microsecond
   out.append(".").append(fraction, 1).append("Z");
 }
 
-}  // namespace appsync::device
+}  // namespace appsync

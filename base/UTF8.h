@@ -1,4 +1,4 @@
-// UTF-8: the one decoder and encoder. All text in values, messages and paths is meant to be UTF-8.
+// UTF-8: the only decoder and encoder of this repository.
 #pragma once
 
 #include <cstddef>
@@ -31,7 +31,8 @@ namespace appsync {
 /// Decodes the well-formed sequence of `length` bytes at `text`.
 [[nodiscard]] char32_t decodeSequence(const char* text, std::size_t length) noexcept;
 
-/// Returns the offset of the first byte that is not part of a well-formed sequence, or nullopt if all of `text` is UTF-8.
+/// Returns the offset of the first byte that is not part of a well-formed sequence, or nullopt if all of `text` is
+/// UTF-8.
 [[nodiscard]] std::optional<std::size_t> findMalformedUTF8(std::string_view text) noexcept;
 
 /// One character of a text from outside, or one byte that is not part of a well-formed sequence.

@@ -69,7 +69,7 @@ void VirtualTime::moveTo(TimePoint time) {
   now_ = std::max(now_, time);
   for (Waiter& waiter : waiters_) {
     if (waiter.deadline > now_) continue;
-    waiter.beingWoken = true;  // It cannot leave now, so its mutex can be taken without holding ours.
+    waiter.beingWoken = true;  // Keeps it from leaving, so that its mutex can be locked without holding ours.
     own.unlock();
     {
       const std::lock_guard theirs(waiter.mutex);

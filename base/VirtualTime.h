@@ -1,4 +1,4 @@
-// Time that moves only when told to.
+// Time that advances only on request.
 #pragma once
 
 #include <condition_variable>
@@ -15,11 +15,11 @@
 
 namespace appsync {
 
-/// A clock and scheduler for whatever must not depend on real time. All operations may be called on any thread.
+/// A clock and scheduler for code that must not depend on real time, such as tests. Thread-safe.
 class VirtualTime final : public Clock, public Scheduler {
  public:
   VirtualTime() = default;
-  /// Drops what is pending.
+  /// Drops pending tasks.
   ~VirtualTime() override;
   VirtualTime(const VirtualTime&) = delete;
   VirtualTime& operator=(const VirtualTime&) = delete;
@@ -29,27 +29,27 @@ class VirtualTime final : public Clock, public Scheduler {
             const std::function<bool()>& ready) override;
   void after(Duration delay, std::function<void()> task) override;
 
-  /// Moves time on by `duration`: runs the tasks that fall due, also those that tasks add meanwhile, on the calling
-  /// thread, in order of due time and then of scheduling, with now() at each one's due time; and wakes the waiters
-  /// whose deadlines are reached. What a task throws ends the call, with time at that task's due time.
-  /// Calls on several threads follow one another; a call from inside a task throws std::logic_error.
+  /// Advances time by `duration`: runs the tasks that become due, including tasks added by tasks, on the calling
+  /// thread, in order of due time and then of scheduling, with now() at each task's due time, and wakes the waiters
+  /// whose deadlines are reached. If a task throws, time stays at its due time and the exception is passed on.
+  /// Concurrent calls are serialised; a call from a task throws std::logic_error.
   void advance(Duration duration);
 
   /// Blocks until at least `count` tasks are pending.
   void waitUntilScheduled(std::size_t count) const;
 
-  /// Blocks until at least `count` threads are blocked in `wait` with a deadline (not kForever) that is still to come.
+  /// Blocks until at least `count` threads are blocked in `wait` with a deadline (not kForever) in the future.
   void waitUntilWaiting(std::size_t count) const;
 
   std::size_t pendingTasks() const;
 
-  /// When the next pending task is due; none if there is none.
+  /// Returns the due time of the next pending task, or nullopt if no task is pending.
   std::optional<TimePoint> nextDue() const;
 
  private:
   using Tasks = std::multimap<TimePoint, std::function<void()>>;
 
-  /// A thread in `wait`. Its own mutex and condition may go as soon as it has left.
+  /// A thread in `wait`. Its mutex and condition variable may be destroyed as soon as it has left.
   struct Waiter {
     std::condition_variable& condition;
     std::mutex& mutex;
@@ -63,7 +63,7 @@ class VirtualTime final : public Clock, public Scheduler {
   void leave(Waiters::iterator waiter);
 
   SerialQueue advances_{"advance of virtual time"};
-  /// Never held while a waiter's own mutex is taken: waiters read the time with theirs locked.
+  /// Never held while a waiter's mutex is locked: waiters read the time while they hold theirs.
   mutable std::mutex mutex_;
   mutable std::condition_variable changed_;
   TimePoint now_{};

@@ -26,7 +26,7 @@ Examples:
 
 std::string timeText(const TransactionEntry& entry) {
   std::string text;
-  device::appendTime(text, entry.time);
+  appendTime(text, entry.time);
   return text;
 }
 

@@ -24,7 +24,7 @@ class TodoIndex {
   [[nodiscard]] const plist::Value* firstEntry(std::string_view identifier) const;
 
  private:
-  std::unordered_map<std::string_view, const plist::Value*, SecretHash> first_;
+  std::unordered_map<std::string_view, const plist::Value*, SeededHash> first_;
 };
 
 }  // namespace appsync

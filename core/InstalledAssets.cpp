@@ -23,7 +23,7 @@ class CandidateSet {
   [[nodiscard]] auto end() const { return inOrder_.end(); }
 
  private:
-  std::unordered_set<std::string_view, SecretHash> seen_;
+  std::unordered_set<std::string_view, SeededHash> seen_;
   std::vector<std::string_view> inOrder_;
 };
 

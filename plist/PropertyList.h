@@ -1,4 +1,4 @@
-// Property lists: the value, and its three file forms.
+// Property lists: reading and writing their three file formats.
 #pragma once
 
 #include <optional>
@@ -18,64 +18,61 @@ namespace appsync::plist {
 /// The codes of errors in the domain kPropertyList.
 enum class Failure : long {
   truncated = 1,     ///< the document ends too early
-  malformed,         ///< it breaks its form's rules
-  outOfRange,        ///< a number, date, offset or length lies outside what is allowed
-  badText,           ///< bytes that are not text in their encoding, or text its form cannot hold
+  malformed,         ///< it violates the syntax of its format
+  outOfRange,        ///< a number, date, offset or length is outside the allowed range
+  badText,           ///< bytes that are not text in their encoding, or text that the format cannot represent
   tooDeep,           ///< containers nested deeper than kMaximumDepth
   tooLarge,          ///< a document or value whose shared content expands to too many values or too much text
-  unsupported,       ///< a form or element that is understood but refused
-  notRepresentable,  ///< a value that the form to be written cannot hold; every null is one
+  unsupported,       ///< a format or element that is known but refused
+  notRepresentable,  ///< a value that the format cannot represent; null in any format
 };
 
-/// Documents nested deeper than this are neither read nor written.
+/// Readers and writers refuse documents with deeper nesting: their recursion needs stack for each level.
 inline constexpr int kMaximumDepth = 512;
 
-/// Bytes. Values that share their content can stand for far more than memory holds: forms that repeat shared content,
-/// such as XML, are refused beyond this size.
+/// In bytes. Values that share content can expand to far more than memory holds: a document that would exceed this size
+/// with shared content repeated, as in XML, is refused.
 inline constexpr std::size_t kMaximumExpandedSize = std::size_t{1} << 30;
 
-// Reading. Input may be hostile: nothing in it is trusted, time and memory stay in proportion to its size, and a
-// failure names the byte at which it was found. Of equal keys in one dictionary the last one counts. Repeated
-// references to text or data in a binary document share its storage. Every document that the writers return can be
-// read.
+// Reading. Parsers of untrusted input: time and memory are proportional to the size of the document, and errors name
+// the byte offset. Of equal keys in one dictionary the last one wins. Repeated references to text or data in a binary
+// document share its storage. Every document that the writers return can be read.
 
-/// Reads whichever of the three forms the bytes are in, told by their content.
+/// Detects the format by the content.
 [[nodiscard]] Result<Value> read(ByteView document);
-/// The same of a document that is given away: long data in the binary form is not copied, and keeps all of it alive.
+/// Detects the format by the content. Long data in the binary format is not copied: it keeps the whole document alive.
 [[nodiscard]] Result<Value> read(Bytes&& document);
-/// "bplist00". Sets are refused.
+/// The binary format, "bplist00". Refuses sets.
 [[nodiscard]] Result<Value> readBinary(ByteView document);
-/// UTF-8 or, with a byte-order mark, UTF-16. Entity declarations are refused, other document types skipped.
+/// The XML format, in UTF-8 or UTF-16. Refuses entity declarations; skips other document type declarations.
 [[nodiscard]] Result<Value> readXML(ByteView document);
-/// The old text form: `{ key = value; }`, `( a, b )`, `<0f a0>`, "quoted" and bare words, comments; also the
+/// The ASCII format: `{ key = value; }`, `( a, b )`, `<0f a0>`, "quoted" and bare words, comments; also the
 /// `key = value;` lines of a strings file. Every scalar in it is a string or data.
 [[nodiscard]] Result<Value> readText(ByteView document);
-/// Binary if the document begins like one, else XML: for files that programs wrote. Almost any text would pass for the
-/// ASCII format.
+/// Reads the binary or the XML format. For files that are never in the ASCII format, which accepts almost any text.
 [[nodiscard]] Result<Value> readBinaryOrXML(ByteView document);
 
 /// Returns the error for a document whose root should be a dictionary and is not.
 [[nodiscard]] Error rootIsNoDictionary();
 
-// Writing. Equal values give equal bytes. A null anywhere makes both fail.
+// Writing. Deterministic: equal values give equal bytes. A null anywhere in `root` is an error.
 
-/// "bplist00", with equal scalars stored once and shared by the value that is read back. Fails on far more than
-/// kMaximumExpandedSize of text, counted as often as it occurs: readers refuse it too.
+/// Writes the binary format, "bplist00". Equal scalars are stored once. Fails if text, counted at each occurrence,
+/// takes far more than kMaximumExpandedSize, because readers refuse that.
 [[nodiscard]] Result<Bytes> writeBinary(const Value& root);
-/// UTF-8, without a document type declaration. Fails on a uid and on text with characters that XML cannot hold;
-/// dates lose their fractions of a second.
+/// Writes the XML format in UTF-8, without a document type declaration. Fails on a uid and on text with characters that
+/// XML forbids. Dates lose their fractions of a second.
 [[nodiscard]] Result<Bytes> writeXML(const Value& root);
 
-/// Estimates the size in bytes of a form that repeats shared content. Beyond kMaximumExpandedSize it only tells that it
-/// is larger.
+/// Estimates the size in bytes of a format that repeats shared content. Stops counting at kMaximumExpandedSize.
 [[nodiscard]] std::size_t expandedSize(const Value& value);
 
-/// What gives a boolean: booleans, numbers (not zero) and strings: true for those that start with Y, y, T, t or a
-/// number that is not zero, false for all others. Nothing else does.
+/// Converts booleans, numbers (true if not zero) and strings (true if they start with Y, y, T, t or a number that is
+/// not zero). Returns nullopt for all other types.
 [[nodiscard]] std::optional<bool> truth(const Value& value) noexcept;
 
-/// Appends `value` in the style of the ASCII format, for logs, which escape control characters. Dictionaries keep their
-/// order, long data is cut short and followed by its length, deep nesting and text after a megabyte are cut to "…".
+/// Appends `value` in the style of the ASCII format, for logs, which escape control characters. Long data is truncated
+/// and followed by its length; deep nesting and text after a megabyte are replaced by "…".
 void appendDescription(std::string& out, const Value& value);
 void appendDescription(std::string& out, const Array& array);
 inline void appendDescription(std::string& out, const Dictionary& dictionary) {

@@ -23,7 +23,7 @@ using Array = std::vector<Value>;
 
 enum class Type : std::uint8_t { null, boolean, integer, real, string, data, date, uid, array, dictionary };
 
-/// A moment, in seconds since 2001-01-01 00:00:00 UTC.
+/// A point in time, in seconds since 2001-01-01 00:00:00 UTC.
 struct Date {
   double seconds = 0;
   auto operator<=>(const Date&) const = default;
@@ -37,8 +37,8 @@ struct Uid {
 
 /// Unique string keys, each with a value, in the order of the keys' bytes.
 ///
-/// A copy shares the entries until one side changes. Different copies may be used on different threads.
-/// Pointers to values hold until the dictionary they came from is next changed or copied.
+/// Copy-on-write. Different copies may be used on different threads.
+/// Pointers to values are valid until the dictionary is changed or copied.
 class Dictionary {
  public:
   struct Entry {
@@ -46,7 +46,7 @@ class Dictionary {
     const Value& value;
   };
 
-  /// Walks the entries. `*iterator` is an Entry by value: `for (const auto& [key, value] : dictionary)`.
+  /// Iterates over the entries. `*iterator` is an Entry by value: `for (const auto& [key, value] : dictionary)`.
   class Iterator {
    public:
     using iterator_category = std::input_iterator_tag;
@@ -78,14 +78,14 @@ class Dictionary {
   }
   ~Dictionary();
 
-  /// The value under `key`; null when there is none.
+  /// Returns the value under `key`, or null if there is no such key.
   [[nodiscard]] const Value* find(std::string_view key) const noexcept;
   [[nodiscard]] Value* find(std::string_view key);
   [[nodiscard]] bool contains(std::string_view key) const noexcept { return find(key) != nullptr; }
 
-  /// Puts `value` under `key` in place of what was there. Cheapest when keys come in their order.
+  /// Sets the value under `key`, replacing an existing one. Fastest if keys are set in ascending order.
   void set(std::string_view key, Value value);
-  /// False when there was no such key.
+  /// Returns false if there is no such key.
   bool erase(std::string_view key);
 
   [[nodiscard]] std::size_t size() const noexcept;
@@ -102,10 +102,10 @@ class Dictionary {
 
 /// Any property-list value, or null.
 ///
-/// A value: a copy costs a reference count and behaves as if everything in it had been copied. Different copies may be
-/// used on different threads. Nesting of any depth can be destroyed, compared and described.
-/// What `array()`, `dictionary()`, `string()` and `data()` point to holds until this value is changed or destroyed;
-/// what the mutable forms point to may be written through only until this value is copied.
+/// Copy-on-write: a copy costs a reference count and behaves like a deep copy. Different copies may be used on
+/// different threads. Values of any nesting depth can be destroyed, compared and described.
+/// The results of `array()`, `dictionary()`, `string()` and `data()` are valid until this value is changed or
+/// destroyed; a mutable result must not be written through after this value is copied.
 class Value {
  public:
   Value() noexcept = default;
@@ -128,7 +128,7 @@ class Value {
   Value(const char* text) : Value(std::string_view(text)) {}
   Value(std::string_view text) : Value(Type::string, text) {}
   Value(const std::string& text) : Value(Type::string, text) {}
-  /// Data. Keeps the buffer as it is, without a copy, when it is not tiny.
+  /// Data. Takes over the buffer, without a copy unless it is tiny.
   Value(Bytes bytes);
   Value(Date date) noexcept { store(Type::date, date.seconds); }
   Value(Uid uid) noexcept { store(Type::uid, uid.number); }
@@ -138,7 +138,7 @@ class Value {
     bits_.length = kShared;
     ::new (static_cast<void*>(bits_.storage)) Dictionary(std::move(dictionary));
   }
-  /// Data that is copied.
+  /// Data, as a copy of `bytes`.
   [[nodiscard]] static Value data(ByteView bytes) { return {Type::data, textOf(bytes)}; }
 
   Value(const Value& other) noexcept : bits_(other.bits_) {
@@ -162,7 +162,7 @@ class Value {
   [[nodiscard]] Type type() const noexcept { return bits_.type; }
   [[nodiscard]] bool isNull() const noexcept { return bits_.type == Type::null; }
 
-  // Each yields nothing when the value is of another type. Nothing is converted but numbers that fit.
+  // Each returns nullopt or null if the value has another type. Only numbers are converted, and only if they fit.
   [[nodiscard]] std::optional<bool> boolean() const noexcept;
   [[nodiscard]] std::optional<std::int64_t> int64() const noexcept;
   [[nodiscard]] std::optional<std::uint64_t> uint64() const noexcept;
@@ -184,13 +184,13 @@ class Value {
     return bits_.type == Type::dictionary ? std::launder(reinterpret_cast<Dictionary*>(bits_.storage)) : nullptr;
   }
 
-  /// The value under `key` when this is a dictionary that has it, else null.
+  /// Returns the value under `key`, or null if this is not a dictionary or has no such key.
   [[nodiscard]] const Value* find(std::string_view key) const noexcept {
     const Dictionary* held = dictionary();
     return held == nullptr ? nullptr : held->find(key);
   }
 
-  /// Same type and same content. An integer never equals a real. Unlike in arithmetic a NaN equals a NaN,
+  /// Whether type and content are equal. An integer never equals a real. A NaN equals a NaN, unlike in arithmetic,
   /// so that a document always equals its copy.
   bool operator==(const Value& other) const;
 
@@ -233,7 +233,7 @@ class Value {
     return content;
   }
   void storeLong(std::string_view bytes);
-  /// Of a string or data.
+  /// Only for a string or data.
   [[nodiscard]] std::string_view text() const noexcept {
     return bits_.length == kShared ? longText()
                                    : std::string_view(reinterpret_cast<const char*>(bits_.storage), bits_.length);

@@ -29,7 +29,7 @@ class DemotedApps {
   [[nodiscard]] const std::optional<plist::Dictionary>& lists() const { return lists_; }
 
  private:
-  using IdentifierViews = std::unordered_set<std::string_view, SecretHash>;
+  using IdentifierViews = std::unordered_set<std::string_view, SeededHash>;
 
   [[nodiscard]] IdentifierViews identifiersUnder(std::string_view key) const;
 

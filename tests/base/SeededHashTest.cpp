@@ -12,15 +12,15 @@ namespace {
 constexpr int kMany = 1000;
 constexpr std::uint64_t kSecret = 0x0123456789ABCDEF;
 
-TEST(SecretHash, EqualTextsHaveOneHash) {
+TEST(SeededHash, EqualTextsHaveOneHash) {
   for (const std::size_t length : {0U, 1U, 31U, 32U, 33U, 64U, 1000U}) {
     const std::string text(length, 'x');
-    EXPECT_EQ(SecretHash()(text), SecretHash()(std::string(text)));
+    EXPECT_EQ(SeededHash()(text), SeededHash()(std::string(text)));
     EXPECT_EQ(hashText(text, kSecret), hashText(std::string(text), kSecret));
   }
 }
 
-TEST(SecretHash, LengthContentAndSecretDecide) {
+TEST(SeededHash, LengthContentAndSecretDecide) {
   std::set<std::uint64_t> hashes;
   for (std::size_t length = 0; length < kMany; ++length)
     hashes.insert(hashText(std::string(length, '\0'), kSecret));
@@ -31,7 +31,7 @@ TEST(SecretHash, LengthContentAndSecretDecide) {
 }
 
 /// Content that turns one factor of a product into zero for whoever knows the factors but not the secret.
-TEST(SecretHash, NoPartOfABlockTakesAnothersWeight) {
+TEST(SeededHash, NoPartOfABlockTakesAnothersWeight) {
   for (const std::size_t fixed : {0U, 1U, 2U, 3U}) {
     std::set<std::uint64_t> hashes;
     for (std::uint64_t i = 0; i < kMany; ++i) {
@@ -44,7 +44,7 @@ TEST(SecretHash, NoPartOfABlockTakesAnothersWeight) {
   }
 }
 
-TEST(SecretHash, TheProcessKeepsItsSecret) {
+TEST(SeededHash, TheProcessKeepsItsSecret) {
   EXPECT_EQ(secretOfProcess(), secretOfProcess());
   EXPECT_NE(secretOfProcess(), 0U);
 }
