@@ -25,7 +25,7 @@
 #include "plist/PropertyList.h"
 
 namespace appsync::plist {
-class DocumentEntries;
+class DictionaryStream;
 }
 
 namespace appsync {
@@ -294,7 +294,7 @@ class AppsClient final : public platform::ZTClient,
                                                                                  bool existingApp);
   void _satisfyAppAssetPromise(const platform::ZTAsset& asset,
                                const std::shared_ptr<platform::InstallCoordinator>& coordinator);
-  [[nodiscard]] bool _restoreApps(plist::DocumentEntries& info);
+  [[nodiscard]] bool _restoreApps(plist::DictionaryStream& info);
   void _waitForRestorePlaceholders();
   /// The identifiers of installed apps and placeholders.
   [[nodiscard]] Identifiers _userBundles();

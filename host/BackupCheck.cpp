@@ -66,7 +66,7 @@ Status checkRestoreFile(const Backup& backup) {
   }
   Result<Bytes> document = plist::writeBinary(entries);
   if (!document) return document.error();
-  const auto readable = plist::DocumentEntries::open(std::move(document).value());
+  const auto readable = plist::DictionaryStream::open(std::move(document).value());
   return readable ? Status() : Status(readable.error());
 }
 

@@ -15,7 +15,7 @@ bool BinaryReader::beginEntries() {
   const unsigned marker = std::to_integer<unsigned>(begin_[at]);
   return marker >> 4 == 0xD && readExtent(at, marker & 0xFU, entries_) &&
          fits(at, entries_, std::uint64_t{2} * referenceSize_) &&
-         isApart(top_, at, entries_.count * 2 * referenceSize_) && expand({2 * entries_.count, 0}, at);
+         checkOverlap(top_, at, entries_.count * 2 * referenceSize_) && expand({2 * entries_.count, 0}, at);
 }
 
 Result<std::vector<std::size_t>> BinaryReader::checkEntries() {

@@ -100,7 +100,7 @@ inline bool BinaryReader::wasSeen(std::uint64_t number) {
 
 /// Objects that lie in each other would unfold without being referred to twice. Together they cannot be longer than
 /// the document unless they do.
-bool BinaryReader::isApart(std::uint64_t number, std::size_t at, std::uint64_t bytes) {
+bool BinaryReader::checkOverlap(std::uint64_t number, std::size_t at, std::uint64_t bytes) {
   if (!measured_.insert(number)) return true;
   content_ += bytes;
   if (content_ <= table_) return true;
@@ -226,7 +226,7 @@ inline void BinaryReader::readContent(std::uint64_t number, std::size_t at, unsi
   if (!readExtent(at, marker & 0xFU, extent)) return;
   const unsigned type = marker >> 4;
   const std::uint64_t bytesEach = bytesPerElement(type, referenceSize_);
-  const bool isSound = fits(at, extent, bytesEach) && isApart(number, at, extent.count * bytesEach) &&
+  const bool isSound = fits(at, extent, bytesEach) && checkOverlap(number, at, extent.count * bytesEach) &&
                        expand(expansionOf(type, extent.count), at);
   if (!isSound) return;
   switch (type) {
@@ -304,8 +304,8 @@ bool BinaryReader::learnKeys(KnownKeys& known, Extent extent, int depth) {
   std::vector<Value> nulls(keys.size());
   const Dictionary sample = makeDictionary(keys, nulls);
   if (sample.size() != keys.size()) return false;
-  known.maker = DictionaryMaker(*Internals::payload(sample)->shape);
-  auto places = placesOf(keys, *known.maker);
+  known.pool = DictionaryPool(*Internals::payload(sample)->shape);
+  auto places = placesOf(keys, *known.pool);
   if (!places.empty()) known.places = std::make_shared<const std::vector<std::uint32_t>>(std::move(places));
   return true;
 }
@@ -326,7 +326,7 @@ void BinaryReader::readDictionary(std::size_t at, Extent extent, int depth, Valu
 
   // Kept here, because the keys of dictionaries within may displace the known ones.
   const auto places = known->places;
-  Dictionary dictionary = known->maker.make();
+  Dictionary dictionary = known->pool.make();
   Value* const values = Internals::payload(dictionary)->values();
   const std::size_t first = extent.start + count * referenceSize_;
   for (std::size_t i = 0; i < count; ++i) {

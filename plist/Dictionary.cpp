@@ -44,12 +44,12 @@ void Slab::drop(Slab* slab, std::uint32_t times) noexcept {
   ::operator delete(slab);
 }
 
-DictionaryMaker::~DictionaryMaker() {
+DictionaryPool::~DictionaryPool() {
   if (shape_ != nullptr) Shape::drop(shape_, left_ + 1);
   if (slab_ != nullptr) Slab::drop(slab_, left_);
 }
 
-Dictionary DictionaryMaker::make() {
+Dictionary DictionaryPool::make() {
   const std::size_t count = shape_->keys.size();
   const std::size_t bytes = sizeof(DictionaryPayload) + count * sizeof(Value);
   if (left_ == 0) refill(bytes);
@@ -63,7 +63,7 @@ Dictionary DictionaryMaker::make() {
 }
 
 /// The first dictionary may be the only one of its shape; each time there turn out to be more, twice as many follow.
-void DictionaryMaker::refill(std::size_t bytesEach) {
+void DictionaryPool::refill(std::size_t bytesEach) {
   slab_ = Slab::make(bytesEach * atOnce_, atOnce_);
   next_ = slab_->memory();
   left_ = atOnce_;
@@ -150,8 +150,8 @@ Dictionary makeDictionary(std::span<const Value> keys, std::span<Value> values) 
   return Internals::adopt(payload);
 }
 
-Dictionary makeDictionary(DictionaryMaker& maker, std::span<const std::uint32_t> places, std::span<Value> values) {
-  Dictionary dictionary = maker.make();
+Dictionary makeDictionary(DictionaryPool& pool, std::span<const std::uint32_t> places, std::span<Value> values) {
+  Dictionary dictionary = pool.make();
   Value* const made = Internals::payload(dictionary)->values();
   for (std::size_t i = 0; i < values.size(); ++i)
     made[places.empty() ? i : places[i]] = std::move(values[i]);

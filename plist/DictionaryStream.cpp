@@ -6,14 +6,14 @@
 
 namespace appsync::plist {
 
-DocumentEntries::DocumentEntries() = default;
-DocumentEntries::DocumentEntries(DocumentEntries&&) noexcept = default;
-DocumentEntries& DocumentEntries::operator=(DocumentEntries&&) noexcept = default;
-DocumentEntries::~DocumentEntries() = default;
+DictionaryStream::DictionaryStream() = default;
+DictionaryStream::DictionaryStream(DictionaryStream&&) noexcept = default;
+DictionaryStream& DictionaryStream::operator=(DictionaryStream&&) noexcept = default;
+DictionaryStream::~DictionaryStream() = default;
 
-Result<DocumentEntries> DocumentEntries::open(Bytes&& document) {
+Result<DictionaryStream> DictionaryStream::open(Bytes&& document) {
   const auto kept = std::make_shared<const Bytes>(std::move(document));
-  DocumentEntries entries;
+  DictionaryStream entries;
   entries.reader_ = std::make_unique<BinaryReader>(kept);
   if (entries.reader_->beginEntries()) {
     Result<std::vector<std::size_t>> places = entries.reader_->checkEntries();
@@ -30,7 +30,7 @@ Result<DocumentEntries> DocumentEntries::open(Bytes&& document) {
   return entries;
 }
 
-void DocumentEntries::visit(const Visit& visit) {
+void DictionaryStream::visit(const Visit& visit) {
   for (const auto& [key, value] : dictionary_)
     visit(key, value);
   if (reader_) reader_->startAgain();

@@ -1,4 +1,4 @@
-// Documents of many entries, without all of them in memory at once.
+// Large dictionaries, one entry in memory at a time.
 #pragma once
 
 #include <cstddef>
@@ -13,28 +13,28 @@ namespace appsync::plist {
 
 class BinaryReader;
 
-/// A document whose root is a dictionary. Of the binary form it keeps the document and a number for each entry, and
-/// what it hands out is read anew and dropped; the other forms are read as a whole.
-class DocumentEntries {
+/// A document whose root is a dictionary. For the binary format it keeps the document and one number for each entry,
+/// and parses each entry when it is visited; other formats are parsed as a whole.
+class DictionaryStream {
  public:
-  /// A value that is kept keeps the document.
+  /// A Value that outlives the callback keeps the whole document in memory.
   using Visit = std::function<void(std::string_view key, const Value& value)>;
 
-  /// Reads everything once, to be sure that it can be read: fails where `read` does, or when the root is no dictionary.
-  /// (How far a hostile document may unfold is counted for each entry anew.)
-  [[nodiscard]] static Result<DocumentEntries> open(Bytes&& document);
+  /// Parses the whole document once for validation. Fails where `read` fails (but expansion limits apply to each entry
+  /// separately) or if the root is not a dictionary.
+  [[nodiscard]] static Result<DictionaryStream> open(Bytes&& document);
 
-  DocumentEntries(DocumentEntries&&) noexcept;
-  DocumentEntries& operator=(DocumentEntries&&) noexcept;
-  ~DocumentEntries();
+  DictionaryStream(DictionaryStream&&) noexcept;
+  DictionaryStream& operator=(DictionaryStream&&) noexcept;
+  ~DictionaryStream();
 
-  /// Hands out every entry in the order of a dictionary's keys; of equal keys the last one counts.
+  /// Calls `visit` with every entry, in the order of the keys; of equal keys the last one wins.
   void visit(const Visit& visit);
 
  private:
-  DocumentEntries();
+  DictionaryStream();
 
-  /// Null when the whole is in `dictionary_`.
+  /// Null if the document was parsed as a whole into `dictionary_`.
   std::unique_ptr<BinaryReader> reader_;
   std::vector<std::size_t> places_;
   Dictionary dictionary_;

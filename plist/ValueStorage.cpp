@@ -23,14 +23,14 @@ void TextPayload::destroy(TextPayload* text) noexcept {
 namespace {
 
 /// Below this many containers inside one another, freeing goes on in a loop instead of recursion.
-constexpr int kMaximumBurialDepth = 64;
+constexpr int kMaximumDestructionDepth = 64;
 
-struct Burial {
+struct Destruction {
   int depth = 0;
   Container* waiting = nullptr;
 };
 
-thread_local Burial burial;
+thread_local Destruction destruction;
 
 }  // namespace
 
@@ -42,21 +42,21 @@ void Container::destroy(Container* container) noexcept {
   }
 }
 
-void Container::bury(Container* container) noexcept {
-  if (burial.depth == kMaximumBurialDepth) {
-    container->nextToBury = std::exchange(burial.waiting, container);
+void Container::destroyLater(Container* container) noexcept {
+  if (destruction.depth == kMaximumDestructionDepth) {
+    container->nextToDestroy = std::exchange(destruction.waiting, container);
     return;
   }
-  ++burial.depth;
+  ++destruction.depth;
   destroy(container);
-  if (burial.depth == 1) {
-    while (burial.waiting != nullptr) {
-      Container* next = burial.waiting;
-      burial.waiting = next->nextToBury;
+  if (destruction.depth == 1) {
+    while (destruction.waiting != nullptr) {
+      Container* next = destruction.waiting;
+      destruction.waiting = next->nextToDestroy;
       destroy(next);
     }
   }
-  --burial.depth;
+  --destruction.depth;
 }
 
 Value::Value(Bytes bytes) {

@@ -59,8 +59,8 @@ NumberOutcome parseInteger(std::string_view text, Value& number) noexcept {
   return NumberOutcome::parsed;
 }
 
-/// Parses a decimal number with an optional exponent, "nan", "inf" or "infinity", with an optional sign. A magnitude too
-/// small for a double becomes zero.
+/// Parses a decimal number with an optional exponent, "nan", "inf" or "infinity", with an optional sign. A magnitude
+/// too small for a double becomes zero.
 NumberOutcome parseReal(std::string_view text, double& number) noexcept {
   const bool isNegative = takeSign(text);
   if (text.starts_with('-') || text.find('(') != std::string_view::npos) return NumberOutcome::malformed;
@@ -90,7 +90,7 @@ class XMLReader {
  private:
   /// The keys of the latest dictionary at one depth. The next one there most likely has the same.
   struct Level {
-    DictionaryMaker maker;
+    DictionaryPool pool;
     /// As they were written.
     std::vector<Value> keys;
     std::vector<std::uint32_t> places;
@@ -111,7 +111,7 @@ class XMLReader {
   Value readArray(const Tag& tag, int depth);
   Value readDictionary(const Tag& tag, int depth);
   bool readEntry(const Tag& tag, Level& level, std::size_t& matched, std::size_t firstKey, int depth);
-  void spellOut(const Level& level, std::size_t matched, std::size_t firstKey);
+  void materializeKeys(const Level& level, std::size_t matched, std::size_t firstKey);
   Value finishDictionary(Level& level, std::size_t matched, std::size_t firstKey, std::size_t firstValue);
 
   XMLScanner scanner_;
@@ -259,7 +259,7 @@ bool XMLReader::readEntry(const Tag& tag, Level& level, std::size_t& matched, st
   if (isAsExpected) {
     ++matched;
   } else {
-    spellOut(level, matched, firstKey);
+    materializeKeys(level, matched, firstKey);
     keys_.emplace_back(key);
   }
   const Tag next = scanner_.readTag();
@@ -269,7 +269,7 @@ bool XMLReader::readEntry(const Tag& tag, Level& level, std::size_t& matched, st
 }
 
 /// Puts the matched keys into `keys_` unless some are there already.
-void XMLReader::spellOut(const Level& level, std::size_t matched, std::size_t firstKey) {
+void XMLReader::materializeKeys(const Level& level, std::size_t matched, std::size_t firstKey) {
   if (keys_.size() != firstKey) return;
   keys_.insert(keys_.end(), level.keys.begin(), level.keys.begin() + static_cast<std::ptrdiff_t>(matched));
 }
@@ -279,14 +279,14 @@ Value XMLReader::finishDictionary(Level& level, std::size_t matched, std::size_t
   if (values.empty()) return Dictionary();
   Dictionary dictionary;
   if (keys_.size() == firstKey && matched == level.keys.size()) {
-    dictionary = makeDictionary(level.maker, level.places, values);
+    dictionary = makeDictionary(level.pool, level.places, values);
   } else {
-    spellOut(level, matched, firstKey);
+    materializeKeys(level, matched, firstKey);
     const std::span<Value> keys = std::span(keys_).subspan(firstKey);
     dictionary = makeDictionary(keys, values);
     if (dictionary.size() == keys.size()) {
-      level.maker = DictionaryMaker(*Internals::payload(dictionary)->shape);
-      level.places = placesOf(keys, *level.maker);
+      level.pool = DictionaryPool(*Internals::payload(dictionary)->shape);
+      level.places = placesOf(keys, *level.pool);
       level.keys.assign(std::make_move_iterator(keys.begin()), std::make_move_iterator(keys.end()));
     }
     keys_.resize(firstKey);

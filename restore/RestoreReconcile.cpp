@@ -17,14 +17,14 @@ constexpr std::string_view kRestoreInfoPath = "/var/mobile/Media/HarvoRestore/Re
 constexpr std::string_view kFiledRestoreInfoPath = "/var/mobile/Library/Logs/MediaServices/RestoreApplications.plist";
 
 /// A host's file may hold thousands of apps with their icons: only one is in memory beside it at a time.
-std::optional<plist::DocumentEntries> readRestoreInfo(platform::FileSystem& files, const PlugInLog& log) {
+std::optional<plist::DictionaryStream> readRestoreInfo(platform::FileSystem& files, const PlugInLog& log) {
   auto bytes = files.readFile(kRestoreInfoPath);
   if (!bytes) {
     log.message("%s|failed to read harvo app restore info. err=%{public}@", bytes.error());
     return std::nullopt;
   }
   log.message("%s|processing harvo restore info");
-  auto info = plist::DocumentEntries::open(std::move(bytes).value());
+  auto info = plist::DictionaryStream::open(std::move(bytes).value());
   if (!info) {
     log.message("%s|failed to parse harvo app restore info. err=%{public}@", info.error());
     return std::nullopt;
@@ -77,7 +77,7 @@ bool AppsClient::_processHarvoRestoreInfo() {
 }
 
 /// What came of the last app that there was something to do for.
-bool AppsClient::_restoreApps(plist::DocumentEntries& info) {
+bool AppsClient::_restoreApps(plist::DictionaryStream& info) {
   const DemotedApps demotedApps(_loadDemotedAppsPlist(_platform, kDemotedAppsPath, nullptr));
   _log.summary("%s|Demoted Apps: %{public}@", demotedApps.lists());
   // Asked for each app, a walk would cost as many walks as there are apps. What comes to the device while a restore

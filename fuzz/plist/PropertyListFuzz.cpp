@@ -56,7 +56,7 @@ void check(const Result<plist::Value>& value) {
 /// Requires the same content entry by entry as in the whole document. What entries have in common is counted for each
 /// of them: the bounds may be met in one way of reading only.
 void checkEntries(ByteView document, const Result<plist::Value>& whole) {
-  auto entries = plist::DocumentEntries::open(Bytes(document.begin(), document.end()));
+  auto entries = plist::DictionaryStream::open(Bytes(document.begin(), document.end()));
   if (isTooMuch(whole) || isTooMuch(entries)) return;
   const plist::Dictionary* expected = whole ? whole->dictionary() : nullptr;
   require(entries.ok() == (expected != nullptr));

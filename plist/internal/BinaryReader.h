@@ -40,7 +40,7 @@ constexpr Expansion mostExpanded(std::uint64_t size) noexcept {
 }
 
 /// Numbers of objects, a bit for each.
-class ObjectNumbers {
+class ObjectBitset {
  public:
   void resize(std::uint64_t count) { words_.resize(static_cast<std::size_t>(count / 64 + 1)); }
   /// False when it was there.
@@ -104,7 +104,7 @@ class BinaryReader {
   struct KnownKeys {
     const std::byte* references = nullptr;
     std::size_t size = 0;
-    DictionaryMaker maker;
+    DictionaryPool pool;
     /// For each key as written, its place in the shape. Null when they are in order.
     std::shared_ptr<const std::vector<std::uint32_t>> places;
   };
@@ -149,7 +149,7 @@ class BinaryReader {
     fail(Failure::outOfRange, "An object longer than the document", at);
     return false;
   }
-  bool isApart(std::uint64_t number, std::size_t at, std::uint64_t bytes);
+  bool checkOverlap(std::uint64_t number, std::size_t at, std::uint64_t bytes);
   /// Returns false if the document expands beyond the limits.
   bool expand(const Expansion& more, std::size_t at) {
     expansion_ += more;
@@ -176,10 +176,10 @@ class BinaryReader {
 
   Expansion expansion_;
   /// The long or nested objects that were ever met, and how many bytes of content they have.
-  ObjectNumbers measured_;
+  ObjectBitset measured_;
   std::uint64_t content_ = 0;
   /// Those that were met and not forgotten.
-  ObjectNumbers seen_;
+  ObjectBitset seen_;
   std::unordered_map<std::uint64_t, Shared> shared_;
   /// Whether what was met is forgotten from one entry to the next, and what there is to forget.
   bool forgets_ = false;

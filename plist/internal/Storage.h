@@ -48,21 +48,21 @@ struct DataPayload : Payload {
   const ByteView bytes;
 };
 
-/// Content that holds values. Freed through `bury`, so that deep nesting does not take deep recursion.
+/// Content that holds values. Freed through `destroyLater`, so that deep nesting does not take deep recursion.
 struct Container : Payload {
   enum class Kind : std::uint8_t { array, dictionary };
   explicit Container(Kind which) noexcept : kind(which) {}
 
   Kind kind;
-  Container* nextToBury = nullptr;
+  Container* nextToDestroy = nullptr;
 
   /// Gives up one ownership.
   static void drop(Container* container) noexcept {
-    if (container->release()) bury(container);
+    if (container->release()) destroyLater(container);
   }
 
  private:
-  static void bury(Container* container) noexcept;
+  static void destroyLater(Container* container) noexcept;
   static void destroy(Container* container) noexcept;
 };
 
@@ -108,12 +108,12 @@ struct DictionaryPayload : Container {
 
 /// Makes the dictionaries of one shape, or none. Documents that hold one such dictionary tend to hold thousands: their
 /// memory is asked for, and the ownerships of the shape are taken, several at a time.
-class DictionaryMaker {
+class DictionaryPool {
  public:
-  DictionaryMaker() noexcept = default;
-  explicit DictionaryMaker(Shape& shape) noexcept : shape_(&shape) { shape.retain(); }
-  DictionaryMaker(DictionaryMaker&& other) noexcept { *this = std::move(other); }
-  DictionaryMaker& operator=(DictionaryMaker&& other) noexcept {
+  DictionaryPool() noexcept = default;
+  explicit DictionaryPool(Shape& shape) noexcept : shape_(&shape) { shape.retain(); }
+  DictionaryPool(DictionaryPool&& other) noexcept { *this = std::move(other); }
+  DictionaryPool& operator=(DictionaryPool&& other) noexcept {
     std::swap(shape_, other.shape_);
     std::swap(slab_, other.slab_);
     std::swap(next_, other.next_);
@@ -121,7 +121,7 @@ class DictionaryMaker {
     std::swap(atOnce_, other.atOnce_);
     return *this;
   }
-  ~DictionaryMaker();
+  ~DictionaryPool();
 
   /// A dictionary of nulls, which are then to be replaced in its payload.
   [[nodiscard]] Dictionary make();
@@ -185,7 +185,7 @@ struct Internals {
 [[nodiscard]] Dictionary makeDictionary(std::span<const Value> keys, std::span<Value> values);
 
 /// Makes a dictionary of values in the order that `places` was made for.
-[[nodiscard]] Dictionary makeDictionary(DictionaryMaker& maker, std::span<const std::uint32_t> places,
+[[nodiscard]] Dictionary makeDictionary(DictionaryPool& pool, std::span<const std::uint32_t> places,
                                         std::span<Value> values);
 
 /// For each key its place in the shape. Empty when they are all in order.

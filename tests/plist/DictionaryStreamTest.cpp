@@ -14,7 +14,7 @@ namespace appsync::test {
 namespace {
 
 using plist::Dictionary;
-using plist::DocumentEntries;
+using plist::DictionaryStream;
 using plist::Failure;
 using plist::Value;
 
@@ -25,7 +25,7 @@ Bytes bytesOfText(std::string_view text) {
   return {bytes.begin(), bytes.end()};
 }
 
-Entries entriesOf(DocumentEntries& document) {
+Entries entriesOf(DictionaryStream& document) {
   Entries entries;
   document.visit([&](std::string_view key, const Value& value) { entries.emplace_back(key, value); });
   return entries;
@@ -38,7 +38,7 @@ Entries entriesOf(const Dictionary& dictionary) {
   return entries;
 }
 
-std::string failureOf(const Result<DocumentEntries>& result) {
+std::string failureOf(const Result<DictionaryStream>& result) {
   return result ? "none" : result.error().text;
 }
 
@@ -46,7 +46,7 @@ std::string failureOf(const Result<DocumentEntries>& result) {
 void expectAsWhole(std::string_view document) {
   const Result<Value> whole = plist::read(bytesOf(document));
   const Dictionary* dictionary = whole ? whole->dictionary() : nullptr;
-  auto entries = DocumentEntries::open(bytesOfText(document));
+  auto entries = DictionaryStream::open(bytesOfText(document));
   ASSERT_EQ(entries.ok(), dictionary != nullptr) << failureOf(entries) << ", as a whole " << outcome(whole);
   if (entries) {
     EXPECT_EQ(entriesOf(*entries), entriesOf(*dictionary));
@@ -66,14 +66,14 @@ std::string dictionaryOf(std::string_view references) {
 
 TEST(PropertyListEntries, ComeInTheOrderOfTheKeysInEveryForm) {
   for (const std::string& document : documents()) {
-    auto entries = DocumentEntries::open(bytesOfText(document));
+    auto entries = DictionaryStream::open(bytesOfText(document));
     ASSERT_TRUE(entries) << failureOf(entries);
     EXPECT_EQ(entriesOf(*entries), entriesOf(*plist::read(bytesOf(document))->dictionary()));
   }
 }
 
 TEST(PropertyListEntries, CanBeVisitedAgain) {
-  auto entries = DocumentEntries::open(bytesOfText(documents().front()));
+  auto entries = DictionaryStream::open(bytesOfText(documents().front()));
   ASSERT_TRUE(entries);
   const Entries first = entriesOf(*entries);
   EXPECT_EQ(entriesOf(*entries), first);
@@ -82,7 +82,7 @@ TEST(PropertyListEntries, CanBeVisitedAgain) {
 TEST(PropertyListEntries, WrittenInAnyOrderComeInTheOrderOfTheKeys) {
   const std::string document =
       binaryDocument({dictionaryOf("\1\2\3\4\5\6"), "Qc", "Qa", "Qb", "\x10\3", "\x10\1", "\x10\2"});
-  auto entries = DocumentEntries::open(bytesOfText(document));
+  auto entries = DictionaryStream::open(bytesOfText(document));
   ASSERT_TRUE(entries) << failureOf(entries);
   EXPECT_EQ(entriesOf(*entries), (Entries{{"a", 1}, {"b", 2}, {"c", 3}}));
 }
@@ -90,20 +90,20 @@ TEST(PropertyListEntries, WrittenInAnyOrderComeInTheOrderOfTheKeys) {
 TEST(PropertyListEntries, OfEqualKeysTheLastOneCounts) {
   const std::string document =
       binaryDocument({dictionaryOf("\1\2\3\4\5\6"), "Qb", "Qa", "Qb", "\x10\1", "\x10\2", "\x10\3"});
-  auto entries = DocumentEntries::open(bytesOfText(document));
+  auto entries = DictionaryStream::open(bytesOfText(document));
   ASSERT_TRUE(entries) << failureOf(entries);
   EXPECT_EQ(entriesOf(*entries), (Entries{{"a", 2}, {"b", 3}}));
 }
 
 TEST(PropertyListEntries, OfAnEmptyDictionaryThereAreNone) {
-  auto entries = DocumentEntries::open(bytesOfText(textOf(plist::writeBinary(Dictionary()))));
+  auto entries = DictionaryStream::open(bytesOfText(textOf(plist::writeBinary(Dictionary()))));
   ASSERT_TRUE(entries) << failureOf(entries);
   EXPECT_EQ(entriesOf(*entries), Entries{});
 }
 
 TEST(PropertyListEntries, AnotherRootHasNone) {
   for (const Value& root : {Value(plist::Array{"a"}), Value("text"), Value(7)}) {
-    const auto entries = DocumentEntries::open(bytesOfText(textOf(plist::writeBinary(root))));
+    const auto entries = DictionaryStream::open(bytesOfText(textOf(plist::writeBinary(root))));
     EXPECT_EQ(failureOf(entries), "The root is no dictionary");
   }
 }
@@ -111,19 +111,19 @@ TEST(PropertyListEntries, AnotherRootHasNone) {
 TEST(PropertyListEntries, AnEntryThatCannotBeReadIsFoundBeforeAnyIsHandedOut) {
   const std::string document = binaryDocument({dictionaryOf("\1\2\3\4"), "Qa", "Qb", "\x10\1", "\x07"});
   expectAsWhole(document);
-  EXPECT_FALSE(DocumentEntries::open(bytesOfText(document)));
+  EXPECT_FALSE(DictionaryStream::open(bytesOfText(document)));
 }
 
 TEST(PropertyListEntries, AKeyThatIsNoStringIsRefused) {
   const std::string document = binaryDocument({dictionaryOf("\1\2"), "\x10\1", "\x10\1"});
   expectAsWhole(document);
-  EXPECT_FALSE(DocumentEntries::open(bytesOfText(document)));
+  EXPECT_FALSE(DictionaryStream::open(bytesOfText(document)));
 }
 
 TEST(PropertyListEntries, ARootInsideItselfIsRefused) {
   const std::string document = binaryDocument({dictionaryOf(std::string_view("\1\0", 2)), "Qa"});
   expectAsWhole(document);
-  EXPECT_FALSE(DocumentEntries::open(bytesOfText(document)));
+  EXPECT_FALSE(DictionaryStream::open(bytesOfText(document)));
 }
 
 TEST(PropertyListEntries, WhatUnfoldsTooFarIsRefused) {
@@ -134,7 +134,7 @@ TEST(PropertyListEntries, WhatUnfoldsTooFarIsRefused) {
   objects.emplace_back("Qx");
   const std::string document = binaryDocument(objects);
   expectAsWhole(document);
-  const auto entries = DocumentEntries::open(bytesOfText(document));
+  const auto entries = DictionaryStream::open(bytesOfText(document));
   ASSERT_FALSE(entries);
   EXPECT_EQ(entries.error().code, static_cast<long>(Failure::tooLarge)) << failureOf(entries);
 }
@@ -142,7 +142,7 @@ TEST(PropertyListEntries, WhatUnfoldsTooFarIsRefused) {
 TEST(PropertyListEntries, WhatEntriesShareIsInEachOfThem) {
   const std::string document = binaryDocument({dictionaryOf("\1\2\3\3"), "Qa", "Qb", "\xA2\4\4", "\xA2\5\5", "\x10\1"});
   expectAsWhole(document);
-  auto entries = DocumentEntries::open(bytesOfText(document));
+  auto entries = DictionaryStream::open(bytesOfText(document));
   ASSERT_TRUE(entries);
   const plist::Array pair{1, 1};
   const Value both(plist::Array{pair, pair});

@@ -52,7 +52,7 @@ TEST(PropertyListMemory, HoldsTenThousandEqualIconsOnce) {
   Bytes given(document.size());
   std::ranges::copy(bytesOf(document), given.begin());
   const std::size_t held = memory::mostHeldDuring([&] {
-    auto entries = plist::DocumentEntries::open(std::move(given));
+    auto entries = plist::DictionaryStream::open(std::move(given));
     ASSERT_TRUE(entries.ok()) << entries.error().text;
     entries->visit([](std::string_view, const plist::Value&) {});
   });

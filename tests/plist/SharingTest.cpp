@@ -16,7 +16,7 @@ namespace {
 using plist::Array;
 using plist::Date;
 using plist::Dictionary;
-using plist::DocumentEntries;
+using plist::DictionaryStream;
 using plist::Failure;
 using plist::Value;
 
@@ -24,7 +24,7 @@ constexpr std::size_t kIcon = 65'536;
 constexpr std::size_t kIcons = 10'000;
 
 Dictionary entriesOf(Bytes document) {
-  auto entries = DocumentEntries::open(std::move(document));
+  auto entries = DictionaryStream::open(std::move(document));
   EXPECT_TRUE(entries.ok()) << (entries ? "" : entries.error().text);
   Dictionary found;
   if (entries) entries->visit([&](std::string_view key, const Value& value) { found.set(key, value); });
