@@ -1,3 +1,5 @@
+#include <cerrno>
+
 #include "common/TodoList.h"
 #include "core/AppsClient.h"
 #include "platform/SyncFiles.h"
@@ -11,9 +13,18 @@ using platform::IntermediateDirectories;
 
 enum class Takeover { taken, nothingStaged, failed };
 
+/// Moves the staging folder to the work area's path. Anything else than a folder is refused and stays staged.
+Status moveStagingFolder(platform::FileSystem& files) {
+  const auto staged = files.attributesOfItem(kStagingFolder);
+  if (!staged) return staged.error();
+  if (!staged->isDirectory) return Error::fromErrno(ENOTDIR, kStagingFolder);
+  return files.moveItem(kStagingFolder, kWorkArea);
+}
+
 /// Makes the host's staging folder the work area, in place of the last sync's.
 Takeover takeOverStagingFolder(platform::FileSystem& files, const PlugInLog& log, ErrorSlot error) {
-  if (files.fileExists(kWorkArea)) files.removeItem(kWorkArea).ignore();
+  // Without a check before it: a dangling link at the path does not exist, but no folder can be moved there.
+  files.removeItem(kWorkArea).ignore();
 
   if (const Status created = files.createDirectory(kSyncFolder, IntermediateDirectories::create, {}); !created) {
     setError(error, created.error());
@@ -24,7 +35,7 @@ Takeover takeOverStagingFolder(platform::FileSystem& files, const PlugInLog& log
     log.message("%s|Nothing to do");
     return Takeover::nothingStaged;
   }
-  if (const Status moved = files.moveItem(kStagingFolder, kWorkArea); !moved) {
+  if (const Status moved = moveStagingFolder(files); !moved) {
     setError(error, moved.error());
     log.message("%s|Can't move staging area");
     return Takeover::failed;
