@@ -34,15 +34,16 @@ std::shared_ptr<InstallCoordinator> AppsClient::_initiatingOrUpdatingAppInstallC
       &serviceError);
 
   const char* const kind = existingApp ? "updating" : "initiating";
-  if (coordinator && coordinator->creatorIdentifier() == ClientIdentity::CXClientSync) {
+  const auto creator = coordinator ? std::optional(coordinator->creatorIdentifier()) : std::nullopt;
+  if (creator == ClientIdentity::CXClientSync) {
     _log.message(
         "%s|Created %s coordinator %{public}@ (createIfNotExisting:%d, existingApp:%d) for %{public}@ with error %{public}@",
         kind, coordinator, createIfNotExisting, existingApp, bundleIdentifier, serviceError);
-  } else if (coordinator) {
+  } else if (creator) {
     _log.message(
         "%s|CN returned %s coordinator %{public}@ (createIfNotExisting:%d, existingApp:%d, creatorIdentifier=%lu) for %{public}@ with error %{public}@ - Will not perform install/update for this bundle",
-        kind, coordinator, createIfNotExisting, existingApp,
-        static_cast<std::uint64_t>(coordinator->creatorIdentifier()), bundleIdentifier, serviceError);
+        kind, coordinator, createIfNotExisting, existingApp, static_cast<std::uint64_t>(*creator), bundleIdentifier,
+        serviceError);
     coordinator.reset();
   }
   if (error != nullptr) *error = serviceError;

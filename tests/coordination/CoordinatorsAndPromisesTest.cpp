@@ -122,6 +122,12 @@ TEST_F(CoordinatorLookup, ACoordinatorOfAnotherClientIsNoneAndTheRefusalNamesIts
   EXPECT_EQ(platform.coordination.coordinators().size(), 1U);
 }
 
+TEST_F(CoordinatorLookup, AsksForForeignCreatorOnce) {
+  platform.coordination.add(FakeCoordinator::of("com.a").madeBy(kStore));
+  EXPECT_EQ(find(false, true), nullptr);
+  EXPECT_EQ(platform.journal.count("coordinator.creatorIdentifier"), 1U);
+}
+
 TEST_F(CoordinatorLookup, AnUnknownClientsCoordinatorIsRefusedByItsNumber) {
   platform.coordination.add(FakeCoordinator::of("com.a", CoordinatorKind::updating).madeBy(clientOf(17)));
   EXPECT_EQ(find(true, false), nullptr);
