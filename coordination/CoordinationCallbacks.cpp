@@ -27,7 +27,7 @@ void AppsClient::coordinatorDidInstallPlaceholder(InstallCoordinator& coordinato
   const auto identifier = coordinator.bundleID();
   _log.message("%s|coordinatorDidInstallPlaceholder for %{public}@ with error %{public}@", identifier,
                coordinator.coordinatorError());
-  if (identifier) cnDidInstallPlaceHolderForAppBundle(*identifier);
+  cnDidInstallPlaceHolderForAppBundle(identifier);
 }
 
 void AppsClient::coordinatorDidCompleteSuccessfully(InstallCoordinator& coordinator) {

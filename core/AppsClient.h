@@ -265,8 +265,8 @@ class AppsClient final : public platform::ZTClient,
                                                                             const std::function<Status()>& setPromise);
   /// dataMigratorCancelledCoordinatorForRestoreAppBundle: it is not awaited any more.
   void dataMigratorCancelledCoordinatorForRestoreAppBundle(std::string_view bundleIdentifier);
-  /// cnDidInstallPlaceHolderForAppBundle: it has come.
-  void cnDidInstallPlaceHolderForAppBundle(std::string_view bundleIdentifier);
+  /// cnDidInstallPlaceHolderForAppBundle: it has come. One without an identifier is ignored, with an error in the log.
+  void cnDidInstallPlaceHolderForAppBundle(std::optional<std::string_view> bundleIdentifier);
 
   // ---- reporting
 

@@ -25,12 +25,12 @@ void AppsClient::dataMigratorCancelledCoordinatorForRestoreAppBundle(std::string
   });
 }
 
-void AppsClient::cnDidInstallPlaceHolderForAppBundle(std::string_view bundleIdentifier) {
+void AppsClient::cnDidInstallPlaceHolderForAppBundle(std::optional<std::string_view> bundleIdentifier) {
   _restoreQueue.sync([&] {
     if (_finishedWaitingForPlaceHolderInstalls) return;
-    if (_stopAwaitingPlaceholder(bundleIdentifier)) {
+    if (bundleIdentifier && _stopAwaitingPlaceholder(*bundleIdentifier)) {
       _log.message("%s|CN finished installing placeholder for %{public}@, _restoringPlaceholderCount %lld",
-                   bundleIdentifier, _restoringPlaceholderCount.load());
+                   *bundleIdentifier, _restoringPlaceholderCount.load());
     } else {
       _log.error("%s|Ignoring notification from CN about installing placeholder for %{public}@", bundleIdentifier);
     }

@@ -214,6 +214,15 @@ TEST_F(CoordinationCallbacks, TheDeviceServiceIsAskedOutsideTheQueue) {
   EXPECT_TRUE(said("transfer for asset com.a ended with success n error " + description(error) + " existingApp:0"));
 }
 
+TEST_F(CoordinationCallbacks, ReportsPlaceholderWithoutIdentifierAsIgnored) {
+  listen();
+  platform.coordination.add(FakeCoordinator::of("com.x").withoutIdentifier());
+  platform.coordination.didInstallPlaceholder("com.x", std::nullopt, CallbackOn::callingThread);
+  EXPECT_TRUE(sameLines({logged("coordinatorDidInstallPlaceholder for (null) with error (null)"),
+                         loggedError("Ignoring notification from CN about installing placeholder for (null)")},
+                        platform.log.lines()));
+}
+
 TEST_F(CoordinationCallbacks, ACoordinatorWithoutAnIdentifierIsIgnored) {
   listen();
   const auto nameless = [this] { platform.coordination.add(FakeCoordinator::of("com.x").withoutIdentifier()); };
@@ -222,10 +231,8 @@ TEST_F(CoordinationCallbacks, ACoordinatorWithoutAnIdentifierIsIgnored) {
   cancelByUser("com.x");
   EXPECT_TRUE(platform.log.lines().empty());
   nameless();
-  platform.coordination.didInstallPlaceholder("com.x", std::nullopt, CallbackOn::callingThread);
   platform.coordination.complete("com.x", std::nullopt, CallbackOn::callingThread);
-  EXPECT_TRUE(sameLines({logged("coordinatorDidInstallPlaceholder for (null) with error (null)"),
-                         logged("coordinatorDidCompleteSuccessfully for (null) with error (null)")},
+  EXPECT_TRUE(sameLines({logged("coordinatorDidCompleteSuccessfully for (null) with error (null)")},
                         platform.log.lines()));
   EXPECT_TRUE(asked().empty());
   EXPECT_EQ(platform.journal.count("fileSystem."), 0U);
