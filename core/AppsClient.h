@@ -235,7 +235,7 @@ class AppsClient final : public platform::ZTClient,
   bool _processHarvoRestoreInfoForApp(std::string_view bundleIdentifier, ByteView harvoMetaData,
                                       const std::optional<ByteView>& sinfData, const std::optional<ByteView>& iconData);
   /// _loadDemotedAppsPlist:withError: (class operation) the dictionary in that file; none, with a message unless the
-  /// file is absent or empty, when there is no such thing.
+  /// file is absent or empty, when there is no such thing. Only a failed read sets `error`.
   [[nodiscard]] static std::optional<plist::Dictionary> _loadDemotedAppsPlist(platform::Platform& platform,
                                                                               std::string_view path, ErrorSlot error);
 

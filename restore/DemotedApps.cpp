@@ -42,7 +42,6 @@ std::optional<plist::Dictionary> AppsClient::_loadDemotedAppsPlist(platform::Pla
   const PlugInLog log(platform.syncFramework());
   auto root = plist::read(std::move(bytes).value());
   if (!root) {
-    setError(error, root.error());
     log.error("%s|couldn't parse demoted apps list");
     return std::nullopt;
   }

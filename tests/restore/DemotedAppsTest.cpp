@@ -1,4 +1,6 @@
 // Which restored apps were demoted, and how.
+#include <cerrno>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -68,8 +70,20 @@ TEST_F(DemotedAppsFile, ATruncatedOneIsAnError) {
   const Bytes whole = binaryForm(plist::Dictionary{{"AutomaticDowngrades", plist::Array{"com.a"}}});
   platform.files.put(kDemotedApps, ByteView(whole).first(whole.size() / 2));
   EXPECT_EQ(load(), std::nullopt);
-  EXPECT_TRUE(slot);
   EXPECT_TRUE(sameLines({loggedError("couldn't parse demoted apps list")}, platform.log.lines()));
+}
+
+TEST_F(DemotedAppsFile, SetsErrorSlotForFailedReadOnly) {
+  platform.files.put(kDemotedApps, "bplist00");
+  EXPECT_EQ(load(), std::nullopt);
+  EXPECT_EQ(slot, std::nullopt);
+  putPropertyList(platform.files, kDemotedApps, plist::Array{"com.a"});
+  EXPECT_EQ(load(), std::nullopt);
+  EXPECT_EQ(slot, std::nullopt);
+  const Error denied = Error::fromErrno(EACCES, kDemotedApps);
+  platform.files.failures.failNext(FileOperation::readFile, kDemotedApps, denied);
+  EXPECT_EQ(load(), std::nullopt);
+  EXPECT_EQ(slot, denied);
 }
 
 TEST_F(DemotedAppsFile, AnArrayIsAnError) {
