@@ -79,10 +79,14 @@ bool isInTheStoresHands(const RestorePreparation& preparation) {
   return true;
 }
 
-/// Another client's coordinator is never driven: to the plug-in it is as none.
+/// Fails for another client's coordinator, which is never driven and is dropped as if there were none.
 bool observeCoordinator(RestorePreparation& preparation) {
-  if (preparation.coordinator->creatorIdentifier() != ClientIdentity::CXClientSync) {
+  const ClientIdentity creator = preparation.coordinator->creatorIdentifier();
+  if (creator != ClientIdentity::CXClientSync) {
     preparation.coordinator.reset();
+    preparation.error = syncError(SyncFailure::restoreGivenUp);
+    preparation.error->text =
+        "client " + std::to_string(static_cast<std::uint64_t>(creator)) + " created the coordinator";
     return failWithoutCoordinator(preparation);
   }
   preparation.coordinator->setObserver(preparation.client.weak_from_this());

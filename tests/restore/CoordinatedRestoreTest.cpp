@@ -202,12 +202,15 @@ TEST_F(CoordinatedRestore, TheStoresOwnCoordinatorIsLeftToIt) {
 }
 
 TEST_F(CoordinatedRestore, AnotherClientsCoordinatorIsNeitherDrivenNorCancelled) {
+  const std::string foreign = description(Error{"ZTError", 29, "client 17 created the coordinator", nullptr});
   for (const DemotionStatus status : {DemotionStatus::notDemoted, DemotionStatus::intentionallyDemoted}) {
-    const auto kind =
-        status == DemotionStatus::notDemoted ? CoordinatorKind::restoring : CoordinatorKind::restoringDemoted;
-    platform.coordination.add(FakeCoordinator::of("com.a", kind).madeBy(platform::ClientIdentity::CXClientUser));
+    const bool isDemoted = status != DemotionStatus::notDemoted;
+    const auto kind = isDemoted ? CoordinatorKind::restoringDemoted : CoordinatorKind::restoring;
+    const std::string app = isDemoted ? "demoted app com.a" : "com.a";
+    platform.coordination.add(FakeCoordinator::of("com.a", kind).madeBy(platform::ClientIdentity{17}));
     EXPECT_FALSE(prepare(status));
-    EXPECT_TRUE(complained("Error (null) creating restore coordinator for com.a"));
+    EXPECT_TRUE(complained("Error " + foreign + " creating restore coordinator for com.a"));
+    EXPECT_TRUE(said("processing app restore for " + app + " finished with status 0 error " + foreign));
     EXPECT_EQ(platform.journal.count("coordinator.cancelForReason"), 0U);
     EXPECT_EQ(platform.journal.count("coordinator.set"), 0U);
   }
