@@ -1,4 +1,5 @@
 // The store accounts that own the apps on the device.
+#include "common/PropertyListFile.h"
 #include "core/AppsClient.h"
 #include "plist/Access.h"
 #include "reporting/StoreMetadata.h"
@@ -16,7 +17,7 @@ using Text = std::optional<std::string_view>;
 class AccountMetadata {
  public:
   AccountMetadata(platform::FileSystem& files, const AppRecord& app, const PlugInLog& log)
-      : path_(storeMetadataPath(app)), root_(readStoreMetadata(files, path_)), log_(log) {}
+      : path_(storeMetadataPath(app)), root_(readDictionary(files, path_)), log_(log) {}
 
   [[nodiscard]] const std::optional<std::string>& path() const { return path_; }
 

@@ -34,7 +34,7 @@ Change clearAutomaticDownload(plist::Dictionary& metadata, const AppRecord& app,
 
 void prepareApp(platform::FileSystem& files, const AppRecord& app, const PlugInLog& log) {
   const auto path = storeMetadataPath(app);
-  plist::Value root = readStoreMetadata(files, path);
+  plist::Value root = readDictionary(files, path);
   plist::Dictionary* metadata = root.dictionary();
   if (metadata == nullptr) return;
   const Change licence = updateLicenceState(*metadata, app, log);

@@ -33,7 +33,7 @@ TEST_F(BackupPreparation, EveryStepIsTakenInOrder) {
   prepare();
   EXPECT_TRUE(sameLines(
       {logged("preparing for backup"), called("registry.enumerateBundlesOfType 1"),
-       called("fileSystem.attributesOfItem " + std::string(kMetadata)),
+
        called("fileSystem.readFile " + std::string(kMetadata)), logged("Updated DeviceBasedKLP state for : com.a to 0"),
        logged("clearing is-auto-download value for com.a"),
        called("fileSystem.writeFileAtomically " + std::string(kMetadata)), logged("finished preparing for backup")},
@@ -46,7 +46,7 @@ TEST_F(BackupPreparation, AnAppWithNothingToSayIsNotRewritten) {
   prepare();
   EXPECT_TRUE(
       sameLines({logged("preparing for backup"), called("registry.enumerateBundlesOfType 1"),
-                 called("fileSystem.attributesOfItem " + std::string(kMetadata)),
+
                  called("fileSystem.readFile " + std::string(kMetadata)), logged("finished preparing for backup")},
                 platform.log.lines()));
   EXPECT_FALSE(wasRewritten());

@@ -1,14 +1,12 @@
 // Store metadata that no store wrote: it costs its own app's answer, and no other's.
-#include <cstdint>
+#include <cstddef>
+#include <initializer_list>
 #include <set>
 #include <string>
-#include <utility>
 #include <vector>
 
 #include <gtest/gtest.h>
 
-#include "platform/SyncFiles.h"
-#include "reporting/StoreMetadata.h"
 #include "tests/reporting/StoreMetadataFixture.h"
 
 namespace appsync::test {
@@ -42,30 +40,6 @@ class HostileStoreMetadata : public StoreMetadataFixture {
   [[nodiscard]] std::size_t reads() const { return platform.journal.count("fileSystem.readFile " + kPath); }
 
   const std::string kPath = pathOf("com.2");
-};
-
-/// The platform's files, one of which says that it is of this size.
-class OtherSize final : public FakeFileSystem {
- public:
-  OtherSize(FakePlatform& platform, std::string path, std::uint64_t reported)
-      : FakeFileSystem(platform.journal), size(reported), files_(platform.files), path_(std::move(path)) {
-    platform.use(*this);
-  }
-
-  std::uint64_t size;
-
-  [[nodiscard]] Result<platform::FileAttributes> attributesOfItem(std::string_view path) override {
-    if (path == path_) return platform::FileAttributes{size, false};
-    return files_.attributesOfItem(path);
-  }
-  [[nodiscard]] Result<Bytes> readFile(std::string_view path) override { return files_.readFile(path); }
-  [[nodiscard]] Status writeFileAtomically(std::string_view path, ByteView bytes) override {
-    return files_.writeFileAtomically(path, bytes);
-  }
-
- private:
-  FakeFileSystem& files_;
-  const std::string path_;
 };
 
 /// Everything that a property list can hold but a string, a number or a dictionary.
@@ -176,11 +150,8 @@ TEST_F(HostileStoreMetadata, AFileCutOffAnywhereIsNoMetadata) {
 
 TEST_F(HostileStoreMetadata, AFileThatCannotBeReadIsNoMetadata) {
   put(plist::Dictionary{{"corvelId", "x"}});
-  for (const FileOperation operation : {FileOperation::readFile, FileOperation::attributesOfItem}) {
-    platform.files.failures.failAlways(operation, kPath, {"POSIX", 5, "damaged disk", nullptr});
-    expectNoAccount();
-    platform.files.failures.stopFailing();
-  }
+  platform.files.failures.failAlways(FileOperation::readFile, kPath, {"POSIX", 5, "damaged disk", nullptr});
+  expectNoAccount();
 }
 
 TEST_F(HostileStoreMetadata, AFolderInTheFilesPlaceIsNoMetadata) {
@@ -205,19 +176,11 @@ TEST_F(HostileStoreMetadata, ALinkToItselfIsNoMetadata) {
   expectNoAccount();
 }
 
-TEST_F(HostileStoreMetadata, AFileOfAHundredMegabytesIsNotRead) {
-  put(plist::Dictionary{{"corvelId", "x"}, {"is-auto-download", true}});
-  OtherSize files(platform, kPath, 100 << 20);
-  expectNoAccount();
-  EXPECT_EQ(reads(), 0U);
-}
-
-TEST_F(HostileStoreMetadata, AFileOfTheLargestSizeIsReadAndOneByteMoreIsTooMuch) {
-  put(plist::Dictionary{{"corvelId", "x"}});
-  OtherSize files(platform, kPath, kMaximumMetadataBytes);
-  EXPECT_EQ(makeClient().corvelIDsForAssets(), (Identifiers{"first", "last", "x"}));
-  files.size = kMaximumMetadataBytes + 1;
-  EXPECT_EQ(makeClient().corvelIDsForAssets(), (Identifiers{"first", "last"}));
+TEST_F(HostileStoreMetadata, ReadsFileOfAnySize) {
+  put(plist::Dictionary{{"corvelId", "x"}, {"picture", plist::Value::data(Bytes(std::size_t{17} << 20))}});
+  AppsClient& client = makeClient();
+  EXPECT_EQ(client.corvelIDsForAssets(), (Identifiers{"first", "last", "x"}));
+  EXPECT_EQ(client.accountsForAssets(), (ZTAccountInfos{account("first"), account("last"), account("x")}));
 }
 
 TEST_F(HostileStoreMetadata, AHundredThousandDictionariesDeepIsNoMetadata) {
