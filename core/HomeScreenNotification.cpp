@@ -31,7 +31,7 @@ plist::Array AppsClient::_savedIconOrder(platform::Platform& platform) {
   const PlugInLog log(platform.syncFramework());
   platform::HomeScreenService& homeScreen = platform.homeScreen();
   const auto iconState = homeScreen.getFlattenedIconState(homeScreen.blockableServerPort(), kFlattenedIconStateFormat);
-  if (!iconState) {
+  if (!iconState || iconState->empty()) {
     log.message("%s|got no icon sort order from SV");
     return {};
   }

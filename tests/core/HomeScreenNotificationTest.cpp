@@ -90,6 +90,16 @@ TEST_F(OrderTheItems, WithoutAnIconStateEveryItemIsReturnedOnceAndTheOrderIsNotR
   EXPECT_EQ(platform.journal.count("fileSystem."), 0U);
 }
 
+TEST_F(OrderTheItems, EmptyIconStateCountsAsNone) {
+  platform.files.put(kSortOrder, "as it was");
+  platform.screen.setFlattenedIconState(Bytes());
+  Items items{{"com.a", 1}};
+  EXPECT_EQ(order(items), std::vector<int>{1});
+  EXPECT_TRUE(
+      sameLines(LogLines{logged("got no icon sort order from SV"), logged("lastly com.a")}, platform.log.lines()));
+  EXPECT_EQ(platform.files.text(kSortOrder), "as it was");
+}
+
 TEST_F(OrderTheItems, WithoutItemsTheIconStateIsStillSaved) {
   platform.screen.setFlattenedIconState(std::vector<std::string>{"com.a"});
   Items items;
