@@ -8,8 +8,6 @@ namespace {
 
 constexpr std::size_t kMaximumConcurrentInstalls = 10;
 
-constexpr std::string_view kDaemonBundleIdentifier = "com.corvel.zeph";
-
 bool isAllowed(platform::Platform& platform, platform::RestrictionSetting setting) {
   return platform.sharedConnection().effectiveBoolValueForSetting(setting) != platform::RestrictionValue::no;
 }
@@ -35,7 +33,7 @@ void AppsClient::init() {
   _platform.transactionLog().initializeWithLog(
       _platform.systemLog().createHandle("com.corvel.appinstallation", "zeph.appsync"));
   _useInstallCoordinator = _platform.installCoordination().coordinationIsEnabled();
-  _runsInsideDaemon = _platform.bundles().mainBundleIdentifier() == kDaemonBundleIdentifier;
+  _runsInsideDaemon = _platform.bundles().mainBundleIdentifier() == platform::kDaemonBundleIdentifier;
   if (_runsInsideDaemon) {
     _finishedWaitingForPlaceHolderInstalls = true;
     _platform.systemNotify().addObserver(this, &_handleZEPHStartupCompletedNotification,

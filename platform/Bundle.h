@@ -11,6 +11,9 @@
 
 namespace appsync::platform {
 
+/// The main bundle's identifier in the sync daemon's process.
+inline constexpr std::string_view kDaemonBundleIdentifier = "com.corvel.zeph";
+
 /// An open bundle: a directory with an "Info.plist". Thread-safe.
 class Bundle {
  public:

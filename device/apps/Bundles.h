@@ -13,15 +13,13 @@ namespace appsync::device {
 /// Threads: any.
 class Bundles final : public platform::Bundles {
  public:
-  /// The bundle of the daemon's own process.
-  static constexpr std::string_view kDaemonIdentifier = "com.corvel.zeph";
-  /// That of the process that sets a restored device up.
+  /// The main bundle's identifier in the process that sets up a restored device.
   static constexpr std::string_view kDataMigratorIdentifier = "com.corvel.datamigrator";
 
   /// `fileSystem` must outlive this. `mainBundleIdentifier` is whose process this is; a tool that plays the daemon
   /// leaves it as it is.
   explicit Bundles(platform::FileSystem& fileSystem,
-                   std::optional<std::string> mainBundleIdentifier = std::string(kDaemonIdentifier))
+                   std::optional<std::string> mainBundleIdentifier = std::string(platform::kDaemonBundleIdentifier))
       : fileSystem_(fileSystem), mainBundleIdentifier_(std::move(mainBundleIdentifier)) {}
 
   /// An "Info.plist" of more than `kMaximumMetadataBytes` counts as unusable.

@@ -27,7 +27,7 @@ void setMode(FakePlatform& platform, Mode mode) {
 }
 
 void DaemonSync::run(const std::function<void()>& meanwhile) {
-  platform_.bundleFolders.setMainBundleIdentifier(std::string(kDaemonIdentifier));
+  platform_.bundleFolders.setMainBundleIdentifier(std::string(kDaemonBundleIdentifier));
   client_ = AppsClient::create(platform_);
   platform_.notify.deliver(platform::kZTStartupCompleteNotification);
   client_->prepareForSyncWithHostAnchor(client_->currentSyncAnchor(), {}, nullptr);

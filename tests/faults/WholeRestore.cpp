@@ -84,7 +84,7 @@ void WholeRestore::setHook(CallJournal::Hook hook) {
 }
 
 void WholeRestore::prepareForBackup() {
-  device_->bundleFolders.setMainBundleIdentifier(std::string(kDaemonIdentifier));
+  device_->bundleFolders.setMainBundleIdentifier(std::string(kDaemonBundleIdentifier));
   AppsClient::create(*device_)->prepareForBackup();
 }
 

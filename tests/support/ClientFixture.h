@@ -13,7 +13,7 @@
 
 namespace appsync::test {
 
-inline constexpr std::string_view kDaemonIdentifier = "com.corvel.zeph";
+using platform::kDaemonBundleIdentifier;
 
 /// Base of the plug-in's tests: `platform` to prepare and to look at, `makeClient()` when it is prepared. After the
 /// test it lets go of the client and waits until it is gone, wherever its last owner runs.
@@ -28,7 +28,7 @@ class ClientFixture : public testing::Test {
 
   /// The same inside the daemon.
   AppsClient& makeDaemonClient() {
-    platform.bundleFolders.setMainBundleIdentifier(std::string(kDaemonIdentifier));
+    platform.bundleFolders.setMainBundleIdentifier(std::string(kDaemonBundleIdentifier));
     return makeClient();
   }
 
