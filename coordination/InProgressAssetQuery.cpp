@@ -5,18 +5,37 @@
 
 namespace appsync {
 
+namespace {
+
+/// Registers an observer for as long as it lives, whichever way it ends.
+class Observation {
+ public:
+  Observation(platform::AppRegistry& registry, platform::AppRegistryObserver& observer)
+      : registry_(registry), observer_(observer) {
+    registry_.addObserver(observer_);
+  }
+  ~Observation() { registry_.removeObserver(observer_); }
+  Observation(const Observation&) = delete;
+  Observation& operator=(const Observation&) = delete;
+
+ private:
+  platform::AppRegistry& registry_;
+  platform::AppRegistryObserver& observer_;
+};
+
+}  // namespace
+
 void InProgressAssetQuery::currentInProgressAssetIDs(platform::Platform& platform,
                                                      std::optional<IdentifierList>& inProgressAssetIDs,
                                                      std::optional<IdentifierList>& restoringAssetIDs) {
   inProgressAssetIDs.reset();
   restoringAssetIDs.reset();
   InProgressAssetQuery query(platform);
-  platform.defaultRegistry().addObserver(query);
+  const Observation observation(platform.defaultRegistry(), query);
   if (query._fetchResults()) {
     inProgressAssetIDs = *query.inProgressAssetIDs();
     restoringAssetIDs = *query.restoringAssetIDs();
   }
-  platform.defaultRegistry().removeObserver(query);
 }
 
 InProgressAssetQuery::InProgressAssetQuery(platform::Platform& platform)

@@ -5,6 +5,7 @@
 #include <memory>
 #include <mutex>
 #include <optional>
+#include <stdexcept>
 #include <stop_token>
 #include <string>
 #include <thread>
@@ -121,6 +122,21 @@ TEST_F(InProgressQuery, ARegistryThatNeverReportsLeavesBothListsAbsent) {
   EXPECT_EQ(platform.registry.observerCount(), 1U) << "the query observes no longer";
   platform.registry.reportGate.open();
   platform.registry.removeObserver(stuck);
+}
+
+TEST_F(InProgressQuery, UnregistersWhateverIsThrown) {
+  class ThrowingClock final : public Clock {
+   public:
+    TimePoint now() const override { return {}; }
+    bool wait(std::condition_variable&, std::unique_lock<std::mutex>&, TimePoint,
+              const std::function<bool()>&) override {
+      throw std::runtime_error("no wait");
+    }
+  } clock;
+  platform.use(clock);
+  EXPECT_THROW(ask(), std::runtime_error);
+  EXPECT_TRUE(sameLines({"registry.addObserver", "registry.removeObserver"}, platform.journal.lines()));
+  EXPECT_EQ(platform.registry.observerCount(), 0U);
 }
 
 TEST_F(InProgressQuery, FetchingAfterAReportSucceedsAtOnce) {
