@@ -1,10 +1,11 @@
-// Reads the input in every form. Whatever reads must write, and what was written must read back equal.
+// Reads the input in every format. A value that is read must be written, and the written document read back equal.
 #include <cstddef>
 #include <cstdint>
 #include <cstdlib>
 #include <span>
 #include <string>
 
+#include "base/Message.h"
 #include "plist/DictionaryStream.h"
 
 namespace {
@@ -15,7 +16,7 @@ void require(bool condition) {
   if (!condition) std::abort();
 }
 
-/// Forms that repeat shared content are checked up to this size: larger ones only take time.
+/// Formats that repeat shared content are checked up to this size only, to save time.
 constexpr std::size_t kMostExpanded = std::size_t{1} << 24;
 
 template <class T>
@@ -33,7 +34,7 @@ void checkBinary(const plist::Value& value) {
   require(back.ok() && *back == value);
 }
 
-/// Not every value has an XML form, but what has one keeps everything except fractions of a second.
+/// Not every value has an XML document, but one that has keeps everything except fractions of a second.
 void checkXML(const plist::Value& value) {
   if (plist::expandedSize(value) > kMostExpanded) return;
   const auto written = plist::writeXML(value);
@@ -48,13 +49,11 @@ void check(const Result<plist::Value>& value) {
   if (!value) return require(!value.error().text.empty());
   checkBinary(*value);
   checkXML(*value);
-  std::string description;
-  plist::appendDescription(description, *value);
-  require(description.find('\n') == std::string::npos);
+  require(formatMessage("%{public}@", *value).find('\n') == std::string::npos);
 }
 
-/// Requires the same content entry by entry as in the whole document. What entries have in common is counted for each
-/// of them: the bounds may be met in one way of reading only.
+/// Requires the stream to have the content of the whole document. Shared content counts for each entry, so that only one
+/// of the two may exceed the expansion limits.
 void checkEntries(ByteView document, const Result<plist::Value>& whole) {
   auto entries = plist::DictionaryStream::open(Bytes(document.begin(), document.end()));
   if (isTooMuch(whole) || isTooMuch(entries)) return;
