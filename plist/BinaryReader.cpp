@@ -11,40 +11,36 @@ namespace appsync::plist {
 
 namespace {
 
-constexpr std::string_view kMagic = "bplist00";
-/// The trailer is as long as any fixed read ahead: everything before it can be read in whole words.
-constexpr std::size_t kTrailerSize = 32;
-
-/// UTF-16 of so many units is sure to fit into a value as UTF-8.
+/// UTF-16 of this many units always fits into a value as UTF-8.
 constexpr std::size_t kShortUTF16 = Internals::kInlineCapacity / 3;
 
-/// From 32 - n on: n set bytes, then clear ones.
+/// From 32 - n on: n bytes of ones, then zeros.
 constexpr auto kMask = [] {
   std::array<std::uint8_t, 64> mask{};
   std::fill_n(mask.begin(), 32, std::uint8_t{0xFF});
   return mask;
 }();
 
-/// Of data, text in either form, arrays and dictionaries.
-constexpr std::uint64_t bytesPerElement(unsigned type, unsigned referenceSize) {
+/// Returns the bytes per element of the variable-length object types.
+constexpr std::uint64_t bytesPerElement(Marker type, unsigned referenceSize) {
   switch (type) {
-    case 0x6:
+    case Marker::utf16:
       return 2;
-    case 0xA:
+    case Marker::array:
       return referenceSize;
-    case 0xD:
+    case Marker::dictionary:
       return std::uint64_t{2} * referenceSize;
     default:
       return 1;
   }
 }
 
-constexpr Expansion expansionOf(unsigned type, std::uint64_t count) {
+constexpr Expansion expansionOf(Marker type, std::uint64_t count) {
   switch (type) {
-    case 0x4:
+    case Marker::data:
       return {};
-    case 0x5:
-    case 0x6:
+    case Marker::ascii:
+    case Marker::utf16:
       return {0, count};
     default:
       return {count, 0};
@@ -64,7 +60,7 @@ void BinaryReader::failMissing(std::uint64_t number) {
 
 void BinaryReader::readTrailer() {
   if (size_ < kMagic.size() || std::memcmp(begin_, kMagic.data(), kMagic.size()) != 0) {
-    fail(Failure::malformed, "No binary property list", 0);
+    fail(Failure::malformed, "Not a binary property list", 0);
     return;
   }
   if (size_ < kMagic.size() + kTrailerSize + 2) {
@@ -78,13 +74,13 @@ void BinaryReader::readTrailer() {
   top_ = loadBigEndian(begin_ + trailer + 16, 8);
   const std::uint64_t table = loadBigEndian(begin_ + trailer + 24, 8);
   if (offsetSize_ < 1 || offsetSize_ > 8 || referenceSize_ < 1 || referenceSize_ > 8) {
-    fail(Failure::outOfRange, "Number sizes that do not exist in the trailer", trailer + 6);
+    fail(Failure::outOfRange, "Invalid number sizes in the trailer", trailer + 6);
   } else if (table <= kMagic.size() || table >= trailer) {
     fail(Failure::outOfRange, "An offset table outside the document", trailer + 24);
   } else if (objectCount_ == 0 || objectCount_ > (trailer - table) / offsetSize_) {
-    fail(Failure::outOfRange, "More objects than the offset table holds", trailer + 8);
+    fail(Failure::outOfRange, "More objects than the offset table has entries", trailer + 8);
   } else if (top_ >= objectCount_) {
-    fail(Failure::outOfRange, "A top object that does not exist", trailer + 16);
+    fail(Failure::outOfRange, "A root object that does not exist", trailer + 16);
   }
   if (failure_) return;
   table_ = static_cast<std::size_t>(table);
@@ -92,34 +88,34 @@ void BinaryReader::readTrailer() {
   seen_.resize(objectCount_);
 }
 
-inline bool BinaryReader::wasSeen(std::uint64_t number) {
+inline bool BinaryReader::isRepeated(std::uint64_t number) {
   const bool isNew = seen_.insert(number);
-  if (forgets_ && isNew) met_.push_back(number);
+  if (forgetsEntries_ && isNew) seenInEntry_.push_back(number);
   return !isNew;
 }
 
-/// Objects that lie in each other would unfold without being referred to twice. Together they cannot be longer than
-/// the document unless they do.
+/// Adds the size of the object's content. Fails if all content together is longer than the document: then objects
+/// overlap, and could expand without repeated references.
 bool BinaryReader::checkOverlap(std::uint64_t number, std::size_t at, std::uint64_t bytes) {
   if (!measured_.insert(number)) return true;
   content_ += bytes;
   if (content_ <= table_) return true;
-  fail(Failure::malformed, "Objects that lie in each other, met", at);
+  fail(Failure::malformed, "Overlapping objects, detected", at);
   return false;
 }
 
 bool BinaryReader::readLongExtent(std::size_t at, Extent& extent) {
   const unsigned marker = at + 1 < table_ ? std::to_integer<unsigned>(begin_[at + 1]) : 0;
-  const unsigned size = 1U << (marker & 0xFU);
-  if (marker >> 4 != 1 || size > 8 || size > table_ - (at + 2)) {
-    fail(Failure::malformed, "A length that is no integer", at + 1);
+  const unsigned size = 1U << lowOf(marker);
+  if (markerOf(marker) != Marker::integer || size > 8 || size > table_ - (at + 2)) {
+    fail(Failure::malformed, "A length that is not an integer", at + 1);
     return false;
   }
   extent = {at + 2 + size, loadBigEndian(begin_ + at + 2, size)};
   return true;
 }
 
-/// False when the string is not short or not in order, and left to somebody else.
+/// Returns false if the string is long or invalid; readOther then reads it.
 inline bool BinaryReader::readShortASCII(std::size_t start, std::size_t size, Value& place) {
   if (size > Internals::kInlineCapacity || start + size > table_) return false;
   Internals::Words words;
@@ -151,19 +147,21 @@ bool BinaryReader::locate(std::uint64_t number, std::size_t& at) {
 void BinaryReader::readObject(std::uint64_t number, int depth, Value& place) {
   std::size_t at;
   if (!locate(number, at)) return;
-  // Most objects are short strings. Everything before the trailer can be read in whole blocks.
+  // Fast path: most objects are short strings. Everything before the trailer can be read in whole blocks.
+  constexpr unsigned kASCII = markerByte(Marker::ascii);
+  constexpr unsigned kUTF16 = markerByte(Marker::utf16);
   const unsigned marker = std::to_integer<unsigned>(begin_[at]);
-  if (marker >= 0x50 && marker < 0x5F) {
-    if (readShortASCII(at + 1, marker & 0xFU, place)) return;
-  } else if (marker == 0x5F && begin_[at + 1] == std::byte{0x10}) {
+  if (marker >= kASCII && marker < kASCII + kLongCount) {
+    if (readShortASCII(at + 1, lowOf(marker), place)) return;
+  } else if (marker == kASCII + kLongCount && begin_[at + 1] == std::byte{markerByte(Marker::integer)}) {
     if (readShortASCII(at + 3, std::to_integer<std::size_t>(begin_[at + 2]), place)) return;
-  } else if (marker >= 0x60 && marker <= 0x60 + kShortUTF16) {
-    if (readShortUTF16(at + 1, marker & 0xFU, place)) return;
+  } else if (marker >= kUTF16 && marker <= kUTF16 + kShortUTF16) {
+    if (readShortUTF16(at + 1, lowOf(marker), place)) return;
   }
   readOther(number, at, depth, place);
 }
 
-/// False when the string is none of plain characters, and left to somebody else.
+/// Returns false if the string is truncated or has surrogates; readOther then reads it.
 bool BinaryReader::readShortUTF16(std::size_t start, std::size_t count, Value& place) {
   if (start + 2 * count > table_) return false;
   char text[sizeof(Value)] = {};
@@ -185,35 +183,35 @@ bool BinaryReader::readShortUTF16(std::size_t start, std::size_t count, Value& p
 
 void BinaryReader::readOther(std::uint64_t number, std::size_t at, int depth, Value& place) {
   const unsigned marker = std::to_integer<unsigned>(begin_[at]);
-  const unsigned low = marker & 0xFU;
-  switch (marker >> 4) {
-    case 0x0:
-      if (low == 8 || low == 9) {
-        place = low == 9;
+  const unsigned low = lowOf(marker);
+  switch (markerOf(marker)) {
+    case Marker::boolean:
+      if (low == kFalse || low == kTrue) {
+        place = low == kTrue;
       } else {
         fail(Failure::unsupported, "A null or filler object", at);
       }
       return;
-    case 0x1:
+    case Marker::integer:
       place = readInteger(at, low);
       return;
-    case 0x2:
+    case Marker::real:
       place = readReal(at, low);
       return;
-    case 0x3:
+    case Marker::date:
       place = readDate(at, low);
       return;
-    case 0x8:
+    case Marker::uid:
       place = readUid(at, low + 1);
       return;
-    case 0x4:
-    case 0x5:
-    case 0x6:
-    case 0xA:
-    case 0xD:
+    case Marker::data:
+    case Marker::ascii:
+    case Marker::utf16:
+    case Marker::array:
+    case Marker::dictionary:
       return readLong(number, at, marker, depth, place);
-    case 0xB:
-    case 0xC:
+    case Marker::orderedSet:
+    case Marker::set:
       fail(Failure::unsupported, "A set, which is not supported,", at);
       return;
     default:
@@ -223,23 +221,23 @@ void BinaryReader::readOther(std::uint64_t number, std::size_t at, int depth, Va
 
 inline void BinaryReader::readContent(std::uint64_t number, std::size_t at, unsigned marker, int depth, Value& place) {
   Extent extent{};
-  if (!readExtent(at, marker & 0xFU, extent)) return;
-  const unsigned type = marker >> 4;
+  if (!readExtent(at, lowOf(marker), extent)) return;
+  const Marker type = markerOf(marker);
   const std::uint64_t bytesEach = bytesPerElement(type, referenceSize_);
-  const bool isSound = fits(at, extent, bytesEach) && checkOverlap(number, at, extent.count * bytesEach) &&
+  const bool isValid = fits(at, extent, bytesEach) && checkOverlap(number, at, extent.count * bytesEach) &&
                        expand(expansionOf(type, extent.count), at);
-  if (!isSound) return;
+  if (!isValid) return;
   switch (type) {
-    case 0x4:
+    case Marker::data:
       place = readData({begin_ + extent.start, static_cast<std::size_t>(extent.count)});
       return;
-    case 0x5:
+    case Marker::ascii:
       place = readASCII(at, extent);
       return;
-    case 0x6:
+    case Marker::utf16:
       place = readUTF16(extent);
       return;
-    case 0xA:
+    case Marker::array:
       return readArray(at, extent, depth + 1, place);
     default:
       return readDictionary(at, extent, depth + 1, place);
@@ -247,7 +245,7 @@ inline void BinaryReader::readContent(std::uint64_t number, std::size_t at, unsi
 }
 
 void BinaryReader::readLong(std::uint64_t number, std::size_t at, unsigned marker, int depth, Value& place) {
-  const bool again = wasSeen(number);
+  const bool again = isRepeated(number);
   if (again) {
     if (const auto known = shared_.find(number); known != shared_.end()) {
       if (expand(known->second.expansion, at)) place = known->second.value;
@@ -274,7 +272,7 @@ void BinaryReader::readArray(std::size_t at, Extent extent, int depth, Value& pl
   place = std::move(elements);
 }
 
-/// Null when they cannot be read, or when two of them are equal.
+/// Returns null if a key cannot be read or two keys are equal.
 BinaryReader::KnownKeys* BinaryReader::keysOf(Extent extent, int depth) {
   const std::byte* references = begin_ + extent.start;
   const std::size_t size = static_cast<std::size_t>(extent.count) * referenceSize_;
@@ -284,20 +282,20 @@ BinaryReader::KnownKeys* BinaryReader::keysOf(Extent extent, int depth) {
     return expand({extent.count, 0}, extent.start) ? &known : nullptr;
   }
   known = KnownKeys{};
-  if (!learnKeys(known, extent, depth)) return nullptr;
+  if (!readKeys(known, extent, depth)) return nullptr;
   known.references = references;
   known.size = size;
   return &known;
 }
 
-/// False when they cannot be read, or when two of them are equal.
-bool BinaryReader::learnKeys(KnownKeys& known, Extent extent, int depth) {
+/// Returns false if a key cannot be read or two keys are equal.
+bool BinaryReader::readKeys(KnownKeys& known, Extent extent, int depth) {
   if (!expand({extent.count, 0}, extent.start)) return false;
   std::vector<Value> keys(static_cast<std::size_t>(extent.count));
   std::size_t at = extent.start;
   for (Value& key : keys) {
     readObject(reference(at), depth, key);
-    if (key.type() != Type::string) fail(Failure::malformed, "A key that is no string", at);
+    if (key.type() != Type::string) fail(Failure::malformed, "A key that is not a string", at);
     if (failure_) return false;
     at += referenceSize_;
   }
@@ -324,7 +322,7 @@ void BinaryReader::readDictionary(std::size_t at, Extent extent, int depth, Valu
   if (failure_) return;
   if (known == nullptr) return readRepeatingDictionary(extent, depth, place);
 
-  // Kept here, because the keys of dictionaries within may displace the known ones.
+  // A copy: nested dictionaries may replace the cached keys.
   const auto places = known->places;
   Dictionary dictionary = known->pool.make();
   Value* const values = Internals::payload(dictionary)->values();
@@ -336,7 +334,7 @@ void BinaryReader::readDictionary(std::size_t at, Extent extent, int depth, Valu
   place = std::move(dictionary);
 }
 
-/// One with equal keys under different references: the last value counts.
+/// Reads a dictionary that has equal keys under different references: the last value wins.
 void BinaryReader::readRepeatingDictionary(Extent extent, int depth, Value& place) {
   const auto count = static_cast<std::size_t>(extent.count);
   std::vector<Value> keys(count);

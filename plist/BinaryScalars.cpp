@@ -1,4 +1,4 @@
-// Numbers, dates, uids and longer strings of the binary form.
+// Numbers, dates, uids and long strings of the binary format.
 #include <bit>
 
 #include "base/UTF8.h"
@@ -45,14 +45,14 @@ Value BinaryReader::readUid(std::size_t at, unsigned size) {
 }
 
 Value BinaryReader::readData(ByteView bytes) const {
-  // Not worth keeping a whole document for.
+  // Shorter data is copied: it must not keep a whole document alive.
   constexpr std::size_t kShort = 256;
   return document_ == nullptr || bytes.size() < kShort ? Value::data(bytes) : Internals::dataIn(document_, bytes);
 }
 
 Value BinaryReader::readASCII(std::size_t at, Extent extent) {
   const std::string_view text = textOf({begin_ + extent.start, static_cast<std::size_t>(extent.count)});
-  if (!isASCII(text)) return fail(Failure::badText, "A string that should be ASCII and is not", at);
+  if (!isASCII(text)) return fail(Failure::badText, "An ASCII string with bytes that are not ASCII", at);
   return text;
 }
 

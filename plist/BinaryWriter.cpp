@@ -1,4 +1,4 @@
-// Writes the binary form in one step: every object goes out after those that it refers to, so the root is the last.
+// Writes the binary format in one pass: every object is written after the objects that it refers to, the root last.
 #include <algorithm>
 #include <array>
 #include <bit>
@@ -7,6 +7,7 @@
 
 #include "base/UTF8.h"
 #include "plist/internal/BigEndian.h"
+#include "plist/internal/BinaryFormat.h"
 #include "plist/internal/Date.h"
 #include "plist/internal/Encoding.h"
 #include "plist/internal/Failure.h"
@@ -17,17 +18,12 @@ namespace appsync::plist {
 
 namespace {
 
-constexpr std::string_view kMagic = "bplist00";
-/// What any object takes beside its text, data or references; and the trailer's size.
+/// At least the size of any object without its text, data or references, and of the trailer.
 constexpr std::size_t kMargin = 64;
-/// Refused above: values that share their content can stand for far more than memory holds.
-constexpr std::size_t kMostValues = std::size_t{1} << 26;
-/// Offsets within a document fit their type.
-constexpr std::size_t kLargest = std::size_t{1} << 32;
-/// Scalars of at least this size are recognised by their storage when they are repeated: hashing them each time would
-/// take time in proportion to the expanded document.
+/// Repeated scalars of at least this size are recognised by their storage: hashing them each time would take time
+/// proportional to the expanded document.
 constexpr std::size_t kLongScalar = 4096;
-/// At first the buffer is no larger than this: most of a document may turn out to be the same scalars.
+/// The largest initial size of the buffer: most values of a large document may be equal scalars.
 constexpr std::size_t kLargestAtFirst = std::size_t{1} << 26;
 
 unsigned bytesFor(std::uint64_t number) noexcept {
@@ -36,13 +32,21 @@ unsigned bytesFor(std::uint64_t number) noexcept {
   return number < 0x100000000 ? 4 : 8;
 }
 
-std::byte* writeHead(unsigned type, std::size_t length, std::byte* at) noexcept {
-  if (length < 15) return storeBigEndian(type << 4 | length, 1, at);
-  if (length < 0x100) return storeBigEndian(type << 20 | 0xF1000 | length, 3, at);
-  const unsigned size = bytesFor(length);
-  at = storeBigEndian(type << 4 | 0xF, 1, at);
-  at = storeBigEndian(0x10U | static_cast<unsigned>(std::countr_zero(size)), 1, at);
-  return storeBigEndian(length, size, at);
+std::byte* writeMarker(Marker marker, unsigned low, std::byte* at) noexcept {
+  return storeBigEndian(markerByte(marker, low), 1, at);
+}
+
+std::byte* writeInteger(std::uint64_t number, unsigned size, std::byte* at) noexcept {
+  return storeBigEndian(number, size, writeMarker(Marker::integer, static_cast<unsigned>(std::countr_zero(size)), at));
+}
+
+/// Writes the marker and the number of elements.
+std::byte* writeHead(Marker marker, std::size_t count, std::byte* at) noexcept {
+  if (count < kLongCount) return writeMarker(marker, static_cast<unsigned>(count), at);
+  if (count < 0x100) {
+    return storeBigEndian(markerByte(marker, kLongCount) << 16 | markerByte(Marker::integer) << 8 | count, 3, at);
+  }
+  return writeInteger(count, bytesFor(count), writeMarker(marker, kLongCount, at));
 }
 
 std::byte* writeBytes(std::string_view bytes, std::byte* at) noexcept {
@@ -53,32 +57,33 @@ std::byte* writeBytes(std::string_view bytes, std::byte* at) noexcept {
 std::byte* writeInteger(const Value& value, std::byte* at) noexcept {
   if (const auto number = value.int64()) {
     const unsigned size = *number < 0 ? 8 : bytesFor(static_cast<std::uint64_t>(*number));
-    at = storeBigEndian(0x10U | static_cast<unsigned>(std::countr_zero(size)), 1, at);
-    return storeBigEndian(static_cast<std::uint64_t>(*number), size, at);
+    return writeInteger(static_cast<std::uint64_t>(*number), size, at);
   }
-  // Eight bytes are signed.
-  return storeBigEndian(*value.uint64(), 8, storeBigEndian(0, 8, storeBigEndian(0x14, 1, at)));
+  // Above the signed range: 16 bytes, because integers of 8 bytes are signed.
+  return storeBigEndian(*value.uint64(), 8, storeBigEndian(0, 8, writeMarker(Marker::integer, 4, at)));
 }
 
-std::byte* writeDouble(unsigned marker, double number, std::byte* at) noexcept {
-  return storeBigEndian(std::bit_cast<std::uint64_t>(number), 8, storeBigEndian(marker, 1, at));
+/// Writes a real or a date.
+std::byte* writeDouble(Marker marker, double number, std::byte* at) noexcept {
+  return storeBigEndian(std::bit_cast<std::uint64_t>(number), 8, writeMarker(marker, 3, at));
 }
 
 std::byte* writeUid(Uid uid, std::byte* at) noexcept {
   const unsigned size = bytesFor(uid.number);
-  return storeBigEndian(uid.number, size, storeBigEndian(0x80U | (size - 1), 1, at));
+  return storeBigEndian(uid.number, size, writeMarker(Marker::uid, size - 1, at));
 }
 
-/// Of one that holds its text itself. Longer ones count as others: their length is marked by a set high bit.
+/// Whether `string` is stored inline and ASCII. The length byte of a string on the heap is kShared (0xFF), whose high
+/// bit makes this false.
 bool isShortASCII(const Value& string) noexcept {
   const auto words = Internals::words(string);
   return ((words[0] | words[1] | words[2] | words[3]) & 0x8080808080808080U) == 0;
 }
 
-/// Copies the whole value, which is faster than its text alone; what is too much is written over by what follows.
+/// Copies the whole value, which is faster than the text alone. The excess is overwritten by the next object.
 std::byte* writeShortASCII(const Value& string, std::byte* at) noexcept {
   const std::size_t size = Internals::inlineSize(string);
-  at = writeHead(0x5, size, at);
+  at = writeHead(Marker::ascii, size, at);
   std::memcpy(at, Internals::bits(string), sizeof string);
   return at + size;
 }
@@ -101,20 +106,20 @@ std::byte* writeNumbers(std::span<const std::uint32_t> numbers, unsigned size, s
   }
 }
 
-/// What is known of a document before it is written.
+/// The size of a document, estimated before it is written.
 struct Measure {
   std::size_t values = 0;
   std::size_t containers = 0;
-  /// An upper bound but for text beyond ASCII.
+  /// An upper bound, except for text that is not ASCII.
   std::size_t bytes = 0;
-  /// Bytes of long text, counted as often as readers count it or more.
+  /// Bytes of long text, counted at least as often as readers count it.
   std::size_t text = 0;
   bool isTooDeep = false;
 
   void add(std::span<const Value> several, int depth) {
     values += several.size();
     bytes += several.size() * 12;
-    if (values > kMostValues) return;
+    if (values > kMaximumValues) return;
     for (const Value& value : several) {
       if (Internals::isInline(value)) {
         bytes += Internals::inlineSize(value);
@@ -123,7 +128,7 @@ struct Measure {
         text += textSize(value);
       } else {
         addContainer(value, depth + 1);
-        if (isTooDeep || values > kMostValues) return;
+        if (isTooDeep || values > kMaximumValues) return;
       }
     }
   }
@@ -143,8 +148,8 @@ struct Measure {
     if (payload->shape != latestShape_) addKeys(*payload->shape, depth);
     add({payload->values(), payload->count}, depth);
   }
-  /// Shared keys are most likely stored already and take no space. Readers count their text again unless the dictionary
-  /// before had them, too.
+  /// Shared keys are most likely stored already and take no space. Readers count their text again unless the previous
+  /// dictionary has the same keys.
   void addKeys(const Shape& shape, int depth) {
     latestShape_ = &shape;
     if (!shape.isShared()) return add(shape.keys, depth);
@@ -182,12 +187,12 @@ class BinaryWriter {
   std::byte* encode(const Value& value, std::byte* at);
   std::byte* encodeString(std::string_view text, std::byte* at);
   std::uint32_t writeContainer(const Value& value);
-  std::uint32_t writeReferences(unsigned type, ByteView keys, std::size_t first);
+  std::uint32_t writeReferences(Marker marker, ByteView keys, std::size_t first);
   void writeValues(std::span<const Value> values);
   ByteView referencesToKeys(const Shape& shape);
   void writeEnd();
 
-  std::byte* room(std::size_t size) {
+  std::byte* reserve(std::size_t size) {
     if (out_.size() - end_ < size + kMargin) grow(size + kMargin);
     return out_.data() + end_;
   }
@@ -202,15 +207,15 @@ class BinaryWriter {
   Bytes out_;
   std::size_t end_ = 0;
   ObjectTable objects_;
-  /// The numbers of the long scalars that were written, by their storage.
+  /// The numbers of the long scalars, by their storage.
   std::unordered_map<const Payload*, std::uint32_t> longScalars_;
   unsigned referenceSize_ = 1;
-  /// Writing is given up at an object of this number, which no reference can hold; after a failure, at any.
+  /// Writing stops at an object of this number, which no reference can hold. 0 after a failure.
   std::uint64_t limit_ = 0;
-  /// Numbers of the elements and values written so far of the containers that are still open, innermost last.
+  /// Numbers of the elements and values of the open containers, innermost last.
   std::vector<std::uint32_t> open_;
 
-  /// The references to a shape's keys as they are written, in `keyReferences_`.
+  /// The references to a shape's keys in the document, at `start` in `keyReferences_`.
   struct KnownShape {
     const Shape* shape = nullptr;
     std::size_t start = 0;
@@ -224,15 +229,15 @@ Result<Bytes> BinaryWriter::write(const Value& root) {
   Measure measure;
   measure.add({&root, 1}, 0);
   if (measure.isTooDeep) return failure(Failure::tooDeep, "Containers are nested too deep");
-  if (measure.values > kMostValues) return failure(Failure::tooLarge, "Too many values for one property list");
+  if (measure.values > kMaximumValues) return failure(Failure::tooLarge, "Too many values for one property list");
   out_.resize(std::min(measure.bytes + 2 * kMargin, kLargestAtFirst));
-  // There are at least as many objects as containers; equal scalars may or may not make more.
+  // There are at least as many objects as containers.
   referenceSize_ = bytesFor(measure.containers);
   while (!writeObjects(root, measure))
     referenceSize_ *= 2;
   if (failure_) return *std::move(failure_);
   writeEnd();
-  if (end_ > kLargest) return failure(Failure::tooLarge, "Too much content for one property list");
+  if (end_ > kMaximumDocumentSize) return failure(Failure::tooLarge, "Too much content for one property list");
   // Readers also count short text, which is at most 30 bytes for each byte of the document.
   if (measure.text > kMaximumExpandedSize + 2 * end_) {
     return failure(Failure::tooLarge, "Too much text for one property list");
@@ -240,7 +245,7 @@ Result<Bytes> BinaryWriter::write(const Value& root) {
   return std::move(out_);
 }
 
-/// False when there are too many objects for references of the present size.
+/// Returns false if there are too many objects for references of referenceSize_ bytes.
 bool BinaryWriter::writeObjects(const Value& root, const Measure& measure) {
   limit_ = std::uint64_t{1} << (8 * referenceSize_);
   end_ = 0;
@@ -249,22 +254,22 @@ bool BinaryWriter::writeObjects(const Value& root, const Measure& measure) {
   open_.clear();
   keyReferences_.clear();
   knownShapes_.fill({});
-  advanceTo(writeBytes(kMagic, room(kMagic.size())));
+  advanceTo(writeBytes(kMagic, reserve(kMagic.size())));
   writeValue(root);
   return failure_ || bytesFor(objects_.size()) <= referenceSize_;
 }
 
 void BinaryWriter::grow(std::size_t size) {
-  if (out_.size() + size > kLargest) fail(Failure::tooLarge, "Too much content for one property list");
+  if (out_.size() + size > kMaximumDocumentSize) fail(Failure::tooLarge, "Too much content for one property list");
   out_.resize((out_.size() + size) * 2);
 }
 
-/// Writes a scalar unless an equal one was written. Returns its number.
+/// Writes a scalar unless an equal one exists. Returns its number.
 inline std::uint32_t BinaryWriter::writeOnce(const Value& scalar) {
   const std::size_t before = objects_.size();
   const std::uint32_t number = objects_.findOrAdd(scalar, end_);
   if (number != before) return number;
-  if (const std::byte* end = encode(scalar, room(0))) advanceTo(end);
+  if (const std::byte* end = encode(scalar, reserve(0))) advanceTo(end);
   return number;
 }
 
@@ -279,23 +284,23 @@ std::uint32_t BinaryWriter::writeLong(const Value& scalar) {
   return known->second;
 }
 
-/// Writes a scalar; null when it cannot be written. There is room for everything but text and data.
+/// Writes a scalar. The buffer has space for everything but text and data. Returns the end, or null on failure.
 std::byte* BinaryWriter::encode(const Value& value, std::byte* at) {
   switch (value.type()) {
     case Type::boolean:
-      return storeBigEndian(*value.boolean() ? 0x9 : 0x8, 1, at);
+      return writeMarker(Marker::boolean, *value.boolean() ? kTrue : kFalse, at);
     case Type::integer:
       return writeInteger(value, at);
     case Type::real:
-      return writeDouble(0x23, *value.number(), at);
+      return writeDouble(Marker::real, *value.number(), at);
     case Type::date:
       if (!isInCalendar(*value.date())) return fail(Failure::notRepresentable, "A date lies outside the calendar");
-      return writeDouble(0x33, value.date()->seconds, at);
+      return writeDouble(Marker::date, value.date()->seconds, at);
     case Type::uid:
       return writeUid(*value.uid(), at);
     case Type::data:
-      at = room(Internals::text(value).size());
-      return writeBytes(Internals::text(value), writeHead(0x4, Internals::text(value).size(), at));
+      at = reserve(Internals::text(value).size());
+      return writeBytes(Internals::text(value), writeHead(Marker::data, Internals::text(value).size(), at));
     case Type::string:
       return isShortASCII(value) ? writeShortASCII(value, at) : encodeString(Internals::text(value), at);
     default:
@@ -304,14 +309,14 @@ std::byte* BinaryWriter::encode(const Value& value, std::byte* at) {
 }
 
 std::byte* BinaryWriter::encodeString(std::string_view text, std::byte* at) {
-  if (isASCII(text)) return writeBytes(text, writeHead(0x5, text.size(), room(text.size())));
-  at = room(2 * text.size());
-  // The length is known afterwards. It is at most that of the UTF-8, and so is the room that it takes.
-  std::byte* const draft = writeHead(0x6, text.size(), at);
+  if (isASCII(text)) return writeBytes(text, writeHead(Marker::ascii, text.size(), reserve(text.size())));
+  at = reserve(2 * text.size());
+  // The length is known afterwards: at most that of the UTF-8, and so is the size of its head.
+  std::byte* const draft = writeHead(Marker::utf16, text.size(), at);
   std::byte* const end = writeUTF16(text, draft);
   if (end == nullptr) return fail(Failure::badText, "A string is not well-formed UTF-8");
   const auto size = static_cast<std::size_t>(end - draft);
-  std::byte* const start = writeHead(0x6, size / 2, at);
+  std::byte* const start = writeHead(Marker::utf16, size / 2, at);
   if (start != draft) std::memmove(start, draft, size);
   return start + size;
 }
@@ -320,15 +325,15 @@ std::uint32_t BinaryWriter::writeContainer(const Value& value) {
   const std::size_t first = open_.size();
   if (const Array* array = value.array()) {
     writeValues(*array);
-    return writeReferences(0xA, {}, first);
+    return writeReferences(Marker::array, {}, first);
   }
   DictionaryPayload* payload = Internals::payload(*value.dictionary());
-  if (payload == nullptr || payload->count == 0) return writeReferences(0xD, {}, first);
+  if (payload == nullptr || payload->count == 0) return writeReferences(Marker::dictionary, {}, first);
   writeValues({payload->values(), payload->count});
-  return writeReferences(0xD, referencesToKeys(*payload->shape), first);
+  return writeReferences(Marker::dictionary, referencesToKeys(*payload->shape), first);
 }
 
-/// Puts the values' numbers on top of the open ones.
+/// Writes values and appends their numbers to `open_`.
 void BinaryWriter::writeValues(std::span<const Value> values) {
   for (const Value& value : values) {
     const std::uint32_t number = writeValue(value);
@@ -337,12 +342,12 @@ void BinaryWriter::writeValues(std::span<const Value> values) {
   }
 }
 
-/// Writes a container that holds the open numbers from `first` on, which are closed by that.
-std::uint32_t BinaryWriter::writeReferences(unsigned type, ByteView keys, std::size_t first) {
+/// Writes a container of the numbers in `open_` from `first` on, and removes them there.
+std::uint32_t BinaryWriter::writeReferences(Marker marker, ByteView keys, std::size_t first) {
   const std::span<const std::uint32_t> numbers = std::span(open_).subspan(first);
-  std::byte* at = room(keys.size() + numbers.size() * referenceSize_);
+  std::byte* at = reserve(keys.size() + numbers.size() * referenceSize_);
   const std::size_t start = end_;
-  at = writeHead(type, numbers.size(), at);
+  at = writeHead(marker, numbers.size(), at);
   at = writeBytes(textOf(keys), at);
   advanceTo(writeNumbers(numbers, referenceSize_, at));
   open_.resize(first);
@@ -365,7 +370,7 @@ ByteView BinaryWriter::referencesToKeys(const Shape& shape) {
 void BinaryWriter::writeEnd() {
   const std::size_t table = end_;
   const unsigned offsetSize = bytesFor(table);
-  std::byte* at = room(objects_.size() * offsetSize);
+  std::byte* at = reserve(objects_.size() * offsetSize);
   at = writeNumbers(objects_.offsets(), offsetSize, at);
   at = storeBigEndian(offsetSize, 7, at);
   at = storeBigEndian(referenceSize_, 1, at);

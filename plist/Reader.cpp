@@ -1,17 +1,18 @@
-// Tells the three forms apart.
+// Detects the format of a document.
 #include <algorithm>
 
 #include "plist/PropertyList.h"
 #include "plist/internal/BinaryReader.h"
+#include "plist/internal/Failure.h"
 
 namespace appsync::plist {
 
 namespace {
 
-/// More than any document has before its first telling characters.
+/// Longer than the text before the first significant characters of any document.
 constexpr std::size_t kPrefix = 256;
 
-/// The first characters of text in any encoding: no byte-order mark, no zero bytes of UTF-16, no leading white space.
+/// Returns the first characters of text in any encoding, without byte-order mark, zero bytes and leading white space.
 std::string beginning(ByteView document) {
   std::string start(textOf(document.first(std::min(document.size(), kPrefix))));
   std::erase_if(start, [](char c) { return c == '\0' || static_cast<unsigned char>(c) >= 0x80; });
@@ -20,10 +21,10 @@ std::string beginning(ByteView document) {
 }
 
 bool isBinary(ByteView document) {
-  return textOf(document).starts_with("bplist");
+  return textOf(document).starts_with(kMagicOfAnyVersion);
 }
 
-/// Both XML and data in the old text form begin with '<'; only the latter goes on with nothing but digits.
+/// Both XML and data in the ASCII format begin with '<'; only data has nothing but digits up to the '>'.
 bool isXML(ByteView document) {
   const std::string start = beginning(document);
   if (!start.starts_with('<')) return false;
@@ -34,7 +35,7 @@ bool isXML(ByteView document) {
 }  // namespace
 
 Error rootIsNoDictionary() {
-  return failure(Failure::malformed, "The root is no dictionary");
+  return failure(Failure::malformed, "The root is not a dictionary");
 }
 
 Result<Value> readBinaryOrXML(ByteView document) {

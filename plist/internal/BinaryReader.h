@@ -1,4 +1,4 @@
-// Reads the binary form: numbered objects, a table of where each lies, and a trailer that says how to read the table.
+// Reads the binary format; see BinaryFormat.h.
 #pragma once
 
 #include <array>
@@ -12,6 +12,7 @@
 #include <vector>
 
 #include "plist/internal/BigEndian.h"
+#include "plist/internal/BinaryFormat.h"
 #include "plist/internal/Failure.h"
 #include "plist/internal/Storage.h"
 
@@ -31,19 +32,18 @@ struct Expansion {
   Expansion operator-(const Expansion& other) const noexcept { return {values - other.values, text - other.text}; }
 };
 
-/// The limits of the expansion of a document of `size` bytes. Repeated objects share their storage, so that memory
-/// stays in proportion to the size in any case; the limits protect callers that visit each value or copy each text.
-/// Data is not limited: callers use it in place. Documents that store each container once never reach the limit of
-/// values, because every reference takes at least a byte.
+/// Returns the expansion limits of a document of `size` bytes. Repeated objects share their storage, so that memory is
+/// proportional to the size in any case; the limits protect callers that visit each value or copy each text. Data is
+/// not limited: callers use it in place.
 constexpr Expansion mostExpanded(std::uint64_t size) noexcept {
-  return {32 * size + 262144, 32 * size + kMaximumExpandedSize};
+  return {kExpansionPerByte * size + kExpansionAllowance, kExpansionPerByte * size + kMaximumExpandedSize};
 }
 
-/// Numbers of objects, a bit for each.
+/// A set of object numbers, one bit for each.
 class ObjectBitset {
  public:
   void resize(std::uint64_t count) { words_.resize(static_cast<std::size_t>(count / 64 + 1)); }
-  /// False when it was there.
+  /// Returns false if `number` is in the set already.
   bool insert(std::uint64_t number) {
     std::uint64_t& word = words_[static_cast<std::size_t>(number / 64)];
     const std::uint64_t before = word;
@@ -62,7 +62,7 @@ class ObjectBitset {
 class BinaryReader {
  public:
   explicit BinaryReader(ByteView document) noexcept : begin_(document.data()), size_(document.size()) {}
-  /// What is read may keep the document.
+  /// Long data that is read keeps the document alive.
   explicit BinaryReader(std::shared_ptr<const Bytes> document) noexcept : BinaryReader(ByteView(*document)) {
     document_ = std::move(document);
   }
@@ -75,37 +75,37 @@ class BinaryReader {
     return root;
   }
 
-  // One by one, for a root that is a dictionary.
+  // For a root that is a dictionary: one entry at a time.
 
-  /// False when it is none or cannot be read; `read` tells which.
+  /// Returns false if the root is not a dictionary or the document is invalid; `read` then returns the error.
   [[nodiscard]] bool beginEntries();
-  /// Reads all entries once. Their places, in the order of their keys, without those that a later one replaces.
+  /// Reads all entries once for validation. Returns their indices, sorted by key; of equal keys only the last one.
   [[nodiscard]] Result<std::vector<std::size_t>> checkEntries();
-  /// What follows reads them once more.
+  /// Resets the expansion count, before the entries are read again.
   void startAgain() noexcept { expansion_ = {}; }
-  // Null when it cannot be read.
+  // Each returns a null if the entry cannot be read.
   [[nodiscard]] Value entryKey(std::size_t place);
   [[nodiscard]] Value entryValue(std::size_t place);
 
  private:
-  /// Where an object's content lies and how many bytes or elements it has.
+  /// The offset of an object's content, and its number of bytes or elements.
   struct Extent {
     std::size_t start;
     std::uint64_t count;
   };
 
-  /// Long or nested content that was met a second time and is shared from then on.
+  /// A variable-length object that was read for the second time: further references share its value.
   struct Shared {
     Value value;
     Expansion expansion;
   };
 
-  /// The keys of a dictionary met before, told by the bytes of its references to them.
+  /// The keys of a dictionary, cached under the bytes of its references to them.
   struct KnownKeys {
     const std::byte* references = nullptr;
     std::size_t size = 0;
     DictionaryPool pool;
-    /// For each key as written, its place in the shape. Null when they are in order.
+    /// For each key in document order its index in the shape. Null if they are sorted.
     std::shared_ptr<const std::vector<std::uint32_t>> places;
   };
 
@@ -113,11 +113,11 @@ class BinaryReader {
   void failMissing(std::uint64_t number);
 
   void readTrailer();
-  /// Where an object begins.
+  /// Sets `at` to the offset of an object. Returns false if the object does not exist.
   bool locate(std::uint64_t number, std::size_t& at);
   void sortByKey(std::vector<std::size_t>& places);
-  void forgetWhatWasShared();
-  // Each reads an object into `place`, which holds a null; a null that stays means failure.
+  void forgetShared();
+  // Each reads an object into `place`, which holds a null, and leaves the null on failure.
   void readObject(std::uint64_t number, int depth, Value& place);
   void readOther(std::uint64_t number, std::size_t at, int depth, Value& place);
   bool readShortASCII(std::size_t start, std::size_t size, Value& place);
@@ -135,15 +135,15 @@ class BinaryReader {
   Value readASCII(std::size_t at, Extent extent);
   Value readUTF16(Extent extent);
   KnownKeys* keysOf(Extent extent, int depth);
-  bool learnKeys(KnownKeys& known, Extent extent, int depth);
+  bool readKeys(KnownKeys& known, Extent extent, int depth);
 
   bool readExtent(std::size_t at, unsigned low, Extent& extent) {
     extent = {at + 1, low};
-    return low != 0xF || readLongExtent(at, extent);
+    return low != kLongCount || readLongExtent(at, extent);
   }
   bool readLongExtent(std::size_t at, Extent& extent);
   bool fits(std::size_t at, const Extent& extent, std::uint64_t bytesEach) {
-    // A count of no more than the document's bytes cannot overflow.
+    // The product cannot overflow: the count is at most the size of the document.
     if (extent.start <= table_ && extent.count <= table_ && extent.count * bytesEach <= table_ - extent.start)
       return true;
     fail(Failure::outOfRange, "An object longer than the document", at);
@@ -155,17 +155,18 @@ class BinaryReader {
     expansion_ += more;
     const Expansion most = mostExpanded(size_);
     if (expansion_.values <= most.values && expansion_.text <= most.text) return true;
-    fail(Failure::tooLarge, "Far more values or text than the document's size accounts for, met", at);
+    fail(Failure::tooLarge, "Shared content that expands too far, detected", at);
     return false;
   }
   [[nodiscard]] std::uint64_t reference(std::size_t at) const noexcept {
     return loadBigEndian(begin_ + at, referenceSize_);
   }
-  [[nodiscard]] bool wasSeen(std::uint64_t number);
+  /// Marks an object as read. Returns whether it was read before.
+  [[nodiscard]] bool isRepeated(std::uint64_t number);
 
   const std::byte* begin_;
   std::size_t size_;
-  /// Null when nothing may keep it.
+  /// Null if values must not keep the document.
   std::shared_ptr<const Bytes> document_;
   unsigned offsetSize_ = 0;
   unsigned referenceSize_ = 0;
@@ -175,19 +176,19 @@ class BinaryReader {
   std::size_t table_ = 0;
 
   Expansion expansion_;
-  /// The long or nested objects that were ever met, and how many bytes of content they have.
+  /// The variable-length objects that were read, and the size of their content.
   ObjectBitset measured_;
   std::uint64_t content_ = 0;
-  /// Those that were met and not forgotten.
+  /// The variable-length objects that were read in this document, or in this entry if forgetsEntries_.
   ObjectBitset seen_;
   std::unordered_map<std::uint64_t, Shared> shared_;
-  /// Whether what was met is forgotten from one entry to the next, and what there is to forget.
-  bool forgets_ = false;
-  std::vector<std::uint64_t> met_;
-  /// The root's, when they are read one by one.
+  /// Whether seen_ and shared_ are cleared between entries, and the objects in seen_.
+  bool forgetsEntries_ = false;
+  std::vector<std::uint64_t> seenInEntry_;
+  /// The references of the root, if entries are read one at a time.
   Extent entries_{};
   std::array<KnownKeys, 32> knownKeys_;
-  /// Text that had to be converted.
+  /// Buffer for converted text.
   std::string text_;
   std::optional<Error> failure_;
 };

@@ -47,7 +47,7 @@ TEST_F(PropertyListFile, WhatIsNoDictionaryIsNone) {
 
 TEST_F(PropertyListFile, ARootOfAnotherTypeIsAnErrorOfItsOwn) {
   EXPECT_EQ(dictionaryOf(dictionary).value(), *dictionary.dictionary());
-  EXPECT_EQ(dictionaryOf(plist::Value(7)).error(), (Error{"PropertyList", 2, "The root is no dictionary", nullptr}));
+  EXPECT_EQ(dictionaryOf(plist::Value(7)).error(), (Error{"PropertyList", 2, "The root is not a dictionary", nullptr}));
   const Error error{"POSIX", 5, "no", nullptr};
   EXPECT_EQ(dictionaryOf(error).error(), error);
 }

@@ -241,7 +241,7 @@ TEST(PropertyListBinary, RefusesDatesOutsideTheCalendar) {
 
 TEST(PropertyListBinary, ErrorsNameTheByte) {
   EXPECT_EQ(outcome(readObjects({"\xA1\x01", "\x70"})), "An object of unknown type at byte 10");
-  EXPECT_EQ(outcome(plist::readBinary(bytesOf("nothing"))), "No binary property list at byte 0");
+  EXPECT_EQ(outcome(plist::readBinary(bytesOf("nothing"))), "Not a binary property list at byte 0");
 }
 
 }  // namespace

@@ -104,7 +104,7 @@ TEST(PropertyListEntries, OfAnEmptyDictionaryThereAreNone) {
 TEST(PropertyListEntries, AnotherRootHasNone) {
   for (const Value& root : {Value(plist::Array{"a"}), Value("text"), Value(7)}) {
     const auto entries = DictionaryStream::open(bytesOfText(textOf(plist::writeBinary(root))));
-    EXPECT_EQ(failureOf(entries), "The root is no dictionary");
+    EXPECT_EQ(failureOf(entries), "The root is not a dictionary");
   }
 }
 

@@ -277,7 +277,7 @@ TEST_F(CoordinatedRestore, MetadataThatIsNoDictionaryMakesNoCoordinatorAndChange
   metadata = xmlForm(plist::Array{"title"});
   EXPECT_FALSE(prepare(DemotionStatus::intentionallyDemoted));
   EXPECT_TRUE(
-      complained("failed to parse harvo metadata for 'com.a'. err=PropertyList 2 \"The root is no dictionary\""));
+      complained("failed to parse harvo metadata for 'com.a'. err=PropertyList 2 \"The root is not a dictionary\""));
   EXPECT_TRUE(platform.coordination.coordinators().empty());
   for (const std::string& message : platform.log.messages())
     EXPECT_EQ(message.find("DataMigrator"), std::string::npos) << message;

@@ -55,7 +55,7 @@ TEST_F(HostileRestoreFile, ALastAppThatCannotBeReadKeepsTheOthersFromBeingTakenT
 TEST_F(HostileRestoreFile, ARootOfAnotherTypeIsAsADocumentThatDoesNotParse) {
   for (const plist::Value& root : {plist::Value(plist::Array{"com.a"}), plist::Value("com.a"), plist::Value(7)}) {
     EXPECT_FALSE(processRoot(root));
-    EXPECT_TRUE(said("failed to parse harvo app restore info. err=PropertyList 2 \"The root is no dictionary\""));
+    EXPECT_TRUE(said("failed to parse harvo app restore info. err=PropertyList 2 \"The root is not a dictionary\""));
     EXPECT_FALSE(said("Finished waiting for placeholder installs"));
     expectFiledAway();
     platform.log.clear();

@@ -106,7 +106,7 @@ TEST_F(RestorePlaceholder, UnreadableMetadataCountsAsDealtWith) {
 
 TEST_F(RestorePlaceholder, MetadataThatIsNoDictionaryIsUnreadable) {
   EXPECT_TRUE(process(xmlForm(plist::Array{"title", "An App"})));
-  EXPECT_TRUE(said("failed to parse harvo metadata for 'com.a'. err=PropertyList 2 \"The root is no dictionary\""));
+  EXPECT_TRUE(said("failed to parse harvo metadata for 'com.a'. err=PropertyList 2 \"The root is not a dictionary\""));
   EXPECT_EQ(platform.transactions.scenarios(), (Scenarios{entry(Success::no, "Failed to parse harvo metadata")}));
 }
 
