@@ -2,8 +2,6 @@
 #include "common/PropertyListFile.h"
 #include "core/AppsClient.h"
 #include "plist/Access.h"
-#include "reporting/StoreMetadata.h"
-#include "reporting/TypedLookup.h"
 #include "reporting/UserApps.h"
 
 namespace appsync {
@@ -13,7 +11,31 @@ namespace {
 using platform::AppRecord;
 using Text = std::optional<std::string_view>;
 
-/// The account in one app's store metadata. A value of a wrong type is told each time that it is looked up.
+/// A number is an integer or a real; a boolean is not a number.
+enum class ExpectedType { string, number, dictionary };
+
+bool isOfType(const plist::Value& value, ExpectedType type) {
+  switch (type) {
+    case ExpectedType::string:
+      return value.type() == plist::Type::string;
+    case ExpectedType::number:
+      return value.type() == plist::Type::integer || value.type() == plist::Type::real;
+    case ExpectedType::dictionary:
+      return value.type() == plist::Type::dictionary;
+  }
+  return false;
+}
+
+/// Returns `value` if it has type `type`, else null. A value of another type is logged as an error under `label`; null
+/// (missing) is not logged.
+const plist::Value* typedLookup(const plist::Value* value, ExpectedType type, std::string_view label,
+                                const PlugInLog& log) {
+  if (value == nullptr || isOfType(*value, type)) return value;
+  log.lookupError("unexpected type for %{public}@", label);
+  return nullptr;
+}
+
+/// The account in one app's store metadata. A value of a wrong type is logged at each look-up.
 class AccountMetadata {
  public:
   AccountMetadata(platform::FileSystem& files, const AppRecord& app, const PlugInLog& log)

@@ -2,7 +2,6 @@
 #include "common/PropertyListFile.h"
 #include "core/AppsClient.h"
 #include "plist/Access.h"
-#include "reporting/StoreMetadata.h"
 #include "reporting/UserApps.h"
 
 namespace appsync {

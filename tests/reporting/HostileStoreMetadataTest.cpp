@@ -7,6 +7,7 @@
 
 #include <gtest/gtest.h>
 
+#include "reporting/UserApps.h"
 #include "tests/reporting/StoreMetadataFixture.h"
 
 namespace appsync::test {

@@ -1,4 +1,4 @@
-#include "reporting/StoreMetadata.h"
+#include "reporting/UserApps.h"
 
 #include "platform/SyncFiles.h"
 
