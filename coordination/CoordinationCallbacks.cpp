@@ -1,4 +1,4 @@
-// What the install-coordination service and the registry report, in the words of the sync.
+// The callbacks of the install-coordination service and of the registry.
 #include "common/SyncError.h"
 #include "core/AppsClient.h"
 #include "platform/SyncFiles.h"
@@ -18,6 +18,12 @@ std::shared_ptr<ZTAsset> assetNamed(platform::Platform& platform, std::string_vi
 }
 
 }  // namespace
+
+void AppsClient::setupInstallCoordinatorObserver() {
+  if (_appInstallObserver) return;
+  _appInstallObserver = _platform.installCoordination().initWithMachServiceName(
+      "com.corvel.zeph.xpc.cnappobserverdelegate", {ClientIdentity::CXClientSync}, *this);
+}
 
 void AppsClient::promiseDidBeginFulfillmentWithIdentifier(std::uint64_t identifier) {
   _log.message("%s|promiseDidBeginFulfillmentWithIdentifier %lu", identifier);
