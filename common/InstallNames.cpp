@@ -7,7 +7,7 @@
 
 #include "base/Message.h"
 
-namespace appsync {
+namespace appsync::platform {
 
 namespace {
 
@@ -23,7 +23,7 @@ constexpr std::array<std::string_view, 4> kPhaseNames{"TSInstallPhaseLoading", "
                                                       "TSInstallPhaseRestoringData",
                                                       "TSInstallPhaseInstallingPlaceholder"};
 
-/// The name of the number's place in the table, else `fallback` filled with the number.
+/// Returns the number's name in the table, or `fallback` filled with the number.
 template <std::size_t kCount, class Enumeration>
 std::string nameIn(const std::array<std::string_view, kCount>& names, Enumeration value,
                    MessageFormat<std::uint64_t> fallback) {
@@ -33,16 +33,16 @@ std::string nameIn(const std::array<std::string_view, kCount>& names, Enumeratio
 
 }  // namespace
 
-std::string installTypeName(platform::TSInstallType type) {
-  return nameIn(kTypeNames, type, "Unknown Install Type: %lu");
+void appendDescription(std::string& out, TSInstallType type) {
+  out += nameIn(kTypeNames, type, "Unknown Install Type: %lu");
 }
 
-std::string installStateName(platform::TSInstallState state) {
-  return nameIn(kStateNames, state, "Unknown Install State: %lu");
+void appendDescription(std::string& out, TSInstallState state) {
+  out += nameIn(kStateNames, state, "Unknown Install State: %lu");
 }
 
-std::string installPhaseName(platform::TSInstallPhase phase) {
-  return nameIn(kPhaseNames, phase, "Unknown Install Phase: %lu");
+void appendDescription(std::string& out, TSInstallPhase phase) {
+  out += nameIn(kPhaseNames, phase, "Unknown Install Phase: %lu");
 }
 
-}  // namespace appsync
+}  // namespace appsync::platform

@@ -1,7 +1,6 @@
 #include "coordination/InProgressAssetQuery.h"
 
 #include "common/InstallNames.h"
-#include "coordination/InstallActivity.h"
 
 namespace appsync {
 
@@ -83,8 +82,8 @@ void InProgressAssetQuery::classify(const platform::AppRecord& record, Identifie
   const auto type = record.installType();
   const auto state = progress->installState();
   const auto phase = progress->installPhase();
-  _log.message("%s|Got install type=%{public}@ state=%{public}@ phase=%{public}@ for %{public}@", Named{type},
-               Named{state}, Named{phase}, identifier);
+  _log.message("%s|Got install type=%{public}@ state=%{public}@ phase=%{public}@ for %{public}@", type, state, phase,
+               identifier);
   switch (installActivity(type, state, phase)) {
     case InstallActivity::inProgress:
       inProgress.push_back(identifier);

@@ -55,7 +55,7 @@ void AppsClient::_closeOutstandingTransfers(const Identifiers& outstanding, bool
   const TSInstallState state = success ? TSInstallState::Finished : TSInstallState::Failed;
   for (const std::string& identifier : outstanding) {
     _log.message("%s|Setting state for outstanding DCX loading phase of asset %{public}@ to %{public}@", identifier,
-                 Named{state});
+                 state);
     const auto progress = _progressForAssetIdentifier(identifier);
     if (!progress) continue;
     progress->setInstallState(state);

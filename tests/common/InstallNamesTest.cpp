@@ -7,6 +7,7 @@
 
 #include <gtest/gtest.h>
 
+#include "base/Describe.h"
 #include "common/InstallNames.h"
 
 namespace appsync::test {
@@ -26,36 +27,36 @@ TEST(InstallTypeName, EveryKnownTypeHasItsName) {
       "TSInstallTypeNone", "TSInstallTypeStoreDownload",   "TSInstallTypeRestore",   "TSInstallTypeAutomaticDownload",
       "TSInstallTypeSync", "TSInstallTypeAutomaticUpdate", "TSInstallTypeMigration", "TSInstallTypeDowngrade"};
   for (std::size_t value = 0; value < names.size(); ++value)
-    EXPECT_EQ(installTypeName(TSInstallType{value}), names[value]);
+    EXPECT_EQ(description(TSInstallType{value}), names[value]);
 }
 
 TEST(InstallTypeName, AnUnknownTypeIsNamedByItsNumber) {
-  EXPECT_EQ(installTypeName(TSInstallType{8}), "Unknown Install Type: 8");
-  EXPECT_EQ(installTypeName(TSInstallType{kLargest}), "Unknown Install Type: 18446744073709551615");
+  EXPECT_EQ(description(TSInstallType{8}), "Unknown Install Type: 8");
+  EXPECT_EQ(description(TSInstallType{kLargest}), "Unknown Install Type: 18446744073709551615");
 }
 
 TEST(InstallStateName, EveryKnownStateHasItsName) {
   const std::vector<std::string> names{"TSInstallStateWaiting",  "TSInstallStateActive", "TSInstallStatePaused",
                                        "TSInstallStateCanceled", "TSInstallStateFailed", "TSInstallStateFinished"};
   for (std::size_t value = 0; value < names.size(); ++value)
-    EXPECT_EQ(installStateName(TSInstallState{value}), names[value]);
+    EXPECT_EQ(description(TSInstallState{value}), names[value]);
 }
 
 TEST(InstallStateName, AnUnknownStateIsNamedByItsNumber) {
-  EXPECT_EQ(installStateName(TSInstallState{6}), "Unknown Install State: 6");
-  EXPECT_EQ(installStateName(TSInstallState{kLargest}), "Unknown Install State: 18446744073709551615");
+  EXPECT_EQ(description(TSInstallState{6}), "Unknown Install State: 6");
+  EXPECT_EQ(description(TSInstallState{kLargest}), "Unknown Install State: 18446744073709551615");
 }
 
 TEST(InstallPhaseName, EveryKnownPhaseHasItsName) {
   const std::vector<std::string> names{"TSInstallPhaseLoading", "TSInstallPhaseInstalling",
                                        "TSInstallPhaseRestoringData", "TSInstallPhaseInstallingPlaceholder"};
   for (std::size_t value = 0; value < names.size(); ++value)
-    EXPECT_EQ(installPhaseName(TSInstallPhase{value}), names[value]);
+    EXPECT_EQ(description(TSInstallPhase{value}), names[value]);
 }
 
 TEST(InstallPhaseName, AnUnknownPhaseIsNamedByItsNumber) {
-  EXPECT_EQ(installPhaseName(TSInstallPhase{4}), "Unknown Install Phase: 4");
-  EXPECT_EQ(installPhaseName(TSInstallPhase{kLargest}), "Unknown Install Phase: 18446744073709551615");
+  EXPECT_EQ(description(TSInstallPhase{4}), "Unknown Install Phase: 4");
+  EXPECT_EQ(description(TSInstallPhase{kLargest}), "Unknown Install Phase: 18446744073709551615");
 }
 
 }  // namespace appsync::test

@@ -3,7 +3,7 @@
 
 #include <gtest/gtest.h>
 
-#include "coordination/InstallActivity.h"
+#include "coordination/InProgressAssetQuery.h"
 
 namespace appsync::test {
 
