@@ -26,9 +26,9 @@ Examples:
 Json toJson(const std::vector<host::DeviceApp>& apps) {
   Json list = Json::array();
   for (const host::DeviceApp& app : apps) {
-    list.push_back({{"identifier", app.app.identifier},
-                    {"name", app.app.name},
-                    {"version", app.app.version.empty() ? Json(nullptr) : Json(app.app.version)},
+    list.push_back({{"identifier", app.name.identifier},
+                    {"name", app.name.name},
+                    {"version", app.name.version.empty() ? Json(nullptr) : Json(app.name.version)},
                     {"type", app.type},
                     {"placeholder", app.isPlaceholder},
                     {"installType", static_cast<std::uint64_t>(app.installType)},
@@ -53,9 +53,9 @@ void writeTable(StandardOutput& output, const std::vector<host::DeviceApp>& apps
     column = std::max(column, std::min(kWidest, displayWidth(printable(text, kWidest))));
   };
   for (const host::DeviceApp& app : apps) {
-    widen(name, app.app.name);
-    widen(version, app.app.version);
-    widen(identifier, app.app.identifier);
+    widen(name, app.name.name);
+    widen(version, app.name.version);
+    widen(identifier, app.name.identifier);
   }
   const auto writeRow = [&](std::string_view a, std::string_view b, std::string_view c, std::string_view d,
                             std::string_view e) {
@@ -65,7 +65,7 @@ void writeTable(StandardOutput& output, const std::vector<host::DeviceApp>& apps
   };
   writeRow("NAME", "VERSION", "IDENTIFIER", "SIZE", "STATE");
   for (const host::DeviceApp& app : apps) {
-    writeRow(app.app.name, app.app.version, app.app.identifier, byteCount(app.bytes), stateOf(app));
+    writeRow(app.name.name, app.name.version, app.name.identifier, byteCount(app.bytes), stateOf(app));
   }
 }
 

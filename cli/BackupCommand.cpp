@@ -18,18 +18,18 @@ struct BackupOptions {
 };
 
 constexpr const char* kExamples =
-    R"(BACKUP is a folder that must not exist yet. It gets what the apps of the device need to come back: of each its store
-metadata, licence, icon, version and data, which apps are demoted, and the order of the icons. Packages are not in
-it: after `appsync restore` the next sync brings them.
+    R"(BACKUP is the folder to create; it must not exist yet. It receives each app's store metadata, licence, icon, version
+and data, the list of demoted apps, and the order of the icons. It has no packages: after `appsync restore` the next
+sync sends them.
 
-What is neither file, folder nor link in an app's data is left out, and said so on standard error.
+Items of an app's data that are not files, folders or links are omitted, with a message on standard error.
 
-Whatever ends the process, the folder is whole or not there.
+The folder is created atomically: a backup that fails or is interrupted leaves nothing behind.
 
 Example:
   appsync backup phone phone-backup
 
-Exit status: 0 done, 2 wrong usage, 3 the device cannot be used or the backup not be written.)";
+Exit status: 0 done, 2 wrong usage, 3 the device cannot be used or the backup cannot be written.)";
 
 std::string summaryOf(const host::Backup& backup) {
   const auto count = [&](auto&& has) { return std::to_string(std::ranges::count_if(backup.apps, has)); };
@@ -39,11 +39,12 @@ std::string summaryOf(const host::Backup& backup) {
          printable(backup.path) + ".";
 }
 
-void tellWhatIsLeftOut(const host::Backup& backup) {
+void reportOmittedData(const host::Backup& backup) {
   for (const host::BackedUpApp& app : backup.apps) {
     if (app.leftOut == 0) continue;
-    printError("the data of " + app.app.identifier + " is saved without " + std::to_string(app.leftOut) +
-               (app.leftOut == 1 ? " item that is" : " items that are") + " neither file, folder nor link");
+    printError("the data of " + app.name.identifier + " is saved without " + std::to_string(app.leftOut) +
+               (app.leftOut == 1 ? " item that is not a file, folder or link"
+                                 : " items that are not files, folders or links"));
   }
 }
 
@@ -55,7 +56,7 @@ ExitStatus run(const BackupOptions& options, device::Device& device) {
   if (!listed) return reportUnusable(listed.error());
   const Result<host::Backup> backup = host::writeBackup(device, options.backup);
   if (!backup) return reportUnusable(backup.error());
-  tellWhatIsLeftOut(*backup);
+  reportOmittedData(*backup);
   StandardOutput output;
   output.writeLine(summaryOf(*backup));
   return output.finish(ExitStatus::done);
@@ -64,9 +65,9 @@ ExitStatus run(const BackupOptions& options, device::Device& device) {
 }  // namespace
 
 void addBackupCommand(CLI::App& line, Invocation& invocation) {
-  const CommandText text = {"backup", "Save what a device's apps need to come back.", kExamples};
+  const CommandText text = {"backup", "Back up the apps on a device.", kExamples};
   const auto added = addDeviceCommand(line, invocation, text, device::Access::exclusive, run);
-  added.command.add_option("BACKUP", added.options->backup, "the folder to make")->required();
+  added.command.add_option("BACKUP", added.options->backup, "the folder to create")->required();
 }
 
 }  // namespace appsync::cli

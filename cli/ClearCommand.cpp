@@ -16,7 +16,7 @@ struct ClearOptions {
 };
 
 constexpr const char* kExamples =
-    R"(Removes placeholders, and all that device and host remember of earlier syncs, such as which apps were deleted.
+    R"(Removes placeholders and the state that device and host keep of earlier syncs, such as the list of deleted apps.
 Installed apps stay.
 
 Example:
@@ -25,17 +25,17 @@ Example:
 ExitStatus run(const ClearOptions& /*options*/, device::Device& device) {
   const auto client = daemon::makeClient(device.platform());
   if (!client) return reportUnusable(client.error());
-  daemon::giveUpLeftovers(device);
+  daemon::cancelStaleCoordinators(device);
   (*client)->clearSyncData();
   host::clearStaging(device);
-  const Status forgotten = host::removeHostState(device.path());
-  return forgotten ? ExitStatus::done : reportUnusable(forgotten.error());
+  const Status removed = host::removeHostState(device.path());
+  return removed ? ExitStatus::done : reportUnusable(removed.error());
 }
 
 }  // namespace
 
 void addClearCommand(CLI::App& line, Invocation& invocation) {
-  const CommandText text = {"clear", "Forget everything about earlier syncs.", kExamples};
+  const CommandText text = {"clear", "Remove the state of earlier syncs.", kExamples};
   addDeviceCommand(line, invocation, text, device::Access::exclusive, run);
 }
 

@@ -13,27 +13,27 @@ namespace {
 
 constexpr const char* kNameAndVersion = "appsync " APPSYNC_VERSION;
 
-constexpr const char* kPurpose = R"(appsync keeps the apps on a device in step with a folder of app packages.
+constexpr const char* kPurpose = R"(appsync syncs the apps on a device with a folder of app packages.
 
-A device is a directory of this machine. `init` makes one, `pack` turns an app's folder into a package, and `sync` installs
-and updates what the library holds, and removes what you ask it to. `backup` and `restore` bring the apps of one device to
-a new one.)";
+A device is a folder of this machine. `init` creates one, `pack` creates a package from an app's folder, and `sync`
+installs and updates the apps of a library of packages and removes the apps that you name. `backup` and `restore` move
+the apps of one device to a new one.)";
 
 constexpr const char* kExamples = R"(Examples:
-  appsync init phone                    make a device
+  appsync init phone                    create a device
   appsync pack Tides.app -o lib/tides.zip
   appsync sync phone lib                install and update everything in lib
   appsync sync phone lib --remove org.example.tides
-  appsync tap phone org.example.tides   while a sync runs: this app before the others
-  appsync backup phone phone-backup     what its apps need to come back
+  appsync tap phone org.example.tides   have the running sync send this app first
+  appsync backup phone phone-backup     back up its apps
   appsync restore new-phone phone-backup
-  appsync apps phone                    what is on it now
-  appsync report phone                  how many they are, and whose
-  appsync screen phone -o screen.png    what its home screen looks like
+  appsync apps phone                    list its apps
+  appsync report phone                  show their number, size and accounts
+  appsync screen phone -o screen.png    draw its home screen
 
 Exit status: 0 done, 1 some app failed, 2 wrong usage, 3 the device, library, backup, file or plug-in cannot be used.
 Environment: APPSYNC_MODULE is the file of the plug-in to load, instead of the one installed with this program.
-`appsync COMMAND --help` tells more about a command.)";
+`appsync COMMAND --help` describes a command.)";
 
 void addCommands(CLI::App& line, Invocation& invocation) {
   addInitCommand(line, invocation);
@@ -56,7 +56,7 @@ bool isCommand(const CLI::App& line, const std::string& word) {
   return !line.get_subcommands([&](const CLI::App* command) { return command->get_name() == word; }).empty();
 }
 
-/// The command that was recognised before parsing went wrong, for the hint at its help.
+/// Returns the command that was recognised before parsing failed, for the hint at its help.
 std::string namedCommand(const CLI::App& line) {
   const auto named = line.get_subcommands();
   return named.empty() ? std::string("appsync") : "appsync " + named.front()->get_name();
@@ -66,7 +66,7 @@ ExitStatus explain(const CLI::App& line, const CLI::ParseError& error) {
   std::string reason = error.what();
   while (!reason.empty() && (reason.back() == '.' || reason.back() == '\n'))
     reason.pop_back();
-  printError(reason + "; `" + namedCommand(line) + " --help` shows how it is used");
+  printError(reason + "; `" + namedCommand(line) + " --help` describes its usage");
   return ExitStatus::wrongUsage;
 }
 
@@ -92,11 +92,11 @@ ExitStatus runCommandLine(int count, const char* const* words) {
   Invocation invocation;
   addCommands(line, invocation);
   if (count <= 1) {
-    printError("a command is missing; `appsync --help` shows them");
+    printError("a command is missing; `appsync --help` lists the commands");
     return ExitStatus::wrongUsage;
   }
   if (const std::string first = words[1]; !first.starts_with('-') && !isCommand(line, first)) {
-    printError("there is no command \"" + first + "\"; `appsync --help` shows them");
+    printError("there is no command \"" + first + "\"; `appsync --help` lists the commands");
     return ExitStatus::wrongUsage;
   }
   try {

@@ -1,12 +1,12 @@
-// From the words of a command line to a command.
+// The command line.
 #pragma once
 
 #include "cli/ExitStatus.h"
 
 namespace appsync::cli {
 
-/// Runs the command that these words ask for, or shows the help that they ask for. Wrong usage is explained on standard
-/// error.
+/// Parses the `count` words, of which the first is the program's name, and runs the command or shows the requested
+/// help. Reports an invalid command line on standard error.
 [[nodiscard]] ExitStatus runCommandLine(int count, const char* const* words);
 
 }  // namespace appsync::cli

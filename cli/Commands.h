@@ -1,5 +1,5 @@
-// Every command of the tool. Each adds itself, with its options and its help, to the command line; when it was the one
-// given, `invocation` becomes what runs it.
+// The commands of the tool. Each function adds a command with its options and its help to the command line. Parsing
+// sets `invocation` to the function that runs the given command.
 #pragma once
 
 #include <functional>

@@ -1,4 +1,4 @@
-// What one may ask of a sync while it runs in another process.
+// Commands to a sync that runs in another process.
 #include <string>
 
 #include "cli/Commands.h"
@@ -16,38 +16,38 @@ struct ControlOptions {
 };
 
 constexpr const char* kTapExamples =
-    R"(Does what a tap on the app's icon does while it waits for its package: the package is sent before all others whose
-turn has not come. `appsync apps` shows which apps wait. A sync must be running on the device at the time, in another
-terminal perhaps, and the device must install through coordinators, as devices do unless they were made with --direct.
+    R"(Acts as a tap on the icon of an app that waits for its package: the running sync sends the package before all other
+packages that it has not started to send. `appsync apps` shows which apps wait. A sync must be running on the device,
+and the device must install through coordinators, which is the default of `appsync init`.
 
 Examples:
   appsync sync phone lib &
   appsync tap phone org.example.tides
 
-Exit status: 0 done, 1 the app is not on its way, 2 wrong usage, 3 no sync is running, or it cannot be reached.)";
+Exit status: 0 done, 1 the app is not being installed, 2 wrong usage, 3 no sync is running, or it cannot be reached.)";
 
 constexpr const char* kCancelExamples =
-    R"(Does what a person does who takes the app off the home screen while it waits for its package: the package is not
-sent, or not to its end, and the sync tells the app as skipped. An app that is installed already stays as it is; an
-update that is cancelled leaves the old version. The next sync offers the app again. A sync must be running on the
-device at the time, and the device must install through coordinators, as devices do unless they were made with
---direct.
+    R"(Acts as the removal of an app from the home screen while it waits for its package: the sync cancels the transfer of
+the package and reports the app as skipped. An installed app stays as it is; a cancelled update leaves the old version.
+The next sync offers the app again. A sync must be running on the device, and the device must install through
+coordinators, which is the default of `appsync init`.
 
 Examples:
   appsync sync phone lib &
   appsync cancel phone org.example.tides
 
-Exit status: 0 done, 1 the app is not on its way, or is just being installed, 2 wrong usage, 3 no sync is running, or
-it cannot be reached.)";
+Exit status: 0 done, 1 the app is not being installed or cannot be cancelled any more, 2 wrong usage,
+3 no sync is running, or it cannot be reached.)";
 
 ExitStatus ask(daemon::ControlVerb verb, const ControlOptions& options, device::Device& device) {
   if (!device::isBundleIdentifier(options.identifier)) {
-    printError("\"" + options.identifier + "\" is no app identifier; `appsync apps` shows those of a device");
+    printError("\"" + options.identifier + "\" is not an app identifier; `appsync apps` lists those of a device");
     return ExitStatus::wrongUsage;
   }
   if (!device.platform().installCoordination().coordinationIsEnabled()) {
-    printError(options.device + " installs directly, which can be neither hurried nor cancelled; `appsync set " +
-               options.device + " coordination=on` has later syncs install through coordinators");
+    printError(options.device +
+               " installs directly, so its apps cannot be prioritised or cancelled; run `appsync set " +
+               options.device + " coordination=on` to have later syncs install through coordinators");
     return ExitStatus::unusable;
   }
   const Result<daemon::ControlAnswer> answer = daemon::askSync(options.device, {verb, options.identifier});
@@ -58,7 +58,7 @@ ExitStatus ask(daemon::ControlVerb verb, const ControlOptions& options, device::
   }
   StandardOutput output;
   output.writeLine(options.identifier +
-                   (verb == daemon::ControlVerb::cancel ? " is cancelled." : " comes before the others."));
+                   (verb == daemon::ControlVerb::cancel ? " is cancelled." : " is sent before the others."));
   return output.finish(ExitStatus::done);
 }
 
@@ -76,12 +76,12 @@ void addControlCommand(CLI::App& line, Invocation& invocation, const CommandText
 }  // namespace
 
 void addTapCommand(CLI::App& line, Invocation& invocation) {
-  addControlCommand(line, invocation, {"tap", "Have a running sync bring an app before the others.", kTapExamples},
+  addControlCommand(line, invocation, {"tap", "Have a running sync send an app before the others.", kTapExamples},
                     run<daemon::ControlVerb::prioritize>);
 }
 
 void addCancelCommand(CLI::App& line, Invocation& invocation) {
-  addControlCommand(line, invocation, {"cancel", "Have a running sync leave an app out.", kCancelExamples},
+  addControlCommand(line, invocation, {"cancel", "Have a running sync skip an app.", kCancelExamples},
                     run<daemon::ControlVerb::cancel>);
 }
 

@@ -5,7 +5,7 @@
 namespace appsync::cli {
 
 void addDevice(CLI::App& command, std::string& path) {
-  command.add_option("DEVICE", path, "the device's folder, made by `appsync init`")->required();
+  command.add_option("DEVICE", path, "the device's folder, created by `appsync init`")->required();
 }
 
 ExitStatus withDevice(const std::string& path, device::Access access,

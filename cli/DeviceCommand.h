@@ -1,4 +1,4 @@
-// Devices for commands.
+// Commands that open a device.
 #pragma once
 
 #include <functional>
@@ -16,26 +16,26 @@ namespace appsync::cli {
 /// Adds the positional DEVICE to a command.
 void addDevice(CLI::App& command, std::string& path);
 
-/// Opens the device and does `work` with it; a device that cannot be opened is reported.
+/// Opens the device and calls `work`. Reports a device that cannot be opened.
 [[nodiscard]] ExitStatus withDevice(const std::string& path, device::Access access,
                                     const std::function<ExitStatus(device::Device&)>& work);
 
-/// How a command is called, what it does in a few words, and what stands below its options in its help.
+/// A command's name, its one-line purpose, and the text below the options in its help.
 struct CommandText {
   const char* name;
   const char* purpose;
   const char* examples;
 };
 
-/// A command that was added, for the rest of its options.
+/// An added command, to which the caller adds its further options.
 template <class Options>
 struct AddedCommand {
   CLI::App& command;
   std::shared_ptr<Options> options;
 };
 
-/// Adds a command that opens a device and then does `run`. Of the options, which live as long as the command line,
-/// `device` is filled in already.
+/// Adds a command that opens a device and calls `run`. The options exist as long as the command line; their member
+/// `device` is bound to DEVICE.
 template <class Options>
 AddedCommand<Options> addDeviceCommand(CLI::App& line, Invocation& invocation, const CommandText& text,
                                        device::Access access, ExitStatus (*run)(const Options&, device::Device&)) {
@@ -51,7 +51,7 @@ AddedCommand<Options> addDeviceCommand(CLI::App& line, Invocation& invocation, c
   return {*command, options};
 }
 
-/// The same for a command that shows what is on a device, to people or, with the option `json`, to machines.
+/// As `addDeviceCommand`, for a command that only reads a device, with the flag --json bound to the member `json`.
 template <class Options>
 void addListingCommand(CLI::App& line, Invocation& invocation, const CommandText& text,
                        ExitStatus (*run)(const Options&, device::Device&)) {

@@ -1,12 +1,12 @@
-// What the process tells its caller.
+// The exit status of the process.
 #pragma once
 
 namespace appsync::cli {
 
 enum class ExitStatus : int {
   done = 0,
-  someAppFailed = 1,  ///< the command ran to its end, but not for every app
-  wrongUsage = 2,     ///< the command line asks for what there is not
+  someAppFailed = 1,  ///< the command completed, but failed for some app
+  wrongUsage = 2,     ///< invalid command line
   unusable = 3,       ///< a device, library, file or plug-in cannot be used
 };
 

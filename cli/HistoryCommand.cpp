@@ -17,7 +17,7 @@ struct HistoryOptions {
 };
 
 constexpr const char* kExamples =
-    R"(Each line is one event: when, whether it went well, with which app, and what it was. Times are UTC.
+    R"(Each line is one event: its time in UTC, its result, the app, and a description.
 With --json: an array of {time, identifier, success, scenario, step, party, phase, description}.
 
 Examples:
@@ -41,7 +41,7 @@ Json toJson(const TransactionEntry& entry) {
           {"description", entry.description}};
 }
 
-std::string whatHappened(const TransactionEntry& entry) {
+std::string eventText(const TransactionEntry& entry) {
   if (entry.scenario) return *entry.scenario + ": " + entry.description;
   const std::string step(device::nameOf(static_cast<platform::TransactionStep>(entry.step)));
   const bool begins = entry.phase == platform::TransactionPhase::begin;
@@ -50,7 +50,7 @@ std::string whatHappened(const TransactionEntry& entry) {
 
 void writeLineFor(StandardOutput& output, const TransactionEntry& entry) {
   output.writeLine(timeText(entry) + "  " + (entry.success ? "ok     " : "FAILED ") +
-                   fitted(entry.bundleIdentifier, 32) + "  " + printable(whatHappened(entry)));
+                   fitted(entry.bundleIdentifier, 32) + "  " + printable(eventText(entry)));
 }
 
 ExitStatus run(const HistoryOptions& options, device::Device& device) {
@@ -62,15 +62,14 @@ ExitStatus run(const HistoryOptions& options, device::Device& device) {
     options.json ? list.push_back(toJson(entry)) : writeLineFor(output, entry);
   }
   if (options.json) output.writeLine(indented(list));
-  if (!options.json && entries->empty()) output.writeLine("Nothing has happened yet.");
+  if (!options.json && entries->empty()) output.writeLine("No installs or removals yet.");
   return output.finish(ExitStatus::done);
 }
 
 }  // namespace
 
 void addHistoryCommand(CLI::App& line, Invocation& invocation) {
-  addListingCommand(line, invocation, {"history", "Show what was installed and removed, and how that went.", kExamples},
-                    run);
+  addListingCommand(line, invocation, {"history", "Show the log of installs and removals.", kExamples}, run);
 }
 
 }  // namespace appsync::cli

@@ -1,26 +1,26 @@
-// JSON as the tool writes it.
+// JSON output, and property lists as JSON.
 #pragma once
 
 #include <string>
 
 #include <nlohmann/json.hpp>
 
-#include "cli/Printable.h"
+#include "plist/PropertyList.h"
 
 namespace appsync::cli {
 
 /// Keeps members in the order in which they were added.
 using Json = nlohmann::ordered_json;
 
-/// On one line. Bytes that are no UTF-8 are replaced, so that the result always is JSON; what would command a terminal
-/// stands in it by number.
-[[nodiscard]] inline std::string onOneLine(const Json& json) {
-  return withReferences(json.dump(-1, ' ', false, Json::error_handler_t::replace), Notation::json);
-}
+/// Returns `json` on one line, always as valid JSON: invalid UTF-8 is replaced, and characters that are unsafe for a
+/// terminal are escaped.
+[[nodiscard]] std::string onOneLine(const Json& json);
 
-/// Indented for people, with the same promise.
-[[nodiscard]] inline std::string indented(const Json& json) {
-  return withReferences(json.dump(2, ' ', false, Json::error_handler_t::replace), Notation::json);
-}
+/// Returns `json` indented for users, with the same guarantees as `onOneLine`.
+[[nodiscard]] std::string indented(const Json& json);
+
+/// Converts a property list: data becomes base64 text, a date ISO 8601 text in UTC, a uid {"CF$UID": number}, and a
+/// real without a JSON form null. All other types have a JSON equivalent.
+[[nodiscard]] Json toJson(const plist::Value& value);
 
 }  // namespace appsync::cli

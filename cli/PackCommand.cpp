@@ -28,10 +28,10 @@ struct PackOptions {
 };
 
 constexpr const char* kExamples =
-    R"(APP-FOLDER is the app itself, Name.app with an Info.plist in it, or a folder that holds one Name.app and beside it,
-if there are any, HarvoMetadata.plist and HarvoArtwork; other files beside the app are left out. Info.plist is a
-dictionary with BundleIdentifier, BundleVersion, BundleDisplayName and, if there are any, BundleExecutable and
-BundleIconFile, which name files of the app. The same app always gives the same bytes.
+    R"(APP-FOLDER is the app itself, Name.app with an Info.plist in it, or a folder with one Name.app and, optionally,
+HarvoMetadata.plist and HarvoArtwork; other files next to the app are ignored. Info.plist is a dictionary with
+BundleIdentifier, BundleVersion, BundleDisplayName and, optionally, BundleExecutable and BundleIconFile, which name
+files of the app. The same app always results in the same bytes.
 
 Without -o the package is Name-VERSION.zip in the current folder.
 
@@ -45,7 +45,7 @@ Error wrong(const fs::path& path, const std::string& reason) {
 
 struct AppFolder {
   fs::path app;
-  /// The app and what goes beside it.
+  /// Paths of the app and of the files next to it that belong into the package.
   std::vector<std::string> items;
 };
 
@@ -69,30 +69,31 @@ Result<AppFolder> findApp(const std::string& given) {
   const Result<std::vector<fs::path>> apps = appsIn(folder);
   if (!apps) return apps.error();
   if (apps->empty())
-    return wrong(given, "is no app and holds none; give a folder named Name.app, or one that holds it");
-  if (apps->size() > 1) return wrong(given, "holds several apps; give one of them");
+    return wrong(given, "is not an app and has none in it; name a folder Name.app, or a folder that contains it");
+  if (apps->size() > 1) return wrong(given, "contains several apps; name one of them");
   AppFolder found = {apps->front(), {apps->front().string()}};
-  for (const std::string_view beside : {kStoreMetadataName, kArtworkName}) {
-    if (fs::exists(folder / beside, failure)) found.items.push_back((folder / beside).string());
+  for (const std::string_view name : {kStoreMetadataName, kArtworkName}) {
+    if (fs::exists(folder / name, failure)) found.items.push_back((folder / name).string());
   }
   return found;
 }
 
-/// A text that the info dictionary must have.
+/// Fails unless the info dictionary has a non-empty string under `key`.
 Status requireText(const plist::Dictionary& info, std::string_view key, const fs::path& path) {
   const auto text = stringIn(info.find(key));
   if (text && !text->empty()) return {};
   return wrong(path, "has no text under " + std::string(key) + "; add it");
 }
 
-/// A file of the app that the info dictionary may name.
+/// Fails if the info dictionary names a file under `key` that the app does not have.
 Status requireFile(const plist::Dictionary& info, std::string_view key, const fs::path& app) {
   const plist::Value* value = info.find(key);
   if (value == nullptr) return {};
   const auto file = device::namedFileIn(app.string(), value);
   std::error_code failure;
   if (file && fs::is_regular_file(*file, failure)) return {};
-  return wrong(app / kInfoPlistName, "names under " + std::string(key) + " a file that the app does not have");
+  return wrong(app / kInfoPlistName, "names under " + std::string(key) +
+                                         " a file that the app does not have; add the file or remove the key");
 }
 
 Result<device::BundleInfo> checkedInfo(const fs::path& app) {
@@ -137,7 +138,7 @@ ExitStatus run(const PackOptions& options) {
 
 void addPackCommand(CLI::App& line, Invocation& invocation) {
   const auto options = std::make_shared<PackOptions>();
-  CLI::App* command = line.add_subcommand("pack", "Turn an app's folder into a package.");
+  CLI::App* command = line.add_subcommand("pack", "Create a package from an app's folder.");
   command->add_option("APP-FOLDER", options->folder, "the app")->required();
   command->add_option("-o,--output", options->output, "the package to write; - is standard output");
   command->footer(kExamples);

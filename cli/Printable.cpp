@@ -9,7 +9,8 @@
 namespace appsync::cli {
 namespace {
 
-/// Columns that a character takes, or a negative number when it must not reach a terminal.
+
+/// Returns the character's number of columns, or a negative number if it is unsafe for a terminal.
 int columnsOf(const Character& character) {
   if (!character.valid || isUnsafeForDisplay(character.code)) return -1;
   if (character.code < 0x7F) return 1;
@@ -24,7 +25,7 @@ std::string escaped(const Character& character) {
   return {text, static_cast<std::size_t>(length)};
 }
 
-/// As a document says a character by its number: JSON in UTF-16, XML at once.
+/// Returns the numeric reference of a character: in JSON its UTF-16 units, in XML its code point.
 std::string reference(char32_t code, Notation notation) {
   const auto number = static_cast<unsigned>(code);
   char text[16];
@@ -43,7 +44,7 @@ std::string reference(char32_t code, Notation notation) {
 
 std::string withReferences(std::string document, Notation notation) {
   std::string out;
-  std::size_t kept = 0;  // how much of the document `out` stands for
+  std::size_t kept = 0;  // bytes of the document that were copied to `out`
   for (std::size_t place = 0; place < document.size();) {
     const Character character = firstCharacter(std::string_view(document).substr(place));
     if (character.valid && character.code >= 0x7F && isUnsafeForDisplay(character.code)) {
@@ -60,7 +61,7 @@ std::string printable(std::string_view text, std::size_t columns) {
   constexpr std::string_view kCut = "...";
   std::string out;
   std::size_t width = 0;
-  std::size_t beforeCut = 0;  // bytes of `out` that leave room for the mark of a cut
+  std::size_t beforeCut = 0;  // bytes of `out` that leave space for kCut
   while (!text.empty()) {
     const Character character = firstCharacter(text);
     const int own = columnsOf(character);

@@ -8,7 +8,6 @@
 #include "cli/DeviceCommand.h"
 #include "cli/Json.h"
 #include "cli/Printable.h"
-#include "cli/PropertyListJson.h"
 #include "cli/StandardOutput.h"
 #include "daemon/ClientModule.h"
 #include "host/DeviceApps.h"
@@ -26,15 +25,15 @@ struct DeviceReportOptions {
 };
 
 constexpr const char* kExamples =
-    R"(Tells what the plug-in answers to the sync daemon's questions about a device: how many apps there are and what they
-take, which store accounts own them, and which dataclasses are disabled: "Application", where apps may be neither
-installed nor removed. Accounts stand in the apps' store metadata, two identifiers of one app where its metadata
-disagrees with itself. An app whose metadata is missing or cannot be read has no account; the others have theirs.
+    R"(Shows the plug-in's answers to the sync daemon: the number and size of the apps, the store accounts that own them, and
+the disabled dataclasses: "Application" if apps may be neither installed nor removed. Accounts are read from the apps'
+store metadata; if an app's metadata is inconsistent, two identifiers are shown. An app whose metadata is missing or
+cannot be read has no account.
 
 With --json: one object:
   metrics             {count, physicalSize, purgeableSize}, the sizes in bytes
   corvelIDs           array of the accounts' identifiers
-  accounts            array of {corvelID, DSID, altDSID}; of these DSID is a number, and what is not known is null
+  accounts            array of {corvelID, DSID, altDSID}; DSID is a number, and unknown values are null
   disabledAssetTypes  array of dataclasses
   restrictions        {"app-installation", "app-removal"}, each "yes", "no" or "unset"
 
@@ -42,7 +41,7 @@ Examples:
   appsync report phone
   appsync report phone --json | jq -r '.corvelIDs[]')";
 
-/// What there is to report of a device.
+/// The report on a device.
 struct Report {
   std::uint64_t count = 0;
   std::uint64_t physicalSize = 0;
@@ -108,14 +107,14 @@ std::string shown(const ZTMutableAccountInfo& account) {
   return line;
 }
 
-/// A title and a line for each of `things`; nothing for none.
-template <class Things>
-void writeList(StandardOutput& output, std::string_view title, const Things& things) {
-  if (things.empty()) return;
+/// Writes a title and a line for each item; nothing if the list is empty.
+template <class Items>
+void writeList(StandardOutput& output, std::string_view title, const Items& items) {
+  if (items.empty()) return;
   output.writeLine("");
   output.writeLine(title);
-  for (const auto& thing : things)
-    output.writeLine("  " + shown(thing));
+  for (const auto& item : items)
+    output.writeLine("  " + shown(item));
 }
 
 void write(StandardOutput& output, const Report& report) {
@@ -131,7 +130,7 @@ void write(StandardOutput& output, const Report& report) {
 ExitStatus run(const DeviceReportOptions& options, device::Device& device) {
   const auto client = daemon::makeClient(device.platform());
   if (!client) return reportUnusable(client.error());
-  // To the plug-in a register that cannot be read is one without apps.
+  // The plug-in treats a registry that cannot be read as empty.
   if (const auto apps = host::appsOn(device); !apps) return reportUnusable(apps.error());
   const Report report = ask(**client, device.platform().sharedConnection());
   StandardOutput output;
@@ -146,7 +145,7 @@ ExitStatus run(const DeviceReportOptions& options, device::Device& device) {
 }  // namespace
 
 void addReportCommand(CLI::App& line, Invocation& invocation) {
-  const CommandText text = {"report", "Tell how many apps a device holds, and whose they are.", kExamples};
+  const CommandText text = {"report", "Report the number, size and accounts of the apps on a device.", kExamples};
   addListingCommand(line, invocation, text, run);
 }
 

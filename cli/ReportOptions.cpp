@@ -17,7 +17,7 @@ void addReportOptions(CLI::App& command, ReportOptions& options) {
 
 namespace {
 
-/// Whether lines of standard output can be written over.
+/// Returns whether standard output is a terminal with cursor movement.
 bool canMoveCursor() {
   const char* terminal = std::getenv("TERM");
   const std::string_view kind = terminal == nullptr ? "" : terminal;
@@ -27,8 +27,8 @@ bool canMoveCursor() {
 }  // namespace
 
 std::unique_ptr<host::SyncReporter> makeReporter(const ReportOptions& options, StandardOutput& output,
-                                                 host::Course course) {
-  if (options.json) return makeJsonReporter(output, course);
+                                                 host::OperationKind operation) {
+  if (options.json) return makeJsonReporter(output, operation);
   return canMoveCursor() ? makeTerminalReporter(output) : makePlainReporter(output);
 }
 

@@ -1,4 +1,4 @@
-// How commands that work on many apps tell of it.
+// Options and reporters of commands that process many apps.
 #pragma once
 
 #include <memory>
@@ -20,11 +20,12 @@ struct ReportOptions {
 /// Adds --json and --log.
 void addReportOptions(CLI::App& command, ReportOptions& options);
 
-/// JSON Lines if they are asked for, else lines for a terminal that can write over them, or for a pipe.
+/// Returns the reporter for JSON Lines if requested, else the one for a terminal with cursor movement or for plain
+/// lines.
 [[nodiscard]] std::unique_ptr<host::SyncReporter> makeReporter(const ReportOptions& options, StandardOutput& output,
-                                                               host::Course course);
+                                                               host::OperationKind operation);
 
-/// Lets the sync framework log to the file, if one is asked for.
+/// Starts the sync framework's log if a file was given. Fails if the file cannot be opened.
 [[nodiscard]] Status openLog(const ReportOptions& options, device::Device& device);
 
 }  // namespace appsync::cli

@@ -34,9 +34,9 @@ std::string outcomeLine(const host::AppOutcome& outcome) {
     case host::AppEvent::updated:
     case host::AppEvent::removed:
     case host::AppEvent::restored:
-      return line(host::wordFor(outcome.event), shownName(outcome.app));
+      return line(host::wordFor(outcome.event), shownName(outcome.name));
     case host::AppEvent::skipped:
-      return line("skipped", shownName(outcome.app) + ": " + printable(outcome.reason));
+      return line("skipped", shownName(outcome.name) + ": " + printable(outcome.reason));
     case host::AppEvent::failed:
     case host::AppEvent::cutOff:
     case host::AppEvent::unchanged:
@@ -46,9 +46,9 @@ std::string outcomeLine(const host::AppOutcome& outcome) {
 }
 
 std::string failureSentence(const host::AppOutcome& outcome) {
-  const std::string identifier = printable(outcome.app.identifier, 100);
-  const std::string known = outcome.app.name.empty() ? "" : " (" + identifier + ")";
-  return shownName(outcome.app) + known + " failed: " + printable(outcome.reason, 1000);
+  const std::string identifier = printable(outcome.name.identifier, 100);
+  const std::string known = outcome.name.name.empty() ? "" : " (" + identifier + ")";
+  return shownName(outcome.name) + known + " failed: " + printable(outcome.reason, 1000);
 }
 
 std::string waitingLine(const host::AppName& app, std::string_view reason) {
@@ -64,7 +64,7 @@ std::string summaryLine(const host::AppOutcomes& outcomes) {
       countOf(outcomes, host::AppEvent::restored, "restored"),
       countOf(outcomes, host::AppEvent::failed, "failed"),
       countOf(outcomes, host::AppEvent::skipped, "skipped"),
-      countOf(outcomes, host::AppEvent::cutOff, "cut off, to be offered again at the next sync")};
+      countOf(outcomes, host::AppEvent::cutOff, "interrupted, to be offered again at the next sync")};
   std::string summary;
   for (const std::string& part : done) {
     if (!part.empty()) summary += (summary.empty() ? "" : ", ") + part;

@@ -1,4 +1,4 @@
-// The sentences in which people are told how a sync went.
+// The texts of a sync's report.
 #pragma once
 
 #include <string>
@@ -8,19 +8,19 @@
 
 namespace appsync::cli {
 
-/// "Tides 1.2", or the identifier when there is no name. Printable.
+/// Returns "Tides 1.2", with the identifier if the name is unknown. Printable.
 [[nodiscard]] std::string shownName(const host::AppName& app);
 
-/// "installed  Tides 1.2"; empty for what is not worth a line. Failures are errors, see `failureSentence`.
+/// Returns "installed  Tides 1.2", or an empty string for outcomes without a line. For failures see `failureSentence`.
 [[nodiscard]] std::string outcomeLine(const host::AppOutcome& outcome);
 
-/// "Tides 1.2 (org.example.tides) failed: its package is damaged".
+/// Returns "Tides 1.2 (org.example.tides) failed: its package is damaged".
 [[nodiscard]] std::string failureSentence(const host::AppOutcome& outcome);
 
-/// "waiting    Tides 1.2: the home screen ...".
+/// Returns "waiting    Tides 1.2: the home screen ...".
 [[nodiscard]] std::string waitingLine(const host::AppName& app, std::string_view reason);
 
-/// "2 installed, 1 failed, 5 up to date.", or that there was nothing to do.
+/// Returns "2 installed, 1 failed, 5 up to date.", or "Nothing to do.".
 [[nodiscard]] std::string summaryLine(const host::AppOutcomes& outcomes);
 
 }  // namespace appsync::cli

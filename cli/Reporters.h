@@ -1,4 +1,4 @@
-// How a sync or restore is reported: plain lines, a terminal's progress, or JSON.
+// Reporters of a sync or restore: plain lines, progress on a terminal, or JSON.
 #pragma once
 
 #include <memory>
@@ -9,15 +9,17 @@
 
 namespace appsync::cli {
 
-/// What people are told when they interrupt a sync.
+/// The message when the user interrupts a sync.
 inline constexpr std::string_view kInterruptedNotice =
-    "interrupted; finishing what was sent already. Interrupt again to end at once";
+    "interrupted; finishing the installs of sent packages. Interrupt again to stop at once";
 
-/// Plain lines for pipes: one for each app with which something happened, and a last one that counts.
+/// Returns the reporter for pipes: one line for each app that changed, failed or was skipped, and a summary.
 [[nodiscard]] std::unique_ptr<host::SyncReporter> makePlainReporter(StandardOutput& output);
-/// The same lines, and below them, redrawn in place, one per running app and one for the whole.
+/// Returns the reporter for terminals: the same lines and, redrawn below them, the progress of each app and of the
+/// sync.
 [[nodiscard]] std::unique_ptr<host::SyncReporter> makeTerminalReporter(StandardOutput& output);
-/// JSON Lines for machines.
-[[nodiscard]] std::unique_ptr<host::SyncReporter> makeJsonReporter(StandardOutput& output, host::Course course);
+/// Returns the reporter for JSON Lines.
+[[nodiscard]] std::unique_ptr<host::SyncReporter> makeJsonReporter(StandardOutput& output,
+                                                                   host::OperationKind operation);
 
 }  // namespace appsync::cli

@@ -6,7 +6,7 @@
 #include "cli/DeviceCommand.h"
 #include "cli/ReportOptions.h"
 #include "cli/StandardOutput.h"
-#include "daemon/ClientModule.h"
+#include "daemon/DataMigrator.h"
 #include "host/Backup.h"
 #include "host/Restore.h"
 
@@ -20,17 +20,17 @@ struct RestoreOptions {
 };
 
 constexpr const char* kExamples =
-    R"(BACKUP is a folder that `appsync backup` made. DEVICE must have no apps yet. Each app of the backup gets a placeholder
-on it, with its name, version and icon; its data is kept for it. Then
+    R"(BACKUP is a folder that `appsync backup` created. DEVICE must have no apps. The restore creates a placeholder for each
+app of the backup, with its name, version and icon, and keeps its data until it is installed. Then
 
   appsync sync DEVICE LIBRARY
 
-brings the packages of those that are not demoted: from the library, or where apps are installed through
-coordinators from the folder that was set with `appsync set DEVICE store=FOLDER`.
+installs the apps that are not demoted: from the library or, on a device that installs through coordinators, from the
+folder that was set with `appsync set DEVICE store=FOLDER`.
 
-A restore that was cut off is completed by running it again. One bad app does not stop the others.
+Run an interrupted restore again to complete it. A failed app does not stop the others.
 
-With --json each line is an object: {"event":"progress","identifier":...,"fraction":...} while placeholders arrive;
+With --json each line is an object: {"event":"progress","identifier":...,"fraction":...} while placeholders are created;
 exactly one of restored, failed and skipped for each app, the last two with a "reason"; and at the end
 {"event":"summary",...} with the identifiers as arrays.
 
@@ -46,27 +46,29 @@ ExitStatus run(const RestoreOptions& options, device::Device& device) {
   if (Status opened = openLog(options.report, device); !opened) return reportUnusable(opened.error());
   const Result<host::Backup> backup = host::readBackup(options.backup);
   if (!backup) return reportUnusable(backup.error());
-  // Not the daemon: outside it the plug-in itself waits until the placeholders are there.
-  device.services().bundles().actAs(std::string(device::Bundles::kDataMigratorIdentifier));
-  const auto client = daemon::makeClient(device.platform());
-  if (!client) return reportUnusable(client.error());
+  Result<daemon::DataMigrator> migrator = daemon::DataMigrator::make(device);
+  if (!migrator) return reportUnusable(migrator.error());
   StandardOutput output;
-  const auto reporter = makeReporter(options.report, output, host::Course::restore);
+  const auto reporter = makeReporter(options.report, output, host::OperationKind::restore);
   host::SyncProgress progress(*reporter);
-  host::Restore restore(device, *backup, **client, progress);
+  host::Restore restore(device, *backup, progress);
   if (Status checked = restore.check(); !checked) return reportUnusable(checked.error());
-  const Status restored = restore.run();
+  Status restored = restore.begin();
+  if (restored) {
+    migrator->createPlaceholders(*backup, restore.preparedApps(), progress);
+    restored = restore.end();
+  }
   const host::AppOutcomes& outcomes = progress.summarise();
   if (!restored) return output.finish(reportUnusable(restored.error()));
-  const bool allWell =
+  const bool isSuccessful =
       std::ranges::none_of(outcomes, [](const host::AppOutcome& one) { return host::isFailure(one.event); });
-  return output.finish(allWell ? ExitStatus::done : ExitStatus::someAppFailed);
+  return output.finish(isSuccessful ? ExitStatus::done : ExitStatus::someAppFailed);
 }
 
 }  // namespace
 
 void addRestoreCommand(CLI::App& line, Invocation& invocation) {
-  const CommandText text = {"restore", "Bring the apps of a backup back to a new device.", kExamples};
+  const CommandText text = {"restore", "Restore the apps of a backup to a new device.", kExamples};
   const auto added = addDeviceCommand(line, invocation, text, device::Access::exclusive, run);
   added.command.add_option("BACKUP", added.options->backup, "the backup's folder")->required();
   addReportOptions(added.command, added.options->report);

@@ -13,7 +13,7 @@ struct ScreenOptions {
   std::string picture;
 };
 
-constexpr const char* kExamples = R"(Apps whose packages are still to come are shown with how far they are.
+constexpr const char* kExamples = R"(Apps that wait for their packages are drawn with their progress.
 
 Example:
   appsync screen phone -o screen.png)";

@@ -23,8 +23,8 @@ struct SetOptions {
 using device::InstallerFailure;
 using platform::TSInstallType;
 
-/// What is done to an app rather than set.
-struct Deed {
+/// A key that acts on an app instead of setting a value.
+struct AppAction {
   std::string_view key;
   Status (*perform)(device::Device& device, const std::string& value);
 };
@@ -37,34 +37,33 @@ Status demote(device::Device& device, const std::string& identifier) {
 
 constexpr std::uint64_t kLargestLicence = 16'000'000;
 
-/// "ID:FILE"
-Status giveLicence(device::Device& device, const std::string& value) {
+/// `value` is "ID:FILE".
+Status setLicence(device::Device& device, const std::string& value) {
   const std::size_t colon = value.find(':');
   if (colon == value.npos) {
-    return device::installerError(InstallerFailure::badOptions, "setting licence takes ID:FILE");
+    return device::installerError(InstallerFailure::badOptions, "licence needs a value ID:FILE");
   }
   const Result<Bytes> licence = device::readHostFile(value.substr(colon + 1), kLargestLicence);
   if (!licence) return licence.error();
   return device.services().defaultRegistry().setLicenceData(value.substr(0, colon), *licence);
 }
 
-constexpr std::array<Deed, 3> kDeeds = {{{"demote", demote<TSInstallType::IntentionalDowngrade>},
-                                         {"demote-auto", demote<TSInstallType::Downgrade>},
-                                         {"licence", giveLicence}}};
+constexpr std::array<AppAction, 3> kAppActions = {{{"demote", demote<TSInstallType::IntentionalDowngrade>},
+                                                   {"demote-auto", demote<TSInstallType::Downgrade>},
+                                                   {"licence", setLicence}}};
 
 constexpr const char* kExamples = R"(Keys and their values:
   app-installation   yes, no or unset: whether apps may be installed
   app-removal        yes, no or unset: whether apps may be removed
-  coordination       on, off or unset: whether apps are installed through coordinators, which can be tapped and
-                     cancelled while a sync runs; from the next sync on
-  assertion          ID:granted, ID:denied, ID:unknown, ID:failing or ID:unset: what the home screen
-                     answers when app ID is about to be replaced; only a device that installs directly asks, so
-                     it has no effect through coordinators
-  store              a folder of packages, or unset: where an app that was restored through coordinators gets its
-                     package from
-  demote             ID: leaves of an installed app the icon and the data, as a person wishes it
-  demote-auto        ID: the same, as a device does it that needs room
-  licence            ID:FILE: gives an app the licence data in FILE
+  coordination       on, off or unset: whether the next syncs install apps through coordinators, so that `appsync
+                     tap` and `appsync cancel` have an effect
+  assertion          ID:granted, ID:denied, ID:unknown, ID:failing or ID:unset: the home screen's answer when a
+                     direct install is about to replace app ID; no effect on coordinated installs
+  store              a folder of packages, or unset: the source of the packages of apps that were restored through
+                     coordinators
+  demote             ID: removes an installed app except its icon and data, as on a user's request
+  demote-auto        ID: removes an installed app except its icon and data, as for lack of space
+  licence            ID:FILE: sets the licence data of an app to the content of FILE
 
 Examples:
   appsync set phone app-removal=no
@@ -72,22 +71,23 @@ Examples:
   appsync set phone app-removal=unset app-installation=unset
   appsync set phone coordination=off)";
 
-/// Sets a setting. Who names none hears of the deeds as well.
+/// Sets a setting. The error for an unknown key lists the actions, too.
 Status assignSetting(device::Settings& settings, const std::string& assignment) {
   Status set = settings.assign(assignment);
   const bool isKnown = set || set.error().code != static_cast<long>(device::SettingsFailure::unknownKey);
   if (isKnown) return set;
   Error unknown = set.error();
-  for (const Deed& deed : kDeeds)
-    unknown.text.append(", ").append(deed.key);
+  for (const AppAction& action : kAppActions)
+    unknown.text.append(", ").append(action.key);
   return unknown;
 }
 
 Status assign(device::Device& device, const std::string& assignment) {
   const std::size_t equals = assignment.find('=');
-  const auto deed = std::ranges::find(kDeeds, std::string_view(assignment).substr(0, equals), &Deed::key);
-  if (equals == assignment.npos || deed == kDeeds.end()) return assignSetting(device.services().settings(), assignment);
-  return deed->perform(device, assignment.substr(equals + 1));
+  const auto action = std::ranges::find(kAppActions, std::string_view(assignment).substr(0, equals), &AppAction::key);
+  if (equals == assignment.npos || action == kAppActions.end())
+    return assignSetting(device.services().settings(), assignment);
+  return action->perform(device, assignment.substr(equals + 1));
 }
 
 ExitStatus run(const SetOptions& options, device::Device& device) {

@@ -10,19 +10,19 @@
 namespace appsync::cli {
 namespace {
 
-constexpr std::size_t kLargestBuffer = std::size_t{64} * 1024;
-constexpr std::size_t kLongestSentence = 2000;
+constexpr std::size_t kBufferSize = std::size_t{64} * 1024;
+constexpr std::size_t kMaximumSentence = 2000;
 
 }  // namespace
 
 void StandardOutput::write(std::string_view text) {
   pending_ += text;
-  if (pending_.size() >= kLargestBuffer) flush();
+  if (pending_.size() >= kBufferSize) flush();
 }
 
 void StandardOutput::writeLine(std::string_view text) {
   pending_.append(text).push_back('\n');
-  if (pending_.size() >= kLargestBuffer) flush();
+  if (pending_.size() >= kBufferSize) flush();
 }
 
 void StandardOutput::flush() {
@@ -43,8 +43,8 @@ bool isForTerminal(const std::string& path, std::string_view what) {
 }
 
 void printError(std::string_view sentence) {
-  const std::string line = "appsync: " + printable(sentence, kLongestSentence) + "\n";
-  // Nobody is left to tell when standard error fails too.
+  const std::string line = "appsync: " + printable(sentence, kMaximumSentence) + "\n";
+  // If standard error fails, too, there is no way left to report it.
   static_cast<void>(device::writeAll(STDERR_FILENO, bytesOf(line)));
 }
 

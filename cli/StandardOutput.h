@@ -1,4 +1,4 @@
-// Standard output and standard error, as commands use them.
+// Standard output and standard error of commands.
 #pragma once
 
 #include <string>
@@ -9,8 +9,8 @@
 
 namespace appsync::cli {
 
-/// Standard output with a buffer. A reader that closes its end early is no failure: the rest goes nowhere, and the
-/// command does its work to the end. Any other failure is reported once, by `finish`. One thread at a time.
+/// Buffered standard output. If the reader closes the pipe early, further output is discarded without an error and the
+/// command completes. `finish` reports any other failure. Not thread-safe.
 class StandardOutput {
  public:
   StandardOutput() = default;
@@ -18,28 +18,28 @@ class StandardOutput {
   StandardOutput(const StandardOutput&) = delete;
   StandardOutput& operator=(const StandardOutput&) = delete;
 
-  /// Adds text; what piles up is written on the way.
+  /// Adds text. Writes the buffer when it is full.
   void write(std::string_view text);
-  /// Adds text and a line end.
+  /// Adds text and a line end. Writes the buffer when it is full.
   void writeLine(std::string_view text);
-  /// Hands everything on to the reader.
+  /// Writes the buffer.
   void flush();
-  /// Flushes, and returns `status`, or `unusable` with a message if something could not be written.
+  /// Flushes and returns `status`, or reports an error and returns `unusable` if output could not be written.
   [[nodiscard]] ExitStatus finish(ExitStatus status);
 
  private:
   std::string pending_;
-  int failure_ = 0;  // errno of the first write that failed; nothing is written after it
+  int failure_ = 0;  // errno of the first failed write, after which nothing is written
 };
 
-/// Whether bytes that only programs read, named `what`, would go to a terminal when `path` is where they are written.
-/// Then what to do instead is told on standard error.
+/// Returns whether `path` is standard output and that is a terminal, and then reports on standard error that it cannot
+/// show `what`.
 [[nodiscard]] bool isForTerminal(const std::string& path, std::string_view what);
 
-/// Writes "appsync: " and the sentence to standard error. `sentence` may hold names from outside.
+/// Writes "appsync: " and the sentence to standard error. `sentence` may contain untrusted text.
 void printError(std::string_view sentence);
 
-/// The same for what went wrong with a device, library or file. Returns `unusable`.
+/// Writes the error's text like `printError` and returns `unusable`.
 [[nodiscard]] ExitStatus reportUnusable(const Error& error);
 
 }  // namespace appsync::cli

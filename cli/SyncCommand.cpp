@@ -23,16 +23,16 @@ struct SyncOptions {
 };
 
 constexpr const char* kExamples =
-    R"(LIBRARY is a folder of packages: files named *.zip, made by `appsync pack`. Of two versions of an app the newer
-counts. Apps that the device lacks are installed, older ones updated. One bad app does not stop the others.
+    R"(LIBRARY is a folder of packages: files named *.zip, created by `appsync pack`. Of two versions of an app the newer is
+used. The sync installs missing apps and updates older ones. A failed app does not stop the others.
 
-An app that was deleted on the device, or removed with --remove, is not sent again until --only asks for it.
-Interrupting (Ctrl-C) ends the sync in order; what was cut off is offered again next time. A second Ctrl-C ends
-it at once. While it runs, `appsync tap` has it bring an app before the others, and `appsync cancel` leave one out.
+An app that was deleted on the device, or removed with --remove, is not sent again unless --only names it.
+Ctrl-C ends the sync in order; the next sync offers the interrupted apps again. A second Ctrl-C ends it at once.
+While it runs, `appsync tap` has it send an app before the others, and `appsync cancel` has it skip one.
 
 With --json each line is an object: {"event":"progress","identifier":...,"fraction":...}; exactly one of
 installed, updated, removed, failed and skipped for each app, the last two with a "reason"; {"event":"waiting",...}
-while the home screen does not let go of an app; and at the end {"event":"summary",...} with the identifiers as
+while the home screen does not release an app; and at the end {"event":"summary",...} with the identifiers as
 arrays.
 
 Examples:
@@ -55,7 +55,7 @@ bool isUsable(const SyncOptions& options) {
   }
   for (const std::string& identifier : options.remove) {
     if (std::ranges::find(options.only, identifier) == options.only.end()) continue;
-    printError(identifier + " is given to both --remove and --only; decide on one");
+    printError(identifier + " is given to both --remove and --only; use one of them");
     return false;
   }
   return true;
@@ -67,25 +67,25 @@ ExitStatus run(const SyncOptions& options, device::Device& device) {
   if (!library) return reportUnusable(library.error());
   const auto client = daemon::makeClient(device.platform());
   if (!client) return reportUnusable(client.error());
-  const host::Interruption interruption;
+  const host::InterruptSignals interruption;
   StandardOutput output;
-  const auto reporter = makeReporter(options.report, output, host::Course::sync);
+  const auto reporter = makeReporter(options.report, output, host::OperationKind::sync);
   host::SyncProgress progress(*reporter);
   daemon::Daemon daemon(device, **client, progress, interruption);
   const Status synced = daemon.sync(
       {*library, {options.only.begin(), options.only.end()}, {options.remove.begin(), options.remove.end()}});
   const host::AppOutcomes& outcomes = progress.summarise();
   if (!synced) return output.finish(reportUnusable(synced.error()));
-  const bool allWell =
+  const bool isSuccessful =
       std::ranges::none_of(outcomes, [](const host::AppOutcome& one) { return host::isFailure(one.event); });
-  return output.finish(allWell ? ExitStatus::done : ExitStatus::someAppFailed);
+  return output.finish(isSuccessful ? ExitStatus::done : ExitStatus::someAppFailed);
 }
 
 }  // namespace
 
 void addSyncCommand(CLI::App& line, Invocation& invocation) {
   const auto options = std::make_shared<SyncOptions>();
-  CLI::App* command = line.add_subcommand("sync", "Bring the apps on a device in step with a library.");
+  CLI::App* command = line.add_subcommand("sync", "Sync the apps on a device with a library.");
   addDevice(*command, options->device);
   command->add_option("LIBRARY", options->library, "a folder of packages")->required();
   command->add_option("--remove", options->remove, "remove this app from the device")->type_name("ID")->take_all();

@@ -16,15 +16,15 @@ namespace {
 
 using Clock = std::chrono::steady_clock;
 
-constexpr auto kShortestTimeBetweenDrawings = std::chrono::milliseconds(50);
-constexpr std::size_t kMostAppLines = 10;
+constexpr auto kMinimumTimeBetweenDrawings = std::chrono::milliseconds(50);
+constexpr std::size_t kMaximumAppLines = 10;
 
 struct Size {
   std::size_t columns = 80;
   std::size_t rows = 24;
 };
 
-/// Asked for at each drawing: people resize their windows.
+/// Called at each drawing: the user may resize the terminal.
 Size terminalSize() {
   struct winsize found = {};
   if (::ioctl(STDOUT_FILENO, TIOCGWINSZ, &found) != 0 || found.ws_col == 0 || found.ws_row == 0) return {};
@@ -43,7 +43,7 @@ std::string_view wordFor(host::AppStage stage) {
   return "waiting";
 }
 
-/// "verb       what      [#####-----]  50 %" in at most `columns`; what does not fit is left out, the percentage last.
+/// "verb       what      [#####-----]  50 %" in at most `columns`; the percentage is kept longest.
 std::string progressLine(std::string_view verb, std::string_view what, double fraction, std::size_t columns) {
   constexpr std::size_t kVerb = 11;
   constexpr std::size_t kPercent = 6;
@@ -64,12 +64,12 @@ class TerminalReporter final : public host::SyncReporter {
   ~TerminalReporter() override { erase(); }
 
   void progressed(const host::AppProgress& progress) override {
-    lineOf(progress.app).stage = progress.stage;
-    lineOf(progress.app).fraction = progress.fraction;
+    lineOf(progress.name).stage = progress.stage;
+    lineOf(progress.name).fraction = progress.fraction;
     overall_ = progress.overall;
     finishedApps_ = progress.finishedApps;
     allApps_ = progress.allApps;
-    if (const auto now = Clock::now(); now - drawn_ >= kShortestTimeBetweenDrawings) {
+    if (const auto now = Clock::now(); now - drawn_ >= kMinimumTimeBetweenDrawings) {
       draw();
       drawn_ = now;
     }
@@ -81,7 +81,7 @@ class TerminalReporter final : public host::SyncReporter {
   void warned(std::string_view sentence) override { printErrorAbove(sentence); }
 
   void finished(const host::AppOutcome& outcome) override {
-    std::erase_if(running_, [&](const Line& line) { return line.identifier == outcome.app.identifier; });
+    std::erase_if(running_, [&](const Line& line) { return line.identifier == outcome.name.identifier; });
     if (outcome.event == host::AppEvent::failed) {
       printErrorAbove(failureSentence(outcome));
     } else if (const std::string line = outcomeLine(outcome); !line.empty()) {
@@ -124,7 +124,7 @@ class TerminalReporter final : public host::SyncReporter {
     draw();
   }
 
-  /// Puts the cursor where the drawing began, and clears all below.
+  /// Moves the cursor to the start of the drawing and clears the terminal below.
   void erase() {
     if (drawnLines_ == 0) return;
     output_.write("\r\x1b[" + std::to_string(drawnLines_) + "A\x1b[J");
@@ -136,9 +136,9 @@ class TerminalReporter final : public host::SyncReporter {
     erase();
     if (allApps_ == 0) return;
     const Size size = terminalSize();
-    // The last column stays free: a line that fills it wraps on some terminals.
+    // The last column stays free: a line that fills it is wrapped by some terminals.
     const std::size_t columns = size.columns - 1;
-    const std::size_t most = std::min(kMostAppLines, size.rows > 3 ? size.rows - 3 : 0);
+    const std::size_t most = std::min(kMaximumAppLines, size.rows > 3 ? size.rows - 3 : 0);
     for (const Line& line : running_) {
       if (drawnLines_ == most) break;
       output_.writeLine(progressLine(wordFor(line.stage), line.name, line.fraction, columns));

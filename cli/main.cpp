@@ -1,4 +1,4 @@
-// appsync: keeps apps on a device in step with a library, as host and sync daemon in one process.
+// appsync: syncs the apps on a device with a library, as host and sync daemon in one process.
 #include <clocale>
 #include <csignal>
 #include <exception>
@@ -11,8 +11,8 @@
 
 namespace {
 
-/// Takes the numbers of standard streams that are closed, so that no file of a device gets one of them, and with it
-/// what is said to people. Reading and writing them stays a failure.
+/// Opens closed standard streams on /dev/null, so that no file of a device gets their descriptors and receives
+/// messages. Reading and writing them still fails.
 void occupyStandardStreams() {
   for (const int stream : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO}) {
     const bool isClosed = ::fcntl(stream, F_GETFD) < 0;
@@ -25,14 +25,14 @@ void occupyStandardStreams() {
 int main(int count, char** words) {
   using namespace appsync::cli;
   occupyStandardStreams();
-  // Names in any script have their right width on a terminal, whatever the environment says.
+  // wcwidth needs a UTF-8 locale for the width of names on a terminal.
   if (std::setlocale(LC_CTYPE, "") == nullptr || MB_CUR_MAX == 1) std::setlocale(LC_CTYPE, "C.UTF-8");
-  // A reader that leaves early is an error of a write, not the end of a sync.
+  // A reader that closes the pipe early must not end the sync; the write fails instead.
   std::signal(SIGPIPE, SIG_IGN);
   try {
     return static_cast<int>(runCommandLine(count, words));
   } catch (const std::exception& failure) {
-    printError(std::string("gave up: ") + failure.what());
+    printError(std::string("internal error: ") + failure.what());
     return static_cast<int>(ExitStatus::unusable);
   }
 }

@@ -14,7 +14,7 @@ namespace appsync::daemon {
 namespace {
 
 constexpr const char* kModuleVariable = "APPSYNC_MODULE";
-/// From the folder of this program, where it is built as where it is installed.
+/// Relative to this program's directory, both in the build tree and where it is installed.
 constexpr const char* kModuleFromProgram = APPSYNC_MODULE_FROM_PROGRAM;
 
 using Client = std::shared_ptr<platform::ZTClient>;
@@ -24,12 +24,13 @@ Error refusal(const std::string& path, std::string_view reason) {
           nullptr};
 }
 
-/// For all that another file would put right.
+/// Returns the error for a file that is not a usable plug-in.
 Error wrongFile(const std::string& path, const std::string& reason) {
-  return refusal(path, reason + "; install the plug-in of this release there, or name its file in " + kModuleVariable);
+  return refusal(path,
+                 reason + "; install the plug-in of this release there, or set " + kModuleVariable + " to its file");
 }
 
-/// What the system said of the last failure, without the path that it begins with.
+/// Returns the dynamic loader's last error text without the path at its start.
 std::string loaderError(const std::string& path) {
   const char* text = ::dlerror();
   std::string said = text == nullptr ? "unknown reason" : text;
@@ -54,7 +55,7 @@ Result<std::string> modulePath() {
     const auto path = std::filesystem::absolute(named, failure);
     if (!failure) return path.string();
     return refusal(named,
-                   "the current folder is gone; name it in " + std::string(kModuleVariable) + " by its full path");
+                   "the current folder no longer exists; set " + std::string(kModuleVariable) + " to an absolute path");
   }
   std::error_code ignored;
   const auto program = std::filesystem::read_symlink("/proc/self/exe", ignored);
@@ -78,7 +79,8 @@ Result<Client> makeClient(platform::Platform& platform, const std::string& path)
                                " and this program's " + std::to_string(platform::kModuleInterfaceVersion));
   }
   const std::string_view reason(answer.refusal, ::strnlen(answer.refusal, sizeof answer.refusal));
-  if (client == nullptr) return refusal(path, reason.empty() ? "it makes no client and does not say why" : reason);
+  if (client == nullptr)
+    return refusal(path, reason.empty() ? "it refused to create a client without a reason" : reason);
   return client;
 }
 

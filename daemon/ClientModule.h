@@ -1,4 +1,4 @@
-// The sync plug-in, loaded as a daemon does it.
+// Loading of the sync plug-in.
 #pragma once
 
 #include <memory>
@@ -10,16 +10,16 @@
 
 namespace appsync::daemon {
 
-/// The plug-in's file: what the environment variable APPSYNC_MODULE names, or else the one that is built and installed
-/// with this program. A name without a folder that it starts from is an error.
+/// Returns the path of the plug-in's file: the value of the environment variable APPSYNC_MODULE or, if that is not set,
+/// the file that is built and installed with this program. Fails if a relative path cannot be resolved.
 [[nodiscard]] Result<std::string> modulePath();
 
-/// A client of the plug-in in that file, which stays loaded. `platform` must outlive the client. Of a file that cannot
-/// be loaded or does not fit this program the error says what to do; why a module makes no client it says in the
-/// module's own words.
+/// Loads the plug-in and creates a client; the plug-in stays loaded. `platform` must outlive the client. Fails if the
+/// file cannot be loaded or has another interface version, with a text that says what to do, and if the plug-in refuses
+/// to create a client, with the plug-in's own text.
 [[nodiscard]] Result<std::shared_ptr<platform::ZTClient>> makeClient(platform::Platform& platform);
 
-/// The same of the plug-in in the file at `path`.
+/// As above, for the plug-in in the file at `path`.
 [[nodiscard]] Result<std::shared_ptr<platform::ZTClient>> makeClient(platform::Platform& platform,
                                                                      const std::string& path);
 

@@ -19,38 +19,37 @@ using platform::ClientIdentity;
 using platform::InstallCoordinator;
 
 constexpr std::string_view kServiceName = "com.corvel.appsync.sync";
-constexpr auto kTimeBetweenLooks = 100ms;
-/// Installs and removals move as fast as the disk does. What has not moved for so long never will, and must not hold up
-/// the end of the sync for good.
-constexpr auto kLongestSilence = 5min;
-/// The same for somebody who asked for an end.
-constexpr auto kLongestSilenceOnceInterrupted = 10s;
+/// Progress requires registry look-ups, and the service notifies of everything else.
+constexpr auto kTimeBetweenProgress = 5 * host::kTimeBetweenLooks;
+/// The watcher waits no longer for installs and removals without any progress: they must not block the sync forever.
+constexpr auto kStallTimeout = 5min;
+constexpr auto kStallTimeoutOnceInterrupted = 10s;
 
-/// What the service says of a coordinator's end.
+/// How a coordinator ended.
 struct Ending {
   bool isCancelled = false;
   std::optional<Error> error;
 };
 
-host::AppOutcome outcomeOf(const Ending& ending, const SentPackage& package) {
-  if (ending.isCancelled) return {host::AppEvent::skipped, package.app, std::string(host::kCancelledOnDevice)};
-  if (ending.error) return {host::AppEvent::failed, package.app, ending.error->text};
-  return {package.success, package.app, {}};
+host::AppOutcome outcomeOf(const Ending& ending, const PendingInstall& package) {
+  if (ending.isCancelled) return {host::AppEvent::skipped, package.name, std::string(host::kCancelledOnDevice)};
+  if (ending.error) return {host::AppEvent::failed, package.name, ending.error->text};
+  return {package.success, package.name, {}};
 }
 
-host::AppOutcome lost(device::Device& device, const SentPackage& package) {
+host::AppOutcome outcomeWithoutNotification(device::Device& device, const PendingInstall& package) {
   host::AppOutcome outcome = outcomeOnDevice(device, package);
   if (!host::isSuccess(outcome.event)) {
-    outcome.reason = "the device does not tell how its install ends; `appsync apps` shows whether it is there";
+    outcome.reason = "the device did not report the end of its install; see `appsync apps`";
   }
   return outcome;
 }
 
-/// The service installs an app once its package is there, and tells its observers how each coordinator ends.
+/// The service installs an app when its package is complete, and notifies its observers of each coordinator's end.
 class CoordinatedInstallWatcher final : public InstallWatcher, private platform::InstallObserverDelegate {
  public:
   CoordinatedInstallWatcher(device::Device& device, host::SyncProgress& progress,
-                            const host::Interruption& interruption)
+                            const host::InterruptSignals& interruption)
       : device_(device),
         progress_(progress),
         interruption_(interruption),
@@ -58,25 +57,25 @@ class CoordinatedInstallWatcher final : public InstallWatcher, private platform:
         observer_(device.platform().installCoordination().initWithMachServiceName(
             kServiceName, {ClientIdentity::CXClientSync}, *this)) {}
 
-  void watch(SentPackage package) override {
+  void watch(PendingInstall package) override {
     const std::lock_guard lock(mutex_);
-    const auto ending = early_.find(package.app.identifier);
-    if (ending == early_.end()) return packages_.add(std::move(package));
+    const auto ending = endedBeforeSent_.find(package.name.identifier);
+    if (ending == endedBeforeSent_.end()) return packages_.add(std::move(package));
     progress_.finish(outcomeOf(ending->second, package));
   }
 
-  void waitForRoom(std::uint64_t bytes) override { packages_.waitForRoom(bytes, interruption_); }
+  void waitForSpace(std::uint64_t bytes) override { packages_.waitForSpace(bytes, interruption_); }
 
   void waitForOthers() override {
     waitUntilIdle();
     const std::lock_guard lock(mutex_);
-    early_.clear();  // how an earlier sync's installs ended
+    endedBeforeSent_.clear();  // installs of an earlier sync
   }
 
   void waitForInstalls() override {
     waitUntilIdle();
-    // Of what is left the service will say no more.
-    packages_.settle([&](const SentPackage& package) { return lost(device_, package); });
+    // The service will not notify of the remaining ones.
+    packages_.settle([&](const PendingInstall& package) { return outcomeWithoutNotification(device_, package); });
   }
 
  private:
@@ -86,7 +85,7 @@ class CoordinatedInstallWatcher final : public InstallWatcher, private platform:
     ended(coordinator, {false, coordinator.coordinatorError()});
   }
 
-  /// Whoever else cancels, the plug-in treats it as the wish of the person who holds the device.
+  /// The plug-in treats a cancellation by any other client as the user's.
   void coordinatorCanceledWithReason(InstallCoordinator& coordinator, const Error& reason,
                                      ClientIdentity client) override {
     ended(coordinator, {client != ClientIdentity::CXClientSync, reason});
@@ -95,51 +94,52 @@ class CoordinatedInstallWatcher final : public InstallWatcher, private platform:
   void ended(const InstallCoordinator& coordinator, const Ending& ending) {
     const std::string identifier = coordinator.bundleID().value_or("");
     const std::lock_guard lock(mutex_);
-    hasNews();
-    const bool wasSent = packages_.settle([&](const SentPackage& package) -> std::optional<host::AppOutcome> {
-      if (package.app.identifier != identifier) return std::nullopt;
+    resetStallTimer();
+    const bool wasSent = packages_.settle([&](const PendingInstall& package) -> std::optional<host::AppOutcome> {
+      if (package.name.identifier != identifier) return std::nullopt;
       return outcomeOf(ending, package);
     });
     if (wasSent) return;
-    early_.insert_or_assign(identifier, ending);
+    endedBeforeSent_.insert_or_assign(identifier, ending);
     if (ending.isCancelled) progress_.finishExpected(identifier, host::AppEvent::skipped, host::kCancelledOnDevice);
   }
 
   void look() {
     if (interruption_.requested()) progress_.interrupted();
     double sum = 0;
-    for (const SentPackage& package : packages_.first(kShownInstalls))
-      sum += showInstall(device_, package.app.identifier, progress_);
-    if (std::exchange(shown_, sum) != sum) hasNews();
+    for (const PendingInstall& package : packages_.first(kShownInstalls))
+      sum += showInstall(device_, package.name.identifier, progress_);
+    if (std::exchange(shown_, sum) != sum) resetStallTimer();
   }
 
-  /// Until the service has done, and told everybody, all that it can.
+  /// Blocks until the service has no work and no notifications left, or has made no progress for the time-out.
   void waitUntilIdle() {
-    hasNews();
-    while (!device_.services().installCoordination().waitUntilIdle(kTimeBetweenLooks)) {
-      const auto longest = interruption_.requested() ? kLongestSilenceOnceInterrupted : kLongestSilence;
-      if (Clock::now() - lastNews_.load() >= longest) return;
+    resetStallTimer();
+    while (!device_.services().installCoordination().waitUntilIdle(kTimeBetweenProgress)) {
+      const auto timeout = interruption_.requested() ? kStallTimeoutOnceInterrupted : kStallTimeout;
+      if (Clock::now() - lastProgress_.load() >= timeout) return;
     }
   }
 
-  void hasNews() { lastNews_ = Clock::now(); }
+  void resetStallTimer() { lastProgress_ = Clock::now(); }
 
   device::Device& device_;
   host::SyncProgress& progress_;
-  const host::Interruption& interruption_;
-  SentPackages packages_;
+  const host::InterruptSignals& interruption_;
+  PendingInstalls packages_;
   std::mutex mutex_;
-  std::map<std::string, Ending, std::less<>> early_;  // under mutex_: of apps whose packages were not handed over yet
-  std::atomic<Clock::time_point> lastNews_{Clock::now()};
-  double shown_ = 0;  // the ticker's own
+  std::map<std::string, Ending, std::less<>>
+      endedBeforeSent_;  // guarded by mutex_; apps whose packages were not sent yet
+  std::atomic<Clock::time_point> lastProgress_{Clock::now()};
+  double shown_ = 0;  // used on the ticker's thread only
   const std::unique_ptr<platform::InstallObserver> observer_;
-  host::Ticker ticker_{kTimeBetweenLooks, [this] { look(); }};
+  host::Ticker ticker_{kTimeBetweenProgress, [this] { look(); }};
 };
 
 }  // namespace
 
 std::unique_ptr<InstallWatcher> makeCoordinatedInstallWatcher(device::Device& device, host::SyncProgress& progress,
-                                                              const host::Interruption& interruption) {
+                                                              const host::InterruptSignals& interruption) {
   return std::make_unique<CoordinatedInstallWatcher>(device, progress, interruption);
 }
 

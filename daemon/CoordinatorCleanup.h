@@ -1,13 +1,13 @@
-// What syncs leave behind that did not come to their end.
+// Removal of the coordinators that an interrupted sync leaves behind.
 #pragma once
 
 #include "device/Device.h"
 
 namespace appsync::daemon {
 
-/// Gives up the coordinators of new apps and updates that a sync made and nobody will bring packages for, with their
-/// placeholders; of each such app what is installed stays, and it is offered again. Those that have all they need are
-/// to be waited for before. Restores stay: the store brings their packages.
-void giveUpLeftovers(device::Device& device);
+/// Cancels the coordinators of new apps and updates that a sync created and whose packages will not be sent, and
+/// removes their placeholders. Installed versions stay, and the apps are offered again. Coordinators of restores are
+/// kept: the store delivers their packages. Coordinators that can complete must have completed before.
+void cancelStaleCoordinators(device::Device& device);
 
 }  // namespace appsync::daemon

@@ -6,7 +6,7 @@
 
 #include "base/ReturnIfError.h"
 #include "daemon/CoordinatorCleanup.h"
-#include "daemon/SyncControl.h"
+#include "daemon/control/Server.h"
 #include "device/services/SyncFramework.h"
 #include "host/StagingArea.h"
 #include "platform/SyncFiles.h"
@@ -29,7 +29,7 @@ Result<AppsByIdentifier> appsByIdentifier(device::Device& device) {
   if (!all) return all.error();
   AppsByIdentifier apps;
   for (host::DeviceApp& app : *all)
-    apps.emplace(app.app.identifier, std::move(app));
+    apps.emplace(app.name.identifier, std::move(app));
   return apps;
 }
 
@@ -67,18 +67,18 @@ Error cancelled() {
           std::string(host::kCancelledOnDevice), nullptr};
 }
 
-Error hostHasNone() {
+Error packageMissingError() {
   return {std::string(platform::kZTErrorDomain), static_cast<long>(device::TransferFailure::hostLost),
           "the library has no package of this app", nullptr};
 }
 
 std::unique_ptr<InstallWatcher> makeWatcher(device::Device& device, host::SyncProgress& progress,
-                                            const host::Interruption& interruption) {
+                                            const host::InterruptSignals& interruption) {
   const bool isCoordinated = device.platform().installCoordination().coordinationIsEnabled();
   return (isCoordinated ? makeCoordinatedInstallWatcher : makeDirectInstallWatcher)(device, progress, interruption);
 }
 
-/// While it lives the device's services reach the daemon.
+/// Connects the device's services to the daemon for the object's lifetime.
 class ServiceConnection {
  public:
   ServiceConnection(device::Device& device, platform::ZTDeviceService& daemon)
@@ -96,7 +96,7 @@ class ServiceConnection {
 }  // namespace
 
 Daemon::Daemon(device::Device& device, platform::ZTClient& client, host::SyncProgress& progress,
-               const host::Interruption& interruption)
+               const host::InterruptSignals& interruption)
     : device_(device),
       client_(client),
       progress_(progress),
@@ -110,36 +110,36 @@ Status Daemon::sync(const SyncRequest& request) {
   const ServiceConnection connection(device_, queue_);
   const auto control = openSyncControl(device_);
   if (!control) {
-    progress_.warn("this sync cannot be reached by `appsync tap` and `appsync cancel`: " + control.error().text);
+    progress_.warn("`appsync tap` and `appsync cancel` cannot reach this sync: " + control.error().text);
   }
   auto watcher = makeWatcher(device_, progress_, interruption_);
   watcher->waitForOthers();
-  giveUpLeftovers(device_);
+  cancelStaleCoordinators(device_);
   device_.platform().systemNotify().post(platform::kZTStartupCompleteNotification);
   client_.prepareForSyncWithHostAnchor(client_.currentSyncAnchor(), {}, nullptr);
-  learnDeletedApps();
-  Status begun = planSync(request);
-  tellWhatIsKnown();
-  if (begun) begun = handOverInstructions();
-  if (!begun) {
-    failEverything(begun.error());
+  recordDeletedApps();
+  Status started = planSync(request);
+  reportDecidedApps();
+  if (started) started = handOverInstructions();
+  if (!started) {
+    failEverything(started.error());
     client_.assetTransferEndedWithSuccess(false);
     client_.syncEndedWithSuccess(false);
-    return begun;
+    return started;
   }
-  tellRemovals(*watcher);
+  reportRemovals(*watcher);
   transferPackages(*watcher);
   watcher.reset();
-  giveUpLeftovers(device_);
-  tellUnfinished();
-  Status remembered = remember();
-  client_.syncEndedWithSuccess(remembered.ok() && !interruption_.requested());
+  cancelStaleCoordinators(device_);
+  reportUnfinishedApps();
+  Status saved = saveState();
+  client_.syncEndedWithSuccess(saved.ok() && !interruption_.requested());
   host::clearStaging(device_);
-  return remembered;
+  return saved;
 }
 
-void Daemon::learnDeletedApps() {
-  state_.learnDeleted(deletedIn(client_.installedAssets()));
+void Daemon::recordDeletedApps() {
+  state_.addDeleted(deletedIn(client_.installedAssets()));
 }
 
 Status Daemon::planSync(const SyncRequest& request) {
@@ -152,28 +152,28 @@ Status Daemon::planSync(const SyncRequest& request) {
   state_.declined.insert(request.remove.begin(), request.remove.end());
   for (const host::PlannedApp& app : plan_) {
     if (app.package == nullptr) continue;
-    state_.offered.insert(app.app.identifier);
-    transfers_.emplace(app.app.identifier, &app);
+    state_.offered.insert(app.name.identifier);
+    transfers_.emplace(app.name.identifier, &app);
   }
-  wakeDemotedApps(*apps);
+  markDemotedAppsAsRestored(*apps);
   return {};
 }
 
-/// Who installs directly asks for no package of an app that has a placeholder, unless it was restored: a demoted app
-/// that is wanted again counts as that.
-void Daemon::wakeDemotedApps(const std::map<std::string, host::DeviceApp, std::less<>>& apps) {
+/// In direct mode the plug-in requests no package for an app with a placeholder unless its install type is Restore, so
+/// this sets that type on demoted apps that are to be reinstalled.
+void Daemon::markDemotedAppsAsRestored(const std::map<std::string, host::DeviceApp, std::less<>>& apps) {
   if (device_.platform().installCoordination().coordinationIsEnabled()) return;
   for (const auto& [identifier, app] : transfers_) {
     const auto present = apps.find(identifier);
     const bool isDemoted =
         present != apps.end() && !present->second.isInstalled && device::isDemotion(present->second.installType);
     if (!isDemoted) continue;
-    // One that cannot be changed is not asked for, and told so.
+    // If it fails, the plug-in does not request the package, and the app is reported as failed.
     device_.services().defaultRegistry().setPlaceholderType(identifier, platform::TSInstallType::Restore).ignore();
   }
 }
 
-/// What the host knows must be safe before the device acts on it: a kill may come at any moment.
+/// Saves the host's state before the device acts on it, so that a crash at any moment is safe.
 Status Daemon::handOverInstructions() {
   if (Status staged = host::stage(device_, plan_); !staged) return staged.error().in("the device cannot be synced");
   RETURN_IF_ERROR(host::saveHostState(device_.path(), state_));
@@ -186,14 +186,14 @@ void Daemon::transferPackages(InstallWatcher& watcher) {
   const platform::Assets assets = client_.outstandingAssetTransfers();
   for (const auto& asset : assets) {
     const host::PlannedApp* app = planned(asset->identifier());
-    if (app != nullptr) progress_.expect(app->app, app->package->bytes);
+    if (app != nullptr) progress_.expect(app->name, app->package->bytes);
   }
   queue_.fill(assets);
   StoreRun store(device_, plan_, progress_, watcher, interruption_);
   while (const auto next = queue_.front()) {
     const host::PlannedApp* app = planned(next->identifier());
-    watcher.waitForRoom(app == nullptr ? 0 : app->package->bytes);
-    // Meanwhile another may have become the first.
+    watcher.waitForSpace(app == nullptr ? 0 : app->package->bytes);
+    // The first package may have changed during the wait.
     if (const auto asset = queue_.take()) transfer(asset, watcher);
   }
   client_.assetTransferEndedWithSuccess(!interruption_.requested());
@@ -203,31 +203,31 @@ void Daemon::transferPackages(InstallWatcher& watcher) {
 
 void Daemon::transfer(const std::shared_ptr<ZTAsset>& asset, InstallWatcher& watcher) {
   const host::PlannedApp* app = planned(asset->identifier());
-  if (app == nullptr) return client_.assetTransferSucceeded(asset, false, hostHasNone());
-  const auto mayGoOn = [&] { return !interruption_.requested() && !queue_.wasCancelled(asset->identifier()); };
-  std::chrono::steady_clock::time_point told;
+  if (app == nullptr) return client_.assetTransferSucceeded(asset, false, packageMissingError());
+  const auto mayContinue = [&] { return !interruption_.requested() && !queue_.wasCancelled(asset->identifier()); };
+  std::chrono::steady_clock::time_point reportedAt;
   const auto goOn = [&](double fraction) {
     const auto now = std::chrono::steady_clock::now();
-    if (fraction >= 1 || now - told >= kShortestTimeBetweenUpdates) {
-      told = now;
+    if (fraction >= 1 || now - reportedAt >= kShortestTimeBetweenUpdates) {
+      reportedAt = now;
       asset->setDownloadProgress(fraction);
       client_.assetTransferUpdatedProgress(asset, fraction);
       progress_.sending(asset->identifier(), fraction);
     }
-    return mayGoOn();
+    return mayContinue();
   };
-  const Result<std::string> path = mayGoOn() ? sender_.send(*app->package, goOn) : interrupted();
+  const Result<std::string> path = mayContinue() ? sender_.send(*app->package, goOn) : interrupted();
   if (!path) {
-    const NotSent end = endOf(*app, path.error());
-    client_.assetTransferSucceeded(asset, false, end.error);
-    progress_.finish({end.event, app->app, end.error.text});
+    const TransferFailure failure = transferFailureOf(*app, path.error());
+    client_.assetTransferSucceeded(asset, false, failure.error);
+    progress_.finish({failure.event, app->name, failure.error.text});
     return;
   }
   asset->setPath(*path);
   asset->setCompletedAssetParts(platform::kZTAssetPartApplication);
   const host::AppEvent success =
       app->work == host::PlannedWork::update ? host::AppEvent::updated : host::AppEvent::installed;
-  watcher.watch({app->app, success, std::string(kPublicStaging) + "/" + *path, app->package->bytes,
+  watcher.watch({app->name, success, std::string(kPublicStaging) + "/" + *path, app->package->bytes,
                  std::chrono::steady_clock::now()});
   progress_.installing(asset->identifier(), 0);
   client_.assetTransferSucceeded(asset, true, std::nullopt);
@@ -237,66 +237,66 @@ void Daemon::transfer(const std::shared_ptr<ZTAsset>& asset, InstallWatcher& wat
 void Daemon::handOverData(const std::shared_ptr<ZTAsset>& asset) {
   if (!asset->isRestore()) return;
   if (!device_.platform().makeBackupManager()->restoreDataExists(asset->identifier(), nullptr)) return;
-  // The client has parked the package, and finds it again by itself.
+  // The client has stored the package's path itself.
   asset->setPath(std::nullopt);
   asset->setCompletedAssetParts(platform::kZTAssetPartApplicationData);
   client_.assetTransferSucceeded(asset, true, std::nullopt);
 }
 
-Daemon::NotSent Daemon::endOf(const host::PlannedApp& app, const Error& error) const {
-  if (queue_.wasCancelled(app.app.identifier)) return {host::AppEvent::skipped, cancelled()};
+Daemon::TransferFailure Daemon::transferFailureOf(const host::PlannedApp& app, const Error& error) const {
+  if (queue_.wasCancelled(app.name.identifier)) return {host::AppEvent::skipped, cancelled()};
   if (interruption_.requested()) return {host::AppEvent::cutOff, interrupted()};
   return {host::AppEvent::failed, error};
 }
 
-void Daemon::tellWhatIsKnown() {
+void Daemon::reportDecidedApps() {
   for (const host::PlannedApp& app : plan_) {
-    if (app.work == host::PlannedWork::none) progress_.finish({host::AppEvent::unchanged, app.app, app.reason});
-    if (app.work == host::PlannedWork::skip) progress_.finish({host::AppEvent::skipped, app.app, app.reason});
-    if (app.work == host::PlannedWork::refuse) progress_.finish({host::AppEvent::failed, app.app, app.reason});
+    if (app.work == host::PlannedWork::none) progress_.finish({host::AppEvent::unchanged, app.name, app.reason});
+    if (app.work == host::PlannedWork::skip) progress_.finish({host::AppEvent::skipped, app.name, app.reason});
+    if (app.work == host::PlannedWork::refuse) progress_.finish({host::AppEvent::failed, app.name, app.reason});
   }
 }
 
-void Daemon::tellRemovals(InstallWatcher& watcher) {
+void Daemon::reportRemovals(InstallWatcher& watcher) {
   watcher.waitForOthers();
   const bool forbidden = isForbidden(device_, RestrictionSetting::appRemovalAllowed);
   for (const host::PlannedApp& app : plan_) {
     if (app.work != host::PlannedWork::remove) continue;
-    if (!isInstalled(device_, app.app.identifier)) {
-      progress_.finish({host::AppEvent::removed, app.app, {}});
+    if (!isInstalled(device_, app.name.identifier)) {
+      progress_.finish({host::AppEvent::removed, app.name, {}});
     } else if (forbidden) {
       progress_.finish(
-          {host::AppEvent::skipped, app.app, "removing apps is not allowed on this device (app-removal=no)"});
+          {host::AppEvent::skipped, app.name, "removing apps is not allowed on this device (app-removal=no)"});
     } else {
-      progress_.finish({host::AppEvent::failed, app.app, app.reason});
+      progress_.finish({host::AppEvent::failed, app.name, app.reason});
     }
   }
 }
 
-void Daemon::tellUnfinished() {
+void Daemon::reportUnfinishedApps() {
   const bool forbidden = isForbidden(device_, RestrictionSetting::appInstallationAllowed);
   for (const host::PlannedApp& app : plan_) {
     if (app.work == host::PlannedWork::restore) {
       progress_.finish(
-          {host::AppEvent::failed, app.app, "the store did not bring its package; the next sync tries again"});
+          {host::AppEvent::failed, app.name, "the store did not deliver its package; the next sync tries again"});
     }
     if (app.package == nullptr) continue;
-    if (queue_.wasCancelled(app.app.identifier)) {
-      progress_.finish({host::AppEvent::skipped, app.app, std::string(host::kCancelledOnDevice)});
+    if (queue_.wasCancelled(app.name.identifier)) {
+      progress_.finish({host::AppEvent::skipped, app.name, std::string(host::kCancelledOnDevice)});
     } else if (forbidden) {
       progress_.finish(
-          {host::AppEvent::skipped, app.app, "installing apps is not allowed on this device (app-installation=no)"});
+          {host::AppEvent::skipped, app.name, "installing apps is not allowed on this device (app-installation=no)"});
     } else if (interruption_.requested()) {
-      progress_.finish({host::AppEvent::cutOff, app.app, interrupted().text});
+      progress_.finish({host::AppEvent::cutOff, app.name, interrupted().text});
     } else {
-      progress_.finish({host::AppEvent::failed, app.app, "the device did not ask for its package"});
+      progress_.finish({host::AppEvent::failed, app.name, "the device did not ask for its package"});
     }
   }
 }
 
 void Daemon::failEverything(const Error& error) {
   for (const host::PlannedApp& app : plan_)
-    progress_.finish({host::AppEvent::failed, app.app, error.text});
+    progress_.finish({host::AppEvent::failed, app.name, error.text});
 }
 
 const host::PlannedApp* Daemon::planned(std::string_view identifier) const {
@@ -304,7 +304,7 @@ const host::PlannedApp* Daemon::planned(std::string_view identifier) const {
   return found == transfers_.end() ? nullptr : found->second;
 }
 
-Status Daemon::remember() {
+Status Daemon::saveState() {
   std::erase_if(state_.offered, [&](const std::string& identifier) { return !isAwaited(device_, identifier); });
   std::erase_if(state_.declined, [&](const std::string& identifier) { return isInstalled(device_, identifier); });
   return host::saveHostState(device_.path(), state_);

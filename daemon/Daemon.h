@@ -1,4 +1,4 @@
-// The sync daemon, and the host that it talks to, for one sync.
+// The sync daemon and its host, for one sync.
 #pragma once
 
 #include <map>
@@ -27,50 +27,50 @@ struct SyncRequest {
   host::IdentifierSet remove;
 };
 
-/// Makes the fixed sequence of calls with which a daemon drives its client through a sync, and does meanwhile what the
-/// device's services, and other processes, ask of it. One object, one sync.
+/// Drives the client through a sync with the fixed sequence of calls, and serves requests of the device's services and
+/// of other processes meanwhile. One object serves one sync.
 class Daemon {
  public:
-  /// All must outlive it.
+  /// All arguments must outlive it.
   Daemon(device::Device& device, platform::ZTClient& client, host::SyncProgress& progress,
-         const host::Interruption& interruption);
+         const host::InterruptSignals& interruption);
 
-  /// Runs the sync. Every app concerned has its outcome in the progress when it returns. Fails when the device cannot
-  /// be synced at all; what was to be done, if that is known, is then told as failed.
+  /// Runs the sync. Every planned app is reported with its outcome before it returns. Fails if the device cannot be
+  /// synced; every planned app is then reported as failed.
   [[nodiscard]] Status sync(const SyncRequest& request);
 
  private:
-  struct NotSent {
+  struct TransferFailure {
     host::AppEvent event;
     Error error;
   };
 
-  void learnDeletedApps();
+  void recordDeletedApps();
   [[nodiscard]] Status planSync(const SyncRequest& request);
-  void wakeDemotedApps(const std::map<std::string, host::DeviceApp, std::less<>>& apps);
+  void markDemotedAppsAsRestored(const std::map<std::string, host::DeviceApp, std::less<>>& apps);
   [[nodiscard]] Status handOverInstructions();
   void transferPackages(InstallWatcher& watcher);
-  /// Tells the client that the data of a restored app, which the device keeps, has come too.
+  /// Notifies the client that the data of a restored app, which the device keeps, is available.
   void handOverData(const std::shared_ptr<platform::ZTAsset>& asset);
   void transfer(const std::shared_ptr<platform::ZTAsset>& asset, InstallWatcher& watcher);
-  void tellWhatIsKnown();
-  void tellRemovals(InstallWatcher& watcher);
-  void tellUnfinished();
-  /// Why a package did not reach the device, which `error` is only one answer to.
-  [[nodiscard]] NotSent endOf(const host::PlannedApp& app, const Error& error) const;
+  void reportDecidedApps();
+  void reportRemovals(InstallWatcher& watcher);
+  void reportUnfinishedApps();
+  /// Returns why a package was not sent: a cancellation or an interruption, or else `error`.
+  [[nodiscard]] TransferFailure transferFailureOf(const host::PlannedApp& app, const Error& error) const;
   void failEverything(const Error& error);
   [[nodiscard]] const host::PlannedApp* planned(std::string_view identifier) const;
-  [[nodiscard]] Status remember();
+  [[nodiscard]] Status saveState();
 
   device::Device& device_;
   platform::ZTClient& client_;
   host::SyncProgress& progress_;
-  const host::Interruption& interruption_;
+  const host::InterruptSignals& interruption_;
   host::PackageSender sender_;
   TransferQueue queue_;
   host::HostState state_;
   std::vector<host::PlannedApp> plan_;
-  std::map<std::string_view, const host::PlannedApp*> transfers_;  // those in plan_ that have a package, by identifier
+  std::map<std::string_view, const host::PlannedApp*> transfers_;  // entries of plan_ with a package, by identifier
 };
 
 }  // namespace appsync::daemon

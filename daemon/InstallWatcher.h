@@ -1,4 +1,4 @@
-// Watches the installs of packages that were sent: how far each is, and how it ends.
+// Watches the installs of sent packages.
 #pragma once
 
 #include <cstdint>
@@ -11,32 +11,32 @@
 
 namespace appsync::daemon {
 
-/// Tells the progress how far each install is, and of each end, as the device's way of installing lets it know. One
-/// object, one sync; destruction ends the watch. Threads: any.
+/// Reports the progress and the outcome of each install. One object serves one sync; the destructor ends the watch.
+/// Thread-safe.
 class InstallWatcher {
  public:
   virtual ~InstallWatcher() = default;
 
-  /// To be called in front of the package's hand-over.
-  virtual void watch(SentPackage package) = 0;
-  /// Blocks until another package of that size may lie on the device beside those whose install is not over, or the
-  /// user interrupts.
-  virtual void waitForRoom(std::uint64_t bytes) = 0;
-  /// Blocks until what goes on by itself is over, well or not: the removals that were begun, and the installs for which
-  /// an earlier sync that was killed had brought everything.
+  /// Adds a package. Must be called before the package is passed to the client.
+  virtual void watch(PendingInstall package) = 0;
+  /// Blocks until the packages on the device whose installs have not ended leave space for `bytes` more, or the user
+  /// interrupts.
+  virtual void waitForSpace(std::uint64_t bytes) = 0;
+  /// Blocks until operations that need nothing from this sync have ended: started removals, and installs whose packages
+  /// were delivered by an earlier sync that crashed.
   virtual void waitForOthers() = 0;
-  /// To be called once all packages are handed over and the client has ended the transfers: blocks until every install
-  /// has its outcome.
+  /// Blocks until every install has its outcome. Must be called after the last package was passed on and the client was
+  /// notified of the end of the transfers.
   virtual void waitForInstalls() = 0;
 };
 
-/// For a device that installs directly. All must outlive it, as for the next.
+/// Returns the watcher for a device that installs directly. All arguments must outlive it.
 [[nodiscard]] std::unique_ptr<InstallWatcher> makeDirectInstallWatcher(device::Device& device,
                                                                        host::SyncProgress& progress,
-                                                                       const host::Interruption& interruption);
-/// For a device that installs through coordinators.
+                                                                       const host::InterruptSignals& interruption);
+/// Returns the watcher for a device that installs through coordinators. All arguments must outlive it.
 [[nodiscard]] std::unique_ptr<InstallWatcher> makeCoordinatedInstallWatcher(device::Device& device,
                                                                             host::SyncProgress& progress,
-                                                                            const host::Interruption& interruption);
+                                                                            const host::InterruptSignals& interruption);
 
 }  // namespace appsync::daemon

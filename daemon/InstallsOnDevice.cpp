@@ -19,14 +19,14 @@ double showInstall(device::Device& device, const std::string& identifier, host::
   return fraction;
 }
 
-host::AppOutcome outcomeOnDevice(device::Device& device, const SentPackage& package) {
+host::AppOutcome outcomeOnDevice(device::Device& device, const PendingInstall& package) {
   platform::AppRegistry& registry = device.platform().defaultRegistry();
-  const auto record = registry.recordForIdentifier(package.app.identifier, PlaceholderLookup::on);
+  const auto record = registry.recordForIdentifier(package.name.identifier, PlaceholderLookup::on);
   // After a failed update the earlier version is installed.
-  const bool hasVersion = record && record->bundleVersion().value_or("") == package.app.version;
-  if (hasVersion && record->isInstalled() && !record->isPlaceholder()) return {package.success, package.app, {}};
-  const auto failure = device.services().defaultRegistry().lastInstallFailure(package.app.identifier);
-  return {host::AppEvent::failed, package.app, failure ? failure->text : "the device did not install it"};
+  const bool hasVersion = record && record->bundleVersion().value_or("") == package.name.version;
+  if (hasVersion && record->isInstalled() && !record->isPlaceholder()) return {package.success, package.name, {}};
+  const auto failure = device.services().defaultRegistry().lastInstallFailure(package.name.identifier);
+  return {host::AppEvent::failed, package.name, failure ? failure->text : "the device did not install it"};
 }
 
 }  // namespace appsync::daemon

@@ -1,4 +1,4 @@
-// What the device's registry says of an app that was sent.
+// The state of installs in the device's registry.
 #pragma once
 
 #include <string>
@@ -9,13 +9,13 @@
 
 namespace appsync::daemon {
 
-/// Installs that run side by side; those behind them wait for their turn and have nothing to show.
+/// Number of installs that run at the same time. Later ones are queued and have no progress.
 inline constexpr std::size_t kShownInstalls = 10;
 
-/// Tells the progress how far an app's install is, if one runs, and returns that fraction, else 0.
+/// Reports the progress of an app's install and returns its fraction, or 0 if no install is running.
 double showInstall(device::Device& device, const std::string& identifier, host::SyncProgress& progress);
 
-/// What came of an app that was sent, as the device knows it.
-[[nodiscard]] host::AppOutcome outcomeOnDevice(device::Device& device, const SentPackage& package);
+/// Returns the outcome of an install that has ended.
+[[nodiscard]] host::AppOutcome outcomeOnDevice(device::Device& device, const PendingInstall& package);
 
 }  // namespace appsync::daemon

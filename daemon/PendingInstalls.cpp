@@ -3,27 +3,25 @@
 #include <algorithm>
 #include <utility>
 
+#include "host/Ticker.h"
+
 namespace appsync::daemon {
 namespace {
 
-using namespace std::chrono_literals;
-
 constexpr std::size_t kMostPackages = 64;
 constexpr std::uint64_t kMostBytes = std::uint64_t{256} << 20;
-/// An interruption wakes nobody.
-constexpr auto kTimeBetweenLooks = 20ms;
 
 }  // namespace
 
-void SentPackages::add(SentPackage package) {
+void PendingInstalls::add(PendingInstall package) {
   const std::lock_guard lock(mutex_);
   bytes_ += package.bytes;
   packages_.push_back(std::move(package));
 }
 
-bool SentPackages::settle(const std::function<std::optional<host::AppOutcome>(const SentPackage&)>& outcomeOf) {
+bool PendingInstalls::settle(const std::function<std::optional<host::AppOutcome>(const PendingInstall&)>& outcomeOf) {
   const std::lock_guard lock(mutex_);
-  const std::size_t settled = std::erase_if(packages_, [&](const SentPackage& package) {
+  const std::size_t settled = std::erase_if(packages_, [&](const PendingInstall& package) {
     const std::optional<host::AppOutcome> outcome = outcomeOf(package);
     if (!outcome) return false;
     bytes_ -= package.bytes;
@@ -34,19 +32,20 @@ bool SentPackages::settle(const std::function<std::optional<host::AppOutcome>(co
   return settled > 0;
 }
 
-std::vector<SentPackage> SentPackages::first(std::size_t most) const {
+std::vector<PendingInstall> PendingInstalls::first(std::size_t most) const {
   const std::lock_guard lock(mutex_);
   const auto count = static_cast<std::ptrdiff_t>(std::min(most, packages_.size()));
   return {packages_.begin(), packages_.begin() + count};
 }
 
-void SentPackages::waitForRoom(std::uint64_t bytes, const host::Interruption& interruption) const {
+void PendingInstalls::waitForSpace(std::uint64_t bytes, const host::InterruptSignals& interruption) const {
   std::unique_lock lock(mutex_);
-  const auto hasRoom = [&] {
+  const auto hasSpace = [&] {
     return packages_.empty() || (packages_.size() < kMostPackages && bytes_ + bytes <= kMostBytes);
   };
-  while (!hasRoom() && !interruption.requested())
-    settled_.wait_for(lock, kTimeBetweenLooks, hasRoom);
+  // A signal does not notify the condition variable.
+  while (!hasSpace() && !interruption.requested())
+    settled_.wait_for(lock, host::kTimeBetweenLooks, hasSpace);
 }
 
 }  // namespace appsync::daemon

@@ -1,4 +1,4 @@
-// The packages that lie on the device until their installs are over.
+// The packages on the device whose installs have not ended.
 #pragma once
 
 #include <chrono>
@@ -16,37 +16,38 @@
 
 namespace appsync::daemon {
 
-/// A package that was handed over.
-struct SentPackage {
-  host::AppName app;
-  host::AppEvent success = host::AppEvent::installed;  ///< what it is when it is in
-  std::string path;                                    ///< device path of the package file
+/// A package that was passed to the client.
+struct PendingInstall {
+  host::AppName name;
+  host::AppEvent success = host::AppEvent::installed;  ///< the event to report on success
+  std::string path;                                    ///< path of the package file on the device
   std::uint64_t bytes = 0;
-  std::chrono::steady_clock::time_point since;  ///< when it was handed over
+  std::chrono::steady_clock::time_point since;  ///< when it was passed to the client
 };
 
-/// In the order in which they came. Threads: any.
-class SentPackages {
+/// A list of packages in the order of arrival. Thread-safe.
+class PendingInstalls {
  public:
-  /// `progress`, which must outlive it, is told of each end.
-  explicit SentPackages(host::SyncProgress& progress) : progress_(progress) {}
+  /// `progress` receives each outcome and must outlive this object.
+  explicit PendingInstalls(host::SyncProgress& progress) : progress_(progress) {}
 
-  void add(SentPackage package);
-  /// What has an outcome is over, and told before anybody who waits for it here goes on. Returns whether any was.
-  bool settle(const std::function<std::optional<host::AppOutcome>(const SentPackage&)>& outcomeOf);
-  /// The first few.
-  [[nodiscard]] std::vector<SentPackage> first(std::size_t most) const;
+  void add(PendingInstall package);
+  /// Removes every package for which `outcomeOf` returns an outcome and reports that outcome, before `waitForSpace`
+  /// returns. Returns whether any package was removed.
+  bool settle(const std::function<std::optional<host::AppOutcome>(const PendingInstall&)>& outcomeOf);
+  /// Returns the first packages, at most `most`.
+  [[nodiscard]] std::vector<PendingInstall> first(std::size_t most) const;
 
-  /// Blocks until another package of that size may lie beside them, or the user interrupts: sending is faster than
-  /// installing.
-  void waitForRoom(std::uint64_t bytes, const host::Interruption& interruption) const;
+  /// Blocks until the list has space for a package of `bytes`, or the user interrupts. Limits the disk space of sent
+  /// packages, because sending is faster than installing.
+  void waitForSpace(std::uint64_t bytes, const host::InterruptSignals& interruption) const;
 
  private:
   host::SyncProgress& progress_;
   mutable std::mutex mutex_;
   mutable std::condition_variable settled_;
-  // Under mutex_:
-  std::vector<SentPackage> packages_;
+  // Guarded by mutex_:
+  std::vector<PendingInstall> packages_;
   std::uint64_t bytes_ = 0;
 };
 

@@ -6,7 +6,7 @@
 namespace appsync::daemon {
 namespace {
 
-Error notThere(std::string text) {
+Error packageMissingError(std::string text) {
   return {std::string(domains::kPOSIX), ENOENT, std::move(text), nullptr};
 }
 
@@ -22,18 +22,18 @@ host::IdentifierSet awaitedFromStore(device::Device& device) {
 }
 
 StoreRun::StoreRun(device::Device& device, const std::vector<host::PlannedApp>& plan, host::SyncProgress& progress,
-                   InstallWatcher& watcher, const host::Interruption& interruption)
+                   InstallWatcher& watcher, const host::InterruptSignals& interruption)
     : progress_(progress), watcher_(watcher), interruption_(interruption) {
   for (const host::PlannedApp& app : plan) {
-    if (app.work == host::PlannedWork::restore) planned_.insert(app.app.identifier);
+    if (app.work == host::PlannedWork::restore) planned_.insert(app.name.identifier);
   }
   if (planned_.empty()) return;
   folder_ = device.services().settings().storeFolder();
   if (folder_) store_ = host::readLibrary(*folder_);
   for (const host::PlannedApp& app : plan) {
     if (app.work != host::PlannedWork::restore) continue;
-    const Result<std::string> path = find(app.app.identifier);
-    progress_.expect(app.app, path ? (*store_)->packages.find(app.app.identifier)->second.bytes : 0);
+    const Result<std::string> path = find(app.name.identifier);
+    progress_.expect(app.name, path ? (*store_)->packages.find(app.name.identifier)->second.bytes : 0);
   }
   client_ = std::make_unique<device::StoreClient>(
       device.services().installCoordination(), device.services().fileSystem(),
@@ -47,17 +47,16 @@ void StoreRun::wait() {
 
 Result<std::string> StoreRun::find(std::string_view identifier) const {
   if (!planned_.contains(identifier) || interruption_.requested()) {
-    return Error{std::string(domains::kPOSIX), ECANCELED, "its package comes with the next sync", nullptr};
+    return Error{std::string(domains::kPOSIX), ECANCELED, "the next sync installs its package", nullptr};
   }
   if (!folder_) {
-    return notThere(
-        "the device has no store to get its package from; name a folder of packages with `appsync set DEVICE "
-        "store=FOLDER`");
+    return packageMissingError(
+        "the device has no store for its package; set a folder of packages with `appsync set DEVICE store=FOLDER`");
   }
   if (!*store_) return store_->error();
   const auto found = (*store_)->packages.find(identifier);
   if (found == (*store_)->packages.end()) {
-    return notThere("the store " + *folder_ + " has no package of this app; it is tried again at the next sync");
+    return packageMissingError("the store " + *folder_ + " has no package of this app; the next sync tries again");
   }
   return found->second.path;
 }
@@ -76,7 +75,7 @@ void StoreRun::report(const device::StoreDelivery& delivery) {
 host::AppName StoreRun::nameOf(const device::StoreDelivery& delivery) const {
   if (!delivery.failure && store_ && *store_) {
     const auto found = (*store_)->packages.find(delivery.identifier);
-    if (found != (*store_)->packages.end()) return found->second.app;
+    if (found != (*store_)->packages.end()) return found->second.name;
   }
   return {delivery.identifier, delivery.name, {}};
 }

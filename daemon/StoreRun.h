@@ -1,4 +1,4 @@
-// What the device's store brings during a sync.
+// The deliveries of the device's store during a sync.
 #pragma once
 
 #include <memory>
@@ -17,18 +17,18 @@
 
 namespace appsync::daemon {
 
-/// The apps whose packages are the store's to bring.
+/// Returns the apps whose packages the store is to deliver.
 [[nodiscard]] host::IdentifierSet awaitedFromStore(device::Device& device);
 
-/// Runs the store for the apps that are planned to come from there, from its construction on, and tells the progress of
-/// each that does not come; of those that do the watcher hears. One object, one sync.
+/// Runs the store for the planned restores, from construction on. Passes delivered packages to the watcher and reports
+/// failed deliveries. One object serves one sync.
 class StoreRun {
  public:
-  /// All must outlive it.
+  /// All arguments must outlive it.
   StoreRun(device::Device& device, const std::vector<host::PlannedApp>& plan, host::SyncProgress& progress,
-           InstallWatcher& watcher, const host::Interruption& interruption);
+           InstallWatcher& watcher, const host::InterruptSignals& interruption);
 
-  /// Blocks until all packages have been delivered, or will not be now.
+  /// Blocks until every package was delivered or failed.
   void wait();
 
  private:
@@ -38,11 +38,11 @@ class StoreRun {
 
   host::SyncProgress& progress_;
   InstallWatcher& watcher_;
-  const host::Interruption& interruption_;
+  const host::InterruptSignals& interruption_;
   host::IdentifierSet planned_;
   std::optional<std::string> folder_;
   std::optional<Result<host::Library>> store_;
-  /// Null when there is nothing to bring.
+  /// Null if nothing is to be delivered.
   std::unique_ptr<device::StoreClient> client_;
 };
 

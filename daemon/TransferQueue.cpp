@@ -27,7 +27,7 @@ void TransferQueue::fill(const platform::Assets& assets) {
   for (const auto& asset : assets) {
     if (!cancelled_.contains(asset->identifier())) waiting_.push_back(asset);
   }
-  for (const std::string& identifier : wantedEarly_)
+  for (const std::string& identifier : prioritizedBeforeFill_)
     moveToFront(identifier);
 }
 
@@ -58,7 +58,7 @@ void TransferQueue::prioritizeAsset(const std::shared_ptr<ZTAsset>& asset, Compl
   {
     const std::lock_guard lock(mutex_);
     if (!isFilled_) {
-      wantedEarly_.push_back(asset->identifier());
+      prioritizedBeforeFill_.push_back(asset->identifier());
     } else if (!moveToFront(asset->identifier())) {
       error = notWaiting(asset->identifier());
     }

@@ -1,4 +1,4 @@
-// The packages that a sync still has to send, in the order in which they are wanted.
+// The packages that a sync still has to send, by priority.
 #pragma once
 
 #include <deque>
@@ -14,23 +14,23 @@
 
 namespace appsync::daemon {
 
-/// The client says what is to be sent; somebody on the device may want an app first, or not at all. Both can be asked
-/// for before the client has said anything. Threads: any, and one that sends.
+/// The client determines the packages. The user of the device may prioritise or cancel an app at any time, also before
+/// `fill`. Thread-safe, with a single thread that takes packages.
 class TransferQueue final : public platform::ZTDeviceService {
  public:
-  /// What is to be sent, but for what was cancelled already.
+  /// Adds the assets, except those that were cancelled already, and applies earlier priorities.
   void fill(const platform::Assets& assets);
 
-  /// The package whose turn comes next; null when all have gone. It may be another one a moment later.
+  /// Returns the next package, or null if the queue is empty. Another thread may change the order at any time.
   [[nodiscard]] std::shared_ptr<platform::ZTAsset> front() const;
-  /// The same, and it is the sender's now.
+  /// Removes the next package from the queue and returns it, or null if the queue is empty.
   [[nodiscard]] std::shared_ptr<platform::ZTAsset> take();
 
-  /// Whether the app was cancelled, be its package sent, under way or still to come.
+  /// Returns whether the app was cancelled, before, during or after its transfer.
   [[nodiscard]] bool wasCancelled(std::string_view identifier) const;
 
   [[nodiscard]] bool supports(Operation operation) override;
-  /// Fails when all packages are known and this is none of those that are still to be sent.
+  /// Completes with an error if the queue was filled and does not contain the app.
   void prioritizeAsset(const std::shared_ptr<platform::ZTAsset>& asset, Completion completion) override;
   void cancelAssetTransferForFailedAsset(const std::shared_ptr<platform::ZTAsset>& asset) override;
 
@@ -38,9 +38,9 @@ class TransferQueue final : public platform::ZTDeviceService {
   bool moveToFront(std::string_view identifier);
 
   mutable std::mutex mutex_;
-  // Under mutex_:
+  // Guarded by mutex_:
   std::deque<std::shared_ptr<platform::ZTAsset>> waiting_;
-  std::vector<std::string> wantedEarly_;  // in front of `fill`, the latest last
+  std::vector<std::string> prioritizedBeforeFill_;  // before `fill`, the latest last
   host::IdentifierSet cancelled_;
   bool isFilled_ = false;
 };

@@ -1,4 +1,4 @@
-// What came of each app in a sync, or a restore.
+// The result of a sync or a restore for each app.
 #pragma once
 
 #include <cstdint>
@@ -12,49 +12,48 @@ enum class AppEvent : std::uint8_t {
   installed,
   updated,
   removed,
-  restored,  ///< its placeholder is there again; the package comes with the next sync
+  restored,  ///< its placeholder is on the device; the next sync sends the package
   failed,
-  cutOff,     ///< the sync was interrupted before the app was on the device; machines are told "failed"
-  skipped,    ///< something would have been to do, and was not done on purpose
-  unchanged,  ///< nothing was to do; machines are told "skipped"
+  cutOff,     ///< the sync was interrupted before the app was installed; "failed" in JSON
+  skipped,    ///< deliberately left as it is, although it differs from the library
+  unchanged,  ///< already up to date; "skipped" in JSON
 };
 
-/// Why an app is skipped that somebody on the device did not want.
+/// The reason for skipping an app that the user of the device cancelled.
 inline constexpr std::string_view kCancelledOnDevice = "cancelled on the device";
 
-/// What is named: a file of the library may be called as an app is.
+/// Whether the name identifies an app or a package file; both may have the same text.
 enum class NameKind : std::uint8_t { app, packageFile };
 
-/// An app, or a package that does not say whose it is, as people and machines are told of it. Texts are as they came
-/// from outside.
+/// An app, or a package file whose app is unknown, as it appears in reports. The texts are untrusted input.
 struct AppName {
-  std::string identifier;  ///< of a package file its name
-  std::string name;        ///< empty when it is not known
-  std::string version;     ///< empty when it is not known
+  std::string identifier;  ///< for a package file, the file name
+  std::string name;        ///< empty if unknown
+  std::string version;     ///< empty if unknown
   NameKind kind = NameKind::app;
 };
 
 struct AppOutcome {
   AppEvent event = AppEvent::failed;
-  AppName app;
-  std::string reason;  ///< why, of everything but a success
+  AppName name;
+  std::string reason;  ///< empty if the app was successful
 };
 
-/// Whether the app now is as it was to be.
+/// Returns whether the planned work was done.
 [[nodiscard]] constexpr bool isSuccess(AppEvent event) {
   return event == AppEvent::installed || event == AppEvent::updated || event == AppEvent::removed ||
          event == AppEvent::restored;
 }
 
-/// Whether the sync did not do for the app what it was to do.
+/// Returns whether the planned work could not be done.
 [[nodiscard]] constexpr bool isFailure(AppEvent event) {
   return event == AppEvent::failed || event == AppEvent::cutOff;
 }
 
-/// The word for an event in JSON.
+/// Returns the word for an event in JSON.
 [[nodiscard]] std::string_view wordFor(AppEvent event);
 
-/// Every outcome of a sync, in the order in which they came.
+/// Every outcome of a sync, in the order of arrival.
 using AppOutcomes = std::vector<AppOutcome>;
 
 }  // namespace appsync::host

@@ -1,4 +1,4 @@
-// A folder of this machine that is whole or not there.
+// A directory of this machine that is created atomically.
 #pragma once
 
 #include <filesystem>
@@ -9,41 +9,40 @@
 
 namespace appsync::host {
 
-/// A folder that is being filled beside its place, in a hidden folder that says what it is. Unless it is published its
-/// end removes it; after a kill the next draft for the same place does.
-class FolderDraft {
+/// A directory that is filled under a hidden name, ".NAME.partial", and appears under its name only when it is
+/// published. The destructor removes an unpublished one; after a crash the next one for the same path does.
+class AtomicDirectory {
  public:
-  /// Fails when there is something at `path`, when its parent is not there, while another process fills a draft for it,
-  /// and when something that is no draft has the hidden folder's name, which is left as it is. Errors: "POSIX"; the
-  /// text says what to do.
-  [[nodiscard]] static Result<FolderDraft> make(const std::string& path);
-  FolderDraft(FolderDraft&&) = default;
-  FolderDraft& operator=(FolderDraft&&) = delete;
-  ~FolderDraft();
+  /// Fails if `path` exists, if its parent does not exist, if another process is creating the same directory, and if
+  /// anything else has the hidden name, which is then left as it is. Errors: "POSIX"; the text says what to do.
+  [[nodiscard]] static Result<AtomicDirectory> make(const std::string& path);
+  AtomicDirectory(AtomicDirectory&&) = default;
+  AtomicDirectory& operator=(AtomicDirectory&&) = delete;
+  ~AtomicDirectory();
 
-  /// The open folder.
+  /// Returns the file descriptor of the directory to fill.
   [[nodiscard]] int folder() const noexcept { return folder_.get(); }
 
-  /// The path of the open folder until it is published.
+  /// Returns the path of that directory until it is published.
   [[nodiscard]] std::string folderPath() const;
 
-  /// Brings it to the disk and gives it its name.
+  /// Makes the content durable and renames the directory to its path. Fails if the path exists by now.
   [[nodiscard]] Status publish();
 
  private:
-  FolderDraft(std::string path, const std::filesystem::path& place, device::FileDescriptor parent);
-  [[nodiscard]] Status takeHold();
-  /// Opens and locks the hidden folder, made if it is missing; false when it has gone or another one has taken its
-  /// place.
-  [[nodiscard]] Result<bool> lockShell();
+  AtomicDirectory(std::string path, const std::filesystem::path& place, device::FileDescriptor parent);
+  [[nodiscard]] Status open();
+  /// Opens and locks the hidden directory and creates it if it is missing. Returns false if it was removed or replaced
+  /// before it could be locked.
+  [[nodiscard]] Result<bool> lockHidden();
 
   std::string path_;
   std::string name_;
-  std::string shellName_;
-  std::string shellPath_;
+  std::string hiddenName_;
+  std::string hiddenPath_;
   device::FileDescriptor parent_;
-  /// The hidden folder, which is locked, and in it the one that is published.
-  device::FileDescriptor shell_;
+  /// The hidden directory, which is locked, and the directory in it that is published.
+  device::FileDescriptor hidden_;
   device::FileDescriptor folder_;
 };
 

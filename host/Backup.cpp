@@ -37,8 +37,8 @@ void setNumber(plist::Dictionary& entry, std::string_view key, const std::option
 }
 
 plist::Value entryOf(const BackedUpApp& app) {
-  plist::Dictionary entry = {{kIdentifierKey, app.app.identifier}, {kNameKey, app.app.name}};
-  if (!app.app.version.empty()) entry.set(kAppVersionKey, app.app.version);
+  plist::Dictionary entry = {{kIdentifierKey, app.name.identifier}, {kNameKey, app.name.name}};
+  if (!app.name.version.empty()) entry.set(kAppVersionKey, app.name.version);
   if (app.isDemoted()) entry.set(kDemotionKey, static_cast<std::uint64_t>(app.demotion));
   setNumber(entry, backup_files::kStoreMetadata, app.storeMetadata);
   setNumber(entry, backup_files::kLicence, app.licence);
@@ -49,22 +49,22 @@ plist::Value entryOf(const BackedUpApp& app) {
 
 BackedUpApp appIn(const plist::Value& entry) {
   BackedUpApp app;
-  app.app = {textIn(entry, kIdentifierKey), textIn(entry, kNameKey), textIn(entry, kAppVersionKey)};
+  app.name = {textIn(entry, kIdentifierKey), textIn(entry, kNameKey), textIn(entry, kAppVersionKey)};
   app.storeMetadata = numberIn(entry, backup_files::kStoreMetadata);
   app.licence = numberIn(entry, backup_files::kLicence);
   app.icon = numberIn(entry, backup_files::kIcon);
   app.data = numberIn(entry, backup_files::kData);
   const auto type = static_cast<TSInstallType>(numberIn(entry, kDemotionKey).value_or(0));
   if (type == TSInstallType::Downgrade || type == TSInstallType::IntentionalDowngrade) app.demotion = type;
-  if (!device::isBundleIdentifier(app.app.identifier)) {
-    app.damage = "the backup names it by what is no bundle identifier";
+  if (!device::isBundleIdentifier(app.name.identifier)) {
+    app.damage = "its name in the backup is not a bundle identifier";
   }
   return app;
 }
 
 Error notABackup(const std::string& path, const std::string& why) {
   return {std::string(domains::kPOSIX), EINVAL,
-          path + " is no backup that can be used: " + why + "; name a folder that `appsync backup` made", nullptr};
+          path + " is not a usable backup: " + why + "; name a folder that `appsync backup` created", nullptr};
 }
 
 }  // namespace
@@ -85,7 +85,7 @@ Result<Backup> readBackup(const std::string& path) {
   if (!document) return notABackup(path, document.error().text);
   const Result<plist::Value> root = plist::read(*document);
   if (!root) return notABackup(path, "its manifest is damaged (" + root.error().text + ")");
-  if (textIn(*root, kFormatKey) != kFormat) return notABackup(path, "its manifest is something else's");
+  if (textIn(*root, kFormatKey) != kFormat) return notABackup(path, "its manifest is not that of a backup");
   const auto version = numberIn(*root, kVersionKey);
   if (version != kVersion) {
     return notABackup(path, "it has version " + (version ? std::to_string(*version) : std::string("(none)")) +
@@ -99,7 +99,7 @@ Result<Backup> readBackup(const std::string& path) {
   std::set<std::string> names;
   for (const plist::Value& entry : *apps->array()) {
     BackedUpApp app = appIn(entry);
-    if (!names.insert(app.app.identifier).second) continue;
+    if (!names.insert(app.name.identifier).second) continue;
     backup.apps.push_back(std::move(app));
   }
   const plist::Value* order = root->find(kIconOrderKey);
@@ -112,7 +112,7 @@ Result<Backup> readBackup(const std::string& path) {
 
 Result<Bytes> readBackupFile(const Backup& backup, const BackedUpApp& app, std::string_view name, std::uint64_t size) {
   const std::string path =
-      backup.path + "/" + std::string(backup_files::kApps) + "/" + app.app.identifier + "/" + std::string(name);
+      backup.path + "/" + std::string(backup_files::kApps) + "/" + app.name.identifier + "/" + std::string(name);
   Result<Bytes> bytes = device::readHostFile(path);
   if (!bytes || bytes->size() == size) return bytes;
   return Error{
@@ -122,7 +122,7 @@ Result<Bytes> readBackupFile(const Backup& backup, const BackedUpApp& app, std::
 }
 
 std::string dataFolderIn(const Backup& backup, const BackedUpApp& app) {
-  return backup.path + "/" + std::string(backup_files::kApps) + "/" + app.app.identifier + "/" +
+  return backup.path + "/" + std::string(backup_files::kApps) + "/" + app.name.identifier + "/" +
          std::string(backup_files::kData);
 }
 

@@ -1,4 +1,4 @@
-// A backup: what a device's apps need to come back, in a folder of this machine.
+// A backup: a directory of this machine with everything that is needed to restore a device's apps, except packages.
 #pragma once
 
 #include <cstdint>
@@ -11,32 +11,33 @@
 #include "base/Error.h"
 #include "host/AppOutcome.h"
 #include "platform/InstallTypes.h"
+#include "platform/SyncFiles.h"
 #include "plist/PropertyList.h"
 
 namespace appsync::host {
 
-/// Names in a backup's folder, and in the folder of an app, "Apps/<identifier>".
+/// Names in the backup's directory, and in the directory of an app, "Apps/<identifier>".
 namespace backup_files {
 inline constexpr std::string_view kManifest = "Manifest.plist";
 inline constexpr std::string_view kApps = "Apps";
-inline constexpr std::string_view kStoreMetadata = "HarvoMetadata.plist";
+inline constexpr std::string_view kStoreMetadata = kStoreMetadataName;
 inline constexpr std::string_view kLicence = "ApplicationSINF";
 inline constexpr std::string_view kIcon = "PlaceholderIcon";
 inline constexpr std::string_view kData = "Data";
 }  // namespace backup_files
 
-/// What the manifest says of an app. Sizes are in bytes; absent is what the app did not have.
+/// The manifest's entry for an app. Sizes are in bytes; nullopt if the app has no such file.
 struct BackedUpApp {
-  AppName app;
-  /// `Downgrade` or `IntentionalDowngrade` of a demoted app, else `None`.
+  AppName name;
+  /// `Downgrade` or `IntentionalDowngrade` for a demoted app, else `None`.
   platform::TSInstallType demotion = platform::TSInstallType::None;
   std::optional<std::uint64_t> storeMetadata;
   std::optional<std::uint64_t> licence;
   std::optional<std::uint64_t> icon;
   std::optional<std::uint64_t> data;
-  /// How much of its data is neither file, folder nor link, and not in the backup. Not in the manifest.
+  /// The number of data items that are not files, directories or links and are not saved. Not in the manifest.
   std::uint64_t leftOut = 0;
-  /// Why the entry cannot be used; empty for one that can.
+  /// Why the entry cannot be used; empty if it can.
   std::string damage;
 
   [[nodiscard]] bool isDemoted() const { return demotion != platform::TSInstallType::None; }
@@ -44,24 +45,25 @@ struct BackedUpApp {
 
 struct Backup {
   std::string path;
-  /// Different for every backup that is made.
+  /// Unique to each backup.
   std::string identifier;
   std::vector<BackedUpApp> apps;
-  /// The home screen, from the first place to the last.
+  /// Bundle identifiers in the order of the home screen.
   std::vector<std::string> iconOrder;
 };
 
+/// Returns the content of the backup's manifest.
 [[nodiscard]] plist::Dictionary manifestOf(const Backup& backup);
 
-/// Reads and checks a backup's manifest. An entry that cannot be used is marked as damaged; what is no backup, or one
-/// of a later version, is an error that says so.
+/// Reads and checks a backup's manifest. Marks entries that cannot be used as damaged. Fails if the directory is not a
+/// backup or is one of another version.
 [[nodiscard]] Result<Backup> readBackup(const std::string& path);
 
-/// A file of an app, which must be of the size that the manifest gives.
+/// Reads a file of an app. Fails if its size is not `size`, which the manifest gives.
 [[nodiscard]] Result<Bytes> readBackupFile(const Backup& backup, const BackedUpApp& app, std::string_view name,
                                            std::uint64_t size);
 
-/// Host path of the app's folder of data.
+/// Returns the host path of the app's data directory.
 [[nodiscard]] std::string dataFolderIn(const Backup& backup, const BackedUpApp& app);
 
 }  // namespace appsync::host

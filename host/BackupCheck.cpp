@@ -39,7 +39,7 @@ Status checkData(const Backup& backup, const BackedUpApp& app) {
   const Result<std::uint64_t> size = sizeOfFiles(dataFolderIn(backup, app));
   if (!size) return size.error();
   if (*size == *app.data) return {};
-  return damage("the data of " + app.app.identifier + " has " + std::to_string(*size) + " bytes and must have " +
+  return damage("the data of " + app.name.identifier + " has " + std::to_string(*size) + " bytes and must have " +
                 std::to_string(*app.data));
 }
 
@@ -62,7 +62,7 @@ Status checkRestoreFile(const Backup& backup) {
   plist::Dictionary entries;
   for (const BackedUpApp& app : backup.apps) {
     Result<plist::Dictionary> info = restoreInfoOf(backup, app);
-    if (info) entries.set(app.app.identifier, std::move(info).value());
+    if (info) entries.set(app.name.identifier, std::move(info).value());
   }
   Result<Bytes> document = plist::writeBinary(entries);
   if (!document) return document.error();
@@ -75,7 +75,7 @@ Status checkRestoreFile(const Backup& backup) {
 Status checkBackup(const std::string& path, const Backup& written) {
   const Result<Backup> backup = readBackup(path);
   if (!backup) return backup.error();
-  if (manifestOf(*backup) != manifestOf(written)) return damage("its manifest is not what was written");
+  if (manifestOf(*backup) != manifestOf(written)) return damage("its manifest differs from what was written");
   for (const BackedUpApp& app : backup->apps) {
     RETURN_IF_ERROR(checkApp(*backup, app));
   }

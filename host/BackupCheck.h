@@ -8,9 +8,9 @@
 
 namespace appsync::host {
 
-/// Reads the backup in the folder `path` as a restore does: its manifest must say what `written` says, every file must
-/// have its size, and the restore file made of them must be readable. Store metadata that the device itself cannot
-/// read is accepted as it is. Fails with the first difference.
+/// Reads the backup in the directory `path` as a restore does: its manifest must equal that of `written`, every file
+/// must have its size, and the restore file made of them must be readable. Store metadata that the device itself cannot
+/// read is accepted. Fails with the first difference.
 [[nodiscard]] Status checkBackup(const std::string& path, const Backup& written);
 
 }  // namespace appsync::host

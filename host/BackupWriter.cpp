@@ -31,7 +31,7 @@ Result<FileDescriptor> makeFolder(int parent, const std::string& name) {
   return folder;
 }
 
-/// The file of the app that its info dictionary names as the icon; none where it cannot be one.
+/// Returns the icon file that the app's info dictionary names, or nullopt if it is missing, unreadable or too large.
 std::optional<Bytes> iconOf(device::Device& device, const platform::AppRecord& record) {
   const auto folder = record.bundlePath();
   const auto bundle = folder ? device.platform().bundles().openBundle({*folder, true}) : nullptr;
@@ -49,15 +49,15 @@ std::optional<Bytes> storeMetadataOf(device::Device& device, const platform::App
   return bytes ? std::optional(std::move(bytes).value()) : std::nullopt;
 }
 
-/// Writes the apps of one device into the folder of a backup.
+/// Writes the apps of one device into the directory of a backup.
 class AppWriter {
  public:
   AppWriter(device::Device& device, const FileDescriptor& folder) : device_(device), folder_(folder) {}
 
   [[nodiscard]] Result<BackedUpApp> write(const DeviceApp& app) {
-    const std::string& identifier = app.app.identifier;
+    const std::string& identifier = app.name.identifier;
     BackedUpApp entry;
-    entry.app = app.app;
+    entry.name = app.name;
     if (!app.isInstalled && device::isDemotion(app.installType)) entry.demotion = app.installType;
     const auto record =
         device_.platform().defaultRegistry().recordForIdentifier(identifier, platform::PlaceholderLookup::on);
@@ -79,13 +79,13 @@ class AppWriter {
                     std::optional<std::uint64_t>& size) {
     if (!bytes) return {};
     size = bytes->size();
-    const int number = device::tree::create(folder.get(), std::string(name).c_str(), *bytes);
-    return number == 0 ? Status() : Status(Error::fromErrno(number, name));
+    const int error = device::tree::create(folder.get(), std::string(name).c_str(), *bytes);
+    return error == 0 ? Status() : Status(Error::fromErrno(error, name));
   }
 
-  /// What the app has, or what an earlier restore still keeps for it.
+  /// Adds the app's data or, if it has not been given back yet, the data that an earlier restore keeps for it.
   Status addData(const FileDescriptor& folder, BackedUpApp& entry) {
-    const std::string& identifier = entry.app.identifier;
+    const std::string& identifier = entry.name.identifier;
     const bool isKept = device_.platform().makeBackupManager()->restoreDataExists(identifier, nullptr);
     const std::string path =
         isKept ? std::string(device::kRestoreDataPath) + "/" + identifier : device::dataContainerOf(identifier);
@@ -93,9 +93,9 @@ class AppWriter {
     if (!data && data.error().code == ENOENT) return {};
     if (!data) return data.error();
     std::uint64_t bytes = 0;
-    const int number = device::tree::copy(data->get(), ".", folder.get(), std::string(backup_files::kData).c_str(),
-                                          bytes, &entry.leftOut);
-    if (number != 0) return Error::fromErrno(number, "the data of " + identifier);
+    const int error = device::tree::copy(data->get(), ".", folder.get(), std::string(backup_files::kData).c_str(),
+                                         bytes, &entry.leftOut);
+    if (error != 0) return Error::fromErrno(error, "the data of " + identifier);
     entry.data = bytes;
     return {};
   }
@@ -105,12 +105,12 @@ class AppWriter {
 };
 
 bool isToBeSaved(const DeviceApp& app) {
-  const bool comesWithSync = !app.isInstalled && app.installType == TSInstallType::Sync;
-  return app.type == platform::kApplicationTypeUser && !comesWithSync;
+  const bool isBeingSynced = !app.isInstalled && app.installType == TSInstallType::Sync;
+  return app.type == platform::kApplicationTypeUser && !isBeingSynced;
 }
 
-Status fill(const FolderDraft& draft, device::Device& device, Backup& backup) {
-  const Result<FileDescriptor> apps = makeFolder(draft.folder(), std::string(backup_files::kApps));
+Status fill(const AtomicDirectory& directory, device::Device& device, Backup& backup) {
+  const Result<FileDescriptor> apps = makeFolder(directory.folder(), std::string(backup_files::kApps));
   if (!apps) return apps.error();
   AppWriter writer(device, *apps);
   const Result<std::vector<DeviceApp>> present = appsOn(device);
@@ -123,26 +123,26 @@ Status fill(const FolderDraft& draft, device::Device& device, Backup& backup) {
   }
   const Result<Bytes> manifest = plist::writeXML(manifestOf(backup));
   if (!manifest) return manifest.error();
-  const int number = device::tree::create(draft.folder(), std::string(backup_files::kManifest).c_str(), *manifest);
-  return number == 0 ? Status() : Status(Error::fromErrno(number, backup_files::kManifest));
+  const int error = device::tree::create(directory.folder(), std::string(backup_files::kManifest).c_str(), *manifest);
+  return error == 0 ? Status() : Status(Error::fromErrno(error, backup_files::kManifest));
 }
 
 }  // namespace
 
 Result<Backup> writeBackup(device::Device& device, const std::string& path) {
-  Result<FolderDraft> draft = FolderDraft::make(path);
-  if (!draft) return draft.error();
+  Result<AtomicDirectory> directory = AtomicDirectory::make(path);
+  if (!directory) return directory.error();
   Backup backup{path, device::newUUID(), {}, {}};
   const auto order = device.services().homeScreen().iconOrder();
   if (!order) return order.error().in("the order of the icons cannot be read");
   backup.iconOrder = *order;
-  if (Status filled = fill(*draft, device, backup); !filled) {
-    return filled.error().in(path + " cannot be written, and is not there");
+  if (Status filled = fill(*directory, device, backup); !filled) {
+    return filled.error().in(path + " cannot be written and was not created");
   }
-  if (Status checked = checkBackup(draft->folderPath(), backup); !checked) {
-    return checked.error().in(path + " cannot be read back after it was written, and is not there");
+  if (Status checked = checkBackup(directory->folderPath(), backup); !checked) {
+    return checked.error().in(path + " cannot be read back after it was written and was not created");
   }
-  RETURN_IF_ERROR(draft->publish());
+  RETURN_IF_ERROR(directory->publish());
   return backup;
 }
 

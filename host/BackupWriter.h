@@ -1,4 +1,4 @@
-// Makes backups.
+// Creates backups.
 #pragma once
 
 #include <string>
@@ -9,9 +9,9 @@
 
 namespace appsync::host {
 
-/// Saves of each of the device's user apps, but for those that a sync is about to bring, its store metadata, licence,
-/// icon and data, its version, and whether it is demoted, and the order of the icons. The folder at `path` is whole or
-/// not there, whatever ends the process; it is read back before it gets its name. Returns what its manifest says.
+/// Saves the icon order and, of each of the device's user apps except those that a sync is installing, the store
+/// metadata, licence, icon, data, version and demotion. The directory at `path` is created atomically and is read back
+/// before that. Returns the content of its manifest; on failure nothing is left at `path`.
 [[nodiscard]] Result<Backup> writeBackup(device::Device& device, const std::string& path);
 
 }  // namespace appsync::host

@@ -9,7 +9,7 @@ Result<std::vector<DeviceApp>> appsOn(device::Device& device) {
   apps.reserve(records->size());
   for (const auto& record : *records) {
     DeviceApp& app = apps.emplace_back();
-    app.app = {record->applicationIdentifier(), record->name(), record->bundleVersion().value_or("")};
+    app.name = {record->applicationIdentifier(), record->name(), record->bundleVersion().value_or("")};
     app.type = record->applicationType();
     app.isInstalled = record->isInstalled();
     app.isPlaceholder = record->isPlaceholder();

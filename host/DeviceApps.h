@@ -12,17 +12,17 @@
 namespace appsync::host {
 
 struct DeviceApp {
-  AppName app;
+  AppName name;
   std::string type;  ///< "User" or "System"
   bool isInstalled = false;
   bool isPlaceholder = false;
-  bool isUnderWay = false;  ///< an install of it has begun and not ended
+  bool isUnderWay = false;  ///< an install of it has started and not ended
   platform::TSInstallType installType = platform::TSInstallType::None;
   std::uint64_t bytes = 0;
 };
 
-/// Every app and placeholder, in the order in which they came to the device; an error of device::kDeviceDomain when its
-/// register cannot be read.
+/// Returns every app and placeholder, in the order of installation. Fails with an error of device::kDeviceDomain if the
+/// device's registry cannot be read.
 [[nodiscard]] Result<std::vector<DeviceApp>> appsOn(device::Device& device);
 
 }  // namespace appsync::host

@@ -17,17 +17,17 @@ std::string pathIn(const std::string& devicePath) {
   return devicePath + "/host-state.plist";
 }
 
-/// `text` says what is wrong with the file.
+/// Returns an error that says what is wrong with the file (`text`) and what to do.
 Error unusable(long code, const std::string& text) {
   return {std::string(domains::kPOSIX), code,
-          text + "; put a good copy in its place, or remove it: then apps that were deleted are sent again", nullptr};
+          text + "; replace it with a good copy, or remove it: apps that were deleted are then sent again", nullptr};
 }
 
 Error damaged(const std::string& path, const std::string& why) {
   return unusable(EINVAL, path + " is damaged (" + why + ")");
 }
 
-/// False when it is not the array of identifiers that it must be; none at all is an empty one.
+/// Returns false if `value` is not an array of strings. Null is an empty array.
 bool readIdentifiers(const plist::Value* value, IdentifierSet& identifiers) {
   if (value == nullptr) return true;
   if (value->array() == nullptr) return false;
@@ -45,7 +45,7 @@ plist::Array arrayOf(const IdentifierSet& identifiers) {
 
 }  // namespace
 
-void HostState::learnDeleted(const IdentifierSet& deleted) {
+void HostState::addDeleted(const IdentifierSet& deleted) {
   for (const std::string& identifier : deleted) {
     if (!offered.contains(identifier)) declined.insert(identifier);
   }
@@ -61,7 +61,8 @@ Result<HostState> loadHostState(const std::string& devicePath) {
   HostState state;
   const bool isWhole = root->dictionary() != nullptr && readIdentifiers(root->find(kDeclined), state.declined) &&
                        readIdentifiers(root->find(kOffered), state.offered);
-  return isWhole ? Result<HostState>(std::move(state)) : damaged(path, "it is no dictionary of lists of identifiers");
+  return isWhole ? Result<HostState>(std::move(state))
+                 : damaged(path, "it is not a dictionary of arrays of identifiers");
 }
 
 Status saveHostState(const std::string& devicePath, const HostState& state) {

@@ -12,7 +12,7 @@ constexpr std::array<int, 3> kSignals = {SIGINT, SIGTERM, SIGHUP};
 std::atomic<bool> wasRequested = false;
 static_assert(std::atomic<bool>::is_always_lock_free, "used in a signal handler");
 
-/// Only calls that are safe in a signal handler.
+/// Calls async-signal-safe functions only.
 void handle(int signal) {
   if (wasRequested.exchange(true)) {
     std::signal(signal, SIG_DFL);
@@ -23,7 +23,7 @@ void handle(int signal) {
 
 }  // namespace
 
-Interruption::Interruption() {
+InterruptSignals::InterruptSignals() {
   wasRequested = false;
   struct sigaction action = {};
   action.sa_handler = handle;
@@ -31,13 +31,13 @@ Interruption::Interruption() {
   sigemptyset(&action.sa_mask);
   for (const int signal : kSignals) {
     struct sigaction earlier = {};
-    // What the caller has us ignore, as nohup does, stays ignored.
+    // A signal that the parent process has set to be ignored, as nohup does, stays ignored.
     ::sigaction(signal, nullptr, &earlier);
     if (earlier.sa_handler != SIG_IGN) ::sigaction(signal, &action, nullptr);
   }
 }
 
-Interruption::~Interruption() {
+InterruptSignals::~InterruptSignals() {
   for (const int signal : kSignals) {
     struct sigaction present = {};
     ::sigaction(signal, nullptr, &present);
@@ -45,7 +45,7 @@ Interruption::~Interruption() {
   }
 }
 
-bool Interruption::requested() const {
+bool InterruptSignals::requested() const {
   return wasRequested;
 }
 

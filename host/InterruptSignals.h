@@ -1,18 +1,18 @@
-// Ctrl-C, and the other polite ways of asking a process to end.
+// Handlers for the signals with which a user interrupts a process.
 #pragma once
 
 namespace appsync::host {
 
-/// While one exists, the first SIGINT, SIGTERM or SIGHUP only asks for an end; the second ends the process at once. One
-/// at a time.
-class Interruption {
+/// While an object exists, the first SIGINT, SIGTERM or SIGHUP only sets `requested`; the second ends the process.
+/// Ignored signals stay ignored. At most one object may exist at a time.
+class InterruptSignals {
  public:
-  Interruption();
-  ~Interruption();
-  Interruption(const Interruption&) = delete;
-  Interruption& operator=(const Interruption&) = delete;
+  InterruptSignals();
+  ~InterruptSignals();
+  InterruptSignals(const InterruptSignals&) = delete;
+  InterruptSignals& operator=(const InterruptSignals&) = delete;
 
-  /// Any thread.
+  /// Returns whether a signal was received. Thread-safe.
   [[nodiscard]] bool requested() const;
 };
 

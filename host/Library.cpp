@@ -32,7 +32,7 @@ bool beginsLikePackage(const std::string& path) {
          std::string_view(start, sizeof start) == "PK\x03\x04";
 }
 
-/// Names of the files that are packages or claim to be, sorted.
+/// Returns the sorted names of the files that are packages by name or by content.
 Result<std::vector<std::string>> packageNames(const std::string& folder) {
   std::error_code failure;
   fs::directory_iterator entry(folder, failure);
@@ -45,12 +45,12 @@ Result<std::vector<std::string>> packageNames(const std::string& folder) {
         endsLikePackage(name) || (entry->is_regular_file(unknown) && beginsLikePackage(entry->path().string()));
     if (isPackage) names.push_back(std::move(name));
   }
-  if (failure) return Error::fromErrno(failure.value(), folder + " is no library that can be read");
+  if (failure) return Error::fromErrno(failure.value(), folder + " cannot be read as a library");
   std::ranges::sort(names);
   return names;
 }
 
-/// Without the package's pictures and lists: a library may hold many.
+/// Reads a package, but keeps neither its images nor its property lists: a library may have many packages.
 Result<LibraryPackage> summarise(const std::string& path) {
   const Result<device::PackageInfo> info = device::readPackageInfo(path);
   if (!info) return info.error();
@@ -58,11 +58,12 @@ Result<LibraryPackage> summarise(const std::string& path) {
 }
 
 void addPackage(Library& library, const LibraryPackage& package) {
-  const auto [place, isFirst] = library.packages.try_emplace(package.app.identifier, package);
-  if (!isFirst && std::is_gt(compareVersions(package.app.version, place->second.app.version))) place->second = package;
+  const auto [place, isFirst] = library.packages.try_emplace(package.name.identifier, package);
+  if (!isFirst && std::is_gt(compareVersions(package.name.version, place->second.name.version)))
+    place->second = package;
 }
 
-/// The error's text, without the path that it starts with: the package is named beside it anyway.
+/// Returns the error's text without the path at its start, which the report contains already.
 std::string reasonOf(const Error& error, const std::string& path) {
   const std::string prefix = path + ": ";
   return error.text.starts_with(prefix) ? error.text.substr(prefix.size()) : error.text;

@@ -1,4 +1,4 @@
-// The host's library: a folder of packages.
+// The host's library: a directory of packages.
 #pragma once
 
 #include <cstdint>
@@ -13,7 +13,7 @@ namespace appsync::host {
 
 struct LibraryPackage {
   std::string path;
-  AppName app;
+  AppName name;
   std::uint64_t bytes = 0;  ///< of the package file
 };
 
@@ -22,16 +22,16 @@ struct BrokenPackage {
   std::string reason;
 };
 
-/// What a library holds: of each app the newest package, and what cannot be used.
+/// The newest package of each app, and the files that cannot be used.
 struct Library {
   /// By identifier.
   std::map<std::string, LibraryPackage, std::less<>> packages;
   std::vector<BrokenPackage> broken;
 };
 
-/// Reads the folder at `path`. A package is a file that is named "….zip" or begins like a zip archive; subfolders,
-/// hidden files and everything else are passed over. Of two versions of one app the newer counts, of two files of one
-/// version the first by name. Only the folder itself can make it fail.
+/// Reads the directory at `path`. A package is a file that is named "….zip" or begins like a zip archive;
+/// subdirectories, hidden files and all other files are ignored. Of two versions of one app the newer is used, of two
+/// files of one version the first by name. Fails only if the directory cannot be read.
 [[nodiscard]] Result<Library> readLibrary(const std::string& path);
 
 }  // namespace appsync::host

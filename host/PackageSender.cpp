@@ -16,12 +16,12 @@ namespace {
 
 constexpr std::size_t kPiece = std::size_t{4} << 20;
 
-bool isNotForThisFileSystem(int number) {
-  return number == EXDEV || number == ENOSYS || number == EINVAL || number == EOPNOTSUPP || number == EBADF;
+bool isUnsupportedByFileSystem(int error) {
+  return error == EXDEV || error == ENOSYS || error == EINVAL || error == EOPNOTSUPP || error == EBADF;
 }
 
-/// The same by way of memory.
-int copyPieceByHand(int from, int to, std::size_t& copied) {
+/// Copies at most one piece through memory, where the kernel cannot copy between the files.
+int copyPieceThroughMemory(int from, int to, std::size_t& copied) {
   Bytes buffer(std::min(kPiece, std::size_t{256} * 1024));
   ssize_t count = -1;
   do {
@@ -35,7 +35,7 @@ int copyPieceByHand(int from, int to, std::size_t& copied) {
   return failed;
 }
 
-/// Copies at most one piece; `copied` is 0 at the end.
+/// Copies at most one piece; `copied` is 0 at the end of the file.
 int copyPiece(int from, int to, std::size_t& copied) {
   if (const int failed = device::faultPoint("send package"); failed != 0) return failed;
   ssize_t count = -1;
@@ -44,10 +44,10 @@ int copyPiece(int from, int to, std::size_t& copied) {
   } while (count < 0 && errno == EINTR);
   copied = count < 0 ? 0 : static_cast<std::size_t>(count);
   if (count >= 0) return 0;
-  return isNotForThisFileSystem(errno) ? copyPieceByHand(from, to, copied) : errno;
+  return isUnsupportedByFileSystem(errno) ? copyPieceThroughMemory(from, to, copied) : errno;
 }
 
-int copyWhole(int from, int to, std::uint64_t size, const PackageSender::GoOn& goOn) {
+int copyFile(int from, int to, std::uint64_t size, const PackageSender::GoOn& goOn) {
   std::uint64_t done = 0;
   for (;;) {
     if (!goOn(size == 0 ? 0 : std::min(1.0, static_cast<double>(done) / static_cast<double>(size)))) return ECANCELED;
@@ -61,14 +61,14 @@ int copyWhole(int from, int to, std::uint64_t size, const PackageSender::GoOn& g
 int copyInto(int from, int folder, const std::string& name, std::uint64_t size, const PackageSender::GoOn& goOn) {
   device::FileDescriptor to;
   int failed = device::sys::createFile(folder, name.c_str(), device::sys::kFileMode, to);
-  if (failed == 0) failed = copyWhole(from, to.get(), size, goOn);
+  if (failed == 0) failed = copyFile(from, to.get(), size, goOn);
   if (failed != 0 && to.valid()) static_cast<void>(device::sys::removeFile(folder, name.c_str()));
   return failed;
 }
 
-/// Gives the library's own file a second name, where both are on one file system: the device only reads a package, and
-/// what it then removes is the name. Copies would have to be written out with every app that is installed meanwhile.
-int lendWhole(int from, int folder, const std::string& name, const PackageSender::GoOn& goOn) {
+/// Hard-links the library's file, if both are on one file system: the device only reads a package, and removes only the
+/// link. Copies would be flushed to the disk together with every app that is installed meanwhile.
+int linkPackage(int from, int folder, const std::string& name, const PackageSender::GoOn& goOn) {
   if (!goOn(0)) return ECANCELED;
   if (const int failed = device::faultPoint("send package"); failed != 0) return failed;
   if (::linkat(from, "", folder, name.c_str(), AT_EMPTY_PATH) != 0) {
@@ -91,7 +91,7 @@ Result<std::string> PackageSender::send(const LibraryPackage& package, const GoO
   const std::string name = std::to_string(++sent_) + ".zip";
   const Result<device::RootDirectory::Place> place = files_.root().place(folder + "/" + name);
   if (!place) return place.error();
-  int failed = lendWhole(from.get(), place->folder.get(), name, goOn);
+  int failed = linkPackage(from.get(), place->folder.get(), name, goOn);
   if (failed != 0 && failed != ECANCELED) failed = copyInto(from.get(), place->folder.get(), name, package.bytes, goOn);
   if (failed == 0) return std::string(kPackagesFolder) + "/" + name;
   return Error::fromErrno(failed, package.path + " cannot be sent to the device");

@@ -1,4 +1,4 @@
-// The host's side of a transfer: a package's way onto the device.
+// The host's side of a transfer: sends packages to the device.
 #pragma once
 
 #include <cstdint>
@@ -11,19 +11,18 @@
 
 namespace appsync::host {
 
-/// Copies packages onto the device piece by piece, within the kernel where it can; memory does not grow with a package.
-/// One thread at a time.
+/// Links or copies packages into the device. Copies are made in pieces, in the kernel if possible, so memory does not
+/// depend on the package's size. Not thread-safe.
 class PackageSender {
  public:
-  /// Hears how much of the package is there, from 0 to 1; false ends the transfer.
+  /// Receives the fraction of the package that was sent, from 0 to 1. Returning false cancels the transfer.
   using GoOn = std::function<bool(double fraction)>;
 
   explicit PackageSender(device::DeviceFileSystem& files) : files_(files) {}
 
-  /// Puts the package into the public staging folder under a name of its own, and returns its path relative to that
-  /// folder. On the library's own file system it is the library's file under a second name, for which no time is
-  /// needed; elsewhere a copy. A failed or ended transfer leaves nothing behind. Errors: "POSIX"; ECANCELED when `goOn`
-  /// ended it.
+  /// Puts the package into the public staging folder under a unique name and returns its path relative to that folder.
+  /// On the library's own file system the name is a hard link to the library's file, elsewhere the file is copied. A
+  /// failed or cancelled transfer leaves nothing behind. Errors: "POSIX"; ECANCELED if `goOn` returned false.
   [[nodiscard]] Result<std::string> send(const LibraryPackage& package, const GoOn& goOn);
 
  private:

@@ -1,4 +1,4 @@
-// Work on many things at once.
+// Parallel loops.
 #pragma once
 
 #include <algorithm>
@@ -9,8 +9,8 @@
 
 namespace appsync::host {
 
-/// Calls `work` with each number below `count`, on as many threads as the machine has processors, and returns when all
-/// is done. `work` must not throw.
+/// Calls `work` with each index below `count`, on as many threads as the machine has processors, and blocks until all
+/// calls have returned. `work` must not throw.
 template <class Work>
 void inParallel(std::size_t count, const Work& work) {
   std::atomic<std::size_t> next = 0;

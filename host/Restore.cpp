@@ -1,35 +1,30 @@
 #include "host/Restore.h"
 
 #include <cerrno>
-#include <chrono>
-#include <memory>
 #include <utility>
+
+#include <fcntl.h>
 
 #include "base/ReturnIfError.h"
 #include "device/apps/AppData.h"
 #include "device/apps/BackupManager.h"
 #include "device/apps/Demotion.h"
+#include "device/storage/HostFile.h"
+#include "device/storage/SystemCalls.h"
 #include "host/DeviceApps.h"
 #include "host/RestoreInfo.h"
-#include "host/RestoreMarker.h"
-#include "host/Ticker.h"
 
 namespace appsync::host {
 namespace {
 
-using namespace std::chrono_literals;
 using platform::TSInstallType;
 
 constexpr std::string_view kHostRestoreFolder = "/var/mobile/Media/HarvoRestore";
 constexpr std::string_view kHostRestorePath = "/var/mobile/Media/HarvoRestore/RestoreApplications.plist";
-constexpr auto kTimeBetweenLooks = 20ms;
+constexpr std::string_view kBackupKey = "Backup";
 
 Error refusal(std::string text) {
   return {std::string(domains::kPOSIX), EEXIST, std::move(text), nullptr};
-}
-
-std::shared_ptr<const platform::AppRecord> recordOf(device::Device& device, std::string_view identifier) {
-  return device.platform().defaultRegistry().recordForIdentifier(identifier, platform::PlaceholderLookup::on);
 }
 
 Status writeList(device::Device& device, std::string_view path, const plist::Value& root) {
@@ -40,37 +35,58 @@ Status writeList(device::Device& device, std::string_view path, const plist::Val
 }  // namespace
 
 Status Restore::check() const {
-  const auto underWay = restoreUnderWay(device_.path());
-  if (underWay == backup_.identifier) return {};
+  const auto unfinished = unfinishedBackup();
+  if (unfinished == backup_.identifier) return {};
   const Result<std::vector<DeviceApp>> apps = appsOn(device_);
   if (!apps) return apps.error();
   if (apps->empty()) return {};
-  if (underWay) {
+  if (unfinished) {
     return refusal(device_.path() +
-                   " is in the middle of the restore of another backup; finish that one first, or restore to a new "
+                   " has an unfinished restore of another backup; finish that restore first, or restore to a new "
                    "device, made with `appsync init`");
   }
-  return refusal(device_.path() + " has apps already; restore to a new device, made with `appsync init`");
+  return refusal(device_.path() + " already has apps; restore to a new device, made with `appsync init`");
 }
 
-Status Restore::run() {
+Status Restore::begin() {
   for (const BackedUpApp& app : backup_.apps) {
     if (app.damage.empty()) {
-      progress_.expect(app.app, 0);
+      progress_.expect(app.name, 0);
     } else {
       refuse(app, app.damage);
     }
   }
-  Status placed = beginRestore(device_.path(), backup_.identifier);
+  Status placed = saveMarker();
   if (placed) placed = putFilesInPlace();
-  if (!placed) {
-    for (const BackedUpApp& app : backup_.apps)
-      progress_.finish({AppEvent::failed, app.app, placed.error().text});
-    return placed;
+  if (placed) return {};
+  for (const BackedUpApp& app : backup_.apps)
+    progress_.finish({AppEvent::failed, app.name, placed.error().text});
+  return placed;
+}
+
+std::vector<const BackedUpApp*> Restore::preparedApps() const {
+  std::vector<const BackedUpApp*> apps;
+  for (const BackedUpApp& app : backup_.apps) {
+    if (!isRefused(app)) apps.push_back(&app);
   }
-  makePlaceholders();
-  finishApps();
-  return endRestore(device_.path());
+  return apps;
+}
+
+Status Restore::end() {
+  const int error = device::sys::removeFile(AT_FDCWD, markerPath().c_str());
+  return error == 0 || error == ENOENT ? Status() : Status(Error::fromErrno(error, markerPath()));
+}
+
+std::optional<std::string> Restore::unfinishedBackup() const {
+  const Result<Bytes> bytes = device::readHostFile(markerPath());
+  if (!bytes) return std::nullopt;
+  const Result<plist::Value> root = plist::read(*bytes);
+  return root ? ownedStringIn(root->find(kBackupKey)) : std::nullopt;
+}
+
+Status Restore::saveMarker() {
+  const Result<Bytes> bytes = plist::writeXML(plist::Dictionary{{kBackupKey, backup_.identifier}});
+  return bytes ? device::replaceHostFile(markerPath(), *bytes) : Status(bytes.error());
 }
 
 Status Restore::putFilesInPlace() {
@@ -78,93 +94,51 @@ Status Restore::putFilesInPlace() {
   plist::Array automatic;
   plist::Array intentional;
   for (const BackedUpApp& app : backup_.apps) {
-    if (!isWanted(app)) continue;
-    if (Status taken = takeOver(app, entries); !taken) {
-      refuse(app, taken.error().text);
+    if (isRefused(app)) continue;
+    if (Status prepared = prepare(app, entries); !prepared) {
+      refuse(app, prepared.error().text);
       continue;
     }
     if (!app.isDemoted()) continue;
-    (app.demotion == TSInstallType::Downgrade ? automatic : intentional).push_back(app.app.identifier);
+    (app.demotion == TSInstallType::Downgrade ? automatic : intentional).push_back(app.name.identifier);
   }
   const plist::Dictionary demoted = {{device::kAutomaticDowngradesKey, std::move(automatic)},
                                      {device::kIntentionalDowngradesKey, std::move(intentional)}};
   RETURN_IF_ERROR(writeList(device_, device::kDemotedAppsPath, demoted));
-  Status made = device_.platform().fileSystem().createDirectory(kHostRestoreFolder,
-                                                                platform::IntermediateDirectories::create, {});
-  return made ? writeList(device_, kHostRestorePath, entries) : made;
+  RETURN_IF_ERROR(device_.platform().fileSystem().createDirectory(kHostRestoreFolder,
+                                                                  platform::IntermediateDirectories::create, {}));
+  return writeList(device_, kHostRestorePath, entries);
 }
 
-Status Restore::takeOver(const BackedUpApp& app, plist::Dictionary& entries) {
+Status Restore::prepare(const BackedUpApp& app, plist::Dictionary& entries) {
   Result<plist::Dictionary> entry = restoreInfoOf(backup_, app);
   if (!entry) return entry.error();
   RETURN_IF_ERROR(keepData(app));
-  entries.set(app.app.identifier, std::move(entry).value());
+  entries.set(app.name.identifier, std::move(entry).value());
   return {};
 }
 
 Status Restore::keepData(const BackedUpApp& app) {
-  const std::string& identifier = app.app.identifier;
+  const std::string& identifier = app.name.identifier;
   if (!app.data) return {};
   device::BackupManager manager(device_.services().database(), device_.services().fileSystem());
   std::uint64_t size = 0;
   const bool isKept = manager.restoreDataExists(identifier, &size);
-  // An attempt that was cut off may have come further.
+  // An interrupted attempt may already have moved the data to the app.
   if (!isKept && device_.platform().fileSystem().fileExists(device::dataContainerOf(identifier))) return {};
   if (isKept && size == *app.data) return {};
   RETURN_IF_ERROR(manager.keepRestoreData(identifier, dataFolderIn(backup_, app)));
   if (manager.restoreDataExists(identifier, &size) && size == *app.data) return {};
   manager.cancelApplicationRestore(identifier, nullptr);
   return Error{std::string(domains::kPOSIX), EINVAL,
-               "its data in the backup is damaged: there are " + std::to_string(size) + " bytes and must be " +
+               "its data in the backup is damaged: it has " + std::to_string(size) + " bytes and must have " +
                    std::to_string(*app.data),
                nullptr};
 }
 
-void Restore::makePlaceholders() {
-  const Ticker ticker(kTimeBetweenLooks, [this] {
-    for (const BackedUpApp& app : backup_.apps) {
-      if (recordOf(device_, app.app.identifier) != nullptr) progress_.installing(app.app.identifier, 1);
-    }
-  });
-  client_.reconcileRestoreOfType(platform::kRestoreTypeHost, nullptr);
-}
-
-void Restore::finishApps() {
-  for (const BackedUpApp& app : backup_.apps) {
-    if (!isWanted(app)) continue;
-    const auto record = recordOf(device_, app.app.identifier);
-    if (record == nullptr) {
-      refuse(app, "the device made no placeholder for it; --log may tell why");
-    } else if (Status demoted = app.isDemoted() ? demote(app, *record) : Status(); !demoted) {
-      refuse(app, demoted.error().text);
-    } else {
-      progress_.finish({AppEvent::restored, app.app, {}});
-    }
-  }
-  const plist::Array layout(backup_.iconOrder.begin(), backup_.iconOrder.end());
-  const Result<Bytes> document = plist::writeBinary(layout);
-  auto& homeScreen = device_.services().homeScreen();
-  if (document && !layout.empty()) homeScreen.setIconState(homeScreen.blockableServerPort(), *document);
-}
-
-/// Without coordination the sync client makes all placeholders alike. No package comes that would bring the app's own
-/// name, where the store has another, nor one at which the data would be given back.
-Status Restore::demote(const BackedUpApp& app, const platform::AppRecord& record) {
-  const std::string& identifier = app.app.identifier;
-  if (record.isPlaceholder() && !record.isInstalled()) {
-    device::AppRegistry& registry = device_.services().defaultRegistry();
-    Status set =
-        record.installType() == app.demotion ? Status() : registry.setPlaceholderType(identifier, app.demotion);
-    if (set && !app.app.name.empty()) set = registry.renamePlaceholder(identifier, app.app.name);
-    if (!set) return set;
-  }
-  device::BackupManager manager(device_.services().database(), device_.services().fileSystem());
-  return manager.restoreDataNow(identifier);
-}
-
 void Restore::refuse(const BackedUpApp& app, std::string_view reason) {
-  refused_.insert(app.app.identifier);
-  progress_.finish({AppEvent::failed, app.app, std::string(reason)});
+  refused_.insert(app.name.identifier);
+  progress_.finish({AppEvent::failed, app.name, std::string(reason)});
 }
 
 }  // namespace appsync::host

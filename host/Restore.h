@@ -1,52 +1,56 @@
-// Brings a backup back to a device.
+// The host's part of a restore: the files and the data of a backup, put in place on a device.
 #pragma once
 
-#include <set>
+#include <optional>
 #include <string>
 #include <string_view>
+#include <vector>
 
 #include "base/Error.h"
 #include "device/Device.h"
 #include "host/Backup.h"
+#include "host/HostState.h"
 #include "host/SyncProgress.h"
-#include "platform/ZTClient.h"
 #include "plist/PropertyList.h"
 
 namespace appsync::host {
 
-/// The host and the process that sets a restored device up, for one restore: puts the apps' data and the files that the
-/// sync client reads in place, lets it make the placeholders, and waits for them for the bounded time that it takes.
-/// Packages come with the next sync.
-///
-/// Cut off at any moment, the restore of the same backup is taken up again; the device remembers which one it is.
+/// One restore of one backup: `check`, `begin`, then the data migrator, then `end`. The device's folder stores the
+/// backup's identifier in "restore.plist" from `begin` to `end`, so that an interrupted restore can be resumed: all
+/// steps are idempotent. Not thread-safe.
 class Restore {
  public:
-  /// All must outlive it. `client` is not the daemon's: it waits for placeholders.
-  Restore(device::Device& device, const Backup& backup, platform::ZTClient& client, SyncProgress& progress)
-      : device_(device), backup_(backup), client_(client), progress_(progress) {}
+  /// All arguments must outlive it.
+  Restore(device::Device& device, const Backup& backup, SyncProgress& progress)
+      : device_(device), backup_(backup), progress_(progress) {}
 
-  /// Whether the device can be restored: it has no apps, or a restore of this backup was cut off on it.
+  /// Fails unless the device has no apps or has an unfinished restore of this backup.
   [[nodiscard]] Status check() const;
 
-  /// Every app of the backup has its outcome in the progress when it returns; fails when nothing can be restored at
-  /// all, and is to be run again then.
-  [[nodiscard]] Status run();
+  /// Puts the apps' data and the files that the sync client reads in place. An app whose part of the backup is damaged
+  /// is reported as failed. If the files cannot be written, every app is, and the restore must be run again.
+  [[nodiscard]] Status begin();
+
+  /// Returns the apps whose files are in place, in the backup's order.
+  [[nodiscard]] std::vector<const BackedUpApp*> preparedApps() const;
+
+  /// Marks the restore as finished.
+  [[nodiscard]] Status end();
 
  private:
+  [[nodiscard]] std::optional<std::string> unfinishedBackup() const;
+  [[nodiscard]] Status saveMarker();
   [[nodiscard]] Status putFilesInPlace();
-  void makePlaceholders();
-  void finishApps();
-  [[nodiscard]] Status takeOver(const BackedUpApp& app, plist::Dictionary& entries);
+  [[nodiscard]] Status prepare(const BackedUpApp& app, plist::Dictionary& entries);
   [[nodiscard]] Status keepData(const BackedUpApp& app);
-  [[nodiscard]] Status demote(const BackedUpApp& app, const platform::AppRecord& record);
-  [[nodiscard]] bool isWanted(const BackedUpApp& app) const { return !refused_.contains(app.app.identifier); }
+  [[nodiscard]] bool isRefused(const BackedUpApp& app) const { return refused_.contains(app.name.identifier); }
   void refuse(const BackedUpApp& app, std::string_view reason);
+  [[nodiscard]] std::string markerPath() const { return device_.path() + "/restore.plist"; }
 
   device::Device& device_;
   const Backup& backup_;
-  platform::ZTClient& client_;
   SyncProgress& progress_;
-  std::set<std::string, std::less<>> refused_;
+  IdentifierSet refused_;
 };
 
 }  // namespace appsync::host

@@ -10,22 +10,23 @@
 namespace appsync::host {
 namespace {
 
-/// Adds what the sync client requires to the store's metadata. Fails if that is not a dictionary.
+/// Adds the keys that the sync client requires to the store metadata. Fails if the metadata is not a dictionary.
 Result<Bytes> completed(const BackedUpApp& app, const std::optional<Bytes>& saved) {
   plist::Dictionary metadata;
   if (saved) {
     const Result<plist::Value> root = plist::read(*saved);
     if (!root) return root.error().in("its store metadata is damaged");
     if (root->dictionary() == nullptr) {
-      return Error{std::string(domains::kPOSIX), EINVAL, "its store metadata is damaged: it is no dictionary", nullptr};
+      return Error{std::string(domains::kPOSIX), EINVAL, "its store metadata is damaged: it is not a dictionary",
+                   nullptr};
     }
     metadata = *root->dictionary();
   }
   if (metadata.find("title") == nullptr && metadata.find("itemName") == nullptr) {
-    metadata.set("title", app.app.name.empty() ? app.app.identifier : app.app.name);
+    metadata.set("title", app.name.name.empty() ? app.name.identifier : app.name.name);
   }
   const bool lacksVersion = metadata.find("bundleVersion") == nullptr;
-  if (lacksVersion || !app.app.version.empty()) metadata.set("bundleVersion", app.app.version);
+  if (lacksVersion || !app.name.version.empty()) metadata.set("bundleVersion", app.name.version);
   return plist::writeBinary(metadata);
 }
 
@@ -46,8 +47,8 @@ Result<plist::Dictionary> restoreInfoOf(const Backup& backup, const BackedUpApp&
   };
   Status done =
       read(backup_files::kStoreMetadata, app.storeMetadata, [&](Bytes bytes) { metadata = std::move(bytes); });
-  if (done) done = read(backup_files::kLicence, app.licence, addTo("ApplicationSINF"));
-  if (done) done = read(backup_files::kIcon, app.icon, addTo("PlaceholderIcon"));
+  if (done) done = read(backup_files::kLicence, app.licence, addTo(backup_files::kLicence));
+  if (done) done = read(backup_files::kIcon, app.icon, addTo(backup_files::kIcon));
   if (!done) return done.error();
   Result<Bytes> document = completed(app, metadata);
   if (!document) return document.error();

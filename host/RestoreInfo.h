@@ -1,4 +1,4 @@
-// The host's restore file: what the sync client reads of each app of a backup.
+// The host's restore file, from which the sync client reads the apps to restore.
 #pragma once
 
 #include "base/Error.h"

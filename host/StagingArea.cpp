@@ -19,7 +19,7 @@ std::string stagedPath(std::string_view name) {
   return std::string(kStagingFolder) + "/" + std::string(name);
 }
 
-/// Where the host writes what the plug-in will find at `path` in its work area.
+/// Returns the staging path of the file that the plug-in will find at `path` in its work area.
 std::string stagedFor(std::string_view path) {
   return stagedPath(path.substr(kWorkArea.size() + 1));
 }
@@ -29,10 +29,10 @@ bool isTransfer(const PlannedApp& planned) {
 }
 
 plist::Value todoEntry(const PlannedApp& planned) {
-  plist::Dictionary entry = {{todo::kIdentifier, planned.app.identifier}};
+  plist::Dictionary entry = {{todo::kIdentifier, planned.name.identifier}};
   entry.set(todo::kOperation, isTransfer(planned) ? todo::kInstall : todo::kRemove);
-  if (isTransfer(planned) && !planned.app.version.empty()) entry.set(todo::kVersion, planned.app.version);
-  if (isTransfer(planned) && !planned.app.name.empty()) entry.set(todo::kName, planned.app.name);
+  if (isTransfer(planned) && !planned.name.version.empty()) entry.set(todo::kVersion, planned.name.version);
+  if (isTransfer(planned) && !planned.name.name.empty()) entry.set(todo::kName, planned.name.name);
   return entry;
 }
 
@@ -44,11 +44,11 @@ plist::Array todoList(const std::vector<PlannedApp>& plan) {
   return list;
 }
 
-/// The icons where they are, without those of removed apps, and new apps behind them.
+/// Returns the present icon order without removed apps, followed by the new apps.
 plist::Array iconLayout(device::Device& device, const std::vector<PlannedApp>& plan) {
   std::set<std::string_view> removed;
   for (const PlannedApp& planned : plan) {
-    if (planned.work == PlannedWork::remove) removed.insert(planned.app.identifier);
+    if (planned.work == PlannedWork::remove) removed.insert(planned.name.identifier);
   }
   plist::Array layout;
   std::set<std::string> present;
@@ -58,8 +58,8 @@ plist::Array iconLayout(device::Device& device, const std::vector<PlannedApp>& p
     }
   }
   for (const PlannedApp& planned : plan) {
-    if (isTransfer(planned) && present.insert(planned.app.identifier).second)
-      layout.emplace_back(planned.app.identifier);
+    if (isTransfer(planned) && present.insert(planned.name.identifier).second)
+      layout.emplace_back(planned.name.identifier);
   }
   return layout;
 }
@@ -69,8 +69,8 @@ Status writeList(FileSystem& files, const std::string& path, const plist::Value&
   return bytes ? files.createFile(path, *bytes, {}) : Status(bytes.error());
 }
 
-/// The staged info dictionary names the icon as it is staged: the package's own name for it may be any path.
-Status writeFace(FileSystem& files, const std::string& folder, device::PackageInfo package) {
+/// Sets the icon's staged name in the staged info dictionary: its name in the package may be any path.
+Status stageAppFiles(FileSystem& files, const std::string& folder, device::PackageInfo package) {
   if (package.icon) package.info.set(platform::kBundleIconFileKey, kIconName);
   const Result<Bytes> info = plist::writeBinary(package.info);
   if (!info) return info.error();
@@ -87,10 +87,10 @@ Status writeFace(FileSystem& files, const std::string& folder, device::PackageIn
 
 Status stageApp(FileSystem& files, const PlannedApp& planned) {
   Result<device::PackageInfo> package = device::readPackageInfo(planned.package->path);
-  return package ? writeFace(files, stagedPath(planned.app.identifier), *std::move(package)) : Status();
+  return package ? stageAppFiles(files, stagedPath(planned.name.identifier), *std::move(package)) : Status();
 }
 
-/// The first failure, in the plan's order.
+/// Stages the apps in parallel. Returns the first failure in the plan's order.
 Status stageApps(FileSystem& files, const std::vector<PlannedApp>& plan) {
   std::vector<Status> staged(plan.size());
   inParallel(plan.size(), [&](std::size_t number) {

@@ -1,4 +1,4 @@
-// The host's side of the folder through which host and plug-in meet.
+// The host's side of the staging folder, through which host and plug-in exchange files.
 #pragma once
 
 #include <string>
@@ -10,18 +10,18 @@
 
 namespace appsync::host {
 
-/// Where the packages of a sync are put, beside the staging folder; relative to the public staging folder.
+/// The folder for the packages of a sync, relative to the public staging folder.
 inline constexpr std::string_view kPackagesFolder = "ApplicationPackages";
 
-/// Writes what the device has to know before the packages come: the todo list, the icon layout with new apps at its
-/// end, and of each app that is to come its info dictionary, icon, store metadata and artwork, in a folder named by its
-/// identifier. What an earlier sync left in the staging folder goes first.
+/// Writes the files that the plug-in needs before the packages: the todo list, the icon layout with new apps at its
+/// end, and for each app to install its info dictionary, icon, store metadata and artwork, in a folder named after its
+/// identifier. Removes the files of an earlier sync first.
 ///
-/// Errors: those of the device's file system, each with what to do. Of a package that cannot be read only its app's
-/// folder is left out; the installer will say why.
+/// Fails with the errors of the device's file system and then leaves nothing behind. For a package that cannot be read
+/// only the app's folder is omitted; the installer reports the reason.
 [[nodiscard]] Status stage(device::Device& device, const std::vector<PlannedApp>& plan);
 
-/// Removes everything that was staged and sent and is not in use any more.
+/// Removes all staged files and sent packages. No sync may be running.
 void clearStaging(device::Device& device);
 
 }  // namespace appsync::host

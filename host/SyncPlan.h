@@ -1,4 +1,4 @@
-// What is to be done with each app in a sync.
+// The planned work of a sync for each app.
 #pragma once
 
 #include <cstdint>
@@ -17,17 +17,17 @@ enum class PlannedWork : std::uint8_t {
   install,
   update,
   remove,
-  restore,  ///< the device's store brings the package
-  none,     ///< the app is as it should be
-  skip,     ///< left alone on purpose
+  restore,  ///< the device's store delivers the package
+  none,     ///< the app is up to date
+  skip,     ///< deliberately left as it is
   refuse,   ///< cannot be done
 };
 
 struct PlannedApp {
-  AppName app;
+  AppName name;
   PlannedWork work = PlannedWork::none;
-  const LibraryPackage* package = nullptr;  ///< of installs and updates
-  std::string reason;                       ///< why nothing is done; of a removal, why the app may stay
+  const LibraryPackage* package = nullptr;  ///< null except for installs and updates
+  std::string reason;                       ///< why nothing is done; for a removal, the reason if the app stays
 };
 
 struct PlanInput {
@@ -35,15 +35,15 @@ struct PlanInput {
   /// By identifier.
   const std::map<std::string, DeviceApp, std::less<>>& deviceApps;
   const IdentifierSet& declined;
-  /// When not empty, the only apps that are installed or updated.
+  /// If not empty, the only apps to install or update.
   const IdentifierSet& only;
   const IdentifierSet& remove;
-  /// Restored apps whose packages are the device's store's to bring.
+  /// Restored apps whose packages the device's store delivers.
   const IdentifierSet& fromStore;
 };
 
-/// One entry for each app concerned: first the removals, then restored apps whose packages the library does not bring,
-/// then the library's apps by identifier, then its broken packages. The packages stay the library's.
+/// Returns one entry for each affected app: first the removals, then restored apps whose packages are not in the
+/// library, then the library's apps by identifier, then its broken packages. Entries point to the library's packages.
 [[nodiscard]] std::vector<PlannedApp> makePlan(const PlanInput& input);
 
 }  // namespace appsync::host

@@ -6,9 +6,9 @@
 namespace appsync::host {
 namespace {
 
-/// What an app weighs beside its bytes: placeholder, record and the rest of the work that does not depend on its size.
+/// Weight of an app in addition to its bytes: the work that does not depend on its size, such as its placeholder.
 constexpr double kFixedWeight = 100'000;
-/// The part of an app's progress that is its transfer.
+/// The transfer's share of an app's progress.
 constexpr double kSendingShare = 0.5;
 constexpr double kSmallestStep = 0.01;
 constexpr auto kShortestTimeBetweenReports = std::chrono::milliseconds(50);
@@ -20,7 +20,7 @@ void SyncProgress::expect(const AppName& app, std::uint64_t bytes) {
   if (finished_.contains({app.kind, app.identifier})) return;
   const auto [place, isNew] = running_.try_emplace(app.identifier);
   if (!isNew) return;
-  place->second.app = app;
+  place->second.name = app;
   place->second.weight = kFixedWeight + static_cast<double>(bytes);
   weight_ += place->second.weight;
   ++expected_;
@@ -39,7 +39,7 @@ void SyncProgress::waits(std::string_view identifier, std::string_view reason) {
   const auto found = running_.find(identifier);
   if (found == running_.end() || found->second.stage == AppStage::waiting) return;
   found->second.stage = AppStage::waiting;
-  reporter_.waits(found->second.app, reason);
+  reporter_.waits(found->second.name, reason);
   report(found->second);
 }
 
@@ -55,7 +55,7 @@ void SyncProgress::interrupted() {
 
 bool SyncProgress::finish(const AppOutcome& outcome) {
   const std::lock_guard lock(mutex_);
-  const AppName& app = outcome.app;
+  const AppName& app = outcome.name;
   if (!finished_.emplace(app.kind, app.identifier).second) return false;
   const auto found = app.kind == NameKind::app ? running_.find(app.identifier) : running_.end();
   if (found != running_.end()) {
@@ -75,7 +75,7 @@ void SyncProgress::finishExpected(std::string_view identifier, AppEvent event, s
     const std::lock_guard lock(mutex_);
     const auto found = running_.find(identifier);
     if (found == running_.end()) return;
-    outcome.app = found->second.app;
+    outcome.name = found->second.name;
   }
   finish(outcome);
 }
@@ -93,15 +93,15 @@ void SyncProgress::advance(std::string_view identifier, AppStage stage, double f
   Running& running = found->second;
   moveTo(running, fraction);
   const bool isNewStage = std::exchange(running.stage, stage) != stage;
-  const bool isWorthIt = running.fraction - running.reported >= kSmallestStep &&
-                         Clock::now() - running.reportedAt >= kShortestTimeBetweenReports;
-  if (isNewStage || isWorthIt) report(running);
+  const bool isDue = running.fraction - running.reported >= kSmallestStep &&
+                     Clock::now() - running.reportedAt >= kShortestTimeBetweenReports;
+  if (isNewStage || isDue) report(running);
 }
 
 void SyncProgress::report(Running& running) {
   running.reported = running.fraction;
   running.reportedAt = Clock::now();
-  reporter_.progressed({running.app, running.stage, running.fraction, overall_, arrived_, expected_});
+  reporter_.progressed({running.name, running.stage, running.fraction, overall_, arrived_, expected_});
 }
 
 void SyncProgress::moveTo(Running& running, double fraction) {

@@ -1,4 +1,4 @@
-// How far a sync is, from what its threads tell.
+// The progress of a sync, collected from its threads.
 #pragma once
 
 #include <chrono>
@@ -14,8 +14,8 @@
 
 namespace appsync::host {
 
-/// Turns reports on single apps into progress that never goes back and into exactly one outcome for each app, and
-/// passes both on to the reporter, progress not more often than people and machines can use. Threads: any.
+/// Combines the progress of single apps into one fraction that never decreases, ensures exactly one outcome for each
+/// app, and passes both to the reporter, progress at a limited rate. Thread-safe.
 class SyncProgress {
  public:
   using Clock = std::chrono::steady_clock;
@@ -23,33 +23,33 @@ class SyncProgress {
   /// `reporter` must outlive it.
   explicit SyncProgress(SyncReporter& reporter) : reporter_(reporter) {}
 
-  /// An app that is to be sent; the whole weighs apps by the bytes of their packages.
+  /// Adds an app that will be sent. Apps are weighted by the size of their packages, `bytes`.
   void expect(const AppName& app, std::uint64_t bytes);
 
   void sending(std::string_view identifier, double fraction);
   void installing(std::string_view identifier, double fraction);
   void waits(std::string_view identifier, std::string_view reason);
 
-  /// The user asked for an end. May be told again and again.
+  /// Reports that the user interrupted the sync. Idempotent.
   void interrupted();
 
-  /// Something that the user should know and that is no app's end.
+  /// Reports a problem that concerns no single app.
   void warn(std::string_view sentence);
 
-  /// The app's end, or a package file's. Only the first one of a name counts; returns whether it was that.
+  /// Reports the outcome of an app or a package file. Returns false and does nothing if it already has an outcome.
   bool finish(const AppOutcome& outcome);
-  /// The same for an app that is expected, named as it was then; does nothing for others.
+  /// Reports the outcome of an app that was added by `expect` and has none yet. Does nothing for other apps.
   void finishExpected(std::string_view identifier, AppEvent event, std::string_view reason);
 
-  /// Tells the reporter that it was all. The outcomes, in the order in which they came.
+  /// Has the reporter summarise the sync. Returns the outcomes in the order of arrival.
   const AppOutcomes& summarise();
 
  private:
   struct Running {
-    AppName app;
+    AppName name;
     double weight = 0;
     double fraction = 0;
-    double reported = -1;  // the fraction that the reporter knows
+    double reported = -1;  // the fraction last passed to the reporter
     AppStage stage = AppStage::sending;
     Clock::time_point reportedAt;
   };
@@ -60,7 +60,7 @@ class SyncProgress {
 
   SyncReporter& reporter_;
   std::mutex mutex_;
-  // Under mutex_, as are the calls of the reporter:
+  // Guarded by mutex_, as are the calls of the reporter:
   std::map<std::string, Running, std::less<>> running_;
   std::set<std::pair<NameKind, std::string>> finished_;
   AppOutcomes outcomes_;

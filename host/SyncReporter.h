@@ -1,4 +1,4 @@
-// Those who are told how a sync goes.
+// The interface through which a sync reports its progress.
 #pragma once
 
 #include <cstddef>
@@ -9,14 +9,14 @@
 
 namespace appsync::host {
 
-/// What is reported on.
-enum class Course : std::uint8_t { sync, restore };
+/// The operation that is reported.
+enum class OperationKind : std::uint8_t { sync, restore };
 
 enum class AppStage : std::uint8_t { sending, installing, waiting };
 
-/// How far one app is, and the whole sync. Fractions run from 0 to 1 and never go back.
+/// The progress of one app and of the whole sync. Fractions are from 0 to 1 and never decrease.
 struct AppProgress {
-  const AppName& app;
+  const AppName& name;
   AppStage stage = AppStage::sending;
   double fraction = 0;
   double overall = 0;
@@ -24,21 +24,21 @@ struct AppProgress {
   std::size_t allApps = 0;
 };
 
-/// Threads: one call at a time.
+/// Not thread-safe: callers must serialise the calls.
 class SyncReporter {
  public:
   virtual ~SyncReporter() = default;
 
   virtual void progressed(const AppProgress& progress) = 0;
-  /// The app waits for something outside; told once per wait.
+  /// The app waits for an external event. Called once per wait.
   virtual void waits(const AppName& app, std::string_view reason) = 0;
-  /// The user asked for an end, and the sync is on its way there. Once.
+  /// The user interrupted the sync, which is ending. Called at most once.
   virtual void interrupted() = 0;
-  /// Something that the user should know and that is no app's end: a sentence.
+  /// A problem that concerns no single app: a sentence.
   virtual void warned(std::string_view sentence) = 0;
-  /// Exactly once for each app.
+  /// Called exactly once for each app.
   virtual void finished(const AppOutcome& outcome) = 0;
-  /// Once, at the end.
+  /// Called once, at the end.
   virtual void summarise(const AppOutcomes& outcomes) = 0;
 };
 

@@ -1,4 +1,4 @@
-// Something that is done again and again.
+// Periodic work on a dedicated thread.
 #pragma once
 
 #include <chrono>
@@ -9,7 +9,10 @@
 
 namespace appsync::host {
 
-/// Calls a function on a thread of its own, with a pause after each call, until it is destroyed.
+/// How often the state of the device is polled where nothing notifies of a change.
+inline constexpr std::chrono::milliseconds kTimeBetweenLooks(20);
+
+/// Calls a function on a dedicated thread, with a pause after each call. The destructor waits for a running call.
 class Ticker {
  public:
   Ticker(std::chrono::milliseconds pause, std::function<void()> tick)

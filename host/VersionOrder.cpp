@@ -5,7 +5,7 @@
 namespace appsync::host {
 namespace {
 
-/// Takes what stands before the next '.' off `rest`.
+/// Removes the text before the next '.' from `rest` and returns it.
 std::string_view takeComponent(std::string_view& rest) {
   const std::size_t end = std::min(rest.find('.'), rest.size());
   const std::string_view component = rest.substr(0, end);
@@ -13,7 +13,7 @@ std::string_view takeComponent(std::string_view& rest) {
   return component;
 }
 
-/// Takes the leading digits off `component`, without zeros in front.
+/// Removes the leading digits from `component` and returns them without leading zeros.
 std::string_view takeNumber(std::string_view& component) {
   const std::size_t end = std::min(component.find_first_not_of("0123456789"), component.size());
   std::string_view digits = component.substr(0, end);

@@ -1,4 +1,4 @@
-// Which of two versions is the newer.
+// The order of versions.
 #pragma once
 
 #include <compare>
@@ -6,8 +6,8 @@
 
 namespace appsync::host {
 
-/// Compares component by component, split at '.': by the number that a component starts with, whatever its length, then
-/// by the text after it. Absent components count as 0, so "1.0" and "1.0.0" are the same version.
+/// Compares the components between the '.'s: first by the number at their start, which may have any length, then by the
+/// text after it. Missing components count as 0, so "1.0" and "1.0.0" are equivalent.
 [[nodiscard]] std::weak_ordering compareVersions(std::string_view left, std::string_view right);
 
 }  // namespace appsync::host

@@ -6,8 +6,8 @@ _appsync_apps() {
   "$program" apps "$device" --json 2>/dev/null | sed -n 's/^ *"identifier": "\([A-Za-z0-9._-]*\)",*$/\1/p'
 }
 
-# _appsync_offer BEFORE CANDIDATE...: those that go on from what is typed, where BEFORE is what stands in front of each in
-# the same word. Readline replaces only what follows the last = or : of a word.
+# _appsync_offer BEFORE CANDIDATE...: offers the candidates that start with the typed word. BEFORE precedes each candidate
+# in the same word. Readline replaces only the part after the last = or : of a word.
 _appsync_offer() {
   local before="$1" candidate
   shift
@@ -23,7 +23,7 @@ _appsync_offer_apps() {
   _appsync_offer "$1" ${apps[@]+"${apps[@]/%/${2-}}"}
 }
 
-# _appsync_offer_paths BEFORE KIND: KIND is what compgen calls them, "file" or "directory".
+# _appsync_offer_paths BEFORE KIND: KIND is an action of compgen, "file" or "directory".
 _appsync_offer_paths() {
   local paths
   mapfile -t paths < <(compgen -A "$2" -- "${typed:${#1}}")
@@ -92,12 +92,12 @@ _appsync_options() {
 
 _appsync() {
   local line="${COMP_LINE:0:COMP_POINT}" words=() word option='' awaited='' positionals=()
-  # shellcheck disable=SC2162 # the backslashes go, as the shell takes them away
+  # shellcheck disable=SC2162 # backslashes are removed, as by the shell
   read -a words <<<"$line"
   [[ "$line" != *[!\\][[:blank:]] ]] || words+=('')
   COMPREPLY=()
 
-  # What is typed of the word, and how much of that Readline keeps.
+  # The typed part of the word, and the part of it that Readline keeps.
   local piece="${2//[\\\"\']/}" typed="${words[-1]#[\"\']}" kept
   [[ "$typed" == *"$piece" ]] || typed="$piece" # blanks in quotes
   kept="${typed%"$piece"}"
@@ -127,7 +127,7 @@ _appsync() {
   elif [[ "$typed" == -* ]]; then
     _appsync_options "${words[1]}"
   elif [[ "${words[1]}" == sync && $expected -ge 2 ]]; then
-    _appsync_offer_value "$option" '' # --remove and --only take several
+    _appsync_offer_value "$option" '' # --remove and --only accept several apps
   else
     _appsync_offer_positional "${words[1]}" "$((expected + 1))"
   fi

@@ -28,7 +28,7 @@ function __appsync_positionals
     end
 end
 
-# Whether --remove or --only of a sync may go on: they take several apps.
+# Whether --remove or --only of a sync may take another app: they accept several.
 function __appsync_names_apps
     __appsync_expects sync; and test (count (__appsync_positionals)) -ge 2
     and string match -qr -- '^--(remove|only)(=|$)' (__appsync_words)
@@ -43,7 +43,7 @@ function __appsync_apps
     $program apps $device --json 2>/dev/null | string replace -rf '^ *"identifier": "([A-Za-z0-9._-]*)",?$' '$1'
 end
 
-# __appsync_paths BEFORE FUNCTION: what FUNCTION completes of the word after BEFORE.
+# __appsync_paths BEFORE FUNCTION: completes the part of the word after BEFORE with FUNCTION.
 function __appsync_paths
     set -l typed (commandline -ct)
     string match -q -- "$argv[1]*" $typed; or return 0
@@ -77,26 +77,26 @@ function __appsync_settings
     end
 end
 
-# Files where nothing else is said, and only there.
+# Files are completed only where -F is given.
 complete -c appsync -f
 complete -c appsync -s h -l help -d 'Print this help message and exit'
 complete -c appsync -n 'test (count (commandline -opc)) -eq 1' -l version -d 'Print the name and the version and exit'
 
 for command in \
-    'init:Make a new, empty device' \
-    "pack:Turn an app's folder into a package" \
-    'sync:Bring the apps on a device in step with a library' \
-    "backup:Save what a device's apps need to come back" \
-    'restore:Bring the apps of a backup back to a new device' \
-    'tap:Have a running sync bring an app before the others' \
-    'cancel:Have a running sync leave an app out' \
+    'init:Create an empty device' \
+    "pack:Create a package from an app's folder" \
+    'sync:Sync the apps on a device with a library' \
+    "backup:Back up the apps on a device" \
+    'restore:Restore the apps of a backup to a new device' \
+    'tap:Have a running sync send an app before the others' \
+    'cancel:Have a running sync skip an app' \
     'apps:List the apps on a device' \
-    'report:Tell how many apps a device holds, and whose they are' \
+    'report:Report the number, size and accounts of the apps on a device' \
     "screen:Draw the device's home screen" \
-    'history:Show what was installed and removed, and how that went' \
+    'history:Show the log of installs and removals' \
     "set:Change a device's settings" \
-    'clear:Forget everything about earlier syncs' \
-    'plist:Convert a property list, or look into it'
+    'clear:Remove the state of earlier syncs' \
+    'plist:Convert or show a property list'
     set -l parts (string split -m 1 : $command)
     complete -c appsync -n 'test (count (commandline -opc)) -eq 1' -a $parts[1] -d $parts[2]
 end
@@ -113,8 +113,8 @@ complete -c appsync -n '__appsync_expects tap 1; or __appsync_expects cancel 1' 
 complete -c appsync -n '__appsync_names_apps' -a '(__appsync_apps)'
 complete -c appsync -n '__appsync_expects set; and not __appsync_expects set 0' -a '(__appsync_settings)'
 
-complete -c appsync -n '__appsync_expects init' -l coordinated -d 'install through coordinators, also when not said'
-complete -c appsync -n '__appsync_expects init' -l direct -d 'let the sync install packages itself'
+complete -c appsync -n '__appsync_expects init' -l coordinated -d 'install through coordinators (default)'
+complete -c appsync -n '__appsync_expects init' -l direct -d 'install packages in the sync itself'
 complete -c appsync -n '__appsync_expects pack' -s o -l output -rF -d 'the package to write; - is standard output'
 complete -c appsync -n '__appsync_expects sync' -l remove -x -a '(__appsync_apps)' -d 'remove this app from the device'
 complete -c appsync -n '__appsync_expects sync' -l only -x -a '(__appsync_apps)' \
@@ -128,5 +128,5 @@ for command in apps report history
 end
 complete -c appsync -n '__appsync_expects screen' -s o -l output -rF -d 'the PNG file to write; - is standard output'
 complete -c appsync -n '__appsync_expects plist' -l to -x -a 'xml binary json' \
-    -d 'the form to write: xml (when not said), binary or json'
+    -d 'the format to write: xml (default), binary or json'
 complete -c appsync -n '__appsync_expects plist' -s o -l output -rF -d 'write to this file instead of standard output'

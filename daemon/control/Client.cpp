@@ -9,23 +9,23 @@
 namespace appsync::daemon {
 namespace {
 
-/// More than several others need who are served before.
-constexpr auto kPatience = std::chrono::seconds(10);
+/// Longer than the server needs for several earlier clients.
+constexpr auto kTimeout = std::chrono::seconds(10);
 
-Error explained(const std::string& devicePath, const Error& error) {
+Error explain(const std::string& devicePath, const Error& error) {
   const auto say = [&](const std::string& sentence) {
     return Error{std::string(domains::kPOSIX), error.code, devicePath + ": " + sentence, nullptr};
   };
   switch (error.code) {
     case ENOENT:
     case ECONNREFUSED:
-      return say("no sync is running; start one with `appsync sync`, and ask while it runs");
+      return say("no sync is running; start `appsync sync`, and repeat this command while it runs");
     case ECONNRESET:
     case EPIPE:
-      return say("the sync has just ended; what it did not bring is offered again at the next one");
+      return say("the sync has just ended; the next sync offers the apps that it did not install");
     case EACCES:
     case EPERM:
-      return say("the sync that is running is another user's; ask as that user");
+      return say("the running sync belongs to another user; run this command as that user");
     case ETIMEDOUT:
     case EAGAIN:
       return say("the sync does not answer; try again");
@@ -39,21 +39,23 @@ Result<std::string> converse(const std::string& devicePath, const std::string& l
   if (!folder) return folder.error();
   const Result<device::FileDescriptor> connection = connectIn(folder->get());
   if (!connection) return connection.error();
-  const ControlPatience patience(kPatience, -1);
-  const Status sent = writeLine(connection->get(), line, patience);
-  // Whoever closed the connection may have said why.
+  const Deadline deadline(kTimeout, -1);
+  const Status sent = writeLine(connection->get(), line, deadline);
+  // A server that closes the connection early may have sent the reason.
   if (!sent && sent.error().code != EPIPE) return sent.error();
-  return readLine(connection->get(), patience);
+  return readLine(connection->get(), deadline);
 }
 
 }  // namespace
 
 Result<ControlAnswer> askSync(const std::string& devicePath, const ControlRequest& request) {
   const Result<std::string> line = converse(devicePath, lineOf(request));
-  if (!line) return explained(devicePath, line.error());
+  if (!line) return explain(devicePath, line.error());
   std::optional<ControlAnswer> answer = readAnswer(*line);
   if (!answer)
-    return Error{std::string(domains::kPOSIX), EPROTO, devicePath + ": the sync's answer is not understood", nullptr};
+    return Error{std::string(domains::kPOSIX), EPROTO,
+                 devicePath + ": the sync's answer is not valid; use the same release of appsync for both commands",
+                 nullptr};
   return *std::move(answer);
 }
 

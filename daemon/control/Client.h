@@ -1,4 +1,4 @@
-// The way from another process to a running sync.
+// Client end of a sync's control socket.
 #pragma once
 
 #include <string>
@@ -8,8 +8,8 @@
 
 namespace appsync::daemon {
 
-/// Asks the sync that runs on a device, and waits for its answer, though not for long. Errors: "POSIX", with a sentence
-/// that says what to do: no sync runs, it is another user's, or it does not answer.
+/// Sends a request to the sync that is running on a device and waits for its answer, with a time-out. Errors: "POSIX",
+/// with a text that says what to do: no sync is running, it belongs to another user, or it does not answer.
 [[nodiscard]] Result<ControlAnswer> askSync(const std::string& devicePath, const ControlRequest& request);
 
 }  // namespace appsync::daemon

@@ -8,7 +8,7 @@
 namespace appsync::daemon {
 namespace {
 
-// By their enumerations' values.
+// Indexed by the enumerators' values.
 constexpr std::array<std::string_view, 2> kVerbs = {"prioritize", "cancel"};
 constexpr std::array<std::string_view, 3> kResults = {"done", "refused", "error"};
 
@@ -19,7 +19,7 @@ std::optional<std::size_t> indexOf(std::string_view word, const std::array<std::
   return static_cast<std::size_t>(found - words.begin());
 }
 
-/// Takes the first word off `line`; what is left starts behind one blank.
+/// Removes the first word and one space from `line` and returns the word.
 std::string_view takeWord(std::string_view& line) {
   const std::size_t end = std::min(line.find(' '), line.size());
   const std::string_view word = line.substr(0, end);

@@ -1,4 +1,4 @@
-// What a running sync is asked by other processes, and what it answers: one line each way.
+// Requests of other processes to a running sync, and its answers: one line each.
 #pragma once
 
 #include <cstddef>
@@ -9,12 +9,12 @@
 
 namespace appsync::daemon {
 
-/// The longest line of either side, its end included.
+/// Maximum length of a line in bytes, including its end.
 inline constexpr std::size_t kLongestControlLine = 1024;
 
 enum class ControlVerb : std::uint8_t {
-  prioritize,  ///< "prioritize ID": this app before the others
-  cancel,      ///< "cancel ID": this app not at all
+  prioritize,  ///< "prioritize ID": send this app before the others
+  cancel,      ///< "cancel ID": do not send this app
 };
 
 struct ControlRequest {
@@ -25,23 +25,24 @@ struct ControlRequest {
 
 enum class ControlResult : std::uint8_t {
   done,     ///< "done"
-  refused,  ///< "refused WHY": asked well, but not to be had
-  error,    ///< "error WHY": not understood, or not this caller's to ask
+  refused,  ///< "refused WHY": a valid request that cannot be carried out
+  error,    ///< "error WHY": an invalid request, or one by another user
 };
 
 struct ControlAnswer {
   ControlResult result = ControlResult::error;
-  std::string why;  ///< a sentence for people; empty when it was done
+  std::string why;  ///< a sentence for the user; empty if done
   bool operator==(const ControlAnswer&) const = default;
 };
 
-/// Lines as they are sent, with their end. What would not fit into one is cut.
+/// Returns the line to send, including its end. Longer texts are truncated.
 [[nodiscard]] std::string lineOf(const ControlRequest& request);
 [[nodiscard]] std::string lineOf(const ControlAnswer& answer);
 
-/// A line without its end, from anyone; none when it is no request. An identifier is one that an app can have.
+/// Parses a line without its end, which is untrusted input. Returns nullopt if it is not a request for a valid bundle
+/// identifier.
 [[nodiscard]] std::optional<ControlRequest> readRequest(std::string_view line);
-/// The same for an answer.
+/// Parses a line without its end. Returns nullopt if it is not an answer.
 [[nodiscard]] std::optional<ControlAnswer> readAnswer(std::string_view line);
 
 }  // namespace appsync::daemon

@@ -16,15 +16,35 @@ namespace {
 
 using namespace std::chrono_literals;
 
-/// For one connection, from its acceptance to its end.
-constexpr auto kPatience = 2s;
-/// For connections to come; then the wait begins anew.
-constexpr auto kLongestPause = 1h;
-/// When the system is out of something that an accepted connection needs.
-constexpr auto kRest = 100ms;
+/// For a request and for its answer.
+constexpr auto kTimeout = 2s;
+/// For the next connection; the wait is then repeated.
+constexpr auto kAcceptTimeout = 1h;
+/// Pause before the next attempt when the system lacks resources for a connection.
+constexpr auto kRetryPause = 100ms;
+
+bool isBeingInstalled(device::InstallCoordination& coordination, const std::string& identifier) {
+  return coordination.coordinatorForApp(platform::CoordinatorKind::any, identifier,
+                                        platform::ClientIdentity::CXClientSync, platform::IfMissing::findNothing,
+                                        nullptr, nullptr) != nullptr;
+}
+
+ControlAnswer carryOut(device::InstallCoordination& coordination, const ControlRequest& request) {
+  const std::string& identifier = request.identifier;
+  if (!isBeingInstalled(coordination, identifier)) {
+    return {ControlResult::refused, identifier + " is not being installed; `appsync apps` shows which apps wait"};
+  }
+  if (request.verb == ControlVerb::prioritize) {
+    if (coordination.prioritize(identifier)) return {ControlResult::done, {}};
+    return {ControlResult::refused, "the install of " + identifier + " has just ended"};
+  }
+  const Status cancelled = coordination.cancelByUser(identifier);
+  if (cancelled) return {ControlResult::done, {}};
+  return {ControlResult::refused, identifier + " cannot be cancelled: " + cancelled.error().text};
+}
 
 std::string whyUnread(const Error& error) {
-  return error.code == EMSGSIZE ? "the request is too long" : "the request did not come to its end";
+  return error.code == EMSGSIZE ? "the request is too long" : "the request is incomplete";
 }
 
 }  // namespace
@@ -49,7 +69,7 @@ ControlServer::ControlServer(device::FileDescriptor folder, device::FileDescript
       thread_([this] { run(); }) {}
 
 ControlServer::~ControlServer() {
-  // Nobody can connect any more, and whoever waits for an answer finds the connection closed.
+  // No client can connect any more, and the connections of waiting clients are closed.
   static_cast<void>(::unlinkat(folder_.get(), kControlSocket, 0));
   static_cast<void>(::eventfd_write(wake_.get(), 1));
   thread_.join();
@@ -57,29 +77,35 @@ ControlServer::~ControlServer() {
 
 void ControlServer::run() {
   for (;;) {
-    const Status ready = ControlPatience(kLongestPause, wake_.get()).await(socket_.get(), POLLIN);
+    const Status ready = Deadline(kAcceptTimeout, wake_.get()).await(socket_.get(), POLLIN);
     if (!ready && ready.error().code == ECANCELED) return;
     const device::FileDescriptor connection(::accept4(socket_.get(), nullptr, nullptr, SOCK_CLOEXEC | SOCK_NONBLOCK));
     if (connection.valid()) {
       serve(connection.get());
     } else if (errno != EAGAIN && errno != EINTR && errno != ECONNABORTED) {
-      ControlPatience(kRest, wake_.get()).await(-1, 0).ignore();
+      Deadline(kRetryPause, wake_.get()).await(-1, 0).ignore();
     }
   }
 }
 
 void ControlServer::serve(int connection) {
   const ControlAnswer answer = answerTo(connection);
-  // Whoever does not wait for the answer does not want it.
-  writeLine(connection, lineOf(answer), ControlPatience(kPatience, wake_.get())).ignore();
+  // A client may disconnect without waiting for the answer.
+  writeLine(connection, lineOf(answer), Deadline(kTimeout, wake_.get())).ignore();
 }
 
 ControlAnswer ControlServer::answerTo(int connection) {
-  if (!isOfThisUser(connection)) return {ControlResult::error, "the sync is another user's"};
-  const Result<std::string> line = readLine(connection, ControlPatience(kPatience, wake_.get()));
+  if (!isOfThisUser(connection)) return {ControlResult::error, "the sync belongs to another user"};
+  const Result<std::string> line = readLine(connection, Deadline(kTimeout, wake_.get()));
   if (!line) return {ControlResult::error, whyUnread(line.error())};
   const std::optional<ControlRequest> request = readRequest(*line);
-  return request ? handler_(*request) : ControlAnswer{ControlResult::error, "the request is not understood"};
+  return request ? handler_(*request) : ControlAnswer{ControlResult::error, "the request is not valid"};
+}
+
+Result<std::unique_ptr<ControlServer>> openSyncControl(device::Device& device) {
+  device::InstallCoordination& coordination = device.services().installCoordination();
+  return ControlServer::open(
+      device.path(), [&coordination](const ControlRequest& request) { return carryOut(coordination, request); });
 }
 
 }  // namespace appsync::daemon

@@ -1,4 +1,4 @@
-// A running sync's ear for other processes.
+// Server end of a sync's control socket.
 #pragma once
 
 #include <functional>
@@ -8,21 +8,23 @@
 
 #include "base/Error.h"
 #include "daemon/control/Protocol.h"
+#include "device/Device.h"
 #include "device/storage/FileDescriptor.h"
 
 namespace appsync::daemon {
 
-/// Answers one request at a time on a thread of its own, for as long as it lives. Who says nothing, or too much, is
-/// given up after a moment and holds up neither the sync nor its end.
+/// Answers one request at a time on a dedicated thread. Clients that send nothing, or more than one line, are
+/// disconnected after a time-out. They delay neither the sync nor the destructor.
 class ControlServer {
  public:
-  /// Carries out a request; called on the server's thread.
+  /// Carries out a request. Called on the server's thread.
   using Handler = std::function<ControlAnswer(const ControlRequest&)>;
 
-  /// Begins to listen in the device's folder. The caller holds the device.
+  /// Creates the socket in the device's folder and starts the thread. The caller must have exclusive access to the
+  /// device.
   [[nodiscard]] static Result<std::unique_ptr<ControlServer>> open(const std::string& devicePath, Handler handler);
 
-  /// Removes the socket; the handler is not called any more.
+  /// Removes the socket and waits for a running call of the handler.
   ~ControlServer();
   ControlServer(const ControlServer&) = delete;
   ControlServer& operator=(const ControlServer&) = delete;
@@ -41,5 +43,9 @@ class ControlServer {
   const Handler handler_;
   std::thread thread_;
 };
+
+/// Serves the requests for a running sync, as actions of the device's user, while the returned server exists. Fails if
+/// the socket cannot be created. `device` must outlive the server.
+[[nodiscard]] Result<std::unique_ptr<ControlServer>> openSyncControl(device::Device& device);
 
 }  // namespace appsync::daemon

@@ -18,9 +18,9 @@
 namespace appsync::daemon {
 namespace {
 
-constexpr int kWaitingConnections = 16;
-/// For a place among the waiting connections.
-constexpr timeval kLongestConnect = {10, 0};
+constexpr int kQueuedConnections = 16;
+/// For a place in the server's queue of connections.
+constexpr timeval kConnectTimeout = {10, 0};
 
 sockaddr_un addressIn(int folder) {
   sockaddr_un address = {};
@@ -33,12 +33,12 @@ const sockaddr* generic(const sockaddr_un& address) {
   return reinterpret_cast<const sockaddr*>(&address);
 }
 
-Error failure(int number) {
-  return Error::fromErrno(number, "the socket through which other processes reach a sync");
+Error failure(int error) {
+  return Error::fromErrno(error, "the control socket of the sync");
 }
 
-bool isPassing(int number) {
-  return number == EAGAIN || number == EINTR;
+bool isTransient(int error) {
+  return error == EAGAIN || error == EINTR;
 }
 
 }  // namespace
@@ -50,7 +50,7 @@ Result<device::FileDescriptor> listenIn(int folder) {
   // The mode of a socket that is not bound yet becomes that of its file.
   const bool listens = socket.valid() && ::fchmod(socket.get(), 0600) == 0 &&
                        ::bind(socket.get(), generic(address), sizeof address) == 0 &&
-                       ::listen(socket.get(), kWaitingConnections) == 0;
+                       ::listen(socket.get(), kQueuedConnections) == 0;
   if (!listens) return failure(errno);
   return socket;
 }
@@ -60,7 +60,7 @@ Result<device::FileDescriptor> connectIn(int folder) {
   const sockaddr_un address = addressIn(folder);
   const bool isConnected =
       socket.valid() &&
-      ::setsockopt(socket.get(), SOL_SOCKET, SO_SNDTIMEO, &kLongestConnect, sizeof kLongestConnect) == 0 &&
+      ::setsockopt(socket.get(), SOL_SOCKET, SO_SNDTIMEO, &kConnectTimeout, sizeof kConnectTimeout) == 0 &&
       ::connect(socket.get(), generic(address), sizeof address) == 0 && ::fcntl(socket.get(), F_SETFL, O_NONBLOCK) == 0;
   if (!isConnected) return failure(errno);
   return socket;
@@ -78,7 +78,7 @@ bool isOfThisUser(int connection) {
   return ::getsockopt(connection, SOL_SOCKET, SO_PEERCRED, &peer, &size) == 0 && peer.uid == ::geteuid();
 }
 
-Status ControlPatience::await(int file, short events) const {
+Status Deadline::await(int file, short events) const {
   for (;;) {
     const auto left = std::chrono::ceil<std::chrono::milliseconds>(end_ - std::chrono::steady_clock::now());
     if (left.count() <= 0) return failure(ETIMEDOUT);
@@ -90,13 +90,13 @@ Status ControlPatience::await(int file, short events) const {
   }
 }
 
-Result<std::string> readLine(int connection, const ControlPatience& patience) {
+Result<std::string> readLine(int connection, const Deadline& deadline) {
   std::string line;
   std::array<char, kLongestControlLine> piece = {};
   while (line.size() < kLongestControlLine) {
-    RETURN_IF_ERROR(patience.await(connection, POLLIN));
+    RETURN_IF_ERROR(deadline.await(connection, POLLIN));
     const ssize_t count = ::recv(connection, piece.data(), kLongestControlLine - line.size(), 0);
-    if (count < 0 && isPassing(errno)) continue;
+    if (count < 0 && isTransient(errno)) continue;
     if (count <= 0) return failure(count < 0 ? errno : ECONNRESET);
     const std::string_view arrived(piece.data(), static_cast<std::size_t>(count));
     const std::size_t end = arrived.find('\n');
@@ -106,11 +106,11 @@ Result<std::string> readLine(int connection, const ControlPatience& patience) {
   return failure(EMSGSIZE);
 }
 
-Status writeLine(int connection, std::string_view line, const ControlPatience& patience) {
+Status writeLine(int connection, std::string_view line, const Deadline& deadline) {
   while (!line.empty()) {
-    RETURN_IF_ERROR(patience.await(connection, POLLOUT));
+    RETURN_IF_ERROR(deadline.await(connection, POLLOUT));
     const ssize_t count = ::send(connection, line.data(), line.size(), MSG_NOSIGNAL);
-    if (count < 0 && !isPassing(errno)) return failure(errno);
+    if (count < 0 && !isTransient(errno)) return failure(errno);
     if (count > 0) line.remove_prefix(static_cast<std::size_t>(count));
   }
   return {};

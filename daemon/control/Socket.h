@@ -1,4 +1,4 @@
-// The Unix socket in a device's folder through which other processes reach a running sync.
+// The Unix socket in a device's folder that connects other processes to a running sync.
 #pragma once
 
 #include <chrono>
@@ -13,28 +13,28 @@ namespace appsync::daemon {
 /// The socket's name in the device's folder.
 inline constexpr const char* kControlSocket = "control";
 
-/// Makes the socket, in place of one that a killed sync left, and listens. Only this user can ever connect to it: it is
-/// made with the mode 0600, and not narrowed to it afterwards. The caller holds the device. `folder` is its folder,
-/// through which the socket is named: a socket's address is too short for many a path.
+/// Creates the socket with mode 0600, so that only this user can connect, and listens. Replaces the socket of a crashed
+/// sync. `folder` is the open folder of the device, to which the caller must have exclusive access: the socket's
+/// address is relative to it, because it is too short for long paths.
 [[nodiscard]] Result<device::FileDescriptor> listenIn(int folder);
 
-/// Connects to the sync that listens in that folder. ENOENT and ECONNREFUSED: there is none.
+/// Connects to the sync that listens in that folder. Fails with ENOENT or ECONNREFUSED if no sync listens.
 [[nodiscard]] Result<device::FileDescriptor> connectIn(int folder);
 
-/// Opens a device's folder for the two.
+/// Opens a device's folder for `listenIn` and `connectIn`.
 [[nodiscard]] Result<device::FileDescriptor> openControlFolder(const std::string& devicePath);
 
-/// Whether the process at the other end runs as this user.
+/// Returns whether the peer process runs as this user.
 [[nodiscard]] bool isOfThisUser(int connection);
 
-/// Waits for connections, and for lines of a connection, no longer than allowed.
-class ControlPatience {
+/// The end of a wait for connections or lines.
+class Deadline {
  public:
-  /// `wake` is a file that becomes readable when waiting is to end early, or -1.
-  ControlPatience(std::chrono::milliseconds longest, int wake)
-      : end_(std::chrono::steady_clock::now() + longest), wake_(wake) {}
+  /// `wake` is a file descriptor that becomes readable to end the wait early, or -1.
+  Deadline(std::chrono::milliseconds timeout, int wake)
+      : end_(std::chrono::steady_clock::now() + timeout), wake_(wake) {}
 
-  /// Until `file` is ready for `events` of poll. Errors: ETIMEDOUT, and ECANCELED when woken.
+  /// Blocks until `file` is ready for the poll `events`. Errors: ETIMEDOUT, or ECANCELED if `wake` is readable.
   [[nodiscard]] Status await(int file, short events) const;
 
  private:
@@ -42,10 +42,10 @@ class ControlPatience {
   int wake_;
 };
 
-/// A whole line without its end. Errors: EMSGSIZE when it is longer than a line may be, ECONNRESET when the other side
-/// leaves before its end, and those of waiting.
-[[nodiscard]] Result<std::string> readLine(int connection, const ControlPatience& patience);
-/// `line` with its end.
-[[nodiscard]] Status writeLine(int connection, std::string_view line, const ControlPatience& patience);
+/// Reads a line and returns it without its end. Errors: EMSGSIZE if the line is too long, ECONNRESET if the peer
+/// disconnects before its end, and those of `Deadline::await`.
+[[nodiscard]] Result<std::string> readLine(int connection, const Deadline& deadline);
+/// Writes `line`, which includes its end. Errors: those of the socket and of `Deadline::await`.
+[[nodiscard]] Status writeLine(int connection, std::string_view line, const Deadline& deadline);
 
 }  // namespace appsync::daemon

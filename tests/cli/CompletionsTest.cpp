@@ -1,4 +1,4 @@
-// What bash, zsh and fish offer to complete, each asked the way it asks itself.
+// The completions in bash, zsh and fish, by the shells themselves.
 #include <map>
 #include <ostream>
 #include <set>
@@ -57,7 +57,7 @@ class Completions : public ToolFixture, public testing::WithParamInterface<Shell
     write(path("file.txt"), "");
   }
 
-  /// What the shell offers for each line, a word that it completes only in part whole.
+  /// Returns the shell's completions of each line, as complete words.
   [[nodiscard]] OffersByLine offersFor(const std::vector<std::string>& lines) const {
     const Shell& shell = GetParam();
     std::vector<std::string> words = shell.withoutConfiguration;
@@ -85,7 +85,7 @@ class Completions : public ToolFixture, public testing::WithParamInterface<Shell
   }
 
  private:
-  /// Lines, and below each what is offered: indented, and whatever is said of it behind a tabulator.
+  /// Parses lines, each followed by its completions: indented, with a description after a tab.
   static OffersByLine offersIn(const std::string& output) {
     OffersByLine all;
     std::istringstream rest(output);
@@ -103,18 +103,18 @@ class Completions : public ToolFixture, public testing::WithParamInterface<Shell
   TemporaryFolder home_;
 };
 
-TEST_P(Completions, EveryCommandIsOfferedAndNothingElse) {
+TEST_P(Completions, OffersExactlyTheCommands) {
   expectOffers({{"appsync ", namesIn(helpOf().commands)}, {"appsync s", {"sync", "screen", "set"}}, {"appsync x", {}}});
 }
 
-TEST_P(Completions, EveryOptionOfEveryCommandIsOfferedAndNoOther) {
+TEST_P(Completions, OffersExactlyTheOptions) {
   OffersByLine expected = {{"appsync -", namesIn(helpOf().options)}};
   for (const std::string& command : namesIn(helpOf().commands))
     expected["appsync " + command + " -"] = namesIn(helpOf(command).options);
   expectOffers(expected);
 }
 
-TEST_P(Completions, EveryDeviceIsAFolder) {
+TEST_P(Completions, OffersFoldersAsDevices) {
   OffersByLine expected;
   for (const std::string& command : namesIn(helpOf().commands)) {
     const std::vector<std::string> positionals = helpOf(command).positionals;
@@ -125,7 +125,7 @@ TEST_P(Completions, EveryDeviceIsAFolder) {
   expectOffers(expected);
 }
 
-TEST_P(Completions, LibrariesBackupsAndAppFoldersAreFolders) {
+TEST_P(Completions, OffersFoldersAsOtherArguments) {
   expectOffers({{"appsync sync device ", {"device", "library"}},
                 {"appsync sync device l", {"library"}},
                 {"appsync sync --json device l", {"library"}},
@@ -136,11 +136,11 @@ TEST_P(Completions, LibrariesBackupsAndAppFoldersAreFolders) {
                 {"appsync pack f", {}}});
 }
 
-TEST_P(Completions, AnArgumentTooManyIsNotOffered) {
+TEST_P(Completions, OffersNoExcessArgument) {
   expectOffers({{"appsync apps device l", {}}, {"appsync sync device library l", {}}, {"appsync clear device l", {}}});
 }
 
-TEST_P(Completions, FilesAreOfferedWhereFilesAreMeant) {
+TEST_P(Completions, OffersFilesAsFileArguments) {
   expectOffers({{"appsync plist f", {"file.txt"}},
                 {"appsync plist -o f", {"file.txt"}},
                 {"appsync plist --output f", {"file.txt"}},
@@ -151,11 +151,11 @@ TEST_P(Completions, FilesAreOfferedWhereFilesAreMeant) {
                 {"appsync sync device library --log=f", {"--log=file.txt"}}});
 }
 
-TEST_P(Completions, TheFormsOfAPropertyListAreOffered) {
+TEST_P(Completions, OffersPropertyListFormats) {
   expectOffers({{"appsync plist --to ", {"xml", "binary", "json"}}, {"appsync plist --to=b", {"--to=binary"}}});
 }
 
-TEST_P(Completions, TheAppsOfTheDeviceAreOffered) {
+TEST_P(Completions, OffersAppsOfTheDevice) {
   expectOffers({{"appsync tap device ", {"org.a", "org.b"}},
                 {"appsync cancel device ", {"org.a", "org.b"}},
                 {"appsync sync device library --remove ", {"org.a", "org.b"}},
@@ -164,11 +164,11 @@ TEST_P(Completions, TheAppsOfTheDeviceAreOffered) {
                 {"appsync sync device library --only=org.b", {"--only=org.b"}}});
 }
 
-TEST_P(Completions, WithoutADeviceThereAreNoApps) {
+TEST_P(Completions, OffersNoAppsWithoutDevice) {
   expectOffers({{"appsync tap library ", {}}, {"appsync tap nowhere ", {}}, {"appsync set library demote=", {}}});
 }
 
-TEST_P(Completions, TheKeysOfSettingsAreOffered) {
+TEST_P(Completions, OffersKeysOfSettings) {
   const Offers keys = {"app-installation=", "app-removal=", "coordination=", "assertion=", "store=",
                        "demote=",           "demote-auto=", "licence="};
   expectOffers({{"appsync set device ", keys},
@@ -176,7 +176,7 @@ TEST_P(Completions, TheKeysOfSettingsAreOffered) {
                 {"appsync set device coo", {"coordination="}}});
 }
 
-TEST_P(Completions, TheValuesOfSettingsAreOffered) {
+TEST_P(Completions, OffersValuesOfSettings) {
   expectOffers({{"appsync set device app-installation=",
                  {"app-installation=yes", "app-installation=no", "app-installation=unset"}},
                 {"appsync set device app-removal=", {"app-removal=yes", "app-removal=no", "app-removal=unset"}},
@@ -193,7 +193,7 @@ TEST_P(Completions, TheValuesOfSettingsAreOffered) {
                 {"appsync set device licence=org.a:f", {"licence=org.a:file.txt"}}});
 }
 
-TEST_P(Completions, CommandsAndOptionsAreDescribedAsInTheHelp) {
+TEST_P(Completions, DescriptionsAreThoseOfTheHelp) {
   if (std::string(GetParam().name) == "bash") return;  // shows no descriptions
   std::ifstream file(scriptsFolder() + "/" + GetParam().script);
   std::string script{std::istreambuf_iterator<char>(file), {}};

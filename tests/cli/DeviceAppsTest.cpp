@@ -1,4 +1,4 @@
-// What is asked of a device whose register stops to be readable while it is open.
+// Commands on a device whose registry becomes unreadable while it is open.
 #include <memory>
 #include <string>
 #include <utility>
@@ -7,7 +7,6 @@
 
 #include "cli/ReportOptions.h"
 #include "cli/StandardOutput.h"
-#include "daemon/ClientModule.h"
 #include "device/Device.h"
 #include "host/BackupWriter.h"
 #include "host/DeviceApps.h"
@@ -17,7 +16,7 @@
 namespace appsync::test {
 namespace {
 
-class UnreadableRegister : public testing::Test {
+class UnreadableRegistry : public testing::Test {
  protected:
   void SetUp() override {
     auto made = device::Device::create(path());
@@ -35,28 +34,26 @@ class UnreadableRegister : public testing::Test {
   std::unique_ptr<device::Device> device_;
 };
 
-TEST_F(UnreadableRegister, IsNotOneWithoutApps) {
+TEST_F(UnreadableRegistry, FailsList) {
   const auto apps = host::appsOn(*device_);
   ASSERT_FALSE(apps.ok());
   EXPECT_EQ(apps.error().text, reason());
 }
 
-TEST_F(UnreadableRegister, IsNotRestoredOver) {
-  const auto client = daemon::makeClient(device_->platform());
-  ASSERT_TRUE(client.ok());
+TEST_F(UnreadableRegistry, FailsRestore) {
   cli::StandardOutput output;
-  const auto reporter = cli::makeReporter({}, output, host::Course::restore);
+  const auto reporter = cli::makeReporter({}, output, host::OperationKind::restore);
   host::SyncProgress progress(*reporter);
   const host::Backup backup{folder_.path("backup"), "a backup", {}, {}};
-  const Status checked = host::Restore(*device_, backup, **client, progress).check();
+  const Status checked = host::Restore(*device_, backup, progress).check();
   ASSERT_FALSE(checked.ok());
   EXPECT_EQ(checked.error().text, reason());
 }
 
-TEST_F(UnreadableRegister, IsNotSaved) {
+TEST_F(UnreadableRegistry, FailsBackup) {
   const auto saved = host::writeBackup(*device_, folder_.path("backup"));
   ASSERT_FALSE(saved.ok());
-  EXPECT_EQ(saved.error().text, folder_.path("backup") + " cannot be written, and is not there: " + reason());
+  EXPECT_EQ(saved.error().text, folder_.path("backup") + " cannot be written and was not created: " + reason());
 }
 
 }  // namespace

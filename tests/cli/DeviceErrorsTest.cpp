@@ -24,22 +24,22 @@ class DeviceErrors : public ToolFixture {
   }
 };
 
-TEST_F(DeviceErrors, AMissingDeviceSaysHowToMakeOne) {
+TEST_F(DeviceErrors, MissingDeviceNamesInit) {
   expectUnusable(runTool({"sync", path("nowhere"), library()}), "appsync init");
 }
 
-TEST_F(DeviceErrors, AFolderThatIsNoDeviceSaysSo) {
+TEST_F(DeviceErrors, RefusesOtherFolder) {
   expectUnusable(runTool({"apps", library()}), "is not a device");
 }
 
-TEST_F(DeviceErrors, ADamagedDatabaseSaysSo) {
+TEST_F(DeviceErrors, ReportsDamagedDatabase) {
   for (const char* file : {"/device.db", "/device.db-wal", "/device.db-shm"}) {
     if (std::filesystem::exists(device() + file)) write(device() + file, std::string(8192, 'x'));
   }
   expectUnusable(sync(), "damaged");
 }
 
-TEST_F(DeviceErrors, ARegisterThatCannotBeReadIsNotAnEmptyOne) {
+TEST_F(DeviceErrors, UnreadableRegistryIsNotEmpty) {
   publish("org.a");
   ASSERT_EQ(sync().status, 0);
   ASSERT_EQ(runTool({"backup", device(), path("backup")}).status, 0);
@@ -60,11 +60,11 @@ TEST_F(DeviceErrors, ARegisterThatCannotBeReadIsNotAnEmptyOne) {
   expectUnusable(runTool({"restore", device(), path("backup")}), reason);
 }
 
-TEST_F(DeviceErrors, AnExistingDeviceIsNotMadeAgain) {
+TEST_F(DeviceErrors, InitRefusesExistingDevice) {
   expectUnusable(runTool({"init", device()}), device());
 }
 
-TEST_F(DeviceErrors, ARefusedSyncEndsItsTransfersAndItself) {
+TEST_F(DeviceErrors, FailedSyncEndsItsTransfers) {
   const std::string folder = device() + "/root/var/mobile/Library/ApplicationSync";
   std::filesystem::remove_all(folder);
   write(folder, "in the way");
@@ -79,7 +79,7 @@ TEST_F(DeviceErrors, ARefusedSyncEndsItsTransfersAndItself) {
   EXPECT_NE(log.find("|sync ended with success: n", transfers), log.npos) << log;
 }
 
-/// A small file system of its own, which only the superuser can mount.
+/// A small file system; needs the superuser to mount it.
 class SmallDisk : public DeviceErrors {
  protected:
   void SetUp() override {
@@ -94,8 +94,8 @@ class SmallDisk : public DeviceErrors {
   [[nodiscard]] std::string disk() const { return path("disk"); }
 };
 
-TEST_F(SmallDisk, AnAppThatDoesNotFitFailsAndTheOthersAreInstalled) {
-  // It is sent first, so that its failing does not take the room from an install that goes on beside it.
+TEST_F(SmallDisk, LargeAppFailsAndOthersAreInstalled) {
+  // It is sent first, so that it does not take disk space from a concurrent install.
   publish("org.0.large", "1.0", {{"Notes.app/large", std::string(4'000'000, 'x')}});
   publish("org.a");
   publish("org.z");
@@ -106,7 +106,7 @@ TEST_F(SmallDisk, AnAppThatDoesNotFitFailsAndTheOthersAreInstalled) {
               testing::UnorderedElementsAre("installed org.a", "failed org.0.large", "installed org.z"));
 }
 
-TEST_F(SmallDisk, AReadOnlyDeviceCanBeLookedAtButNotSynced) {
+TEST_F(SmallDisk, ReadOnlyDeviceCanOnlyBeRead) {
   publish("org.a");
   ASSERT_EQ(::mount("none", disk().c_str(), nullptr, MS_REMOUNT | MS_RDONLY, nullptr), 0);
   EXPECT_EQ(runTool({"sync", disk() + "/device", library()}).status, 3);

@@ -1,4 +1,4 @@
-// Files of the host that are not what they should be: no command waits for ever, none works on what it cannot read.
+// Malicious files of the host: no command blocks forever or uses a file that it cannot read.
 #include <filesystem>
 
 #include <gmock/gmock.h>
@@ -26,35 +26,35 @@ class HostileFiles : public ToolFixture {
   }
 };
 
-TEST_F(HostileFiles, ALicenceThatIsAPipeIsNotWaitedFor) {
+TEST_F(HostileFiles, DoesNotWaitForPipeAsLicence) {
   makePipe(path("pipe"));
   expectUnusable(runTool({"set", device(), "licence=org.a:" + path("pipe")}),
                  path("pipe") + " cannot be read: it is a pipe or a device, not a file");
 }
 
-TEST_F(HostileFiles, ALicenceHasABound) {
+TEST_F(HostileFiles, LimitsTheSizeOfALicence) {
   write(path("licence"), "");
   std::filesystem::resize_file(path("licence"), 16'000'001);
   expectUnusable(runTool({"set", device(), "licence=org.a:" + path("licence")}),
                  path("licence") + " cannot be read: it has more than 16 MB");
 }
 
-TEST_F(HostileFiles, AManifestThatIsAPipeIsNotWaitedFor) {
+TEST_F(HostileFiles, DoesNotWaitForPipeAsManifest) {
   std::filesystem::create_directory(path("backup"));
   makePipe(path("backup/Manifest.plist"));
   expectUnusable(runTool({"restore", device(), path("backup")}),
-                 path("backup") + " is no backup that can be used: " + path("backup/Manifest.plist") +
+                 path("backup") + " is not a usable backup: " + path("backup/Manifest.plist") +
                      " cannot be read: it is a pipe or a device, not a file; name a folder that "
                      "`appsync backup` made");
 }
 
-TEST_F(HostileFiles, ALogThatIsAPipeNobodyReadsIsTold) {
+TEST_F(HostileFiles, ReportsLogPipeWithoutReader) {
   makePipe(path("pipe"));
   expectUnusable(sync({"--log", path("pipe")}),
                  "cannot open log file \"" + path("pipe") + "\": nobody reads from this pipe; start its reader first");
 }
 
-TEST_F(HostileFiles, AHostStateThatCannotBeReadIsNeitherEmptyNorReplaced) {
+TEST_F(HostileFiles, KeepsUnreadableHostState) {
   ASSERT_EQ(sync({"--remove", "org.a"}).status, 0);
   const std::string state = device() + "/host-state.plist";
   write(state, "{");

@@ -1,4 +1,4 @@
-// Libraries that mean ill, or are just broken.
+// Malicious and damaged libraries.
 #include <filesystem>
 
 #include <gmock/gmock.h>
@@ -22,7 +22,7 @@ using testing::UnorderedElementsAre;
 
 class HostileLibrary : public ToolFixtureOfEachMode {
  protected:
-  /// A package whose "Info.plist" is this.
+  /// Adds a package with this "Info.plist".
   void publishInfo(const std::string& fileName, const plist::Dictionary& info) const {
     const Result<Bytes> document = plist::writeBinary(info);
     ASSERT_TRUE(document.ok());
@@ -39,7 +39,7 @@ class HostileLibrary : public ToolFixtureOfEachMode {
 
 INSTANTIATE_TEST_SUITE_P(Modes, HostileLibrary, kModes, nameOfMode);
 
-TEST_P(HostileLibrary, AnIdentifierThatLeadsOutIsRefused) {
+TEST_P(HostileLibrary, RefusesPathAsIdentifier) {
   for (const char* identifier : {"../../escape", "/etc/passwd", "..", "a/../../b", ""}) {
     publishInfo("bad.zip", {{platform::BundleIdentifierKey, identifier}});
     expectOneFailure(sync({"--json"}));
@@ -47,24 +47,24 @@ TEST_P(HostileLibrary, AnIdentifierThatLeadsOutIsRefused) {
   EXPECT_FALSE(std::filesystem::exists(path("escape")));
 }
 
-TEST_P(HostileLibrary, AHugeIdentifierIsRefused) {
+TEST_P(HostileLibrary, RefusesHugeIdentifier) {
   publishInfo("bad.zip", {{platform::BundleIdentifierKey, std::string(65536, 'x')}});
   expectOneFailure(sync({"--json"}));
 }
 
-TEST_P(HostileLibrary, AnIdentifierThatIsNoTextIsRefused) {
+TEST_P(HostileLibrary, RefusesNonStringIdentifier) {
   publishInfo("bad.zip", {{platform::BundleIdentifierKey, 7}});
   expectOneFailure(sync({"--json"}));
 }
 
-TEST_P(HostileLibrary, AnInfoListInBadUTF8IsRefused) {
+TEST_P(HostileLibrary, RefusesInfoInInvalidUTF8) {
   write(library() + "/bad.zip",
         zipArchive({{"Notes.app/Info.plist",
                      "<plist><dict><key>BundleIdentifier</key><string>org.\xff</string></dict></plist>"}}));
   expectOneFailure(sync({"--json"}));
 }
 
-TEST_P(HostileLibrary, AnEscapeSequenceInANameNeverReachesTheTerminal) {
+TEST_P(HostileLibrary, EscapesNames) {
   publishInfo("app.zip", {{platform::BundleIdentifierKey, "org.a"},
                           {platform::kBundleVersionKey, "1\x1b[2J"},
                           {platform::kBundleDisplayNameKey, "\x1b]0;owned\x07\n"}});
@@ -75,7 +75,7 @@ TEST_P(HostileLibrary, AnEscapeSequenceInANameNeverReachesTheTerminal) {
   EXPECT_THAT(runTool({"apps", device()}).out, Not(HasSubstr("\x1b")));
 }
 
-TEST_P(HostileLibrary, AFileNameWithAnEscapeSequenceIsShownSafely) {
+TEST_P(HostileLibrary, EscapesFileNames) {
   write(library() + "/\x1b[31m\xff.zip", "nothing");
   const Finished run = sync();
   EXPECT_EQ(run.status, 1);
@@ -83,7 +83,7 @@ TEST_P(HostileLibrary, AFileNameWithAnEscapeSequenceIsShownSafely) {
   EXPECT_EQ(eventsIn(sync({"--json"}).out).size(), 2U);
 }
 
-TEST_P(HostileLibrary, AnIconOutsideTheAppStagesNothingElsewhere) {
+TEST_P(HostileLibrary, StagesNoIconOutsideTheApp) {
   publishInfo("app.zip", {{platform::BundleIdentifierKey, "org.a"},
                           {platform::kBundleVersionKey, "1.0"},
                           {platform::kBundleIconFileKey, "../../../../../Library/ApplicationSync/RestoreState.plist"}});
@@ -91,24 +91,24 @@ TEST_P(HostileLibrary, AnIconOutsideTheAppStagesNothingElsewhere) {
   EXPECT_FALSE(std::filesystem::exists(device() + "/root/var/mobile/Library/ApplicationSync/RestoreState.plist"));
 }
 
-TEST_P(HostileLibrary, AnEntryThatLeadsOutIsRefused) {
+TEST_P(HostileLibrary, RefusesEntryOutsideTheApp) {
   publish("org.a", "1.0", {{"../../../escape", "x"}});
   expectOneFailure(sync({"--json"}));
 }
 
-TEST_P(HostileLibrary, FoldersHiddenFilesAndOtherFilesArePassedOver) {
+TEST_P(HostileLibrary, IgnoresOtherFiles) {
   std::filesystem::create_directory(library() + "/folder.zip");
   write(library() + "/.hidden.zip", "x");
   write(library() + "/README", "read me");
   EXPECT_EQ(sync().out, "Nothing to do.\n");
 }
 
-TEST_P(HostileLibrary, APackageIsKnownByItsContentToo) {
+TEST_P(HostileLibrary, DetectsPackageByContent) {
   write(library() + "/notes-package", appPackage("org.a"));
   EXPECT_THAT(endsIn(sync({"--json"}).out), ElementsAre("installed org.a"));
 }
 
-TEST_P(HostileLibrary, ABrokenPackageThatIsCalledAsAnAppIsToldBesideIt) {
+TEST_P(HostileLibrary, SeparatesBrokenPackageFromAppOfSameName) {
   publish("org.a");
   write(library() + "/org.a", "PK\x03\x04");
   Finished run = sync({"--json"});
@@ -119,41 +119,41 @@ TEST_P(HostileLibrary, ABrokenPackageThatIsCalledAsAnAppIsToldBesideIt) {
   EXPECT_EQ(run.status, 1);
 }
 
-TEST_P(HostileLibrary, AnUpperCaseSuffixCounts) {
+TEST_P(HostileLibrary, AcceptsUpperCaseSuffix) {
   write(library() + "/NOTES.ZIP", appPackage("org.a"));
   EXPECT_THAT(endsIn(sync({"--json"}).out), ElementsAre("installed org.a"));
 }
 
-TEST_P(HostileLibrary, APipeNamedLikeAPackageDoesNotHang) {
+TEST_P(HostileLibrary, DoesNotWaitForPipe) {
   ASSERT_EQ(::mkfifo((library() + "/pipe.zip").c_str(), 0600), 0);
   EXPECT_THAT(endsIn(sync({"--json"}).out), ElementsAre("failed pipe.zip"));
 }
 
-TEST_P(HostileLibrary, ALinkToNowhereFails) {
+TEST_P(HostileLibrary, DanglingLinkFails) {
   std::filesystem::create_symlink("nowhere", library() + "/link.zip");
   EXPECT_THAT(endsIn(sync({"--json"}).out), ElementsAre("failed link.zip"));
 }
 
-TEST_P(HostileLibrary, ALinkToAPackageIsOne) {
+TEST_P(HostileLibrary, FollowsLinkToPackage) {
   write(path("elsewhere"), appPackage("org.a"));
   std::filesystem::create_symlink(path("elsewhere"), library() + "/link.zip");
   EXPECT_THAT(endsIn(sync({"--json"}).out), ElementsAre("installed org.a"));
 }
 
-TEST_P(HostileLibrary, AMissingLibraryIsUnusable) {
+TEST_P(HostileLibrary, RefusesMissingLibrary) {
   const Finished run = runTool({"sync", device(), path("nowhere")});
   EXPECT_EQ(run.status, 3);
   EXPECT_THAT(run.err, HasSubstr("nowhere"));
 }
 
-TEST_P(HostileLibrary, AFileIsNoLibrary) {
+TEST_P(HostileLibrary, RefusesFileAsLibrary) {
   write(path("file"), "x");
   EXPECT_EQ(runTool({"sync", device(), path("file")}).status, 3);
 }
 
 class LargeLibrary : public ToolFixture {};
 
-/// Counts how often files of a folder are opened; of openings of one file in a row the system may tell one.
+/// Counts how often files of a folder are opened; the system may merge consecutive events of one file.
 class OpeningCounter {
  public:
   explicit OpeningCounter(const std::string& folder) { ::inotify_add_watch(events_.get(), folder.c_str(), IN_OPEN); }
@@ -174,7 +174,7 @@ class OpeningCounter {
   const device::FileDescriptor events_{::inotify_init1(IN_CLOEXEC | IN_NONBLOCK)};
 };
 
-TEST_F(LargeLibrary, IsReadInProportionToItsPackages) {
+TEST_F(LargeLibrary, OpensEachPackageAFewTimes) {
   constexpr int kPackages = 500;
   constexpr int kMostOpenings = 2;  // for the info dictionary and for the icon
   publish("org.a");

@@ -1,4 +1,4 @@
-// What `cmake --install` lays out, as those use it who find nothing else of this repository.
+// The result of `cmake --install`, without access to the repository.
 #include <filesystem>
 #include <fstream>
 #include <iterator>
@@ -52,7 +52,7 @@ Strings quotedIncludesOf(const fs::path& header) {
   return {std::sregex_token_iterator(text.begin(), text.end(), kInclude, 1), std::sregex_token_iterator()};
 }
 
-TEST_F(Install, EveryHeaderFindsTheOthersThatItIncludes) {
+TEST_F(Install, EveryHeaderCompiles) {
   std::size_t found = 0;
   for (const fs::directory_entry& entry : fs::recursive_directory_iterator(headers())) {
     if (!entry.is_regular_file()) continue;
@@ -65,7 +65,7 @@ TEST_F(Install, EveryHeaderFindsTheOthersThatItIncludes) {
   EXPECT_GT(found, 100);
 }
 
-TEST_F(Install, ThePublicHeadersNeedOneIncludeRootAndTheStandardLibrary) {
+TEST_F(Install, PublicHeadersNeedOneIncludeRoot) {
   write(path("user.cpp"),
         "#include \"core/AppsClient.h\"\n#include \"platform/SyncFiles.h\"\n#include \"platform/Module.h\"\n");
   const Finished compiled = run(kCompiler, {"-std=c++20", "-fsyntax-only", "-I" + headers(), path("user.cpp")});
@@ -84,7 +84,7 @@ TEST_F(Install, PkgConfigFindsLibrariesAndModule) {
   for (const fs::directory_entry& entry : fs::recursive_directory_iterator(prefix())) {
     if (entry.path().filename() == "appsync.pc") folder = entry.path().parent_path().string();
   }
-  const ToolOptions there = {.environment = {{"PKG_CONFIG_PATH", folder}}, .output = OutputTo::file, .input = {}};
+  const ToolOptions there = {.environment = {{"PKG_CONFIG_PATH", folder}}};
   const Finished module = run("pkg-config", {"--variable=module", "appsync"}, there);
   EXPECT_TRUE(fs::exists(module.out.substr(0, module.out.find('\n')))) << module.out << module.err;
 
@@ -97,7 +97,7 @@ TEST_F(Install, PkgConfigFindsLibrariesAndModule) {
   EXPECT_EQ(linked.status, 0) << linked.err;
 }
 
-TEST_F(Install, ThereIsHelpInEachForm) {
+TEST_F(Install, InstallsManPagesAndCompletions) {
   for (const char* file : {"man/man1/appsync.1", "man/man1/appsync-sync.1", "bash-completion/completions/appsync",
                            "zsh/site-functions/_appsync", "fish/vendor_completions.d/appsync.fish"})
     EXPECT_TRUE(fs::exists(prefix() + "/share/" + file)) << file;

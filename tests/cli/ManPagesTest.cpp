@@ -1,4 +1,4 @@
-// The man pages against the tool: each is whole, and tells of what there is and of nothing else.
+// The man pages describe exactly the commands, options and keys of the tool.
 #include <filesystem>
 #include <regex>
 #include <set>
@@ -27,7 +27,7 @@ std::string pageOf(const std::string& command) {
   return {std::istreambuf_iterator<char>(file), {}};
 }
 
-/// The lines of a section, without its title.
+/// Returns the lines of a section without its title.
 std::string section(const std::string& page, const std::string& title) {
   const std::string heading = ".Sh " + title + "\n";
   const std::size_t start = page.find(heading);
@@ -36,13 +36,13 @@ std::string section(const std::string& page, const std::string& title) {
   return page.substr(start + heading.size(), end == std::string::npos ? end : end + 1 - start - heading.size());
 }
 
-/// What `pattern` catches in `text`, wherever it matches.
+/// Returns the first group of each match of `pattern` in `text`.
 Names caughtIn(const std::string& text, const std::string& pattern) {
   const std::regex expression(pattern);
   return {std::sregex_token_iterator(text.begin(), text.end(), expression, 1), std::sregex_token_iterator()};
 }
 
-/// The options that the items of a list name, as "-o" and "--output".
+/// Returns the options in the items of a list, as "-o" and "--output".
 Names optionsIn(const std::string& list) {
   Names options;
   for (const std::string& item : caughtIn(list, "\\.It (Fl .*)")) {
@@ -52,7 +52,7 @@ Names optionsIn(const std::string& list) {
   return options;
 }
 
-/// The words in quotes.
+/// Returns the quoted words.
 Names quotedIn(const std::string& text) {
   return caughtIn(text, "\\.(?:It )?Ql ([A-Za-z]+)");
 }
@@ -77,7 +77,7 @@ Names keysOf(const cli::Json& object) {
   return keys;
 }
 
-TEST(ManPages, EveryCommandHasOneAndThereAreNoOthers) {
+TEST(ManPages, EveryCommandHasExactlyOne) {
   Names expected;
   for (const std::string& command : allPages())
     expected.insert(std::filesystem::path(pagePath(command)).filename());
@@ -87,7 +87,7 @@ TEST(ManPages, EveryCommandHasOneAndThereAreNoOthers) {
   EXPECT_EQ(found, expected);
 }
 
-TEST(ManPages, RenderWithoutAWarning) {
+TEST(ManPages, RenderWithoutWarnings) {
   for (const std::string& command : allPages()) {
     const Finished run = runProgram("groff", {"-mandoc", "-Tutf8", "-P-cbou", "-ww", pagePath(command)});
     EXPECT_EQ(run.status, 0) << command;
@@ -96,14 +96,13 @@ TEST(ManPages, RenderWithoutAWarning) {
   }
 }
 
-TEST(ManPages, AMistakeInOneIsFound) {
+TEST(ManPages, RendererReportsMistakes) {
   const Finished run =
-      runProgram("groff", {"-mandoc", "-Tutf8", "-ww"},
-                 {.environment = {}, .output = OutputTo::file, .input = ".Dd June 1, 2026\n.Dt A 1\n.Os\n.Nosuch\n"});
+      runProgram("groff", {"-mandoc", "-Tutf8", "-ww"}, {.input = ".Dd June 1, 2026\n.Dt A 1\n.Os\n.Nosuch\n"});
   EXPECT_THAT(run.err, HasSubstr("Nosuch"));
 }
 
-TEST(ManPages, TellTheSamePurposeAsTheHelp) {
+TEST(ManPages, HaveThePurposeOfTheHelp) {
   for (const auto& [command, purpose] : helpOf().commands) {
     std::string small = purpose;
     small[0] = static_cast<char>(std::tolower(static_cast<unsigned char>(small[0])));
@@ -114,7 +113,7 @@ TEST(ManPages, TellTheSamePurposeAsTheHelp) {
   }
 }
 
-TEST(ManPages, NameEveryOptionAndNoOther) {
+TEST(ManPages, NameExactlyTheOptions) {
   for (const std::string& command : allPages()) {
     Names expected;
     for (const auto& [option, description] : helpOf(command).options)
@@ -123,7 +122,7 @@ TEST(ManPages, NameEveryOptionAndNoOther) {
   }
 }
 
-TEST(ManPages, NameEveryArgumentAndNoOther) {
+TEST(ManPages, NameExactlyTheArguments) {
   for (const std::string& command : allCommands()) {
     const std::vector<std::string> positionals = helpOf(command).positionals;
     const std::string arguments = section(pageOf(command), "ARGUMENTS");
@@ -131,7 +130,7 @@ TEST(ManPages, NameEveryArgumentAndNoOther) {
   }
 }
 
-TEST(ManPages, ShowAnExampleAsTheHelpDoes) {
+TEST(ManPages, HaveAnExample) {
   for (const std::string& command : allCommands()) {
     const std::string help = runTool({command, "--help"}).out;
     EXPECT_THAT(help, HasSubstr("\n  appsync " + command + " "));
@@ -139,7 +138,7 @@ TEST(ManPages, ShowAnExampleAsTheHelpDoes) {
   }
 }
 
-TEST(ManPages, NameEverySettingAndNoOther) {
+TEST(ManPages, NameExactlyTheSettings) {
   const std::string help = runTool({"set", "--help"}).out;
   const std::string keys = help.substr(0, help.find("Examples:"));
   EXPECT_EQ(caughtIn(pageOf("set"), "\\.It Cm ([a-z-]+) Ns ="), caughtIn(keys, "\n  ([a-z-]+) +[a-zA-Z]"));
@@ -155,19 +154,19 @@ class JsonInManPages : public ToolFixture {
   static std::string jsonOf(const std::string& command) { return section(pageOf(command), "JSON"); }
 };
 
-TEST_F(JsonInManPages, OfAppsNamesEveryKeyAndNoOther) {
+TEST_F(JsonInManPages, AppsNamesExactlyTheKeys) {
   ASSERT_EQ(sync().status, 1);
   const cli::Json apps = cli::Json::parse(runTool({"apps", device(), "--json"}).out);
   EXPECT_EQ(caughtIn(jsonOf("apps"), "\\.It Ql (.*)"), keysOf(apps.at(0)));
 }
 
-TEST_F(JsonInManPages, OfHistoryNamesEveryKeyAndNoOther) {
+TEST_F(JsonInManPages, HistoryNamesExactlyTheKeys) {
   ASSERT_EQ(sync().status, 1);
   const cli::Json events = cli::Json::parse(runTool({"history", device(), "--json"}).out);
   EXPECT_EQ(caughtIn(jsonOf("history"), "\\.It Ql (.*)"), keysOf(events.at(0)));
 }
 
-TEST_F(JsonInManPages, OfAReportNamesEveryKeyAndNoOther) {
+TEST_F(JsonInManPages, ReportNamesExactlyTheKeys) {
   publish("org.b", "1.0", {{"HarvoMetadata.plist", "{corvelId = x;}"}});
   ASSERT_EQ(sync().status, 1);
   const cli::Json report = cli::Json::parse(runTool({"report", device(), "--json"}).out);
@@ -180,7 +179,7 @@ TEST_F(JsonInManPages, OfAReportNamesEveryKeyAndNoOther) {
   EXPECT_EQ(caughtIn(jsonOf("report"), "\\.(?:It )?Ql ([A-Za-z-]+)"), seen);
 }
 
-TEST_F(JsonInManPages, OfASyncNamesEveryEventAndKey) {
+TEST_F(JsonInManPages, SyncNamesEveryEventAndKey) {
   Names seen = {"event"};
   for (const std::vector<std::string>& words : {std::vector<std::string>{}, {"--remove", "org.a"}}) {
     for (const cli::Json& event : eventsIn(sync(words.empty() ? std::vector<std::string>{"--json"}
@@ -191,11 +190,11 @@ TEST_F(JsonInManPages, OfASyncNamesEveryEventAndKey) {
       seen.insert(std::string(event.at("event")));
     }
   }
-  seen.insert("waiting");  // of a home screen that does not let go of an app
+  seen.insert("waiting");  // needs a home screen that does not release an app
   EXPECT_EQ(quotedIn(jsonOf("sync")), seen);
 }
 
-TEST_F(JsonInManPages, OfARestoreNamesEveryEventAndKey) {
+TEST_F(JsonInManPages, RestoreNamesEveryEventAndKey) {
   ASSERT_EQ(sync().status, 1);
   ASSERT_EQ(runTool({"backup", device(), path("backup")}).status, 0);
   ASSERT_EQ(runTool({"init", path("new")}).status, 0);

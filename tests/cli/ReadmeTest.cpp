@@ -1,4 +1,4 @@
-// README.md, followed to the letter.
+// The commands of README.md.
 #include <filesystem>
 
 #include <gmock/gmock.h>
@@ -20,7 +20,7 @@ std::string readme() {
   return {std::istreambuf_iterator<char>(file), {}};
 }
 
-/// The commands of a section: what is indented by four blanks, without these.
+/// Returns the commands of a section: its lines that are indented by four spaces.
 std::string commandsIn(const std::string& title) {
   std::istringstream text(readme());
   std::string commands;
@@ -39,7 +39,7 @@ std::vector<std::string> namesIn(const std::string& folder) {
   return names;
 }
 
-TEST(Readme, WhatItSaysToTypeWorks) {
+TEST(Readme, CommandsWork) {
   const TemporaryFolder clone;
   const TemporaryFolder home;
   std::filesystem::create_directory_symlink(std::string(kSourceFolder) + "/samples", clone.path("samples"));

@@ -22,13 +22,13 @@ using testing::Not;
 
 class Report : public ToolFixture {
  protected:
-  /// Installs an app with this metadata, or with none.
+  /// Installs an app with this metadata or, for nullopt, without.
   void install(const std::string& identifier, const plist::Value& metadata = {}) const {
     publish(identifier);
     ASSERT_EQ(sync().status, 0);
     if (!metadata.isNull()) write(metadataOf(identifier), std::string(textOf(*plist::writeBinary(metadata))));
   }
-  /// Where the metadata of an installed app lies on this machine.
+  /// Returns the host path of an installed app's metadata.
   [[nodiscard]] std::string metadataOf(const std::string& identifier) const {
     const auto opened = device::Device::open(device(), device::Access::readOnly);
     const auto app =
@@ -48,7 +48,7 @@ class Report : public ToolFixture {
   [[nodiscard]] std::vector<std::string> identifiers() const { return json().at("corvelIDs"); }
 };
 
-TEST_F(Report, TellsAppsAccountsAndRestrictions) {
+TEST_F(Report, ShowsAppsAccountsAndRestrictions) {
   install("org.a", owned({{"CorvelID", "grace"}, {"DSPersonID", 7}, {"AltDSID", "000-7"}}));
   install("org.b", owned({{"CorvelID", "ada"}}));
   install("org.c");
@@ -72,7 +72,7 @@ TEST_F(Report, TellsAppsAccountsAndRestrictions) {
                               "  grace  DSID 7  altDSID 000-7\n");
 }
 
-TEST_F(Report, AsJsonIsOneObjectWithTheDocumentedKeys) {
+TEST_F(Report, JsonHasTheDocumentedKeys) {
   install("org.a", owned({{"CorvelID", "grace"}, {"DSPersonID", 0xFFFF'FFFF'FFFF'FFFFU}, {"AltDSID", "000-7"}}));
   install("org.b", plist::Dictionary{{"corvelId", "ada"}});
   ASSERT_EQ(runTool({"set", device(), "app-installation=yes"}).status, 0);
@@ -88,7 +88,7 @@ TEST_F(Report, AsJsonIsOneObjectWithTheDocumentedKeys) {
     "restrictions": {"app-installation": "yes", "app-removal": "unset"}})"));
 }
 
-TEST_F(Report, SizesAreThoseOfTheList) {
+TEST_F(Report, SizesEqualThoseOfApps) {
   install("org.a");
   install("org.b");
   std::uint64_t sum = 0;
@@ -97,7 +97,7 @@ TEST_F(Report, SizesAreThoseOfTheList) {
   EXPECT_EQ(json().at("metrics").at("physicalSize"), sum);
 }
 
-TEST_F(Report, OfADeviceWithoutAppsIsEmpty) {
+TEST_F(Report, EmptyDeviceHasEmptyReport) {
   EXPECT_EQ(report().out,
             "apps               0, 0 bytes\ncan be purged      0 bytes\napp-installation   unset\n"
             "app-removal        unset\n");
@@ -105,13 +105,13 @@ TEST_F(Report, OfADeviceWithoutAppsIsEmpty) {
   EXPECT_THAT(json().at("accounts"), IsEmpty());
 }
 
-TEST_F(Report, WhereNothingMayBeInstalledOrRemovedApplicationsAreDisabled) {
+TEST_F(Report, RestrictionsDisableApplications) {
   ASSERT_EQ(runTool({"set", device(), "app-removal=no", "app-installation=no"}).status, 0);
   EXPECT_THAT(report().out, HasSubstr("\n\ndisabled\n  Application\n"));
   EXPECT_EQ(json().at("disabledAssetTypes"), Json::array({"Application"}));
 }
 
-TEST_F(Report, BothIdentifiersOfAnAppThatDisagreesWithItselfAreTold) {
+TEST_F(Report, ShowsBothInconsistentIdentifiers) {
   plist::Dictionary metadata = owned({{"CorvelID", "newer"}});
   metadata.set("corvelId", "older");
   install("org.a", metadata);
@@ -119,7 +119,7 @@ TEST_F(Report, BothIdentifiersOfAnAppThatDisagreesWithItselfAreTold) {
   EXPECT_EQ(json().at("accounts").size(), 1U);
 }
 
-TEST_F(Report, NothingInMetadataReachesTheTerminalAsACommand) {
+TEST_F(Report, EscapesMetadata) {
   install("org.a", owned({{"CorvelID", "\x1b[2J\xe2\x80\xae"}, {"AltDSID", "\x07\n"}}));
   install("org.b", owned({{"CorvelID", ""}, {"AltDSID", std::string(100'000, 'x')}}));
   const Finished plain = report();
@@ -130,26 +130,26 @@ TEST_F(Report, NothingInMetadataReachesTheTerminalAsACommand) {
   EXPECT_THAT(identifiers(), ElementsAre("", "\x1b[2J\xe2\x80\xae"));
 }
 
-TEST_F(Report, ANumberThatJsonCannotHoldIsNull) {
+TEST_F(Report, NonFiniteNumberIsNull) {
   install("org.a", owned({{"CorvelID", "x"}, {"DSPersonID", std::numeric_limits<double>::quiet_NaN()}}));
   EXPECT_EQ(json().at("accounts").at(0).at("DSID"), nullptr);
 }
 
-TEST_F(Report, ADeviceThatAnotherProcessHoldsCanBeReportedOn) {
+TEST_F(Report, WorksDuringSync) {
   install("org.a", plist::Dictionary{{"corvelId", "x"}});
   const auto held = device::Device::open(device(), device::Access::exclusive);
   ASSERT_TRUE(held.ok());
   EXPECT_THAT(identifiers(), ElementsAre("x"));
 }
 
-TEST_F(Report, AMissingDeviceSaysHowToMakeOne) {
+TEST_F(Report, MissingDeviceNamesInit) {
   const Finished finished = runTool({"report", path("nowhere"), "--json"});
   EXPECT_EQ(finished.status, 3);
   EXPECT_EQ(finished.out, "");
   EXPECT_THAT(finished.err, HasSubstr("appsync init"));
 }
 
-/// Of three apps the second's metadata means ill: the report has the others' accounts, and nothing of its.
+/// The second of three apps has malicious metadata: the report has the accounts of the others only.
 class HostileMetadata : public Report {
  protected:
   void SetUp() override {
@@ -171,7 +171,7 @@ class HostileMetadata : public Report {
   std::string metadata_;
 };
 
-TEST_F(HostileMetadata, OfWrongTypesAtEveryKeyCostsOnlyItsApp) {
+TEST_F(HostileMetadata, WrongTypesAffectOnlyTheirApp) {
   for (const char* document : {"(a)", "text", "{corvelId = (x);}", "{corvelId = {};}", "{corvelId = <00>;}",
                                "{\"com.corvel.HarvoStore.downloadInfo\" = x;}",
                                "{\"com.corvel.HarvoStore.downloadInfo\" = {accountInfo = x;};}",
@@ -182,12 +182,12 @@ TEST_F(HostileMetadata, OfWrongTypesAtEveryKeyCostsOnlyItsApp) {
   }
 }
 
-TEST_F(HostileMetadata, ThatIsMissingCostsOnlyItsApp) {
+TEST_F(HostileMetadata, MissingMetadataAffectsOnlyItsApp) {
   std::filesystem::remove(metadata());
   expectTheOthers();
 }
 
-TEST_F(HostileMetadata, ThatIsTruncatedOrNoTextCostsOnlyItsApp) {
+TEST_F(HostileMetadata, TruncatedMetadataAffectsOnlyItsApp) {
   for (const char* document : {"", "bplist00", "{corvelId = x", "<plist><dict><key>corvelId</key><string>x",
                                "<plist><dict><key>corvelId</key><string>\xff</string></dict></plist>"}) {
     SCOPED_TRACE(document);
@@ -196,24 +196,24 @@ TEST_F(HostileMetadata, ThatIsTruncatedOrNoTextCostsOnlyItsApp) {
   }
 }
 
-TEST_F(HostileMetadata, ThatCannotBeReadCostsOnlyItsApp) {
+TEST_F(HostileMetadata, UnreadableMetadataAffectsOnlyItsApp) {
   std::filesystem::remove(metadata());
   ASSERT_EQ(::mkfifo(metadata().c_str(), 0600), 0);
   expectTheOthers();
 }
 
-TEST_F(HostileMetadata, OfAHundredMegabytesCostsOnlyItsApp) {
+TEST_F(HostileMetadata, HugeMetadataAffectsOnlyItsApp) {
   std::filesystem::resize_file(metadata(), 100 << 20);
   expectTheOthers();
 }
 
-TEST_F(HostileMetadata, ThatIsAFolderCostsOnlyItsApp) {
+TEST_F(HostileMetadata, FolderAsMetadataAffectsOnlyItsApp) {
   std::filesystem::remove(metadata());
   std::filesystem::create_directory(metadata());
   expectTheOthers();
 }
 
-TEST_F(HostileMetadata, ThatIsALinkOutOfTheDeviceCostsOnlyItsApp) {
+TEST_F(HostileMetadata, LinkAsMetadataAffectsOnlyItsApp) {
   write(path("outside.plist"), "{corvelId = stolen;}");
   for (const std::string& target : {path("outside.plist"), std::string("../../../../../../../outside.plist")}) {
     std::filesystem::remove(metadata());

@@ -1,4 +1,4 @@
-// What people and machines read of a sync.
+// The reports of a sync for users and programs.
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
@@ -18,43 +18,43 @@ host::AppOutcome outcome(host::AppEvent event, std::string reason = {}) {
   return {event, kTides, std::move(reason)};
 }
 
-TEST(ReportLines, ASuccessIsOneLine) {
+TEST(ReportLines, SuccessIsOneLine) {
   EXPECT_EQ(outcomeLine(outcome(host::AppEvent::installed)), "installed  Tides 1.2");
 }
 
-TEST(ReportLines, WhatIsUpToDateIsNotWorthALine) {
+TEST(ReportLines, UnchangedAppHasNoLine) {
   EXPECT_EQ(outcomeLine(outcome(host::AppEvent::unchanged)), "");
 }
 
-TEST(ReportLines, ASkippedAppSaysWhy) {
+TEST(ReportLines, SkippedAppHasReason) {
   EXPECT_EQ(outcomeLine(outcome(host::AppEvent::skipped, "it is raining")), "skipped    Tides 1.2: it is raining");
 }
 
-TEST(ReportLines, AFailureNamesAppIdentifierAndReason) {
+TEST(ReportLines, FailureNamesAppAndReason) {
   EXPECT_EQ(failureSentence(outcome(host::AppEvent::failed, "it is damaged")),
             "Tides 1.2 (org.example.tides) failed: it is damaged");
 }
 
-TEST(ReportLines, AnAppWithoutANameIsShownByIdentifier) {
+TEST(ReportLines, ShowsIdentifierOfUnnamedApp) {
   EXPECT_EQ(failureSentence({host::AppEvent::failed, {"broken.zip", "", ""}, "it is damaged"}),
             "broken.zip failed: it is damaged");
 }
 
-TEST(ReportLines, NamesCannotWriteToTheTerminal) {
+TEST(ReportLines, EscapesNames) {
   EXPECT_EQ(outcomeLine({host::AppEvent::installed, {"id", "\x1b[31m\nred", ""}, {}}), "installed  \\x1b[31m\\x0ared");
 }
 
-TEST(ReportLines, AHugeNameIsCut) {
+TEST(ReportLines, CutsLongName) {
   EXPECT_LT(outcomeLine({host::AppEvent::installed, {"id", std::string(65536, 'x'), "1"}, {}}).size(), 100U);
 }
 
-TEST(ReportLines, TheSummaryCountsEveryKind) {
+TEST(ReportLines, SummaryCountsEveryOutcome) {
   EXPECT_EQ(summaryLine({outcome(host::AppEvent::installed), outcome(host::AppEvent::installed),
                          outcome(host::AppEvent::failed), outcome(host::AppEvent::unchanged)}),
             "2 installed, 1 failed, 1 up to date.");
 }
 
-TEST(ReportLines, ASyncWithoutWorkSaysSo) {
+TEST(ReportLines, SummaryOfNoWork) {
   EXPECT_EQ(summaryLine({outcome(host::AppEvent::unchanged)}), "Nothing to do: 1 up to date.");
   EXPECT_EQ(summaryLine({}), "Nothing to do.");
 }
@@ -69,11 +69,11 @@ std::vector<Json> linesOf(const std::string& text) {
   return lines;
 }
 
-TEST(JsonReporter, TellsProgressEndsAndSummaryAsOneObjectPerLine) {
+TEST(JsonReporter, WritesOneObjectPerLine) {
   CaptureStdout();
   {
     StandardOutput output;
-    const auto reporter = makeJsonReporter(output, host::Course::sync);
+    const auto reporter = makeJsonReporter(output, host::OperationKind::sync);
     reporter->progressed({kTides, host::AppStage::sending, 0.25, 0.1, 0, 1});
     reporter->finished(outcome(host::AppEvent::failed, "it is damaged"));
     reporter->summarise({outcome(host::AppEvent::failed, "it is damaged"), outcome(host::AppEvent::unchanged)});
@@ -88,17 +88,17 @@ TEST(JsonReporter, TellsProgressEndsAndSummaryAsOneObjectPerLine) {
             R"("skipped":["org.example.tides"]})");
 }
 
-TEST(JsonReporter, HostileNamesStayJSON) {
+TEST(JsonReporter, EscapesHostileNames) {
   CaptureStdout();
   {
     StandardOutput output;
-    makeJsonReporter(output, host::Course::sync)
+    makeJsonReporter(output, host::OperationKind::sync)
         ->finished({host::AppEvent::failed, {"\xff\"\n", std::string(1, '\0'), ""}, "\x1b"});
   }
   EXPECT_EQ(linesOf(GetCapturedStdout()).size(), 1U);
 }
 
-TEST(PlainReporter, SaysNothingOfProgress) {
+TEST(PlainReporter, DoesNotShowProgress) {
   CaptureStdout();
   {
     StandardOutput output;
@@ -110,7 +110,7 @@ TEST(PlainReporter, SaysNothingOfProgress) {
   EXPECT_EQ(GetCapturedStdout(), "updated    Tides 1.2\n1 updated.\n");
 }
 
-TEST(TerminalReporter, ErasesExactlyTheLinesThatItDrew) {
+TEST(TerminalReporter, ErasesExactlyItsLines) {
   CaptureStdout();
   {
     StandardOutput output;

@@ -1,4 +1,4 @@
-// Standard streams as the tool may find them: terminals of all kinds, and none at all.
+// Standard streams: terminals of all kinds, and closed streams.
 #include <filesystem>
 
 #include <gmock/gmock.h>
@@ -15,18 +15,17 @@ using testing::Not;
 
 class Streams : public ToolFixture {
  protected:
-  /// Runs a line of the shell in which $0 is the device and $1 the library.
+  /// Runs a shell command in which $0 is the device and $1 the library.
   [[nodiscard]] Finished shell(const std::string& line) const {
     return runProgram("sh", {"-c", line, device(), library()});
   }
-  /// The same on a terminal of this kind, which gets everything.
+  /// Runs a shell command on a terminal of this kind and returns its output.
   [[nodiscard]] Finished onTerminal(const std::string& line, const std::string& kind) const {
-    return runProgram("script", {"-qec", line, "/dev/null"},
-                      {.environment = {{"TERM", kind}}, .output = OutputTo::file, .input = {}});
+    return runProgram("script", {"-qec", line, "/dev/null"}, {.environment = {{"TERM", kind}}});
   }
 };
 
-TEST_F(Streams, NoFileOfTheDeviceGetsWhatPeopleAreTold) {
+TEST_F(Streams, DeviceFilesNeverReceiveMessages) {
   write(library() + "/broken.zip", "no package");
   for (const std::string closed : {"2>&-", ">&- 2>&-", "<&- >&- 2>&-"}) {
     EXPECT_NE(shell("appsync sync $0 $1 " + closed).status, 0);
@@ -34,12 +33,12 @@ TEST_F(Streams, NoFileOfTheDeviceGetsWhatPeopleAreTold) {
   }
 }
 
-TEST_F(Streams, ThatAreClosedCannotBeReadOrWritten) {
+TEST_F(Streams, ClosedStreamsAreErrors) {
   EXPECT_EQ(shell("appsync plist - <&-").err, "appsync: - cannot be read: Bad file descriptor\n");
   EXPECT_EQ(shell("appsync apps $0 >&-").err, "appsync: standard output cannot be written: Bad file descriptor\n");
 }
 
-TEST_F(Streams, ATerminalThatCannotMoveItsCursorGetsPlainLines) {
+TEST_F(Streams, DumbTerminalGetsPlainLines) {
   publish("org.a");
   const std::string line = "appsync sync " + device() + " " + library();
   const Finished plain = onTerminal(line, "dumb");
@@ -50,11 +49,11 @@ TEST_F(Streams, ATerminalThatCannotMoveItsCursorGetsPlainLines) {
   EXPECT_THAT(onTerminal(line, "xterm").out, HasSubstr("\x1b"));
 }
 
-TEST_F(Streams, ATerminalIsSparedWhatItCannotShow) {
+TEST_F(Streams, RefusesBinaryOutputToTerminal) {
   write(path("list"), "{ a = b; }");
   const Finished list = onTerminal("appsync plist --to binary " + path("list"), "xterm");
   EXPECT_EQ(list.status, 2);
-  EXPECT_EQ(list.out, "appsync: a terminal cannot show the binary form; name a file with -o\r\n");
+  EXPECT_EQ(list.out, "appsync: a terminal cannot show the binary format; name a file with -o\r\n");
   const Finished picture = onTerminal("appsync screen -o - " + device(), "xterm");
   EXPECT_EQ(picture.status, 2);
   EXPECT_EQ(picture.out, "appsync: a terminal cannot show a picture; name a file with -o\r\n");
@@ -62,14 +61,14 @@ TEST_F(Streams, ATerminalIsSparedWhatItCannotShow) {
             "appsync: a terminal cannot show a package; name a file with -o\r\n");
 }
 
-TEST_F(Streams, WithoutACurrentFolderAModuleNeedsItsFullPath) {
+TEST_F(Streams, RelativeModuleNeedsCurrentFolder) {
   const Finished run = shell(
       "mkdir \"$1/gone\" && cd \"$1/gone\" && rmdir \"$1/gone\" && "
       "APPSYNC_MODULE=lib/AppsClient.so appsync clear $0");
   EXPECT_EQ(run.status, 3);
   EXPECT_EQ(run.err,
-            "appsync: the plug-in lib/AppsClient.so cannot be used: the current folder is gone; name it in "
-            "APPSYNC_MODULE by its full path\n");
+            "appsync: the plug-in lib/AppsClient.so cannot be used: the current folder no longer exists; set "
+            "APPSYNC_MODULE to an absolute path\n");
 }
 
 }  // namespace

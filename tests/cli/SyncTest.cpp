@@ -1,4 +1,4 @@
-// Whole syncs by the tool, as people and scripts see them.
+// Complete syncs with the tool.
 #include <filesystem>
 #include <fstream>
 #include <iterator>
@@ -19,7 +19,7 @@ using testing::UnorderedElementsAre;
 
 class Sync : public ToolFixtureOfEachMode {
  protected:
-  /// Puts a placeholder over an installed app, which a restore would have made.
+  /// Adds the placeholder of a restore to an installed app.
   void coverWithPlaceholder(const std::string& identifier) const {
     const auto opened = device::Device::open(device(), device::Access::exclusive);
     ASSERT_TRUE(opened.ok());
@@ -43,7 +43,7 @@ class Sync : public ToolFixtureOfEachMode {
 };
 INSTANTIATE_TEST_SUITE_P(Modes, Sync, kModes, nameOfMode);
 
-TEST_P(Sync, InstallsWhatTheDeviceLacks) {
+TEST_P(Sync, InstallsMissingApps) {
   publish("org.a");
   publish("org.b", "2.1");
   const Finished run = sync();
@@ -53,7 +53,7 @@ TEST_P(Sync, InstallsWhatTheDeviceLacks) {
   EXPECT_THAT(apps(), UnorderedElementsAre("org.a 1.0", "org.b 2.1"));
 }
 
-TEST_P(Sync, ASecondSyncFindsNothingToDo) {
+TEST_P(Sync, SecondSyncDoesNothing) {
   publish("org.a");
   ASSERT_EQ(sync().status, 0);
   const Finished run = sync();
@@ -61,20 +61,20 @@ TEST_P(Sync, ASecondSyncFindsNothingToDo) {
   EXPECT_EQ(run.out, "Nothing to do: 1 up to date.\n");
 }
 
-TEST_P(Sync, AnEmptyLibraryIsNothingToDo) {
+TEST_P(Sync, EmptyLibraryDoesNothing) {
   const Finished run = sync();
   EXPECT_EQ(run.status, 0);
   EXPECT_EQ(run.out, "Nothing to do.\n");
 }
 
-TEST_P(Sync, OfTwoVersionsTheNewerIsInstalled) {
+TEST_P(Sync, InstallsNewerOfTwoVersions) {
   publish("org.a", "1.9");
   publish("org.a", "1.10");
   EXPECT_EQ(sync().status, 0);
   EXPECT_THAT(apps(), ElementsAre("org.a 1.10"));
 }
 
-TEST_P(Sync, ANewerVersionUpdates) {
+TEST_P(Sync, UpdatesToNewerVersion) {
   publish("org.a", "1.0");
   ASSERT_EQ(sync().status, 0);
   publish("org.a", "1.1");
@@ -82,7 +82,7 @@ TEST_P(Sync, ANewerVersionUpdates) {
   EXPECT_THAT(apps(), ElementsAre("org.a 1.1"));
 }
 
-TEST_P(Sync, RemovesWhatItIsAskedTo) {
+TEST_P(Sync, RemovesNamedApps) {
   publish("org.a");
   publish("org.b");
   ASSERT_EQ(sync().status, 0);
@@ -91,7 +91,7 @@ TEST_P(Sync, RemovesWhatItIsAskedTo) {
   EXPECT_THAT(apps(), ElementsAre("org.b 1.0"));
 }
 
-TEST_P(Sync, WhatWasRemovedIsNotSentAgainHoweverOften) {
+TEST_P(Sync, DoesNotReinstallRemovedApps) {
   publish("org.a");
   ASSERT_EQ(sync().status, 0);
   ASSERT_EQ(sync({"--remove", "org.a"}).status, 0);
@@ -100,7 +100,7 @@ TEST_P(Sync, WhatWasRemovedIsNotSentAgainHoweverOften) {
   EXPECT_THAT(apps(), IsEmpty());
 }
 
-TEST_P(Sync, WhatWasRemovedComesBackWhenItIsAskedFor) {
+TEST_P(Sync, OnlyReinstallsRemovedApp) {
   publish("org.a");
   ASSERT_EQ(sync().status, 0);
   ASSERT_EQ(sync({"--remove", "org.a"}).status, 0);
@@ -116,13 +116,13 @@ TEST_P(Sync, OnlyInstallsNothingElse) {
   EXPECT_THAT(apps(), ElementsAre("org.b 1.0"));
 }
 
-TEST_P(Sync, AskingForWhatTheLibraryLacksFails) {
+TEST_P(Sync, OnlyWithoutPackageFails) {
   const Finished run = sync({"--only", "org.c"});
   EXPECT_EQ(run.status, 1);
   EXPECT_THAT(run.err, HasSubstr("org.c failed: the library has no package of this app"));
 }
 
-TEST_P(Sync, ABadAppDoesNotStopTheOthers) {
+TEST_P(Sync, FailedAppDoesNotStopOthers) {
   publish("org.a");
   write(library() + "/broken.zip", "this is no archive");
   publish("org.b");
@@ -132,7 +132,7 @@ TEST_P(Sync, ABadAppDoesNotStopTheOthers) {
   EXPECT_THAT(endsIn(run.out), UnorderedElementsAre("failed broken.zip", "installed org.a", "installed org.b"));
 }
 
-TEST_P(Sync, AFailedInstallHasTheInstallersOwnReason) {
+TEST_P(Sync, FailureHasTheInstallersReason) {
   publish("org.a", "1.0", {{"Notes.app/torn", std::string(5000, 'x'), S_IFREG | 0644, false, true}});
   const Finished run = sync({"--json"});
   EXPECT_EQ(run.status, 1);
@@ -143,7 +143,7 @@ TEST_P(Sync, AFailedInstallHasTheInstallersOwnReason) {
   EXPECT_THAT(apps(), IsEmpty());
 }
 
-TEST_P(Sync, AnAppWhoseUpdateFailedIsOfferedAgain) {
+TEST_P(Sync, OffersFailedUpdateAgain) {
   publish("org.a");
   ASSERT_EQ(sync().status, 0);
   publish("org.a", "2.0", {{"Notes.app/torn", "x", S_IFREG | 0644, false, true}});
@@ -184,7 +184,7 @@ TEST_P(Sync, RemovalUnderAPlaceholderNeedsAnotherSync) {
   const Finished first = sync({"--json", "--remove", "org.a"});
   EXPECT_EQ(first.status, 1);
   EXPECT_THAT(endsIn(first.out), ElementsAre("failed org.a"));
-  EXPECT_THAT(first.out, HasSubstr("its placeholder was removed instead; ask again to remove the app"));
+  EXPECT_THAT(first.out, HasSubstr("only its placeholder was removed; run the sync again to remove the app"));
   EXPECT_THAT(apps(), ElementsAre("org.a 1.0"));
 
   EXPECT_THAT(endsIn(sync({"--json", "--remove", "org.a"}).out), ElementsAre("removed org.a"));
@@ -203,7 +203,7 @@ TEST_P(Sync, ClearLeavesAnAppUnderAPlaceholder) {
   EXPECT_EQ(contentOf(data + "/notes"), "kept");
 }
 
-TEST_P(Sync, ForbiddenInstallsAreSkippedWithTheReason) {
+TEST_P(Sync, SkipsForbiddenInstalls) {
   publish("org.a");
   ASSERT_EQ(runTool({"set", device(), "app-installation=no"}).status, 0);
   const Finished run = sync();
@@ -214,7 +214,7 @@ TEST_P(Sync, ForbiddenInstallsAreSkippedWithTheReason) {
   EXPECT_THAT(endsIn(sync({"--json"}).out), ElementsAre("installed org.a"));
 }
 
-TEST_P(Sync, ForbiddenRemovalsAreSkippedWithTheReason) {
+TEST_P(Sync, SkipsForbiddenRemovals) {
   publish("org.a");
   ASSERT_EQ(sync().status, 0);
   ASSERT_EQ(runTool({"set", device(), "app-removal=no"}).status, 0);
@@ -224,7 +224,7 @@ TEST_P(Sync, ForbiddenRemovalsAreSkippedWithTheReason) {
   EXPECT_THAT(apps(), ElementsAre("org.a 1.0"));
 }
 
-TEST_P(Sync, ARemovalThatWasForbiddenIsNotRemembered) {
+TEST_P(Sync, ForgetsForbiddenRemoval) {
   publish("org.a");
   ASSERT_EQ(sync().status, 0);
   ASSERT_EQ(runTool({"set", device(), "app-removal=no"}).status, 0);
@@ -233,7 +233,7 @@ TEST_P(Sync, ARemovalThatWasForbiddenIsNotRemembered) {
   EXPECT_THAT(endsIn(sync({"--json"}).out), ElementsAre("updated org.a"));
 }
 
-TEST_P(Sync, EachAppHasExactlyOneEndAndTheSummaryNamesThemAll) {
+TEST_P(Sync, ReportsEachAppOnce) {
   publish("org.a");
   publish("org.b");
   ASSERT_EQ(sync().status, 0);
@@ -261,7 +261,7 @@ TEST_P(Sync, ProgressRisesToOneForEachApp) {
   EXPECT_EQ(last, 1.0);
 }
 
-TEST_P(Sync, TheLogIsAppendedTo) {
+TEST_P(Sync, AppendsToTheLog) {
   publish("org.a");
   write(path("log"), "earlier\n");
   ASSERT_EQ(sync({"--log", path("log")}).status, 0);
@@ -279,7 +279,7 @@ TEST_P(Sync, LeavesNothingInTheStagingFolder) {
   EXPECT_TRUE(std::filesystem::is_empty(device() + "/root/var/mobile/Media/PublicStaging"));
 }
 
-TEST_P(Sync, NewIconsStandBehindThoseThatAreThere) {
+TEST_P(Sync, AddsNewIconsAtTheEnd) {
   publish("org.z");
   ASSERT_EQ(sync().status, 0);
   publish("org.a");
@@ -290,7 +290,7 @@ TEST_P(Sync, NewIconsStandBehindThoseThatAreThere) {
   EXPECT_EQ(cli::Json::parse(order.out), cli::Json::array({"org.z", "org.a"}));
 }
 
-TEST_P(Sync, ClearForgetsWhatWasRemoved) {
+TEST_P(Sync, ClearForgetsRemovals) {
   publish("org.a");
   ASSERT_EQ(sync().status, 0);
   ASSERT_EQ(sync({"--remove", "org.a"}).status, 0);
@@ -303,13 +303,13 @@ class DirectSync : public ToolFixture {
   DirectSync() : ToolFixture("--direct") {}
 };
 
-TEST_F(DirectSync, AHomeScreenThatFailsFailsTheApp) {
+TEST_F(DirectSync, FailingHomeScreenFailsTheApp) {
   publish("org.a");
   ASSERT_EQ(runTool({"set", device(), "assertion=org.a:failing"}).status, 0);
   EXPECT_THAT(endsIn(sync({"--json"}).out), ElementsAre("failed org.a"));
 }
 
-TEST_F(DirectSync, HomeScreenThatFailsAnUpdateKeepsTheApp) {
+TEST_F(DirectSync, FailingHomeScreenKeepsUpdatedApp) {
   publish("org.a");
   ASSERT_EQ(sync().status, 0);
   publish("org.a", "2.0");

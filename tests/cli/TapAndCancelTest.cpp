@@ -1,4 +1,4 @@
-// `appsync tap` and `appsync cancel`, from a process of their own, while a sync runs.
+// `appsync tap` and `appsync cancel` while a sync runs in another process.
 #include <filesystem>
 #include <thread>
 
@@ -33,13 +33,13 @@ class TapAndCancel : public ToolFixture {
   }
 };
 
-TEST_F(TapAndCancel, ATappedAppIsSentNext) {
+TEST_F(TapAndCancel, TappedAppIsSentNext) {
   StepHold hold("send package", 1);
   SyncInThisProcess sync(device(), library());
   hold.waitUntilHeld();
   const Finished tapped = tap("org.d");
   EXPECT_EQ(tapped.status, 0) << tapped.err;
-  EXPECT_EQ(tapped.out, "org.d comes before the others.\n");
+  EXPECT_EQ(tapped.out, "org.d is sent before the others.\n");
   sync.waitUntilTold();
   hold.letGo();
   const RecordingReporter& told = sync.finish();
@@ -48,7 +48,7 @@ TEST_F(TapAndCancel, ATappedAppIsSentNext) {
   EXPECT_EQ(apps().size(), 4U);
 }
 
-TEST_F(TapAndCancel, ACancelledAppIsNotSentAndSkipped) {
+TEST_F(TapAndCancel, CancelledAppIsSkipped) {
   StepHold hold("send package", 1);
   SyncInThisProcess sync(device(), library());
   hold.waitUntilHeld();
@@ -66,7 +66,7 @@ TEST_F(TapAndCancel, ACancelledAppIsNotSentAndSkipped) {
   EXPECT_THAT(apps(), UnorderedElementsAre("org.a 1.0", "org.b 1.0", "org.d 1.0"));
 }
 
-TEST_F(TapAndCancel, ATransferUnderWayEndsWithTheCancellation) {
+TEST_F(TapAndCancel, CancelsRunningTransfer) {
   StepHold hold("send package", 2);
   SyncInThisProcess sync(device(), library());
   hold.waitUntilHeld();
@@ -79,7 +79,7 @@ TEST_F(TapAndCancel, ATransferUnderWayEndsWithTheCancellation) {
   EXPECT_TRUE(std::filesystem::is_empty(device() + "/root/var/mobile/Media/PublicStaging"));
 }
 
-TEST_F(TapAndCancel, ACancelledAppIsOfferedAgainAtTheNextSync) {
+TEST_F(TapAndCancel, NextSyncOffersCancelledApp) {
   {
     StepHold hold("send package", 1);
     SyncInThisProcess sync(device(), library());
@@ -92,7 +92,7 @@ TEST_F(TapAndCancel, ACancelledAppIsOfferedAgainAtTheNextSync) {
               UnorderedElementsAre("installed org.a", "skipped org.b", "skipped org.c", "installed org.d"));
 }
 
-TEST_F(TapAndCancel, ACancelledUpdateLeavesTheOldVersion) {
+TEST_F(TapAndCancel, CancelledUpdateKeepsOldVersion) {
   ASSERT_EQ(sync().status, 0);
   publish("org.b", "2.0");
   StepHold hold("send package", 1);
@@ -105,7 +105,7 @@ TEST_F(TapAndCancel, ACancelledUpdateLeavesTheOldVersion) {
   EXPECT_THAT(apps(), UnorderedElementsAre("org.a 1.0", "org.b 1.0", "org.c 1.0", "org.d 1.0"));
 }
 
-TEST_F(TapAndCancel, EveryAppMayBeCancelled) {
+TEST_F(TapAndCancel, CancelsEveryApp) {
   StepHold hold("send package", 1);
   SyncInThisProcess sync(device(), library());
   hold.waitUntilHeld();
@@ -119,7 +119,7 @@ TEST_F(TapAndCancel, EveryAppMayBeCancelled) {
   EXPECT_THAT(apps(), IsEmpty());
 }
 
-TEST_F(TapAndCancel, AnAppThatIsNotOnItsWayIsRefused) {
+TEST_F(TapAndCancel, RefusesAppThatIsNotBeingInstalled) {
   StepHold hold("send package", 1);
   SyncInThisProcess sync(device(), library());
   hold.waitUntilHeld();
@@ -128,12 +128,12 @@ TEST_F(TapAndCancel, AnAppThatIsNotOnItsWayIsRefused) {
     for (const Finished& asked : {tap(identifier), cancel(identifier)}) {
       EXPECT_EQ(asked.status, 1);
       EXPECT_EQ(asked.out, "");
-      EXPECT_THAT(asked.err, AllOf(HasSubstr(identifier), HasSubstr("is not on its way to the device")));
+      EXPECT_THAT(asked.err, AllOf(HasSubstr(identifier), HasSubstr("is not being installed")));
     }
   }
 }
 
-TEST_F(TapAndCancel, TwoAtOnceAreBothServed) {
+TEST_F(TapAndCancel, ServesTwoClients) {
   StepHold hold("send package", 1);
   SyncInThisProcess sync(device(), library());
   hold.waitUntilHeld();
@@ -146,7 +146,7 @@ TEST_F(TapAndCancel, TwoAtOnceAreBothServed) {
   EXPECT_THAT(sync.finish().sent, ElementsAre("org.a", "org.d"));
 }
 
-TEST_F(TapAndCancel, OfTwoWhoCancelOneAppOneIsServed) {
+TEST_F(TapAndCancel, CancelsAppOnlyOnce) {
   StepHold hold("send package", 1);
   SyncInThisProcess sync(device(), library());
   hold.waitUntilHeld();
@@ -155,7 +155,7 @@ TEST_F(TapAndCancel, OfTwoWhoCancelOneAppOneIsServed) {
   EXPECT_EQ(first.wait().status + second.wait().status, 1);
 }
 
-TEST_F(TapAndCancel, WithoutASyncTheSentenceSaysWhatToDo) {
+TEST_F(TapAndCancel, ErrorWithoutSyncSaysWhatToDo) {
   for (const Finished& asked : {tap("org.a"), cancel("org.a")}) {
     EXPECT_EQ(asked.status, 3);
     EXPECT_EQ(asked.out, "");
@@ -163,12 +163,12 @@ TEST_F(TapAndCancel, WithoutASyncTheSentenceSaysWhatToDo) {
   }
 }
 
-TEST_F(TapAndCancel, TheSocketGoesWithTheSync) {
+TEST_F(TapAndCancel, SocketIsRemovedWithTheSync) {
   ASSERT_EQ(sync().status, 0);
   EXPECT_FALSE(std::filesystem::exists(device() + "/control"));
 }
 
-TEST_F(TapAndCancel, ADirectDeviceCanDoNeither) {
+TEST_F(TapAndCancel, RefusesDirectDevice) {
   ASSERT_EQ(runTool({"set", device(), "coordination=off"}).status, 0);
   for (const Finished& asked : {tap("org.a"), cancel("org.a")}) {
     EXPECT_EQ(asked.status, 3);
@@ -176,11 +176,11 @@ TEST_F(TapAndCancel, ADirectDeviceCanDoNeither) {
   }
 }
 
-TEST_F(TapAndCancel, WhatIsNoDeviceIsSaid) {
+TEST_F(TapAndCancel, RefusesMissingDevice) {
   EXPECT_THAT(runTool({"tap", library(), "org.a"}).err, HasSubstr("is not a device"));
 }
 
-TEST_F(TapAndCancel, WhatIsNoIdentifierIsWrongUsage) {
+TEST_F(TapAndCancel, RefusesInvalidIdentifier) {
   for (const char* identifier : {"", "../x", "two words", "\x1b[2J"}) {
     const Finished asked = cancel(identifier);
     EXPECT_EQ(asked.status, 2) << identifier;
@@ -188,7 +188,7 @@ TEST_F(TapAndCancel, WhatIsNoIdentifierIsWrongUsage) {
   }
 }
 
-TEST_F(TapAndCancel, ClientsThatMeanIllDoNotHoldUpTheSync) {
+TEST_F(TapAndCancel, HostileClientsDoNotDelayTheSync) {
   StepHold hold("send package", 1);
   SyncInThisProcess sync(device(), library());
   hold.waitUntilHeld();
@@ -197,7 +197,7 @@ TEST_F(TapAndCancel, ClientsThatMeanIllDoNotHoldUpTheSync) {
   for (const std::string& said : {std::string(), std::string("cancel org.a"), std::string(5000, 'x')}) {
     auto client = daemon::connectIn(folder->get());
     ASSERT_TRUE(client.ok());
-    daemon::writeLine(client->get(), said, daemon::ControlPatience(std::chrono::minutes(1), -1)).ignore();
+    daemon::writeLine(client->get(), said, daemon::Deadline(std::chrono::minutes(1), -1)).ignore();
     clients.push_back(std::move(client).value());
   }
   hold.letGo();

@@ -1,4 +1,4 @@
-// What the tool says to those who use it wrongly, or ask.
+// Invalid command lines, and the help.
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
@@ -10,20 +10,20 @@ namespace {
 
 using testing::HasSubstr;
 
-TEST(Usage, WithoutACommandIsWrong) {
+TEST(Usage, RefusesMissingCommand) {
   const Finished run = runTool({});
   EXPECT_EQ(run.status, 2);
   EXPECT_EQ(run.out, "");
-  EXPECT_EQ(run.err, "appsync: a command is missing; `appsync --help` shows them\n");
+  EXPECT_EQ(run.err, "appsync: a command is missing; `appsync --help` lists the commands\n");
 }
 
-TEST(Usage, AnUnknownCommandIsNamed) {
+TEST(Usage, NamesUnknownCommand) {
   const Finished run = runTool({"fly", "--high"});
   EXPECT_EQ(run.status, 2);
-  EXPECT_EQ(run.err, "appsync: there is no command \"fly\"; `appsync --help` shows them\n");
+  EXPECT_EQ(run.err, "appsync: there is no command \"fly\"; `appsync --help` lists the commands\n");
 }
 
-TEST(Usage, AnUnknownSettingIsToldAllThatCanBeSet) {
+TEST(Usage, UnknownSettingListsAllKeys) {
   const TemporaryFolder folder;
   ASSERT_EQ(runTool({"init", folder.path("device")}).status, 0);
   const Finished run = runTool({"set", folder.path("device"), "colour=red"});
@@ -34,22 +34,22 @@ TEST(Usage, AnUnknownSettingIsToldAllThatCanBeSet) {
       "store, demote, demote-auto, licence\n");
 }
 
-TEST(Usage, AMissingArgumentNamesItAndTheHelp) {
+TEST(Usage, NamesMissingArgumentAndHelp) {
   const Finished run = runTool({"sync", "device"});
   EXPECT_EQ(run.status, 2);
   EXPECT_THAT(run.err, HasSubstr("LIBRARY"));
   EXPECT_THAT(run.err, HasSubstr("`appsync sync --help`"));
 }
 
-TEST(Usage, AnUnknownOptionIsWrong) {
+TEST(Usage, RefusesUnknownOption) {
   EXPECT_EQ(runTool({"apps", "device", "--fast"}).status, 2);
 }
 
-TEST(Usage, AnUnknownFormIsWrong) {
+TEST(Usage, RefusesUnknownFormat) {
   EXPECT_EQ(runTool({"plist", "file", "--to", "yaml"}).status, 2);
 }
 
-TEST(Usage, AnEmptyIdentifierIsWrong) {
+TEST(Usage, RefusesEmptyIdentifier) {
   for (const std::string option : {"--only", "--remove"}) {
     const Finished run = runTool({"sync", "device", "library", option, ""});
     EXPECT_EQ(run.status, 2);
@@ -57,14 +57,14 @@ TEST(Usage, AnEmptyIdentifierIsWrong) {
   }
 }
 
-TEST(Usage, TheVersionIsTold) {
+TEST(Usage, PrintsVersion) {
   const Finished run = runTool({"--version"});
   EXPECT_EQ(run.status, 0);
   EXPECT_THAT(run.out, testing::MatchesRegex("appsync [0-9]+\\.[0-9]+\\.[0-9]+\n"));
-  EXPECT_EQ(runTool({"--version"}, {.environment = {}, .output = OutputTo::full, .input = {}}).status, 3);
+  EXPECT_EQ(runTool({"--version"}, {.output = OutputTo::full}).status, 3);
 }
 
-TEST(Usage, APathIsNeverTakenForAnAddress) {
+TEST(Usage, PathIsNeverAnAddress) {
   const TemporaryFolder folder;
   const Finished run =
       runProgram("sh", {"-c", "cd \"$0\" && appsync init file:x && appsync apps file:x", folder.path()});
@@ -72,19 +72,19 @@ TEST(Usage, APathIsNeverTakenForAnAddress) {
   EXPECT_EQ(run.err, "");
 }
 
-TEST(Usage, AnIdentifierThatIsNoTextIsWrongAndShownSafely) {
+TEST(Usage, RefusesIdentifierInInvalidUTF8) {
   const Finished run = runTool({"sync", "device", "library", "--remove", "\xff\x1b[2J"});
   EXPECT_EQ(run.status, 2);
   EXPECT_THAT(run.err, HasSubstr("\\xff\\x1b[2J"));
 }
 
-TEST(Usage, OneAppCannotBeBothRemovedAndAskedFor) {
+TEST(Usage, RefusesRemoveAndOnlyOfOneApp) {
   const Finished run = runTool({"sync", "device", "library", "--remove", "org.a", "--only", "org.a"});
   EXPECT_EQ(run.status, 2);
   EXPECT_THAT(run.err, HasSubstr("both --remove and --only"));
 }
 
-TEST(Usage, ADeviceCannotBeBothCoordinatedAndDirect) {
+TEST(Usage, RefusesCoordinatedAndDirect) {
   const Finished run = runTool({"init", "device", "--coordinated", "--direct"});
   EXPECT_EQ(run.status, 2);
   EXPECT_THAT(run.err, HasSubstr("--direct"));
@@ -92,7 +92,7 @@ TEST(Usage, ADeviceCannotBeBothCoordinatedAndDirect) {
 
 class Help : public testing::TestWithParam<const char*> {};
 
-TEST_P(Help, TeachesWithAnExample) {
+TEST_P(Help, HasAnExample) {
   const Finished run = runTool({GetParam(), "--help"});
   EXPECT_EQ(run.status, 0);
   EXPECT_EQ(run.err, "");
@@ -100,7 +100,7 @@ TEST_P(Help, TeachesWithAnExample) {
   EXPECT_THAT(run.out, HasSubstr(std::string("appsync ") + GetParam()));
 }
 
-TEST_P(Help, SaysHowToCallIt) {
+TEST_P(Help, HasAUsageLine) {
   EXPECT_THAT(runTool({GetParam(), "--help"}).out,
               HasSubstr(std::string("\nUsage: appsync ") + GetParam() + " [OPTIONS] "));
 }
@@ -110,18 +110,18 @@ INSTANTIATE_TEST_SUITE_P(Commands, Help,
                                          "screen", "history", "set", "clear", "plist"),
                          [](const auto& command) { return std::string(command.param); });
 
-TEST(Usage, TheHelpNamesEveryExitStatus) {
+TEST(Usage, HelpNamesEveryExitStatus) {
   const Finished run = runTool({"--help"});
   EXPECT_EQ(run.status, 0);
   EXPECT_THAT(run.out, HasSubstr("0 done, 1 some app failed, 2 wrong usage, 3 "));
 }
 
-TEST(Usage, HelpForAReaderThatLeftIsNoFailure) {
-  EXPECT_EQ(runTool({"--help"}, {.environment = {}, .output = OutputTo::closedPipe, .input = {}}).status, 0);
+TEST(Usage, HelpToClosedPipeIsNoError) {
+  EXPECT_EQ(runTool({"--help"}, {.output = OutputTo::closedPipe}).status, 0);
 }
 
-TEST(Usage, HelpThatCannotBeWrittenIs) {
-  const Finished run = runTool({"--help"}, {.environment = {}, .output = OutputTo::full, .input = {}});
+TEST(Usage, HelpToFullDiskIsAnError) {
+  const Finished run = runTool({"--help"}, {.output = OutputTo::full});
   EXPECT_EQ(run.status, 3);
   EXPECT_EQ(run.err, "appsync: standard output cannot be written: No space left on device\n");
 }

@@ -1,4 +1,4 @@
-// How the tool finds the plug-in, and what it says of one that it cannot use.
+// Loading of the plug-in, and errors of plug-ins that cannot be used.
 #include <filesystem>
 #include <string>
 #include <vector>
@@ -17,19 +17,19 @@ namespace {
 namespace fs = std::filesystem;
 using testing::HasSubstr;
 
-constexpr const char* kWhatToDo = "; install the plug-in of this release there, or name its file in APPSYNC_MODULE";
+constexpr const char* kWhatToDo = "; install the plug-in of this release there, or set APPSYNC_MODULE to its file";
 
 std::string brokenModule(const std::string& name) {
   return std::string(kBinaryFolder) + "/broken_modules/" + name + ".so";
 }
 
 ToolOptions withModule(const std::string& path) {
-  return {.environment = {{"APPSYNC_MODULE", path}}, .output = OutputTo::file, .input = {}};
+  return {.environment = {{"APPSYNC_MODULE", path}}};
 }
 
 class PlugIn : public ToolFixture {
  protected:
-  /// What `appsync sync` says of the module at `path`.
+  /// Returns the error of `appsync sync` for the module at `path`.
   void expectRefused(const std::string& path, const std::string& reason) const {
     const Finished run = sync({}, withModule(path));
     EXPECT_EQ(run.status, 3);
@@ -38,54 +38,54 @@ class PlugIn : public ToolFixture {
   }
 };
 
-TEST_F(PlugIn, AMissingFileIsRefused) {
+TEST_F(PlugIn, RefusesMissingFile) {
   expectRefused(path("none.so"), std::string("cannot open shared object file: No such file or directory") + kWhatToDo);
 }
 
-TEST_F(PlugIn, AnEmptyTextFileIsRefused) {
+TEST_F(PlugIn, RefusesEmptyFile) {
   write(path("empty.so"), "");
   expectRefused(path("empty.so"), std::string("file too short") + kWhatToDo);
 }
 
-TEST_F(PlugIn, AFileThatIsNoModuleIsRefused) {
+TEST_F(PlugIn, RefusesFileThatIsNotAModule) {
   write(path("text.so"), std::string(8192, 'x'));
   expectRefused(path("text.so"), std::string("invalid ELF header") + kWhatToDo);
 }
 
-TEST_F(PlugIn, AFolderIsRefused) {
+TEST_F(PlugIn, RefusesFolder) {
   expectRefused(library(), std::string("cannot read file data: Is a directory") + kWhatToDo);
 }
 
-TEST_F(PlugIn, AModuleWithoutTheEntryPointIsRefused) {
+TEST_F(PlugIn, RefusesModuleWithoutEntryPoint) {
   expectRefused(brokenModule("WithoutEntryPoint"), std::string("it has no entry point appsyncMakeClient") + kWhatToDo);
 }
 
-TEST_F(PlugIn, AModuleOfAnotherVersionIsRefused) {
+TEST_F(PlugIn, RefusesModuleOfAnotherVersion) {
   expectRefused(brokenModule("OfAnotherVersion"),
                 "its interface version is " + std::to_string(platform::kModuleInterfaceVersion + 1) +
                     " and this program's " + std::to_string(platform::kModuleInterfaceVersion) + kWhatToDo);
 }
 
-TEST_F(PlugIn, AModuleThatGivesNothingIsRefused) {
-  expectRefused(brokenModule("WithoutReason"), "it makes no client and does not say why");
+TEST_F(PlugIn, RefusesModuleWithoutClient) {
+  expectRefused(brokenModule("WithoutReason"), "it refused to create a client without a reason");
 }
 
-TEST_F(PlugIn, AReasonIsReadNoFurtherThanItsRoom) {
+TEST_F(PlugIn, DoesNotReadBeyondTheReason) {
   expectRefused(brokenModule("WithoutEnd"), std::string(252, 'x'));
 }
 
-TEST_F(PlugIn, ARelativePathIsSeenFromTheCurrentFolder) {
+TEST_F(PlugIn, ResolvesRelativePath) {
   const Finished run = sync({}, withModule("none.so"));
   EXPECT_EQ(run.status, 3);
   EXPECT_THAT(run.err, HasSubstr((fs::current_path() / "none.so").string() + " "));
 }
 
-TEST_F(PlugIn, AnEmptyNameCountsAsNone) {
+TEST_F(PlugIn, IgnoresEmptyVariable) {
   publish("org.a");
   EXPECT_EQ(sync({}, withModule("")).status, 0);
 }
 
-TEST_F(PlugIn, IsFoundBesideTheToolWhereverBothAre) {
+TEST_F(PlugIn, IsFoundRelativeToTheTool) {
   const fs::path tool = path("prefix/bin/appsync");
   const fs::path folder = (tool.parent_path() / fs::relative(kModule, kBinaryFolder)).lexically_normal().parent_path();
   fs::create_directories(tool.parent_path());
@@ -99,26 +99,26 @@ TEST_F(PlugIn, IsFoundBesideTheToolWhereverBothAre) {
   EXPECT_EQ(syncThroughLink().status, 0);
 }
 
-TEST_F(PlugIn, CommandsThatNeedNoneDoWithoutIt) {
+TEST_F(PlugIn, IsNotLoadedIfUnused) {
   for (const char* command : {"apps", "history"})
     EXPECT_EQ(runTool({command, device()}, withModule(path("none.so"))).status, 0) << command;
 }
 
-TEST_F(PlugIn, WithoutItNothingIsReported) {
+TEST_F(PlugIn, MissingPlugInFailsReport) {
   const Finished run = runTool({"report", device()}, withModule(path("none.so")));
   EXPECT_EQ(run.status, 3);
   EXPECT_EQ(run.out, "");
   EXPECT_THAT(run.err, HasSubstr(kWhatToDo));
 }
 
-TEST_F(PlugIn, WithoutItABackupIsNotBegun) {
+TEST_F(PlugIn, MissingPlugInFailsBackup) {
   const Finished run = runTool({"backup", device(), path("backup")}, withModule(path("none.so")));
   EXPECT_EQ(run.status, 3);
   EXPECT_THAT(run.err, HasSubstr(kWhatToDo));
   EXPECT_FALSE(fs::exists(path("backup")));
 }
 
-TEST_F(PlugIn, WithoutItARestoreIsNotBegun) {
+TEST_F(PlugIn, MissingPlugInFailsRestore) {
   ASSERT_EQ(runTool({"backup", device(), path("backup")}).status, 0);
   ASSERT_EQ(runTool({"init", path("new")}).status, 0);
   const Finished run = runTool({"restore", path("new"), path("backup"), "--json"}, withModule(path("none.so")));
@@ -128,7 +128,7 @@ TEST_F(PlugIn, WithoutItARestoreIsNotBegun) {
   EXPECT_FALSE(fs::exists(path("new") + "/root/var/mobile/Media/HarvoRestore"));
 }
 
-TEST_F(PlugIn, WithoutItNothingIsCleared) {
+TEST_F(PlugIn, MissingPlugInFailsClear) {
   publish("org.a");
   ASSERT_EQ(sync().status, 0);
   const std::string before = runTool({"history", device()}).out;

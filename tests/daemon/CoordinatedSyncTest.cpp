@@ -1,4 +1,4 @@
-// What a sync of a device that installs through coordinators leaves behind, and what others see meanwhile.
+// Syncs of a device that installs through coordinators.
 #include <algorithm>
 #include <csignal>
 #include <filesystem>
@@ -31,7 +31,7 @@ std::string contentOf(const fs::path& path) {
 
 class EitherMode : public ToolFixture {
  protected:
-  /// Every file below the device's root by its path, but for the names of containers and what tells the time.
+  /// Returns every file below the device's root, except those with times, without the names of containers.
   [[nodiscard]] std::map<std::string, std::string> files() const {
     std::map<std::string, std::string> files;
     const fs::path root = device() + "/root";
@@ -49,7 +49,7 @@ class EitherMode : public ToolFixture {
     }
     return files;
   }
-  /// A whole history of a device: installs, updates, removals, a damaged package, a cancelled wish.
+  /// Runs syncs with installs, updates, removals and a damaged package.
   void live(const std::string& mode) {
     fs::remove_all(device());
     ASSERT_EQ(runTool({"init", device(), mode}).status, 0);
@@ -73,7 +73,7 @@ class EitherMode : public ToolFixture {
   }
 };
 
-TEST_F(EitherMode, EndsInTheSameDevice) {
+TEST_F(EitherMode, BothModesResultInTheSameDevice) {
   live("--direct");
   const auto directFiles = files();
   const std::string directApps = runTool({"apps", device(), "--json"}).out;
@@ -84,7 +84,7 @@ TEST_F(EitherMode, EndsInTheSameDevice) {
   EXPECT_EQ(files(), directFiles);
 }
 
-TEST_F(EitherMode, MayBeChosenAfterwards) {
+TEST_F(EitherMode, ModeCanBeChanged) {
   publish("org.a");
   ASSERT_EQ(runTool({"set", device(), "coordination=off"}).status, 0);
   ASSERT_EQ(sync().status, 0);
@@ -114,7 +114,7 @@ TEST_F(CoordinatedSync, LeavesNoCoordinator) {
   EXPECT_THAT(apps(), ElementsAre("org.a 1.0"));
 }
 
-TEST_F(CoordinatedSync, ShowsPlaceholdersWithTheirProgressToOtherProcesses) {
+TEST_F(CoordinatedSync, OtherProcessesSeeProgress) {
   for (const char* identifier : {"org.a", "org.b"})
     publish(identifier);
   StepHold hold("send package", 1);
@@ -134,7 +134,7 @@ TEST_F(CoordinatedSync, ShowsPlaceholdersWithTheirProgressToOtherProcesses) {
   }
 }
 
-TEST_F(CoordinatedSync, ASecondProcessIsToldThatTheDeviceIsHeld) {
+TEST_F(CoordinatedSync, RefusesSecondProcess) {
   publish("org.a");
   StepHold hold("send package", 1);
   SyncInThisProcess first(device(), library());
@@ -144,7 +144,7 @@ TEST_F(CoordinatedSync, ASecondProcessIsToldThatTheDeviceIsHeld) {
   EXPECT_THAT(second.err, HasSubstr("another process"));
 }
 
-TEST_F(CoordinatedSync, AnAppThatTheLibraryLostAfterAKillLeavesNothingBehind) {
+TEST_F(CoordinatedSync, KilledSyncOfLostPackageLeavesNothing) {
   publish("org.a");
   publish("org.gone");
   fs::copy(device(), path("original"), fs::copy_options::recursive);
@@ -154,21 +154,20 @@ TEST_F(CoordinatedSync, AnAppThatTheLibraryLostAfterAKillLeavesNothingBehind) {
     fs::remove_all(device());
     fs::copy(path("original"), device(), fs::copy_options::recursive);
     fs::copy(path("full"), library(), fs::copy_options::recursive | fs::copy_options::overwrite_existing);
-    const Finished killed =
-        sync({}, {.environment = {{"APPSYNC_KILL_AT", std::to_string(step)}}, .output = OutputTo::file, .input = {}});
+    const Finished killed = sync({}, killedAt(step));
     if (killed.status == 0) break;
     ASSERT_EQ(killed.status, -SIGKILL);
     fs::remove(library() + "/org.gone-1.0.zip");
     ASSERT_EQ(sync().status, 0) << "step " << step;
     EXPECT_THAT(coordinators(), IsEmpty()) << "step " << step;
-    // It may have come before the kill; it is there then, or not at all.
+    // The package may have been sent before the kill; the app is then installed.
     EXPECT_THAT(apps(), AnyOf(ElementsAre("org.a 1.0"), UnorderedElementsAre("org.a 1.0", "org.gone 1.0")))
         << "step " << step;
   }
   EXPECT_GT(kills, 3);
 }
 
-TEST_F(CoordinatedSync, APackageThatVanishesFailsItsAppAndTakesItsPlaceholder) {
+TEST_F(CoordinatedSync, VanishedPackageFailsItsApp) {
   publish("org.a");
   publish("org.b");
   StepHold hold("send package", 1);
@@ -182,11 +181,10 @@ TEST_F(CoordinatedSync, APackageThatVanishesFailsItsAppAndTakesItsPlaceholder) {
   EXPECT_THAT(apps(), ElementsAre("org.a 1.0"));
 }
 
-TEST_F(CoordinatedSync, ClearGivesUpWhatAKilledSyncLeft) {
+TEST_F(CoordinatedSync, ClearCancelsStaleCoordinators) {
   publish("org.a");
   for (int step = 20; coordinators().empty(); step += 10) {
-    const Finished killed =
-        sync({}, {.environment = {{"APPSYNC_KILL_AT", std::to_string(step)}}, .output = OutputTo::file, .input = {}});
+    const Finished killed = sync({}, killedAt(step));
     ASSERT_EQ(killed.status, -SIGKILL) << "no kill left a coordinator";
   }
   ASSERT_EQ(runTool({"clear", device()}).status, 0);
@@ -197,7 +195,7 @@ TEST_F(CoordinatedSync, ClearGivesUpWhatAKilledSyncLeft) {
 class Interrupted : public ToolFixtureOfEachMode {};
 INSTANTIATE_TEST_SUITE_P(Modes, Interrupted, kModes, nameOfMode);
 
-TEST_P(Interrupted, ASyncEndsInOrderAndTheNextOneDoesTheRest) {
+TEST_P(Interrupted, NextSyncInstallsTheRest) {
   for (const char* identifier : {"org.a", "org.b", "org.c"})
     publish(identifier);
   {

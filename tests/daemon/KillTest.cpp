@@ -1,12 +1,12 @@
-// A sync that is ended from outside at any moment, and what the next one makes of it.
+// Killed and interrupted syncs, and their recovery by the next sync.
 #include <csignal>
-#include <cstdlib>
 #include <fstream>
 #include <iterator>
 #include <memory>
 
 #include <gmock/gmock.h>
 
+#include "tests/support/KilledTool.h"
 #include "tests/support/ToolFixture.h"
 
 namespace appsync::test {
@@ -29,11 +29,7 @@ class Kill : public ToolFixtureOfEachMode {
     publish("org.update", "2.0");
     publish("org.install", "1.0", {{"HarvoMetadata.plist", infoPlist("org.install")}});
   }
-  [[nodiscard]] Finished disturbedSync(long step) const {
-    return sync({"--remove", "org.remove"},
-                {.environment = {{"APPSYNC_KILL_AT", std::to_string(step)}}, .output = OutputTo::file, .input = {}});
-  }
-  /// What must be the same however the device came to it.
+  /// Returns the state that must not depend on the kill.
   [[nodiscard]] std::vector<std::string> state() const {
     std::vector<std::string> state = apps();
     std::ranges::sort(state);
@@ -51,29 +47,23 @@ class Kill : public ToolFixtureOfEachMode {
 
 INSTANTIATE_TEST_SUITE_P(Modes, Kill, kModes, nameOfMode);
 
-/// With APPSYNC_EVERY_STEP in the environment at really every one, which takes a minute.
-TEST_P(Kill, AtAnyStepTheNextSyncEndsAsIfUndisturbed) {
+TEST_P(Kill, NextSyncRecoversFromAnyStep) {
   prepare();
   std::filesystem::copy(device(), path("original"), std::filesystem::copy_options::recursive);
-  ASSERT_EQ(sync({"--remove", "org.remove"}).status, 0);
+  const auto syncWithRemoval = [this](const ToolOptions& options) { return sync({"--remove", "org.remove"}, options); };
+  ASSERT_EQ(syncWithRemoval({}).status, 0);
   const std::vector<std::string> undisturbed = state();
   EXPECT_THAT(undisturbed, Contains("org.update 2.0"));
 
-  constexpr long kMostSteps = 3000;
-  const long stride = std::getenv("APPSYNC_EVERY_STEP") == nullptr ? 7 : 1;
-  long step = 1;
-  for (; step < kMostSteps; step += stride) {
+  const auto reset = [this] {
     std::filesystem::remove_all(device());
     std::filesystem::copy(path("original"), device(), std::filesystem::copy_options::recursive);
-    const Finished killed = disturbedSync(step);
-    if (killed.status == 0) break;  // it needs no more steps than that
-    ASSERT_EQ(killed.status, -SIGKILL) << killed.err;
-    const Finished again = sync({"--remove", "org.remove"});
-    ASSERT_EQ(again.status, 0) << "step " << step << ": " << again.err;
-    ASSERT_EQ(state(), undisturbed) << "step " << step;
-  }
-  EXPECT_GT(step, 50);
-  EXPECT_LT(step, kMostSteps);
+  };
+  killAtEachStep(7, 50, reset, syncWithRemoval, [&] {
+    const Finished again = syncWithRemoval({});
+    ASSERT_EQ(again.status, 0) << again.err;
+    ASSERT_EQ(state(), undisturbed);
+  });
 }
 
 class Interrupt : public ToolFixture {
@@ -82,7 +72,7 @@ class Interrupt : public ToolFixture {
   [[nodiscard]] std::unique_ptr<ToolRun> startSync() const {
     return std::make_unique<ToolRun>(std::vector<std::string>{"sync", device(), library(), "--json"});
   }
-  /// A sync that does not come to its end by itself: the home screen does not let go of the app.
+  /// Starts a sync that never ends: the home screen does not release the app.
   [[nodiscard]] std::unique_ptr<ToolRun> endlessSync(const std::string& version = "1.0") {
     publish("org.held", version);
     EXPECT_EQ(runTool({"set", device(), "assertion=org.held:denied"}).status, 0);
@@ -90,14 +80,14 @@ class Interrupt : public ToolFixture {
     EXPECT_TRUE(run->writes("\"event\""));
     return run;
   }
-  /// Interrupts it once, when the install is surely waiting to be tried again.
+  /// Interrupts the sync once its install waits for a retry.
   void interruptWhileItWaits(ToolRun& run) {
     ASSERT_TRUE(run.writes(kWaits));
     run.signal(SIGINT);
     ASSERT_TRUE(run.ends());
     const Finished ended = run.wait();
     EXPECT_EQ(ended.status, 1);
-    EXPECT_THAT(ended.err, HasSubstr("interrupted; finishing what was sent already"));
+    EXPECT_THAT(ended.err, HasSubstr("interrupted; finishing the installs of sent packages"));
     EXPECT_THAT(endsIn(ended.out), ElementsAre("failed org.held"));
     EXPECT_THAT(ended.out, HasSubstr("the sync was interrupted; the app is offered again at the next sync"));
   }
@@ -110,13 +100,13 @@ class Interrupt : public ToolFixture {
   static constexpr std::string_view kWaits = R"({"event":"waiting","identifier":"org.held")";
 };
 
-TEST_F(Interrupt, OnceEndsASyncThatWaitsForTheHomeScreen) {
+TEST_F(Interrupt, OnceEndsWaitingSync) {
   interruptWhileItWaits(*endlessSync());
   letGoOfTheApp();
   expectTheNextSyncBrings("org.held 1.0");
 }
 
-TEST_F(Interrupt, OnceLeavesTheAppWhoseUpdateWaitsForTheHomeScreen) {
+TEST_F(Interrupt, OnceKeepsAppWhoseUpdateWaits) {
   publish("org.held");
   ASSERT_EQ(sync().status, 0);
   interruptWhileItWaits(*endlessSync("2.0"));
@@ -125,9 +115,9 @@ TEST_F(Interrupt, OnceLeavesTheAppWhoseUpdateWaitsForTheHomeScreen) {
   expectTheNextSyncBrings("org.held 2.0");
 }
 
-TEST_F(Interrupt, TwiceEndsItAtOnce) {
+TEST_F(Interrupt, TwiceEndsTheProcess) {
   const auto run = endlessSync();
-  // Both while it stands still: one would let it come to its end. Which of them comes second is the system's choice.
+  // Both signals arrive while the process is stopped, in any order: after one alone the sync could end.
   for (const int signal : {SIGSTOP, SIGTERM, SIGINT, SIGCONT})
     run->signal(signal);
   ASSERT_TRUE(run->ends());
@@ -136,12 +126,12 @@ TEST_F(Interrupt, TwiceEndsItAtOnce) {
   expectTheNextSyncBrings("org.held 1.0");
 }
 
-TEST_F(Interrupt, ASyncThatWaitsForTheHomeScreenSaysSo) {
+TEST_F(Interrupt, ReportsWaitForTheHomeScreen) {
   const auto run = endlessSync();
   EXPECT_TRUE(run->writes(kWaits));
 }
 
-TEST_F(Interrupt, ASecondProcessIsToldThatTheDeviceIsHeld) {
+TEST_F(Interrupt, RefusesSecondProcess) {
   const auto first = endlessSync();
   const Finished second = sync();
   EXPECT_EQ(second.status, 3);
@@ -150,7 +140,7 @@ TEST_F(Interrupt, ASecondProcessIsToldThatTheDeviceIsHeld) {
   EXPECT_EQ(runTool({"clear", device()}).status, 3);
 }
 
-TEST_F(Interrupt, TheAppsOfARunningSyncCanBeLookedAt) {
+TEST_F(Interrupt, ListsAppsDuringSync) {
   const auto first = endlessSync();
   EXPECT_THAT(apps(), ElementsAre("org.held 1.0?"));
   EXPECT_EQ(runTool({"screen", device(), "-o", path("screen.png")}).status, 0);
@@ -159,25 +149,23 @@ TEST_F(Interrupt, TheAppsOfARunningSyncCanBeLookedAt) {
 
 class Outputs : public ToolFixture {};
 
-TEST_F(Outputs, AReaderThatLeavesDoesNotEndTheSync) {
+TEST_F(Outputs, ClosedPipeDoesNotEndTheSync) {
   publish("org.a");
-  EXPECT_EQ(sync({"--json"}, {.environment = {}, .output = OutputTo::closedPipe, .input = {}}).status, 0);
+  EXPECT_EQ(sync({"--json"}, {.output = OutputTo::closedPipe}).status, 0);
   EXPECT_EQ(apps().size(), 1U);
 }
 
-TEST_F(Outputs, AFullDiskBehindTheOutputIsToldAfterTheSync) {
+TEST_F(Outputs, ReportsFullDiskAfterTheSync) {
   publish("org.a");
-  const Finished run = sync({}, {.environment = {}, .output = OutputTo::full, .input = {}});
+  const Finished run = sync({}, {.output = OutputTo::full});
   EXPECT_EQ(run.status, 3);
   EXPECT_THAT(run.err, HasSubstr("standard output cannot be written"));
   EXPECT_EQ(apps().size(), 1U);
 }
 
-TEST_F(Outputs, AListForAReaderThatLeftIsNoFailure) {
+TEST_F(Outputs, ClosedPipeIsNoError) {
   for (const char* command : {"apps", "history"}) {
-    EXPECT_EQ(
-        runTool({command, device(), "--json"}, {.environment = {}, .output = OutputTo::closedPipe, .input = {}}).status,
-        0);
+    EXPECT_EQ(runTool({command, device(), "--json"}, {.output = OutputTo::closedPipe}).status, 0);
   }
 }
 

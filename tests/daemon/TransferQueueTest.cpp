@@ -29,7 +29,7 @@ class TransferQueueTest : public testing::Test {
       assets.push_back(asset(identifier));
     queue_.fill(assets);
   }
-  /// The error that the completion was called with.
+  /// Returns the error that the completion received.
   std::optional<Error> prioritize(const std::string& identifier) {
     std::optional<std::optional<Error>> answer;
     queue_.prioritizeAsset(asset(identifier), [&](const std::optional<Error>& error) {
@@ -50,28 +50,28 @@ class TransferQueueTest : public testing::Test {
   TransferQueue queue_;
 };
 
-TEST_F(TransferQueueTest, PackagesComeInTheClientsOrder) {
+TEST_F(TransferQueueTest, KeepsTheClientsOrder) {
   fill({"a", "b", "c"});
   EXPECT_EQ(queue_.front()->identifier(), "a");
   EXPECT_THAT(rest(), ElementsAre("a", "b", "c"));
   EXPECT_EQ(queue_.front(), nullptr);
 }
 
-TEST_F(TransferQueueTest, APrioritisedPackageComesNextAndTheOthersStayInOrder) {
+TEST_F(TransferQueueTest, MovesPrioritisedPackageToFront) {
   fill({"a", "b", "c", "d"});
   EXPECT_EQ(queue_.take()->identifier(), "a");
   EXPECT_EQ(prioritize("c"), std::nullopt);
   EXPECT_THAT(rest(), ElementsAre("c", "b", "d"));
 }
 
-TEST_F(TransferQueueTest, TheLatestWishComesFirst) {
+TEST_F(TransferQueueTest, LatestPriorityIsFirst) {
   fill({"a", "b", "c", "d"});
   EXPECT_EQ(prioritize("c"), std::nullopt);
   EXPECT_EQ(prioritize("d"), std::nullopt);
   EXPECT_THAT(rest(), ElementsAre("d", "c", "a", "b"));
 }
 
-TEST_F(TransferQueueTest, WishesThatCameBeforeThePackagesWereKnownCount) {
+TEST_F(TransferQueueTest, AppliesPrioritiesFromBeforeFill) {
   EXPECT_EQ(prioritize("b"), std::nullopt);
   EXPECT_EQ(prioritize("c"), std::nullopt);
   EXPECT_EQ(prioritize("unknown"), std::nullopt);
@@ -80,7 +80,7 @@ TEST_F(TransferQueueTest, WishesThatCameBeforeThePackagesWereKnownCount) {
   EXPECT_THAT(rest(), ElementsAre("c", "b", "d"));
 }
 
-TEST_F(TransferQueueTest, APackageThatHasGoneCannotBePrioritised) {
+TEST_F(TransferQueueTest, FailsToPrioritiseTakenPackage) {
   fill({"a", "b"});
   ASSERT_NE(queue_.take(), nullptr);
   const std::optional<Error> error = prioritize("a");
@@ -89,7 +89,7 @@ TEST_F(TransferQueueTest, APackageThatHasGoneCannotBePrioritised) {
   EXPECT_THAT(rest(), ElementsAre("b"));
 }
 
-TEST_F(TransferQueueTest, ACancelledPackageIsNotSent) {
+TEST_F(TransferQueueTest, DropsCancelledPackage) {
   fill({"a", "b", "c"});
   cancel("b");
   cancel("unknown");
@@ -98,7 +98,7 @@ TEST_F(TransferQueueTest, ACancelledPackageIsNotSent) {
   EXPECT_THAT(rest(), ElementsAre("a", "c"));
 }
 
-TEST_F(TransferQueueTest, APackageUnderWayIsKnownToBeCancelled) {
+TEST_F(TransferQueueTest, KnowsCancelledTakenPackage) {
   fill({"a"});
   ASSERT_NE(queue_.take(), nullptr);
   EXPECT_FALSE(queue_.wasCancelled("a"));
@@ -106,7 +106,7 @@ TEST_F(TransferQueueTest, APackageUnderWayIsKnownToBeCancelled) {
   EXPECT_TRUE(queue_.wasCancelled("a"));
 }
 
-TEST_F(TransferQueueTest, ACancelledPackageCannotBePrioritised) {
+TEST_F(TransferQueueTest, FailsToPrioritiseCancelledPackage) {
   fill({"a", "b"});
   cancel("b");
   EXPECT_TRUE(prioritize("b"));
@@ -118,7 +118,7 @@ TEST_F(TransferQueueTest, SupportsBothOperations) {
   EXPECT_TRUE(queue_.supports(TransferQueue::Operation::cancelAssetTransferForFailedAsset));
 }
 
-TEST_F(TransferQueueTest, NoPackageIsLostOrSentTwiceWhileOthersAsk) {
+TEST_F(TransferQueueTest, IsThreadSafe) {
   Strings identifiers;
   for (int number = 0; number < 500; ++number)
     identifiers.push_back("app" + std::to_string(number));

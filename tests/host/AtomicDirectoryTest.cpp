@@ -1,4 +1,3 @@
-// Folders that are whole or not there.
 #include <cerrno>
 #include <filesystem>
 #include <fstream>
@@ -18,12 +17,12 @@ namespace appsync::test {
 namespace {
 
 namespace fs = std::filesystem;
-using host::FolderDraft;
+using host::AtomicDirectory;
 using testing::ElementsAre;
 using testing::IsEmpty;
 using testing::UnorderedElementsAre;
 
-class FolderDraftTest : public testing::Test {
+class AtomicDirectoryTest : public testing::Test {
  protected:
   [[nodiscard]] std::string path(const std::string& name = "backup") const { return folder_.path(name); }
   [[nodiscard]] static std::vector<std::string> in(const std::string& folder) {
@@ -36,44 +35,46 @@ class FolderDraftTest : public testing::Test {
     fs::create_directories(fs::path(path(name)).parent_path());
     std::ofstream(path(name)) << "mine";
   }
-  static void fill(const FolderDraft& draft) { ASSERT_EQ(device::tree::create(draft.folder(), "file", {}), 0); }
+  static void fill(const AtomicDirectory& directory) {
+    ASSERT_EQ(device::tree::create(directory.folder(), "file", {}), 0);
+  }
 
   TemporaryFolder folder_;
 };
 
-TEST_F(FolderDraftTest, ThatIsPublishedIsAllThatThereIs) {
+TEST_F(AtomicDirectoryTest, PublishLeavesOnlyTheDirectory) {
   {
-    Result<FolderDraft> draft = FolderDraft::make(path());
-    ASSERT_TRUE(draft.ok());
-    fill(*draft);
+    Result<AtomicDirectory> directory = AtomicDirectory::make(path());
+    ASSERT_TRUE(directory.ok());
+    fill(*directory);
     EXPECT_FALSE(fs::exists(path()));
-    ASSERT_TRUE(draft->publish().ok());
+    ASSERT_TRUE(directory->publish().ok());
   }
   EXPECT_THAT(in(path("")), ElementsAre("backup"));
   EXPECT_THAT(in(path()), ElementsAre("file"));
 }
 
-TEST_F(FolderDraftTest, ThatIsNotPublishedLeavesNothing) {
+TEST_F(AtomicDirectoryTest, UnpublishedLeavesNothing) {
   {
-    const Result<FolderDraft> draft = FolderDraft::make(path());
-    ASSERT_TRUE(draft.ok());
-    fill(*draft);
+    const Result<AtomicDirectory> directory = AtomicDirectory::make(path());
+    ASSERT_TRUE(directory.ok());
+    fill(*directory);
   }
   EXPECT_THAT(in(path("")), IsEmpty());
 }
 
-TEST_F(FolderDraftTest, TakesOverWhatAKillHasLeft) {
+TEST_F(AtomicDirectoryTest, ReplacesLeftoversOfACrash) {
   for (const std::string left : {"", "content/deep/file", "half-removed/file"}) {
     fs::create_directory(path(".backup.partial"));
     if (!left.empty()) {
-      write(".backup.partial/.appsync-draft");
+      write(".backup.partial/.appsync-directory");
       write(".backup.partial/" + left);
     }
     {
-      Result<FolderDraft> draft = FolderDraft::make(path());
-      ASSERT_TRUE(draft.ok()) << draft.error().text;
-      fill(*draft);
-      ASSERT_TRUE(draft->publish().ok());
+      Result<AtomicDirectory> directory = AtomicDirectory::make(path());
+      ASSERT_TRUE(directory.ok()) << directory.error().text;
+      fill(*directory);
+      ASSERT_TRUE(directory->publish().ok());
     }
     EXPECT_THAT(in(path("")), ElementsAre("backup"));
     EXPECT_THAT(in(path()), ElementsAre("file"));
@@ -81,39 +82,39 @@ TEST_F(FolderDraftTest, TakesOverWhatAKillHasLeft) {
   }
 }
 
-TEST_F(FolderDraftTest, LeavesAFolderOfItsUserAlone) {
+TEST_F(AtomicDirectoryTest, KeepsForeignDirectory) {
   write(".backup.partial/letter");
-  const Result<FolderDraft> draft = FolderDraft::make(path());
-  ASSERT_FALSE(draft.ok());
-  EXPECT_EQ(draft.error(),
+  const Result<AtomicDirectory> directory = AtomicDirectory::make(path());
+  ASSERT_FALSE(directory.ok());
+  EXPECT_EQ(directory.error(),
             (Error{std::string(domains::kPOSIX), EEXIST,
-                   path(".backup.partial") + " is in the way and holds no unfinished backup; move it away, "
+                   path(".backup.partial") + " already exists and is not an unfinished backup; move it away, "
                                              "or choose another name",
                    nullptr}));
   EXPECT_THAT(in(path(".backup.partial")), ElementsAre("letter"));
 }
 
-TEST_F(FolderDraftTest, BelongsToOneProcessAtATime) {
-  const Result<FolderDraft> first = FolderDraft::make(path());
+TEST_F(AtomicDirectoryTest, IsLockedByOneProcess) {
+  const Result<AtomicDirectory> first = AtomicDirectory::make(path());
   ASSERT_TRUE(first.ok());
   fill(*first);
-  const Result<FolderDraft> second = FolderDraft::make(path());
+  const Result<AtomicDirectory> second = AtomicDirectory::make(path());
   ASSERT_FALSE(second.ok());
-  EXPECT_EQ(second.error().text, path() + " is just being made by another process; wait until that has ended");
+  EXPECT_EQ(second.error().text, path() + " is being created by another process; wait until that process has ended");
   struct stat status {};
   EXPECT_EQ(fstatat(first->folder(), "file", &status, 0), 0);
 }
 
-TEST_F(FolderDraftTest, WhoeverWaitsForItsLockDoesNotGetWhatIsPublished) {
+TEST_F(AtomicDirectoryTest, WaitingForLockDoesNotYieldPublished) {
   device::FileDescriptor waiting;
   {
-    Result<FolderDraft> draft = FolderDraft::make(path());
-    ASSERT_TRUE(draft.ok());
+    Result<AtomicDirectory> directory = AtomicDirectory::make(path());
+    ASSERT_TRUE(directory.ok());
     waiting = device::FileDescriptor(open(path(".backup.partial").c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
     ASSERT_TRUE(waiting.valid());
     EXPECT_NE(flock(waiting.get(), LOCK_EX | LOCK_NB), 0);
-    fill(*draft);
-    ASSERT_TRUE(draft->publish().ok());
+    fill(*directory);
+    ASSERT_TRUE(directory->publish().ok());
   }
   ASSERT_EQ(flock(waiting.get(), LOCK_EX | LOCK_NB), 0);
   struct stat locked {};

@@ -13,16 +13,10 @@
 
 namespace appsync::test {
 
-/// The parameter is how both devices install: "--direct" or "--coordinated".
-class RestoreFixture : public ToolFixture, public testing::WithParamInterface<std::string> {
+/// The parameter is the install mode of both devices.
+class BackupFixture : public ToolFixtureOfEachMode {
  protected:
   static constexpr const char* kData = "/root/var/mobile/Containers/Data/";
-
-  void SetUp() override {
-    ToolFixture::SetUp();
-    std::filesystem::remove_all(device());
-    run({"init", device(), GetParam()});
-  }
 
   static Finished run(const std::vector<std::string>& words, int status = 0) {
     Finished finished = runTool(words);
@@ -61,11 +55,10 @@ class RestoreFixture : public ToolFixture, public testing::WithParamInterface<st
     return runTool(more, options);
   }
   [[nodiscard]] Finished syncNew(std::vector<std::string> more = {}, const ToolOptions& options = {}) const {
-    more.insert(more.begin(), {"sync", newDevice(), library()});
-    return runTool(more, options);
+    return syncTo(newDevice(), std::move(more), options);
   }
 
-  /// Everything of a device that a restore is to bring back: apps with version, install state and licence, the files of
+  /// Returns everything that a restore must recreate: apps with version, install state and licence, the files of
   /// installed apps, and all data.
   [[nodiscard]] static std::vector<std::string> contentOf(const std::string& device) {
     std::vector<std::string> content;
@@ -94,14 +87,9 @@ class RestoreFixture : public ToolFixture, public testing::WithParamInterface<st
     }
   }
 
-  /// "org.plain 1.0?" for each app of the new device.
+  /// Returns "org.plain 1.0?" for each app of the new device, sorted.
   [[nodiscard]] std::vector<std::string> newApps() const {
-    const Finished listed = run({"apps", newDevice(), "--json"});
-    std::vector<std::string> all;
-    for (const cli::Json& app : cli::Json::parse(listed.out)) {
-      all.push_back(std::string(app.at("identifier")) + " " + std::string(app.at("version")) +
-                    (app.at("placeholder") ? "?" : ""));
-    }
+    std::vector<std::string> all = appsOf(newDevice());
     std::ranges::sort(all);
     return all;
   }

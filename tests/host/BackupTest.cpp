@@ -1,5 +1,4 @@
 #include <chrono>
-#include <csignal>
 #include <filesystem>
 
 #include <gmock/gmock.h>
@@ -8,6 +7,7 @@
 #include "host/Backup.h"
 #include "host/BackupCheck.h"
 #include "tests/host/BackupFixture.h"
+#include "tests/support/KilledTool.h"
 
 namespace appsync::test {
 namespace {
@@ -17,19 +17,19 @@ using platform::TSInstallType;
 using testing::HasSubstr;
 using testing::UnorderedElementsAre;
 
-class Backup : public RestoreFixture {
+class Backup : public BackupFixture {
  protected:
   [[nodiscard]] BackedUpApp entry(const std::string& identifier) const {
     const auto read = host::readBackup(backup());
     EXPECT_TRUE(read.ok());
     for (const BackedUpApp& app : read->apps) {
-      if (app.app.identifier == identifier) return app;
+      if (app.name.identifier == identifier) return app;
     }
     ADD_FAILURE() << identifier << " is not in the backup";
     return {};
   }
   [[nodiscard]] std::string file(const std::string& name) const { return readHostFile(backup() + "/Apps/" + name); }
-  /// Has the info dictionary of every installed app name this file as its icon.
+  /// Sets this file as the icon in the info dictionary of every installed app.
   void nameIcons(const std::string& icon) const {
     const auto opened = device::Device::open(device(), device::Access::readOnly);
     const auto apps = (*opened)->services().defaultRegistry().apps();
@@ -38,8 +38,8 @@ class Backup : public RestoreFixture {
             "{BundleIdentifier = \"" + app->applicationIdentifier() + "\"; BundleIconFile = \"" + icon + "\";}");
     }
   }
-  /// What is in the folder in which the backup is made.
-  [[nodiscard]] std::vector<std::string> beside() const {
+  /// Returns the names in the parent folder of the backup.
+  [[nodiscard]] std::vector<std::string> names() const {
     std::vector<std::string> names;
     for (const auto& entry : std::filesystem::directory_iterator(path("")))
       names.push_back(entry.path().filename());
@@ -47,11 +47,11 @@ class Backup : public RestoreFixture {
   }
 };
 
-TEST_P(Backup, HasOfEachAppWhatItNeedsToComeBack) {
+TEST_P(Backup, SavesEverythingARestoreNeeds) {
   fillDevice();
   const Finished saved = run({"backup", device(), backup()});
   EXPECT_THAT(saved.out, HasSubstr("Saved 5 apps, 2 demoted, 2 with data, to "));
-  EXPECT_EQ(entry("org.data").app.version, "2.0");
+  EXPECT_EQ(entry("org.data").name.version, "2.0");
   EXPECT_EQ(entry("org.data").data, 16U);
   EXPECT_EQ(file("org.data/Data/Documents/notes"), "what was written");
   EXPECT_THAT(file("org.data/HarvoMetadata.plist"), HasSubstr("With Data"));
@@ -63,12 +63,12 @@ TEST_P(Backup, HasOfEachAppWhatItNeedsToComeBack) {
   EXPECT_FALSE(entry("org.plain").data);
 }
 
-TEST_P(Backup, OfADeviceWithoutAppsHasNone) {
+TEST_P(Backup, EmptyDeviceResultsInEmptyBackup) {
   EXPECT_THAT(run({"backup", device(), backup()}).out, HasSubstr("Saved 0 apps"));
   EXPECT_TRUE(host::readBackup(backup())->apps.empty());
 }
 
-TEST_P(Backup, NothingInThePlaceIsTouched) {
+TEST_P(Backup, RefusesExistingPath) {
   write(path("file"), "mine");
   EXPECT_THAT(run({"backup", device(), path("file")}, 3).err, HasSubstr("exists already; choose another name"));
   EXPECT_EQ(readHostFile(path("file")), "mine");
@@ -78,18 +78,18 @@ TEST_P(Backup, NothingInThePlaceIsTouched) {
   EXPECT_THAT(run({"backup", device(), "."}, 3).err, HasSubstr("exists already"));
 }
 
-TEST_P(Backup, NeedsAFolderToBeMadeInAndADevice) {
+TEST_P(Backup, RefusesMissingParentOrDevice) {
   EXPECT_THAT(run({"backup", device(), path("missing/backup")}, 3).err, HasSubstr("missing"));
   EXPECT_THAT(run({"backup", library(), backup()}, 3).err, HasSubstr("is not a device"));
   EXPECT_FALSE(std::filesystem::exists(backup()));
 }
 
-TEST_P(Backup, SpecialFilesInDataAreToldAndLeftOut) {
+TEST_P(Backup, OmitsAndReportsSpecialFiles) {
   fillDevice();
   const std::string data = device() + kData + "org.data/";
   ASSERT_EQ(mkfifo((data + "pipe").c_str(), 0600), 0);
   const Finished saved = run({"backup", device(), backup()});
-  EXPECT_EQ(saved.err, "appsync: the data of org.data is saved without 1 item that is neither file, folder nor link\n");
+  EXPECT_EQ(saved.err, "appsync: the data of org.data is saved without 1 item that is not a file, folder or link\n");
   EXPECT_THAT(saved.out, HasSubstr("Saved 5 apps, 2 demoted, 2 with data, to "));
   EXPECT_FALSE(std::filesystem::exists(backup() + "/Apps/org.data/Data/pipe"));
   EXPECT_EQ(file("org.data/Data/Documents/notes"), "what was written");
@@ -100,7 +100,7 @@ TEST_P(Backup, SpecialFilesInDataAreToldAndLeftOut) {
             "appsync: the data of org.data is saved without 2 items that are neither file, folder nor link\n");
 }
 
-TEST_P(Backup, DataKeepsItsPermissionsAndTimes) {
+TEST_P(Backup, KeepsPermissionsAndTimesOfData) {
   fillDevice();
   namespace fs = std::filesystem;
   const std::string data = device() + kData + "org.data/Documents";
@@ -121,7 +121,7 @@ TEST_P(Backup, DataKeepsItsPermissionsAndTimes) {
   }
 }
 
-TEST_P(Backup, AnIconIsAFileOfItsAppAndNoneThatIsTooLarge) {
+TEST_P(Backup, IgnoresForeignAndLargeIcons) {
   publish("org.inside");
   publish("org.large");
   publish("org.outside", "1.0", {{"HarvoMetadata.plist", "{}"}});
@@ -144,7 +144,7 @@ TEST_P(Backup, AnIconIsAFileOfItsAppAndNoneThatIsTooLarge) {
   EXPECT_FALSE(entry("org.large").icon);
 }
 
-TEST_P(Backup, LinksInDataLeadNowhereElse) {
+TEST_P(Backup, DoesNotFollowLinksInData) {
   fillDevice();
   write(path("secret"), "secret");
   std::filesystem::create_symlink(path("secret"), device() + kData + "org.data/link");
@@ -155,26 +155,19 @@ TEST_P(Backup, LinksInDataLeadNowhereElse) {
   EXPECT_TRUE(std::filesystem::is_symlink(backup() + "/Apps/org.data/Data/link"));
 }
 
-TEST_P(Backup, KilledAtAnyStepIsNotThereAndTheNextOneIsWhole) {
+TEST_P(Backup, IsAtomicWhenKilledAtAnyStep) {
   fillDevice();
-  long step = 1;
-  for (; step < 2000; step += 5) {
-    std::filesystem::remove_all(backup());
-    const Finished killed =
-        runTool({"backup", device(), backup()},
-                {.environment = {{"APPSYNC_KILL_AT", std::to_string(step)}}, .output = OutputTo::file, .input = {}});
-    if (killed.status == 0) break;
-    ASSERT_EQ(killed.status, -SIGKILL) << killed.err;
-    if (std::filesystem::exists(backup())) {
-      ASSERT_EQ(host::readBackup(backup())->apps.size(), 5U) << "step " << step;
-      continue;
-    }
-    makeBackup();
-    ASSERT_EQ(host::readBackup(backup())->apps.size(), 5U) << "step " << step;
-    ASSERT_THAT(beside(), UnorderedElementsAre("device", "library", "licence", "backup")) << "step " << step;
-  }
-  EXPECT_GT(step, 30);
-  EXPECT_LT(step, 2000);
+  killAtEachStep(
+      5, 30, [this] { std::filesystem::remove_all(backup()); },
+      [this](const ToolOptions& options) {
+        return runTool({"backup", device(), backup()}, options);
+      },
+      [this] {
+        const bool isComplete = std::filesystem::exists(backup());
+        if (!isComplete) makeBackup();
+        ASSERT_EQ(host::readBackup(backup())->apps.size(), 5U);
+        if (!isComplete) EXPECT_THAT(names(), UnorderedElementsAre("device", "library", "licence", "backup"));
+      });
 }
 
 TEST_P(Backup, RestoresAppsThatShareOneIcon) {
@@ -212,16 +205,15 @@ TEST_P(Backup, CheckFindsDamage) {
   finds("Apps/org.licence/ApplicationSINF", "", "must have 9");
   finds("Apps/org.data/HarvoMetadata.plist", "", "is damaged");
   finds("Apps/org.data/Data/Documents/notes", "less", "the data of org.data has 4 bytes and must have 16");
-  finds("Manifest.plist", "", "is no backup that can be used");
+  finds("Manifest.plist", "", "is not a usable backup");
   finds("Manifest.plist", std::string(textOf(*plist::writeXML(host::manifestOf({backup(), "other", {}, {}})))),
-        "its manifest is not what was written");
+        "its manifest differs from what was written");
   EXPECT_EQ(problem(), "");
   std::filesystem::remove_all(backup() + "/Apps/org.auto/Data");
   EXPECT_THAT(problem(), HasSubstr("org.auto/Data"));
 }
 
-INSTANTIATE_TEST_SUITE_P(Modes, Backup, testing::Values("--direct", "--coordinated"),
-                         [](const auto& mode) { return mode.param.substr(2); });
+INSTANTIATE_TEST_SUITE_P(Modes, Backup, kModes, nameOfMode);
 
 }  // namespace
 }  // namespace appsync::test

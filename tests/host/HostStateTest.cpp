@@ -10,12 +10,12 @@
 namespace appsync::host {
 namespace {
 
-TEST(HostState, IsEmptyWhereNoneIsKept) {
+TEST(HostState, MissingFileIsEmptyState) {
   const test::TemporaryFolder folder;
   EXPECT_EQ(loadHostState(folder.path()).value(), HostState{});
 }
 
-TEST(HostState, ThatCannotBeUnderstoodIsAnErrorThatSaysWhatToDo) {
+TEST(HostState, InvalidFileIsAnError) {
   const test::TemporaryFolder folder;
   for (const char* document :
        {"", "no property list <", "(Declined)", "{Declined = org.a;}",
@@ -30,7 +30,7 @@ TEST(HostState, ThatCannotBeUnderstoodIsAnErrorThatSaysWhatToDo) {
   }
 }
 
-TEST(HostState, ThatCannotBeReadIsAnError) {
+TEST(HostState, UnreadableFileIsAnError) {
   const test::TemporaryFolder folder;
   std::filesystem::create_directory(folder.path("host-state.plist"));
   EXPECT_EQ(loadHostState(folder.path()).error(),
@@ -40,26 +40,26 @@ TEST(HostState, ThatCannotBeReadIsAnError) {
                    nullptr}));
 }
 
-TEST(HostState, ListsThatAreNotThereAreEmpty) {
+TEST(HostState, MissingArraysAreEmpty) {
   const test::TemporaryFolder folder;
   std::ofstream(folder.path("host-state.plist")) << "{Declined = (org.a);}";
   EXPECT_EQ(loadHostState(folder.path()).value(), (HostState{{"org.a"}, {}}));
 }
 
-TEST(HostState, IsReadAsItWasSaved) {
+TEST(HostState, LoadsSavedState) {
   const test::TemporaryFolder folder;
   const HostState state = {{"org.a", "org.b"}, {"org.c"}};
   ASSERT_TRUE(saveHostState(folder.path(), state).ok());
   EXPECT_EQ(loadHostState(folder.path()).value(), state);
 }
 
-TEST(HostState, ThatCannotBeSavedIsAnError) {
+TEST(HostState, FailsIfItCannotBeSaved) {
   const Status saved = saveHostState("/proc/no such folder", {});
   ASSERT_FALSE(saved.ok());
   EXPECT_NE(saved.error().text.find("host-state.plist"), std::string::npos);
 }
 
-TEST(HostState, RemovedIsEmpty) {
+TEST(HostState, IsEmptyAfterRemoval) {
   const test::TemporaryFolder folder;
   ASSERT_TRUE(saveHostState(folder.path(), {{"org.a"}, {}}).ok());
   EXPECT_TRUE(removeHostState(folder.path()).ok());
@@ -67,16 +67,16 @@ TEST(HostState, RemovedIsEmpty) {
   EXPECT_TRUE(removeHostState(folder.path()).ok());
 }
 
-TEST(HostState, LearnsWhatTheUserDeleted) {
+TEST(HostState, AddsDeletedApps) {
   HostState state;
-  state.learnDeleted({"org.a"});
+  state.addDeleted({"org.a"});
   EXPECT_EQ(state.declined, IdentifierSet{"org.a"});
 }
 
-TEST(HostState, DoesNotTakeAFailedInstallForADeletion) {
+TEST(HostState, FailedInstallIsNotADeletion) {
   HostState state;
   state.offered = {"org.a"};
-  state.learnDeleted({"org.a"});
+  state.addDeleted({"org.a"});
   EXPECT_TRUE(state.declined.empty());
 }
 

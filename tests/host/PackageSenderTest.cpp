@@ -42,7 +42,7 @@ class PackageSending : public testing::Test {
     std::ifstream file(path, std::ios::binary);
     return {std::istreambuf_iterator<char>(file), {}};
   }
-  /// Everything in the staging folder that is no folder.
+  /// Returns all files in the staging folder.
   [[nodiscard]] std::size_t stagedFiles() const {
     std::size_t count = 0;
     for (const auto& entry : fs::recursive_directory_iterator(staged("")))
@@ -58,7 +58,7 @@ bool always(double) {
   return true;
 }
 
-TEST_F(PackageSending, OnOneFileSystemThePackageIsLentAndNotCopied) {
+TEST_F(PackageSending, LinksOnTheSameFileSystem) {
   const std::string package = folder_.path("a.zip");
   std::vector<double> fractions;
   const auto sent = send(package, [&](double fraction) {
@@ -70,7 +70,7 @@ TEST_F(PackageSending, OnOneFileSystemThePackageIsLentAndNotCopied) {
   EXPECT_EQ(fractions, (std::vector<double>{0, 1}));
 }
 
-TEST_F(PackageSending, ALentPackageStaysInTheLibraryWhenTheDeviceRemovesIt) {
+TEST_F(PackageSending, RemovingTheLinkKeepsThePackage) {
   const std::string package = folder_.path("a.zip");
   const auto sent = send(package, always);
   ASSERT_TRUE(sent.ok());
@@ -79,7 +79,7 @@ TEST_F(PackageSending, ALentPackageStaysInTheLibraryWhenTheDeviceRemovesIt) {
   EXPECT_EQ(fs::hard_link_count(package), 1U);
 }
 
-TEST_F(PackageSending, FromAnotherFileSystemThePackageIsCopied) {
+TEST_F(PackageSending, CopiesFromAnotherFileSystem) {
   const std::string package = "/dev/shm/appsync-sender-" + std::to_string(::getpid()) + ".zip";
   std::vector<double> fractions;
   const auto sent = send(package, [&](double fraction) {
@@ -92,7 +92,7 @@ TEST_F(PackageSending, FromAnotherFileSystemThePackageIsCopied) {
   EXPECT_EQ(fractions.back(), 1);
 }
 
-TEST_F(PackageSending, ATransferThatIsEndedLeavesNothingBehind) {
+TEST_F(PackageSending, CancelledTransferLeavesNothing) {
   const std::string package = folder_.path("a.zip");
   for (const double last : {0.0, 1.0}) {
     const auto sent = send(package, [&](double fraction) { return fraction < last; });

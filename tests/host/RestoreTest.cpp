@@ -1,10 +1,11 @@
 #include <csignal>
-#include <cstdlib>
+#include <functional>
 
 #include <gmock/gmock.h>
 
 #include "host/Backup.h"
 #include "tests/host/BackupFixture.h"
+#include "tests/support/KilledTool.h"
 
 namespace appsync::test {
 namespace {
@@ -15,24 +16,38 @@ using testing::HasSubstr;
 using testing::Not;
 using testing::UnorderedElementsAre;
 
-class Restore : public RestoreFixture {
+class Restore : public BackupFixture {
  protected:
   void prepare() {
     fillDevice();
     makeBackup();
     makeNewDevice();
   }
-  [[nodiscard]] bool isCoordinated() const { return GetParam() == "--coordinated"; }
+  [[nodiscard]] bool isCoordinated() const { return GetParam() == std::string("--coordinated"); }
   [[nodiscard]] std::string manifest() const { return readHostFile(backup() + "/Manifest.plist"); }
   void changeManifest(const std::string& from, const std::string& to) const {
     std::string text = manifest();
     ASSERT_NE(text.find(from), std::string::npos);
     write(backup() + "/Manifest.plist", text.replace(text.find(from), from.size(), to));
   }
+  /// Kills `work` on copies of the new device. Expects `resume` and a sync to complete each.
+  void killAtEachStepOfNewDevice(long least, const std::function<Finished(const ToolOptions&)>& work,
+                                 const std::function<void()>& resume) const {
+    std::filesystem::rename(newDevice(), path("original"));
+    const auto reset = [this] {
+      std::filesystem::remove_all(newDevice());
+      std::filesystem::copy(path("original"), newDevice(), std::filesystem::copy_options::recursive);
+    };
+    killAtEachStep(9, least, reset, work, [&] {
+      resume();
+      ASSERT_EQ(syncNew().status, 0);
+      ASSERT_EQ(contentOf(newDevice()), contentOf(device()));
+    });
+  }
   [[nodiscard]] std::string newFile(const std::string& devicePath) const { return newDevice() + "/root" + devicePath; }
 };
 
-TEST_P(Restore, GivesEachAppAPlaceholderAndTheSyncBringsAllAsItWas) {
+TEST_P(Restore, SyncCompletesRestoredDevice) {
   prepare();
   const Finished restored = restore();
   EXPECT_EQ(restored.status, 0) << restored.err;
@@ -48,7 +63,7 @@ TEST_P(Restore, GivesEachAppAPlaceholderAndTheSyncBringsAllAsItWas) {
   EXPECT_EQ(contentOf(newDevice()), contentOf(device()));
 }
 
-TEST_P(Restore, TellsMachinesOfEachAppOnceAndOfAll) {
+TEST_P(Restore, ReportsEachAppOnceInJson) {
   prepare();
   const Finished restored = restore({"--json"});
   EXPECT_THAT(endsIn(restored.out),
@@ -62,7 +77,7 @@ TEST_P(Restore, TellsMachinesOfEachAppOnceAndOfAll) {
   EXPECT_FALSE(summary.contains("installed"));
 }
 
-TEST_P(Restore, LogsWhatTheClientDoesAndFilesTheHostsFileAway) {
+TEST_P(Restore, LogsAndArchivesTheRestoreFile) {
   prepare();
   ASSERT_EQ(restore({"--log", path("log")}).status, 0);
   const std::string log = readHostFile(path("log"));
@@ -73,7 +88,7 @@ TEST_P(Restore, LogsWhatTheClientDoesAndFilesTheHostsFileAway) {
   EXPECT_TRUE(std::filesystem::exists(newFile("/var/mobile/Library/Logs/MediaServices/RestoreApplications.plist")));
 }
 
-TEST_P(Restore, KeepsTheDataUntilThePackageIsIn) {
+TEST_P(Restore, KeepsDataUntilPackageIsInstalled) {
   prepare();
   ASSERT_EQ(restore().status, 0);
   EXPECT_FALSE(std::filesystem::exists(newDevice() + kData + "org.data"));
@@ -82,7 +97,7 @@ TEST_P(Restore, KeepsTheDataUntilThePackageIsIn) {
   EXPECT_EQ(readHostFile(newDevice() + kData + "org.data/Documents/notes"), "what was written");
 }
 
-TEST_P(Restore, ARestoredDeviceCanBeBackedUpBeforeItsPackagesCome) {
+TEST_P(Restore, BacksUpDeviceBeforePackagesArrive) {
   prepare();
   ASSERT_EQ(restore().status, 0);
   run({"backup", newDevice(), path("second")});
@@ -92,7 +107,7 @@ TEST_P(Restore, ARestoredDeviceCanBeBackedUpBeforeItsPackagesCome) {
   EXPECT_EQ(readHostFile(path("second/Apps/org.licence/ApplicationSINF")), "a licence");
 }
 
-TEST_P(Restore, ADemotedAppComesBackWhenItIsAskedForAndHasItsDataStill) {
+TEST_P(Restore, ReinstallsDemotedAppWithData) {
   prepare();
   ASSERT_EQ(restore().status, 0);
   const Finished synced = syncNew({"--only", "org.auto"});
@@ -101,7 +116,7 @@ TEST_P(Restore, ADemotedAppComesBackWhenItIsAskedForAndHasItsDataStill) {
   EXPECT_EQ(readHostFile(newDevice() + kData + "org.auto/Documents/scores"), "100");
 }
 
-TEST_P(Restore, APackageThatNobodyHasIsToldAndComesLater) {
+TEST_P(Restore, MissingPackageFailsUntilProvided) {
   prepare();
   ASSERT_EQ(restore().status, 0);
   std::filesystem::rename(library() + "/org.plain-1.0.zip", path("aside"));
@@ -114,7 +129,7 @@ TEST_P(Restore, APackageThatNobodyHasIsToldAndComesLater) {
   EXPECT_EQ(contentOf(newDevice()), contentOf(device()));
 }
 
-TEST_P(Restore, WithoutAStoreOnlyCoordinatedAppsWait) {
+TEST_P(Restore, OnlyCoordinatedAppsNeedAStore) {
   prepare();
   run({"set", newDevice(), "store=unset"});
   ASSERT_EQ(restore().status, 0);
@@ -128,16 +143,16 @@ TEST_P(Restore, WithoutAStoreOnlyCoordinatedAppsWait) {
   EXPECT_EQ(contentOf(newDevice()), contentOf(device()));
 }
 
-TEST_P(Restore, OfADeviceThatHasAppsIsRefused) {
+TEST_P(Restore, RefusesDeviceWithApps) {
   fillDevice();
   makeBackup();
   const Finished refused = runTool({"restore", device(), backup()});
   EXPECT_EQ(refused.status, 3);
-  EXPECT_THAT(refused.err, HasSubstr("has apps already; restore to a new device"));
+  EXPECT_THAT(refused.err, HasSubstr("already has apps; restore to a new device"));
   EXPECT_FALSE(std::filesystem::exists(device() + "/restore.plist"));
 }
 
-TEST_P(Restore, WhatIsNoBackupIsRefused) {
+TEST_P(Restore, RefusesInvalidBackup) {
   prepare();
   const auto refusal = [this] {
     const Finished refused = restore();
@@ -147,21 +162,21 @@ TEST_P(Restore, WhatIsNoBackupIsRefused) {
   };
   const std::string good = manifest();
   changeManifest("appsync backup", "holiday pictures");
-  EXPECT_THAT(refusal(), HasSubstr("its manifest is something else's"));
+  EXPECT_THAT(refusal(), HasSubstr("its manifest is not that of a backup"));
   write(backup() + "/Manifest.plist", good);
   changeManifest("<integer>1</integer>", "<integer>9</integer>");
   EXPECT_THAT(refusal(), HasSubstr("it has version 9 and this program reads version 1"));
   write(backup() + "/Manifest.plist", good.substr(0, good.size() / 2));
   EXPECT_THAT(refusal(), HasSubstr("its manifest is damaged"));
   write(backup() + "/Manifest.plist", "");
-  EXPECT_THAT(refusal(), HasSubstr("is no backup that can be used"));
+  EXPECT_THAT(refusal(), HasSubstr("is not a usable backup"));
   std::filesystem::remove(backup() + "/Manifest.plist");
-  EXPECT_THAT(refusal(), HasSubstr("is no backup that can be used"));
+  EXPECT_THAT(refusal(), HasSubstr("is not a usable backup"));
   EXPECT_EQ(runTool({"restore", newDevice(), path("missing")}).status, 3);
   EXPECT_EQ(runTool({"restore", newDevice(), path("licence")}).status, 3);
 }
 
-TEST_P(Restore, AnAppWhoseFilesAreDamagedFailsAloneAndLeavesNothing) {
+TEST_P(Restore, DamagedFilesFailOnlyTheirApp) {
   prepare();
   write(backup() + "/Apps/org.data/Data/Documents/notes", "less");
   write(backup() + "/Apps/org.licence/ApplicationSINF", "x");
@@ -171,12 +186,12 @@ TEST_P(Restore, AnAppWhoseFilesAreDamagedFailsAloneAndLeavesNothing) {
   EXPECT_EQ(restored.status, 1);
   EXPECT_THAT(endsIn(restored.out), UnorderedElementsAre("failed org.auto", "failed org.data", "failed org.licence",
                                                          "restored org.plain", "restored org.wished"));
-  EXPECT_THAT(restored.out, HasSubstr("its data in the backup is damaged: there are 4 bytes and must be 16"));
+  EXPECT_THAT(restored.out, HasSubstr("its data in the backup is damaged: it has 4 bytes and must have 16"));
   EXPECT_THAT(restored.out, HasSubstr("ApplicationSINF is damaged: it has 1 bytes and must have 9"));
   EXPECT_THAT(newApps(), ElementsAre("org.plain 1.0?", "org.wished 1.0?"));
 }
 
-TEST_P(Restore, MetadataThatIsNoDictionaryFailsItsApp) {
+TEST_P(Restore, NonDictionaryMetadataFailsItsApp) {
   fillDevice();
   publish("org.odd", "1.0", {{"HarvoMetadata.plist", "(a, b)"}});
   ASSERT_EQ(sync({"--only", "org.odd"}).status, 0);
@@ -184,11 +199,11 @@ TEST_P(Restore, MetadataThatIsNoDictionaryFailsItsApp) {
   makeNewDevice();
   const Finished restored = restore();
   EXPECT_EQ(restored.status, 1);
-  EXPECT_THAT(restored.err, HasSubstr("its store metadata is damaged: it is no dictionary"));
+  EXPECT_THAT(restored.err, HasSubstr("its store metadata is damaged: it is not a dictionary"));
   EXPECT_EQ(newApps().size(), 5U);
 }
 
-TEST_P(Restore, HostileIdentifiersLeadNowhere) {
+TEST_P(Restore, RefusesHostileIdentifiers) {
   prepare();
   write(path("escaped"), "untouched");
   for (const char* identifier : {"../../escaped", "/etc", "..", ""}) {
@@ -197,35 +212,32 @@ TEST_P(Restore, HostileIdentifiersLeadNowhere) {
     changeManifest("<string>org.plain</string>", "<string>" + std::string(identifier) + "</string>");
     const Finished restored = restore();
     EXPECT_EQ(restored.status, 1) << identifier;
-    EXPECT_THAT(restored.err, HasSubstr("is no bundle identifier")) << identifier;
+    EXPECT_THAT(restored.err, HasSubstr("is not a bundle identifier")) << identifier;
     EXPECT_EQ(newApps().size(), 4U) << identifier;
     write(backup() + "/Manifest.plist", good);
   }
   EXPECT_EQ(readHostFile(path("escaped")), "untouched");
 }
 
-TEST_P(Restore, AnInterruptedOneIsCompletedOnlyWithTheSameBackup) {
+TEST_P(Restore, ResumesOnlyWithTheSameBackup) {
   prepare();
   run({"backup", device(), path("other")});
   long step = 1;
-  // Cut off as soon as there are apps.
+  // Killed as soon as there are apps.
   while (newApps().empty()) {
     makeNewDevice();
     step += 10;
-    ASSERT_EQ(
-        restore({}, {.environment = {{"APPSYNC_KILL_AT", std::to_string(step)}}, .output = OutputTo::file, .input = {}})
-            .status,
-        -SIGKILL);
+    ASSERT_EQ(restore({}, killedAt(step)).status, -SIGKILL);
   }
   const Finished other = runTool({"restore", newDevice(), path("other")});
   EXPECT_EQ(other.status, 3);
-  EXPECT_THAT(other.err, HasSubstr("is in the middle of the restore of another backup"));
+  EXPECT_THAT(other.err, HasSubstr("has an unfinished restore of another backup"));
   EXPECT_EQ(restore().status, 0);
   EXPECT_EQ(newApps().size(), 5U);
   EXPECT_EQ(runTool({"restore", newDevice(), backup()}).status, 3);
 }
 
-TEST_P(Restore, ADemotedAppKeepsItsNameWhateverTheStoreCallsIt) {
+TEST_P(Restore, DemotedAppKeepsItsOwnName) {
   publish("org.wished", "1.0", {{"HarvoMetadata.plist", "{title = \"The Best of Wishes\";}"}});
   ASSERT_EQ(sync().status, 0);
   run({"set", device(), "demote=org.wished"});
@@ -240,57 +252,26 @@ TEST_P(Restore, ADemotedAppKeepsItsNameWhateverTheStoreCallsIt) {
   EXPECT_NE(name, "The Best of Wishes");
 }
 
-/// With APPSYNC_EVERY_STEP in the environment at really every one.
-long strideOr(long usual) {
-  return std::getenv("APPSYNC_EVERY_STEP") == nullptr ? usual : 1;
-}
-
-TEST_P(Restore, KilledAtAnyStepIsCompletedByRunningItAgain) {
+TEST_P(Restore, ResumesWhenKilledAtAnyStep) {
   prepare();
-  std::filesystem::rename(newDevice(), path("original"));
-  long step = 1;
-  for (; step < 3000; step += strideOr(9)) {
-    std::filesystem::remove_all(newDevice());
-    std::filesystem::copy(path("original"), newDevice(), std::filesystem::copy_options::recursive);
-    const Finished killed = restore(
-        {}, {.environment = {{"APPSYNC_KILL_AT", std::to_string(step)}}, .output = OutputTo::file, .input = {}});
-    if (killed.status == 0) break;
-    ASSERT_EQ(killed.status, -SIGKILL) << killed.err;
-    // The last step is the one that ends the restore.
-    const Finished again = restore();
-    ASSERT_EQ(again.status, 0) << "step " << step << ": " << again.err;
-    ASSERT_EQ(syncNew().status, 0) << "step " << step;
-    ASSERT_EQ(contentOf(newDevice()), contentOf(device())) << "step " << step;
-  }
-  EXPECT_GT(step, 100);
-  EXPECT_LT(step, 3000);
+  // Every killed restore is unfinished: the last step removes its marker.
+  killAtEachStepOfNewDevice(
+      100, [this](const ToolOptions& options) { return restore({}, options); },
+      [this] { ASSERT_EQ(restore().status, 0); });
 }
 
-TEST_P(Restore, ASyncThatIsKilledWhileItBringsRestoredAppsIsCompletedByTheNext) {
+TEST_P(Restore, NextSyncResumesKilledSync) {
   prepare();
   ASSERT_EQ(restore().status, 0);
-  std::filesystem::rename(newDevice(), path("original"));
-  long step = 1;
-  for (; step < 3000; step += strideOr(9)) {
-    std::filesystem::remove_all(newDevice());
-    std::filesystem::copy(path("original"), newDevice(), std::filesystem::copy_options::recursive);
-    const Finished killed = syncNew(
-        {}, {.environment = {{"APPSYNC_KILL_AT", std::to_string(step)}}, .output = OutputTo::file, .input = {}});
-    if (killed.status == 0) break;
-    ASSERT_EQ(killed.status, -SIGKILL) << killed.err;
-    ASSERT_EQ(syncNew().status, 0) << "step " << step;
-    ASSERT_EQ(contentOf(newDevice()), contentOf(device())) << "step " << step;
-  }
-  EXPECT_GT(step, 50);
-  EXPECT_LT(step, 3000);
+  killAtEachStepOfNewDevice(
+      50, [this](const ToolOptions& options) { return syncNew({}, options); }, [] {});
 }
 
-INSTANTIATE_TEST_SUITE_P(Modes, Restore, testing::Values("--direct", "--coordinated"),
-                         [](const auto& mode) { return mode.param.substr(2); });
+INSTANTIATE_TEST_SUITE_P(Modes, Restore, kModes, nameOfMode);
 
 class DemotionCommand : public ToolFixture {};
 
-TEST_F(DemotionCommand, DemotesAnInstalledAppAndTellsItInTheList) {
+TEST_F(DemotionCommand, DemotesInstalledApp) {
   publish("org.a");
   ASSERT_EQ(sync().status, 0);
   EXPECT_EQ(runTool({"set", device(), "demote=org.a"}).status, 0);
@@ -302,7 +283,7 @@ TEST_F(DemotionCommand, DemotesAnInstalledAppAndTellsItInTheList) {
   EXPECT_THAT(runTool({"apps", device()}).out, Not(HasSubstr("demoted")));
 }
 
-TEST_F(DemotionCommand, OfWhatIsNotThereIsWrongUsage) {
+TEST_F(DemotionCommand, RefusesUnknownApps) {
   const Finished refused = runTool({"set", device(), "demote=org.none"});
   EXPECT_EQ(refused.status, 2);
   EXPECT_THAT(refused.err, HasSubstr("there is no app \"org.none\" to demote"));

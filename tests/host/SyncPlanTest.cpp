@@ -5,7 +5,7 @@
 namespace appsync::host {
 namespace {
 
-/// A library and a device, and what is planned for them.
+/// The plan for a library and a device.
 class SyncPlan : public testing::Test {
  protected:
   void libraryHas(const std::string& identifier, const std::string& version) {
@@ -13,7 +13,7 @@ class SyncPlan : public testing::Test {
   }
   void deviceHas(const std::string& identifier, const std::string& version) {
     DeviceApp app;
-    app.app = {identifier, "Name", version};
+    app.name = {identifier, "Name", version};
     app.isInstalled = true;
     apps_[identifier] = app;
   }
@@ -37,25 +37,25 @@ class SyncPlan : public testing::Test {
   IdentifierSet fromStore_;
 };
 
-TEST_F(SyncPlan, NothingIsPlannedForAnEmptyLibrary) {
+TEST_F(SyncPlan, EmptyLibraryPlansNothing) {
   deviceHas("org.a", "1.0");
   EXPECT_TRUE(plan().empty());
 }
 
-TEST_F(SyncPlan, AnAppThatTheDeviceLacksIsInstalled) {
+TEST_F(SyncPlan, InstallsMissingApp) {
   libraryHas("org.a", "1.0");
   const PlannedApp app = planOfOne();
   EXPECT_EQ(app.work, PlannedWork::install);
   EXPECT_EQ(app.package, &library_.packages["org.a"]);
 }
 
-TEST_F(SyncPlan, ANewerVersionIsAnUpdate) {
+TEST_F(SyncPlan, UpdatesToNewerVersion) {
   libraryHas("org.a", "1.10");
   deviceHas("org.a", "1.9");
   EXPECT_EQ(planOfOne().work, PlannedWork::update);
 }
 
-TEST_F(SyncPlan, TheSameVersionIsLeftAlone) {
+TEST_F(SyncPlan, LeavesSameVersion) {
   libraryHas("org.a", "1.0");
   deviceHas("org.a", "1.0.0");
   const PlannedApp app = planOfOne();
@@ -63,7 +63,7 @@ TEST_F(SyncPlan, TheSameVersionIsLeftAlone) {
   EXPECT_EQ(app.package, nullptr);
 }
 
-TEST_F(SyncPlan, ANewerVersionOnTheDeviceIsKept) {
+TEST_F(SyncPlan, KeepsNewerVersionOnDevice) {
   libraryHas("org.a", "1.0");
   deviceHas("org.a", "2.0");
   const PlannedApp app = planOfOne();
@@ -71,69 +71,69 @@ TEST_F(SyncPlan, ANewerVersionOnTheDeviceIsKept) {
   EXPECT_EQ(app.reason, "the device has the newer version 2.0, the library 1.0");
 }
 
-TEST_F(SyncPlan, APlaceholderCountsAsNotInstalled) {
+TEST_F(SyncPlan, InstallsAppWithPlaceholder) {
   libraryHas("org.a", "1.0");
   deviceAwaits("org.a");
   EXPECT_EQ(planOfOne().work, PlannedWork::install);
 }
 
-TEST_F(SyncPlan, ADeletedAppIsNotPushedAgain) {
+TEST_F(SyncPlan, SkipsDeletedApp) {
   libraryHas("org.a", "2.0");
   declined_ = {"org.a"};
   EXPECT_EQ(planOfOne().work, PlannedWork::skip);
 }
 
-TEST_F(SyncPlan, ADeletedAppThatIsAskedForIsInstalled) {
+TEST_F(SyncPlan, InstallsRequestedDeletedApp) {
   libraryHas("org.a", "2.0");
   declined_ = only_ = {"org.a"};
   EXPECT_EQ(planOfOne().work, PlannedWork::install);
 }
 
-TEST_F(SyncPlan, ADeletedAppThatCameBackByOtherMeansIsUpdated) {
+TEST_F(SyncPlan, UpdatesReinstalledDeletedApp) {
   libraryHas("org.a", "2.0");
   deviceHas("org.a", "1.0");
   declined_ = {"org.a"};
   EXPECT_EQ(planOfOne().work, PlannedWork::update);
 }
 
-TEST_F(SyncPlan, OnlyTheAppsAskedForAreConcerned) {
+TEST_F(SyncPlan, OnlySelectsApps) {
   libraryHas("org.a", "1.0");
   libraryHas("org.b", "1.0");
   library_.broken.push_back({"broken.zip", "it is damaged"});
   only_ = {"org.b"};
-  EXPECT_EQ(planOfOne().app.identifier, "org.b");
+  EXPECT_EQ(planOfOne().name.identifier, "org.b");
 }
 
-TEST_F(SyncPlan, AnAppAskedForThatTheLibraryLacksIsRefused) {
+TEST_F(SyncPlan, RefusesRequestedAppWithoutPackage) {
   only_ = {"org.c"};
   const PlannedApp app = planOfOne();
   EXPECT_EQ(app.work, PlannedWork::refuse);
-  EXPECT_EQ(app.app.identifier, "org.c");
+  EXPECT_EQ(app.name.identifier, "org.c");
 }
 
-TEST_F(SyncPlan, ABrokenPackageIsRefusedUnderItsFileName) {
+TEST_F(SyncPlan, RefusesBrokenPackageByFileName) {
   library_.broken.push_back({"broken.zip", "it is damaged"});
   const PlannedApp app = planOfOne();
   EXPECT_EQ(app.work, PlannedWork::refuse);
-  EXPECT_EQ(app.app.identifier, "broken.zip");
+  EXPECT_EQ(app.name.identifier, "broken.zip");
   EXPECT_EQ(app.reason, "it is damaged");
 }
 
-TEST_F(SyncPlan, ARemovedAppIsNotInstalledInTheSameSync) {
+TEST_F(SyncPlan, DoesNotInstallRemovedApp) {
   libraryHas("org.a", "2.0");
   deviceHas("org.a", "1.0");
   remove_ = {"org.a"};
   const PlannedApp app = planOfOne();
   EXPECT_EQ(app.work, PlannedWork::remove);
-  EXPECT_EQ(app.app.version, "1.0");
+  EXPECT_EQ(app.name.version, "1.0");
 }
 
-TEST_F(SyncPlan, RemovingWhatIsNotThereIsSkipped) {
+TEST_F(SyncPlan, SkipsRemovalOfMissingApp) {
   remove_ = {"org.a"};
   EXPECT_EQ(planOfOne().work, PlannedWork::skip);
 }
 
-TEST_F(SyncPlan, RemovalsComeFirst) {
+TEST_F(SyncPlan, PlansRemovalsFirst) {
   libraryHas("org.a", "1.0");
   deviceHas("org.b", "1.0");
   remove_ = {"org.b"};
@@ -143,7 +143,7 @@ TEST_F(SyncPlan, RemovalsComeFirst) {
   EXPECT_EQ(all[1].work, PlannedWork::install);
 }
 
-TEST_F(SyncPlan, ADemotedAppIsLeftAloneUnlessItIsAskedFor) {
+TEST_F(SyncPlan, SkipsDemotedAppUnlessRequested) {
   libraryHas("org.a", "1.0");
   deviceAwaits("org.a");
   apps_["org.a"].installType = platform::TSInstallType::IntentionalDowngrade;
@@ -154,7 +154,7 @@ TEST_F(SyncPlan, ADemotedAppIsLeftAloneUnlessItIsAskedFor) {
   EXPECT_EQ(planOfOne().work, PlannedWork::install);
 }
 
-TEST_F(SyncPlan, ADemotedAppThatWasBeingSentIsSentOn) {
+TEST_F(SyncPlan, ResumesInstallOfDemotedApp) {
   libraryHas("org.a", "1.0");
   deviceAwaits("org.a");
   apps_["org.a"].installType = platform::TSInstallType::Downgrade;
@@ -162,7 +162,7 @@ TEST_F(SyncPlan, ADemotedAppThatWasBeingSentIsSentOn) {
   EXPECT_EQ(planOfOne().work, PlannedWork::install);
 }
 
-TEST_F(SyncPlan, ARestoredAppThatTheStoreBringsIsNotTheLibrarys) {
+TEST_F(SyncPlan, StoreDeliversRestoredApp) {
   libraryHas("org.a", "1.0");
   deviceAwaits("org.a");
   fromStore_ = {"org.a"};
@@ -176,7 +176,7 @@ TEST_F(SyncPlan, ARestoredAppThatTheStoreBringsIsNotTheLibrarys) {
   EXPECT_EQ(planOfOne().work, PlannedWork::remove);
 }
 
-TEST_F(SyncPlan, ARestoredAppThatTheLibraryLacksIsToldAndOneThatItHasIsInstalled) {
+TEST_F(SyncPlan, InstallsRestoredAppOrReportsMissingPackage) {
   deviceAwaits("org.a");
   apps_["org.a"].installType = platform::TSInstallType::Restore;
   EXPECT_EQ(planOfOne().work, PlannedWork::refuse);

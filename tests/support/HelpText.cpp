@@ -19,7 +19,7 @@ std::string withoutFullStop(std::string text) {
   return text;
 }
 
-/// "  --name,-n TEXT       what it does", or the same on two lines.
+/// Parses "  --name,-n TEXT       description", on one or two lines.
 void addEntry(HelpText& help, const std::string& section, const std::string& line, std::istream& rest) {
   std::string description;
   if (line.size() > kDescriptionColumn && line[kDescriptionColumn - 1] == ' ') {

@@ -1,4 +1,4 @@
-// What `--help` says, taken apart.
+// The parsed output of `--help`.
 #pragma once
 
 #include <map>
@@ -15,7 +15,7 @@ struct HelpText {
   std::map<std::string, std::string> commands;
 };
 
-/// The help of `command`, or of the whole tool.
+/// Returns the help of `command`, or of the tool if it is empty.
 [[nodiscard]] HelpText helpOf(const std::string& command = {});
 
 }  // namespace appsync::test

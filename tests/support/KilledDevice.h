@@ -1,4 +1,4 @@
-// Devices that are killed at each step of some work.
+// Processes that are killed at each fault point of their work on a device.
 #pragma once
 
 #include <chrono>
@@ -16,7 +16,7 @@
 
 namespace appsync::test {
 
-/// Runs `work` in a process of its own that is killed in front of its step number `step`; false when there are fewer.
+/// Runs `work` in a child process that is killed before its step number `step`. Returns false if it has fewer steps.
 inline bool killedAt(long step, const std::function<void()>& work) {
   const pid_t child = fork();
   if (child == 0) {
@@ -34,7 +34,7 @@ inline bool killedAt(long step, const std::function<void()>& work) {
   return false;
 }
 
-/// How many containers the records name; checks that each record's bundle is there.
+/// Returns the number of containers in the records. Expects each record's bundle to exist.
 inline std::ptrdiff_t containersOfRecords(TestDevice& device) {
   std::ptrdiff_t containers = 0;
   const auto apps = device.registry().apps();
@@ -46,15 +46,15 @@ inline std::ptrdiff_t containersOfRecords(TestDevice& device) {
   return containers;
 }
 
-/// "1.0", "1.0 placeholder" for an app with a placeholder, "none".
+/// Returns "1.0", "1.0 placeholder" for an app with a placeholder, or "none".
 inline std::string versionOf(TestDevice& device, std::string_view identifier) {
   const auto app = device.record(identifier);
   return app == nullptr ? "none"
                         : app->bundleVersion().value_or("no version") + (app->isPlaceholder() ? " placeholder" : "");
 }
 
-/// Kills opening a device and `work` at each step, each time on a device that `prepare` made, and lets `check` judge
-/// what is left.
+/// Kills opening a device and `work` at each step, each time on a device from `prepare`, and calls `check` on the
+/// result.
 inline void killAtEveryStep(const std::function<void(TestDevice&)>& prepare,
                             const std::function<void(TestDevice&)>& work, const std::function<void(TestDevice&)>& check,
                             device::InstallMode mode = device::InstallMode::direct) {

@@ -1,4 +1,4 @@
-// A pipe with a name, and what was written into it.
+// Named pipes.
 #pragma once
 
 #include <string>
@@ -12,12 +12,12 @@
 
 namespace appsync::test {
 
-/// A pipe that nobody writes into.
+/// A pipe without a writer.
 inline void makePipe(const std::string& path) {
   ASSERT_EQ(::mkfifo(path.c_str(), 0600), 0) << path;
 }
 
-/// A pipe that has a reader, which waits for nothing. It holds 1 MB.
+/// A pipe with a non-blocking reader and a capacity of 1 MB.
 class NamedPipe {
  public:
   explicit NamedPipe(std::string path) : path_(std::move(path)) {
@@ -26,12 +26,12 @@ class NamedPipe {
     EXPECT_GE(::fcntl(reader_.get(), F_SETPIPE_SZ, kSize), kSize);
   }
 
-  /// Whether it is still there.
+  /// Returns whether the path is still a pipe.
   [[nodiscard]] bool isThere() const {
     struct stat found = {};
     return ::lstat(path_.c_str(), &found) == 0 && S_ISFIFO(found.st_mode);
   }
-  /// What was written into it and not read yet.
+  /// Returns the bytes that were written and not read yet.
   [[nodiscard]] std::string contents() const {
     std::string all(kSize, '\0');
     const ssize_t count = ::read(reader_.get(), all.data(), all.size());

@@ -38,13 +38,13 @@ int StepHold::passStep(const char* name) {
 void RecordingReporter::progressed(const host::AppProgress& progress) {
   wentBack |= progress.overall < overall;
   overall = progress.overall;
-  const std::string& identifier = progress.app.identifier;
+  const std::string& identifier = progress.name.identifier;
   if (std::ranges::find(sent, identifier) == sent.end()) sent.push_back(identifier);
 }
 
 void RecordingReporter::finished(const host::AppOutcome& outcome) {
   std::string line(wordFor(outcome.event));
-  line += " " + outcome.app.identifier;
+  line += " " + outcome.name.identifier;
   if (!outcome.reason.empty()) line += ": " + outcome.reason;
   ended.push_back(line);
 }
@@ -56,7 +56,7 @@ SyncInThisProcess::SyncInThisProcess(const std::string& devicePath, const std::s
   thread_ = std::thread([this, libraryPath] {
     const auto library = host::readLibrary(libraryPath);
     ASSERT_TRUE(library.ok());
-    const host::Interruption interruption;
+    const host::InterruptSignals interruption;
     host::SyncProgress progress(reporter_);
     const auto client = daemon::makeClient(device_->platform());
     ASSERT_TRUE(client.ok()) << client.error().text;

@@ -1,4 +1,4 @@
-// A sync that a test can stop at a known point and look into.
+// A sync that a test can stop at a known point and inspect.
 #pragma once
 
 #include <atomic>
@@ -15,11 +15,11 @@
 
 namespace appsync::test {
 
-/// Stops whoever reaches a step of the device, of that name, for the n-th time. One at a time.
+/// Blocks the thread that reaches the named step of the device for the n-th time. At most one may exist at a time.
 class StepHold {
  public:
   StepHold(std::string_view step, std::size_t time);
-  /// Lets go.
+  /// Releases the thread.
   ~StepHold();
   StepHold(const StepHold&) = delete;
   StepHold& operator=(const StepHold&) = delete;
@@ -36,7 +36,7 @@ class StepHold {
   Gate gate_;
 };
 
-/// What a sync told while it ran.
+/// The report of a sync.
 class RecordingReporter final : public host::SyncReporter {
  public:
   void progressed(const host::AppProgress& progress) override;
@@ -52,19 +52,19 @@ class RecordingReporter final : public host::SyncReporter {
   bool wentBack = false;
 };
 
-/// `appsync sync`, but for its command line, on a thread of this process.
+/// `appsync sync` without its command line, on a thread of this process.
 class SyncInThisProcess {
  public:
   SyncInThisProcess(const std::string& devicePath, const std::string& libraryPath);
-  /// Waits for its end.
+  /// Waits for the end of the sync.
   ~SyncInThisProcess();
   SyncInThisProcess(const SyncInThisProcess&) = delete;
   SyncInThisProcess& operator=(const SyncInThisProcess&) = delete;
 
   [[nodiscard]] device::Services& services() { return device_->services(); }
-  /// Until everybody has heard what they are to hear. Not while an install is held.
+  /// Blocks until all notifications are delivered. Must not be called while an install is held.
   void waitUntilTold();
-  /// Lets it go on where it is held, waits for its end, and lets go of the device.
+  /// Releases a held thread, waits for the end of the sync, and closes the device.
   const RecordingReporter& finish();
 
  private:

@@ -1,4 +1,4 @@
-// A device, a library and the tool between them.
+// A device, a library, and the tool.
 #pragma once
 
 #include <filesystem>
@@ -17,7 +17,7 @@ namespace appsync::test {
 
 class ToolFixture : public testing::Test {
  protected:
-  /// The device is made with this option, if there is one.
+  /// `mode` is the install mode of the device, an option of `appsync init`; empty for the default.
   explicit ToolFixture(std::string mode = {}) : mode_(std::move(mode)) {}
 
   void SetUp() override {
@@ -37,17 +37,21 @@ class ToolFixture : public testing::Test {
   void write(const std::string& path, std::string_view content) const {
     std::ofstream(path, std::ios::binary) << content;
   }
-  /// Puts a good package into the library.
+  /// Adds a valid package to the library.
   void publish(const std::string& identifier, const std::string& version = "1.0",
                const std::vector<ZipEntry>& more = {}) const {
     write(library() + "/" + identifier + "-" + version + ".zip", appPackage(identifier, version, more));
   }
   [[nodiscard]] Finished sync(std::vector<std::string> more = {}, const ToolOptions& options = {}) const {
-    more.insert(more.begin(), {"sync", device(), library()});
+    return syncTo(device(), std::move(more), options);
+  }
+  [[nodiscard]] Finished syncTo(const std::string& device, std::vector<std::string> more = {},
+                                const ToolOptions& options = {}) const {
+    more.insert(more.begin(), {"sync", device, library()});
     return runTool(more, options);
   }
 
-  /// Every line of a `--json` sync.
+  /// Parses the output of a sync with `--json`.
   [[nodiscard]] static std::vector<cli::Json> eventsIn(const std::string& output) {
     std::vector<cli::Json> events;
     for (std::size_t start = 0; start < output.size();) {
@@ -57,7 +61,7 @@ class ToolFixture : public testing::Test {
     }
     return events;
   }
-  /// "installed org.a, failed b.zip: reason" for the terminal events.
+  /// Returns "installed org.a" for each outcome in the output of a sync with `--json`.
   [[nodiscard]] static std::vector<std::string> endsIn(const std::string& output) {
     std::vector<std::string> ends;
     for (const cli::Json& event : eventsIn(output)) {
@@ -67,9 +71,10 @@ class ToolFixture : public testing::Test {
     }
     return ends;
   }
-  /// Each app on the device as "identifier version", placeholders with a question mark behind.
-  [[nodiscard]] std::vector<std::string> apps() const {
-    const Finished listed = runTool({"apps", device(), "--json"});
+  /// Returns each app on the device as "identifier version", followed by "?" for placeholders.
+  [[nodiscard]] std::vector<std::string> apps() const { return appsOf(device()); }
+  [[nodiscard]] static std::vector<std::string> appsOf(const std::string& device) {
+    const Finished listed = runTool({"apps", device, "--json"});
     EXPECT_EQ(listed.status, 0) << listed.err;
     std::vector<std::string> all;
     for (const cli::Json& app : cli::Json::parse(listed.out)) {
@@ -84,13 +89,12 @@ class ToolFixture : public testing::Test {
   TemporaryFolder folder_;
 };
 
-/// The same on a device of each mode.
+/// A ToolFixture for each install mode. Instantiate with `kModes` and `nameOfMode`.
 class ToolFixtureOfEachMode : public ToolFixture, public testing::WithParamInterface<const char*> {
  protected:
   ToolFixtureOfEachMode() : ToolFixture(GetParam()) {}
 };
 
-/// To be instantiated with these.
 inline const auto kModes = testing::Values("--coordinated", "--direct");
 [[nodiscard]] inline std::string nameOfMode(const testing::TestParamInfo<const char*>& mode) {
   return std::string(mode.param).substr(2);

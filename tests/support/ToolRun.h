@@ -1,4 +1,4 @@
-// The tool as a process of its own.
+// The tool as a child process.
 #pragma once
 
 #include <map>
@@ -12,24 +12,29 @@
 
 namespace appsync::test {
 
-/// What is left of a process: its exit status, or minus the number of the signal that ended it, and what it wrote.
+/// The result of a process: its exit status, or minus the number of the signal that ended it, and its output.
 struct Finished {
   int status = 0;
   std::string out;
   std::string err;
 };
 
-/// Where a process's standard output goes.
+/// The target of a process's standard output.
 enum class OutputTo { file, closedPipe, full };
 
 struct ToolOptions {
-  std::map<std::string, std::string> environment;
+  std::map<std::string, std::string> environment = {};
   OutputTo output = OutputTo::file;
-  std::string input;  ///< what it reads on standard input
+  std::string input = {};  ///< content of standard input
 };
 
-/// Runs `appsync`, or another program of the PATH, with these words. Killed and waited for at the latest when the
-/// object goes.
+/// Returns options for a run of the tool that is killed before its step number `step`.
+[[nodiscard]] inline ToolOptions killedAt(long step) {
+  return {.environment = {{"APPSYNC_KILL_AT", std::to_string(step)}}};
+}
+
+/// Runs `appsync`, or another program of the PATH, with these words. The destructor kills the process and waits for its
+/// end.
 class ToolRun {
  public:
   explicit ToolRun(const std::vector<std::string>& words, const ToolOptions& options = {},
@@ -41,11 +46,11 @@ class ToolRun {
   void signal(int number) const;
   [[nodiscard]] Finished wait();
 
-  // These block. False when it has ended without, or neither wrote nor ended for a minute.
+  // These block, and return false if the process ended without it or made no output for a minute.
 
-  /// Until `text` is in what it has written to standard output.
+  /// Blocks until standard output contains `text`.
   [[nodiscard]] bool writes(std::string_view text) const;
-  /// Until it has ended. It still is to be waited for.
+  /// Blocks until the process has ended. `wait` must still be called.
   [[nodiscard]] bool ends() const;
 
  private:
@@ -53,9 +58,9 @@ class ToolRun {
   pid_t process_ = -1;
 };
 
-/// Runs it to its end.
+/// Runs the tool to its end.
 [[nodiscard]] Finished runTool(const std::vector<std::string>& words, const ToolOptions& options = {});
-/// The same with another program, which finds the tool that is tested on its PATH. Status 127 when there is none.
+/// Runs another program to its end; its PATH contains the tested tool. Status 127 if the program does not exist.
 [[nodiscard]] Finished runProgram(const std::string& program, const std::vector<std::string>& words,
                                   const ToolOptions& options = {});
 

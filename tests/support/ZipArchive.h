@@ -1,4 +1,4 @@
-// Zip archives made by hand, so that they can be wrong in every way.
+// Zip archives with arbitrary defects.
 #pragma once
 
 #include <cstdint>
@@ -17,13 +17,13 @@ struct ZipEntry {
   bool hasWrongChecksum = false;
 };
 
-/// An archive of these entries, stored as they are.
+/// Returns an archive of these entries without compression.
 [[nodiscard]] std::string zipArchive(const std::vector<ZipEntry>& entries);
 
-/// An "Info.plist".
+/// Returns an "Info.plist".
 [[nodiscard]] std::string infoPlist(std::string_view identifier, std::string_view version = "1.0");
 
-/// A good package of one app, "Notes.app", with a few files, and `more`.
+/// Returns a valid package of one app, "Notes.app", with a few files and `more`.
 [[nodiscard]] std::string appPackage(std::string_view identifier, std::string_view version = "1.0",
                                      const std::vector<ZipEntry>& more = {});
 

@@ -7,14 +7,14 @@
 namespace appsync::daemon {
 namespace {
 
-TEST(ControlProtocol, RequestsReadBackAsTheyWereWritten) {
+TEST(ControlProtocol, RequestsRoundTrip) {
   EXPECT_EQ(lineOf(ControlRequest{ControlVerb::prioritize, "org.a"}), "prioritize org.a\n");
   EXPECT_EQ(lineOf(ControlRequest{ControlVerb::cancel, "org.a"}), "cancel org.a\n");
   EXPECT_EQ(readRequest("prioritize org.a"), (ControlRequest{ControlVerb::prioritize, "org.a"}));
   EXPECT_EQ(readRequest("cancel org.a"), (ControlRequest{ControlVerb::cancel, "org.a"}));
 }
 
-TEST(ControlProtocol, AnswersReadBackAsTheyWereWritten) {
+TEST(ControlProtocol, AnswersRoundTrip) {
   EXPECT_EQ(lineOf(ControlAnswer{ControlResult::done, {}}), "done\n");
   EXPECT_EQ(lineOf(ControlAnswer{ControlResult::refused, "not now"}), "refused not now\n");
   EXPECT_EQ(readAnswer("done"), (ControlAnswer{ControlResult::done, {}}));
@@ -22,7 +22,7 @@ TEST(ControlProtocol, AnswersReadBackAsTheyWereWritten) {
   EXPECT_EQ(readAnswer("error what"), (ControlAnswer{ControlResult::error, "what"}));
 }
 
-TEST(ControlProtocol, WhatIsNoRequestIsNone) {
+TEST(ControlProtocol, RejectsInvalidRequests) {
   using namespace std::string_literals;
   const std::string requests[] = {"",
                                   "cancel",
@@ -44,12 +44,12 @@ TEST(ControlProtocol, WhatIsNoRequestIsNone) {
     EXPECT_FALSE(readRequest(request)) << request;
 }
 
-TEST(ControlProtocol, WhatIsNoAnswerIsNone) {
+TEST(ControlProtocol, RejectsInvalidAnswers) {
   for (const char* answer : {"", "ok", "Done", " done", "donee"})
     EXPECT_FALSE(readAnswer(answer)) << answer;
 }
 
-TEST(ControlProtocol, ALongAnswerIsCutAndStaysOneLine) {
+TEST(ControlProtocol, TruncatesLongAnswer) {
   const std::string line = lineOf(ControlAnswer{ControlResult::error, "first\n" + std::string(5000, 'x')});
   EXPECT_EQ(line.size(), kLongestControlLine);
   EXPECT_EQ(line.find('\n'), line.size() - 1);

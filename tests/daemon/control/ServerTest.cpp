@@ -1,4 +1,4 @@
-// The socket of a running sync, and whoever may knock at it.
+// The control socket of a running sync, with valid and hostile clients.
 #include <atomic>
 #include <cerrno>
 #include <filesystem>
@@ -27,7 +27,7 @@ using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::IsEmpty;
 
-/// A client that says whatever it likes.
+/// A client that sends arbitrary bytes.
 class RawClient {
  public:
   explicit RawClient(const std::string& devicePath) {
@@ -37,13 +37,13 @@ class RawClient {
     if (connection) connection_ = std::move(connection).value();
     ::fcntl(connection_.get(), F_SETFL, 0);
   }
-  void say(std::string_view bytes) const {
-    // A server that has heard enough may have closed its end.
+  void send(std::string_view bytes) const {
+    // The server may have disconnected before the end of the text.
     static_cast<void>(::send(connection_.get(), bytes.data(), bytes.size(), MSG_NOSIGNAL));
   }
   void sayNoMore() const { ::shutdown(connection_.get(), SHUT_WR); }
-  /// Everything until the server closes.
-  [[nodiscard]] std::string hear() const {
+  /// Returns everything up to the end of the connection.
+  [[nodiscard]] std::string receive() const {
     std::string heard;
     char piece[4096];
     for (ssize_t count = 0; (count = ::recv(connection_.get(), piece, sizeof piece, 0)) > 0;)
@@ -72,9 +72,9 @@ class ControlServerTest : public testing::Test {
   [[nodiscard]] std::unique_ptr<ControlServer> open() { return open(device()); }
   [[nodiscard]] std::string answerTo(std::string_view bytes) const {
     const RawClient client(device());
-    client.say(bytes);
+    client.send(bytes);
     client.sayNoMore();
-    return client.hear();
+    return client.receive();
   }
 
   TemporaryFolder folder_;
@@ -82,7 +82,7 @@ class ControlServerTest : public testing::Test {
   ControlAnswer answer_{ControlResult::done, {}};
 };
 
-TEST_F(ControlServerTest, CarriesARequestOutAndAnswers) {
+TEST_F(ControlServerTest, CarriesOutRequest) {
   const auto server = open();
   const auto answer = askSync(device(), {ControlVerb::cancel, "org.a"});
   ASSERT_TRUE(answer.ok()) << answer.error().text;
@@ -90,24 +90,24 @@ TEST_F(ControlServerTest, CarriesARequestOutAndAnswers) {
   EXPECT_THAT(requests_, ElementsAre("org.a"));
 }
 
-TEST_F(ControlServerTest, ARefusalSaysWhy) {
+TEST_F(ControlServerTest, RefusalHasReason) {
   answer_ = {ControlResult::refused, "not now"};
   const auto server = open();
   EXPECT_EQ(*askSync(device(), {ControlVerb::prioritize, "org.a"}), answer_);
 }
 
-TEST_F(ControlServerTest, WithoutASyncTheSentenceSaysWhatToDo) {
+TEST_F(ControlServerTest, ErrorWithoutSyncSaysWhatToDo) {
   const auto answer = askSync(device(), {ControlVerb::cancel, "org.a"});
   ASSERT_FALSE(answer.ok());
   EXPECT_THAT(answer.error().text, AllOf(HasSubstr("no sync is running"), HasSubstr("`appsync sync`")));
 }
 
-TEST_F(ControlServerTest, TheSocketGoesWithTheSync) {
+TEST_F(ControlServerTest, SocketIsRemovedWithTheServer) {
   { const auto server = open(); }
   EXPECT_FALSE(std::filesystem::exists(socket()));
 }
 
-TEST_F(ControlServerTest, OnlyTheOwnerMayOpenItWhateverTheUmask) {
+TEST_F(ControlServerTest, OnlyTheOwnerCanConnect) {
   const mode_t before = ::umask(0);
   const auto server = open();
   ::umask(before);
@@ -117,7 +117,7 @@ TEST_F(ControlServerTest, OnlyTheOwnerMayOpenItWhateverTheUmask) {
   EXPECT_EQ(status.st_mode & 07777U, 0600U);
 }
 
-TEST_F(ControlServerTest, WhatAKilledSyncLeftIsReplaced) {
+TEST_F(ControlServerTest, ReplacesSocketOfKilledSync) {
   const auto folder = openControlFolder(device());
   { const auto left = listenIn(folder->get()); }
   ASSERT_TRUE(std::filesystem::exists(socket()));
@@ -126,90 +126,90 @@ TEST_F(ControlServerTest, WhatAKilledSyncLeftIsReplaced) {
   EXPECT_TRUE(askSync(device(), {ControlVerb::cancel, "org.a"}).ok());
 }
 
-TEST_F(ControlServerTest, AFileOfThatNameIsReplacedAndALinkNotFollowed) {
+TEST_F(ControlServerTest, ReplacesFileAndLink) {
   std::filesystem::create_symlink("/etc/passwd", socket());
   const auto server = open();
   EXPECT_TRUE(std::filesystem::is_socket(std::filesystem::symlink_status(socket())));
   EXPECT_TRUE(std::filesystem::exists("/etc/passwd"));
 }
 
-TEST_F(ControlServerTest, AFolderOfThatNameIsAnError) {
+TEST_F(ControlServerTest, FailsIfTheNameIsAFolder) {
   std::filesystem::create_directory(socket());
   EXPECT_FALSE(ControlServer::open(device(), {}).ok());
 }
 
-TEST_F(ControlServerTest, APathLongerThanASocketsAddressWorks) {
+TEST_F(ControlServerTest, AcceptsLongDevicePath) {
   const std::string path = device() + "/" + std::string(200, 'x');
   std::filesystem::create_directory(path);
   const auto server = open(path);
   EXPECT_TRUE(askSync(path, {ControlVerb::cancel, "org.a"}).ok());
 }
 
-TEST_F(ControlServerTest, WhatIsNoRequestIsAnsweredWithAnError) {
+TEST_F(ControlServerTest, InvalidRequestIsAnError) {
   using namespace std::string_literals;
   const auto server = open();
   for (const std::string& bytes : {"\n"s, "cancel\n"s, "fly org.a\n"s, "cancel ../../x\n"s, "\0\0\0\n"s, "\xff\xfe\n"s})
-    EXPECT_EQ(answerTo(bytes), "error the request is not understood\n") << bytes;
+    EXPECT_EQ(answerTo(bytes), "error the request is not valid\n") << bytes;
   EXPECT_THAT(requests_, IsEmpty());
 }
 
-TEST_F(ControlServerTest, ARequestWithoutAnEndIsAnsweredWithAnError) {
+TEST_F(ControlServerTest, IncompleteRequestIsAnError) {
   const auto server = open();
-  EXPECT_EQ(answerTo("cancel org.a"), "error the request did not come to its end\n");
-  EXPECT_EQ(answerTo(""), "error the request did not come to its end\n");
+  EXPECT_EQ(answerTo("cancel org.a"), "error the request is incomplete\n");
+  EXPECT_EQ(answerTo(""), "error the request is incomplete\n");
   EXPECT_THAT(requests_, IsEmpty());
 }
 
-TEST_F(ControlServerTest, AnEndlessRequestIsAnsweredAfterItsFirstPart) {
+TEST_F(ControlServerTest, EndlessRequestIsAnError) {
   const auto server = open();
   const RawClient client(device());
-  client.say(std::string(1U << 16U, 'x'));
-  EXPECT_EQ(client.hear(), "error the request is too long\n");
+  client.send(std::string(1U << 16U, 'x'));
+  EXPECT_EQ(client.receive(), "error the request is too long\n");
   EXPECT_THAT(requests_, IsEmpty());
 }
 
-TEST_F(ControlServerTest, ARequestMayComeInPieces) {
+TEST_F(ControlServerTest, ReadsRequestInPieces) {
   const auto server = open();
   const RawClient client(device());
   for (const char* piece : {"can", "cel o", "rg.a", "\n"})
-    client.say(piece);
-  EXPECT_EQ(client.hear(), "done\n");
+    client.send(piece);
+  EXPECT_EQ(client.receive(), "done\n");
 }
 
-TEST_F(ControlServerTest, OnlyTheFirstLineCounts) {
+TEST_F(ControlServerTest, IgnoresFurtherLines) {
   const auto server = open();
   const RawClient client(device());
-  client.say("cancel org.a\ncancel org.b\n");
-  EXPECT_EQ(client.hear(), "done\n");
+  client.send("cancel org.a\ncancel org.b\n");
+  EXPECT_EQ(client.receive(), "done\n");
   EXPECT_THAT(requests_, ElementsAre("org.a"));
 }
 
-TEST_F(ControlServerTest, WhoLeavesWithoutWaitingDoesNoHarm) {
+TEST_F(ControlServerTest, ClientMayDisconnectEarly) {
   const auto server = open();
   for (int number = 0; number < 50; ++number) {
     const RawClient client(device());
-    client.say("cancel org.a\n");
+    client.send("cancel org.a\n");
   }
   EXPECT_TRUE(askSync(device(), {ControlVerb::cancel, "org.b"}).ok());
 }
 
-TEST_F(ControlServerTest, WhoSaysNothingIsGivenUpAndTheNextIsServed) {
+TEST_F(ControlServerTest, DisconnectsSilentClient) {
   const auto server = open();
   const RawClient silent(device());
   EXPECT_TRUE(askSync(device(), {ControlVerb::cancel, "org.a"}).ok());
-  EXPECT_EQ(silent.hear(), "error the request did not come to its end\n");
+  EXPECT_EQ(silent.receive(), "error the request is incomplete\n");
 }
 
-TEST_F(ControlServerTest, WhoSaysNothingDoesNotHoldUpTheEnd) {
+TEST_F(ControlServerTest, SilentClientDoesNotDelayDestructor) {
   auto server = open();
   const RawClient silent(device());
   const RawClient another(device());
   server.reset();
-  EXPECT_THAT(silent.hear(), testing::AnyOf("", "error the request did not come to its end\n"));
-  EXPECT_EQ(another.hear(), "");
+  EXPECT_THAT(silent.receive(), testing::AnyOf("", "error the request is incomplete\n"));
+  EXPECT_EQ(another.receive(), "");
 }
 
-TEST_F(ControlServerTest, SeveralAtOnceAreServedOneAfterTheOther) {
+TEST_F(ControlServerTest, ServesConcurrentClients) {
   const auto server = open();
   std::vector<std::thread> askers;
   std::atomic<int> served = 0;
@@ -222,7 +222,7 @@ TEST_F(ControlServerTest, SeveralAtOnceAreServedOneAfterTheOther) {
   EXPECT_EQ(requests_.size(), 8U);
 }
 
-/// Another user, which only the superuser can play.
+/// A client of another user; needs the superuser.
 class OtherUser : public ControlServerTest {
  protected:
   static constexpr uid_t kNobody = 65534;
@@ -231,14 +231,14 @@ class OtherUser : public ControlServerTest {
     if (::geteuid() != 0) GTEST_SKIP() << "only the superuser can act as another user";
     ControlServerTest::SetUp();
   }
-  /// What that user is answered; each thread has a user of its own.
+  /// Returns the answer to that user. The effective user is set for the current thread only.
   [[nodiscard]] Result<std::string> answered() const {
     Result<std::string> answer = std::string();
     const auto folder = openControlFolder(device());
     std::thread([&] {
       ASSERT_EQ(::syscall(SYS_setresuid, kNobody, kNobody, kNobody), 0);
       const auto connection = connectIn(folder->get());
-      answer = connection ? readLine(connection->get(), ControlPatience(std::chrono::minutes(1), -1))
+      answer = connection ? readLine(connection->get(), Deadline(std::chrono::minutes(1), -1))
                           : Result<std::string>(connection.error());
     }).join();
     return answer;
@@ -252,12 +252,12 @@ TEST_F(OtherUser, CannotConnect) {
   EXPECT_EQ(answer.error().code, EACCES);
 }
 
-TEST_F(OtherUser, IsRefusedEvenThroughASocketThatEverybodyMayOpen) {
+TEST_F(OtherUser, IsRefusedByOpenSocket) {
   const auto server = open();
   ASSERT_EQ(::chmod(socket().c_str(), 0666), 0);
   const auto answer = answered();
   ASSERT_TRUE(answer.ok()) << answer.error().text;
-  EXPECT_EQ(*answer, "error the sync is another user's");
+  EXPECT_EQ(*answer, "error the sync belongs to another user");
   EXPECT_THAT(requests_, IsEmpty());
 }
 

@@ -3,7 +3,7 @@
 
 #include <gtest/gtest.h>
 
-#include "cli/PropertyListJson.h"
+#include "cli/Json.h"
 
 namespace appsync::cli {
 namespace {
@@ -16,26 +16,26 @@ plist::Value data(std::string_view text) {
   return plist::Value::data(bytesOf(text));
 }
 
-TEST(PropertyListJson, ScalarsHaveTheirOwnForm) {
+TEST(PropertyListJson, ConvertsScalars) {
   EXPECT_EQ(json(true), "true");
   EXPECT_EQ(json(-3), "-3");
   EXPECT_EQ(json(1.5), "1.5");
   EXPECT_EQ(json("text"), "\"text\"");
 }
 
-TEST(PropertyListJson, WhatWouldCommandATerminalStandsByNumber) {
+TEST(PropertyListJson, EscapesUnsafeCharacters) {
   EXPECT_EQ(json("\x7f \xc2\x9b[2J \xe2\x80\xae \xf3\xa0\x81\x81 é潮\n"),
             R"("\u007f \u009b[2J \u202e \udb40\udc41 é潮\n")");
   EXPECT_EQ(Json::parse(json("\xc2\x9b\xf3\xa0\x81\x81")), "\xc2\x9b\xf3\xa0\x81\x81");
   EXPECT_EQ(indented(Json::array({"\x7f"})), "[\n  \"\\u007f\"\n]");
 }
 
-TEST(PropertyListJson, IntegersKeepTheirWholeRange) {
+TEST(PropertyListJson, KeepsIntegerRange) {
   EXPECT_EQ(json(std::numeric_limits<std::int64_t>::min()), "-9223372036854775808");
   EXPECT_EQ(json(std::numeric_limits<std::uint64_t>::max()), "18446744073709551615");
 }
 
-TEST(PropertyListJson, ARealThatIsNoNumberIsNull) {
+TEST(PropertyListJson, NonFiniteRealIsNull) {
   EXPECT_EQ(json(std::nan("")), "null");
   EXPECT_EQ(json(std::numeric_limits<double>::infinity()), "null");
 }
@@ -54,15 +54,15 @@ TEST(PropertyListJson, DatesAreISO8601) {
   EXPECT_EQ(json(plist::Date{-0.5}), "\"2000-12-31T23:59:59.500Z\"");
 }
 
-TEST(PropertyListJson, ADateBeyondTheCalendarIsItsNumber) {
+TEST(PropertyListJson, DateBeyondCalendarIsANumber) {
   EXPECT_EQ(json(plist::Date{1e15}), "1e+15");
 }
 
-TEST(PropertyListJson, AUidIsAnObject) {
+TEST(PropertyListJson, UidIsAnObject) {
   EXPECT_EQ(json(plist::Uid{7}), R"({"CF$UID":7})");
 }
 
-TEST(PropertyListJson, ContainersNest) {
+TEST(PropertyListJson, ConvertsNestedContainers) {
   EXPECT_EQ(json(plist::Dictionary{{"b", plist::Array{1, "x"}}, {"a", plist::Dictionary()}}),
             R"({"a":{},"b":[1,"x"]})");
 }

@@ -1,10 +1,12 @@
-#include "cli/PropertyListJson.h"
+#include "cli/Json.h"
 
 #include <chrono>
 #include <cmath>
 #include <cstdint>
 #include <cstdio>
 #include <string>
+
+#include "cli/Printable.h"
 
 namespace appsync::cli {
 namespace {
@@ -28,7 +30,7 @@ std::string base64(ByteView bytes) {
 
 Json dateText(plist::Date date) {
   using namespace std::chrono;
-  constexpr double kLargest = 250'000'000'000;  // seconds; about 8000 years, within what a calendar can say
+  constexpr double kLargest = 250'000'000'000;  // seconds; about 8000 years, within the range of std::chrono::year
   if (!(std::abs(date.seconds) < kLargest)) return date.seconds;
   const sys_days reference = year{2001} / 1 / 1;
   const auto moment = reference + milliseconds(std::llround(date.seconds * 1000));
@@ -61,7 +63,7 @@ Json arrayJson(const plist::Array& elements) {
 
 Json dictionaryJson(const plist::Dictionary& dictionary) {
   Json json = Json::object();
-  // Appended, not looked up: an ordered object searches all its members, and these keys are different already.
+  // Appended without a look-up, which is linear in an ordered object: the keys are unique already.
   auto& members = json.get_ref<Json::object_t&>();
   members.reserve(dictionary.size());
   for (const auto& [key, value] : dictionary)
@@ -69,7 +71,19 @@ Json dictionaryJson(const plist::Dictionary& dictionary) {
   return json;
 }
 
+std::string safeText(const Json& json, int indentation) {
+  return withReferences(json.dump(indentation, ' ', false, Json::error_handler_t::replace), Notation::json);
+}
+
 }  // namespace
+
+std::string onOneLine(const Json& json) {
+  return safeText(json, -1);
+}
+
+std::string indented(const Json& json) {
+  return safeText(json, 2);
+}
 
 Json toJson(const plist::Value& value) {
   switch (value.type()) {
