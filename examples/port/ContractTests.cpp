@@ -1,7 +1,7 @@
-// Holds this port's own services to what their headers in platform/ promise.
+// Runs the contract suites of this port's services.
 //
-// A subject is what a suite needs to get at a service from its other side: to have an app removed, to read back what
-// was logged. Each test gets a subject of its own, in its first state.
+// A subject gives a suite access to a service and to its other side: it removes an app, or reads the log back. Each
+// test gets a new subject in its initial state.
 #include <filesystem>
 #include <fstream>
 #include <memory>
@@ -18,7 +18,7 @@
 #include "kit/fakes/FakePlatform.h"
 #include "kit/fakes/TemporaryFolder.h"
 
-// The suites' names are used where they live.
+// The suites are instantiated in their own namespace.
 namespace appsync::test {
 
 namespace {
@@ -26,8 +26,8 @@ namespace {
 class RemovedAppsSubject final : public UninstalledAppsListSubject {
  public:
   platform::UninstalledAppsList& list() override { return *list_; }
-  void removeRealApp(std::string_view identifier) override { EXPECT_EQ(list_->remember(identifier), 0); }
-  void installApp(std::string_view identifier) override { EXPECT_EQ(list_->forget(identifier), 0); }
+  void removeRealApp(std::string_view identifier) override { EXPECT_EQ(list_->add(identifier), 0); }
+  void installApp(std::string_view identifier) override { EXPECT_EQ(list_->remove(identifier), 0); }
   bool failClearing() override { return std::filesystem::create_directory(folder_.path("removed-apps.txt.new")); }
   bool restart() override {
     list_ = open();
@@ -92,7 +92,7 @@ class TextLogSubject final : public TransactionLogSubject {
 
   const TemporaryFolder folder_;
   const std::string path_ = folder_.path("transactions.txt");
-  FakePlatform device_;  // For the system's log, which is not ours.
+  FakePlatform device_;  // For its system log; the port implements none.
   port::TextTransactionLog log_{path_};
 };
 

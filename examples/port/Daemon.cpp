@@ -15,10 +15,10 @@ using appsync::platform::ZTClient;
 using appsync::test::FakePlatform;
 namespace plist = appsync::plist;
 
-/// Relative paths of received packages are relative to this folder.
+/// Base of relative paths of received packages.
 const std::string kPublicStaging = "/var/mobile/Media/PublicStaging";
 
-/// The host's instructions: what to install, and beside that each app's info dictionary and icon.
+/// Writes the host's files: the todo list, and each app's info dictionary and icon.
 void stage(FakePlatform& device, const std::vector<WantedApp>& library) {
   plist::Array todoList;
   for (const WantedApp& app : library) {
@@ -29,8 +29,8 @@ void stage(FakePlatform& device, const std::vector<WantedApp>& library) {
   device.files.put(appsync::test::kStagedTodoListPath, appsync::test::binaryForm(std::move(todoList)));
 }
 
-/// What the host does not push again, because a person removed it on the device.
-void tellRemovedApps(const plist::Dictionary& report) {
+/// Prints the apps that the user removed on the device, which the host must not send again.
+void printRemovedApps(const plist::Dictionary& report) {
   const plist::Value* deleted = report.find("_Deleted");
   if (deleted == nullptr || deleted->array() == nullptr) return;
   for (const plist::Value& app : *deleted->array()) {
@@ -39,7 +39,7 @@ void tellRemovedApps(const plist::Dictionary& report) {
   }
 }
 
-/// The host sends one package. Here it comes out of thin air; a daemon copies bytes, and reports as they arrive.
+/// Transfers one package. This example creates it; a daemon receives it from the host and reports progress meanwhile.
 void transfer(FakePlatform& device, ZTClient& client, const std::shared_ptr<ZTAsset>& asset) {
   const plist::Value* version = asset->version();
   const std::string wanted(version == nullptr ? "" : version->string().value_or(""));
@@ -53,9 +53,9 @@ void transfer(FakePlatform& device, ZTClient& client, const std::shared_ptr<ZTAs
   client.assetTransferSucceeded(asset, true, std::nullopt);
 }
 
-/// Ends a sync that the plug-in refuses. False, for `sync` to answer.
+/// Ends a sync that the plug-in refused. Returns false.
 bool endRefused(ZTClient& client, const std::optional<appsync::Error>& error) {
-  std::cout << "the plug-in refused the sync: " << (error ? error->text : "it does not say why") << "\n";
+  std::cout << "the plug-in refused the sync: " << (error ? error->text : "no reason given") << "\n";
   client.assetTransferEndedWithSuccess(false);
   client.syncEndedWithSuccess(false);
   return false;
@@ -67,11 +67,11 @@ bool sync(FakePlatform& device, ZTClient& client, const std::vector<WantedApp>& 
   stage(device, library);
   std::optional<appsync::Error> error;
   if (!client.prepareForSyncWithHostAnchor(client.currentSyncAnchor(), {}, &error)) return endRefused(client, error);
-  tellRemovedApps(client.installedAssets());
+  printRemovedApps(client.installedAssets());
   if (!client.reconcileSync({}, client.currentSyncAnchor(), {}, &error)) return endRefused(client, error);
   for (const auto& asset : client.outstandingAssetTransfers())
     transfer(device, client, asset);
-  client.assetTransferEndedWithSuccess(true);  // Returns when every package is installed, or has failed.
+  client.assetTransferEndedWithSuccess(true);  // Blocks until every install has ended.
   client.syncEndedWithSuccess(true);
   return true;
 }

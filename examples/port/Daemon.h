@@ -1,4 +1,4 @@
-// A sync daemon, and the host that it would talk to.
+// A minimal sync daemon that also plays the part of the host.
 #pragma once
 
 #include <string>
@@ -9,15 +9,15 @@
 
 namespace port {
 
-/// What the host wants on the device.
+/// An app that the host wants on the device.
 struct WantedApp {
   std::string identifier;
   std::string version;
   std::string name;
 };
 
-/// Drives the plug-in through one sync, with the sequence of calls that platform/ZTClient.h prescribes, and says on
-/// standard output what happens. False when the plug-in refused the sync.
+/// Runs one sync with the sequence of calls in platform/ZTClient.h and prints its events on standard output. Returns
+/// false if the plug-in refused the sync.
 [[nodiscard]] bool sync(appsync::test::FakePlatform& device, appsync::platform::ZTClient& client,
                         const std::vector<WantedApp>& library);
 

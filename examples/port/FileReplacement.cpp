@@ -21,11 +21,11 @@ int writeAll(int file, std::string_view text) {
   return fsync(file) == 0 ? 0 : errno;
 }
 
-/// A rename is on the disk only when the folder that holds the names is. Not every file system can do this, and by now
-/// the new file is in place: to call that a failure would be a lie.
-void syncFolderOf(const std::string& path) {
-  const std::string folder = std::filesystem::path(path).parent_path().string();
-  const int file = open(folder.empty() ? "." : folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+/// Makes a rename durable, which requires an fsync of the directory. Not every file system supports it, and the file is
+/// already replaced, so errors are ignored.
+void syncDirectoryOf(const std::string& path) {
+  const std::string directory = std::filesystem::path(path).parent_path().string();
+  const int file = open(directory.empty() ? "." : directory.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
   if (file < 0) return;
   static_cast<void>(fsync(file));
   close(file);
@@ -44,7 +44,7 @@ int replaceFile(const std::string& path, std::string_view text) {
     unlink(fresh.c_str());
     return error;
   }
-  syncFolderOf(path);
+  syncDirectoryOf(path);
   return 0;
 }
 

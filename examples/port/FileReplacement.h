@@ -1,4 +1,4 @@
-// Files that a reader, or a device that lost power, finds old or new and never half.
+// Atomic replacement of files.
 #pragma once
 
 #include <string>
@@ -6,8 +6,9 @@
 
 namespace port {
 
-/// Replaces the file at `path`, or makes it. Returns 0, or the system's error number, and then nothing has changed. The
-/// file that power is lost after may be the old one: where the folder cannot be written through, that is not told.
+/// Creates or replaces the file at `path`. Atomic for readers and across power failures. Returns 0, or the system's
+/// error number; the file is then unchanged. If the file system cannot sync directories, a power failure may restore
+/// the old file.
 [[nodiscard]] int replaceFile(const std::string& path, std::string_view text);
 
 }  // namespace port

@@ -1,4 +1,4 @@
-// A plug-in of some other release, for the test that the daemon refuses it.
+// A module of another interface version; tests that the daemon refuses it.
 #include "platform/Module.h"
 
 void appsync::platform::appsyncMakeClient(std::uint32_t, Platform*, std::shared_ptr<ZTClient>*,

@@ -8,12 +8,12 @@ namespace port {
 
 namespace {
 
-/// The module is never closed: its code must be there as long as any thread may still be in it.
+/// Never closes the module: its threads may run until the process exits.
 appsync::platform::ModuleEntryPoint entryPointOf(const std::string& path) {
   void* module = dlopen(path.c_str(), RTLD_NOW | RTLD_LOCAL);
   if (module == nullptr) throw std::runtime_error(dlerror());
   void* entryPoint = dlsym(module, appsync::platform::kModuleEntryPointName);
-  if (entryPoint == nullptr) throw std::runtime_error(path + " is no sync plug-in: " + dlerror());
+  if (entryPoint == nullptr) throw std::runtime_error(path + " is not a sync plug-in: " + dlerror());
   return reinterpret_cast<appsync::platform::ModuleEntryPoint>(entryPoint);
 }
 
@@ -26,8 +26,8 @@ std::shared_ptr<appsync::platform::ZTClient> loadPlugin(const std::string& path,
   appsync::platform::ModuleAnswer answer;
   entryPointOf(path)(kModuleInterfaceVersion, &platform, &client, &answer);
   if (answer.interfaceVersion != kModuleInterfaceVersion) {
-    throw std::runtime_error(path + " is of interface version " + std::to_string(answer.interfaceVersion) +
-                             ", this daemon of " + std::to_string(kModuleInterfaceVersion));
+    throw std::runtime_error(path + " has interface version " + std::to_string(answer.interfaceVersion) +
+                             "; this daemon requires " + std::to_string(kModuleInterfaceVersion));
   }
   if (client == nullptr) throw std::runtime_error(path + ": " + answer.refusal);
   return client;

@@ -1,4 +1,4 @@
-// The plug-in, out of its loadable module.
+// Loads the plug-in.
 #pragma once
 
 #include <memory>
@@ -10,9 +10,9 @@
 
 namespace port {
 
-/// Loads the module at `path` and has it make a client that reaches the world through `platform`, which must outlive
-/// the client. Never null. Throws std::runtime_error, with words for people, when there is no such module, when it is
-/// none of ours, or when it is of another interface version than the headers that this daemon was compiled with.
+/// Loads the module at `path` and creates a client on `platform`, which must outlive the client. Never returns null.
+/// Throws std::runtime_error, with a message for the user, if the file cannot be loaded, is not a plug-in, or has
+/// another interface version than this daemon.
 [[nodiscard]] std::shared_ptr<appsync::platform::ZTClient> loadPlugin(const std::string& path,
                                                                       appsync::platform::Platform& platform);
 

@@ -10,10 +10,10 @@ namespace port {
 std::optional<appsync::plist::Dictionary> RemovedApps::lookupUninstalled() {
   const std::scoped_lock lock(mutex_);
   const std::optional<Identifiers> identifiers = read();
-  if (!identifiers) return std::nullopt;  // "Nothing when the list cannot be had": not the same as an empty list.
+  if (!identifiers) return std::nullopt;  // The list is not available, which differs from an empty list.
   appsync::plist::Dictionary answer;
   for (const std::string& identifier : *identifiers)
-    answer.set(identifier, true);  // The plug-in reads the keys; the values are ours.
+    answer.set(identifier, true);  // The plug-in reads only the keys.
   return answer;
 }
 
@@ -26,7 +26,7 @@ int RemovedApps::clearUninstalled(const std::vector<std::string>& bundleIdentifi
   return replace(*identifiers);
 }
 
-int RemovedApps::remember(std::string_view bundleIdentifier) {
+int RemovedApps::add(std::string_view bundleIdentifier) {
   const std::scoped_lock lock(mutex_);
   std::optional<Identifiers> identifiers = read();
   if (!identifiers) return EIO;
@@ -34,7 +34,7 @@ int RemovedApps::remember(std::string_view bundleIdentifier) {
   return replace(*identifiers);
 }
 
-int RemovedApps::forget(std::string_view bundleIdentifier) {
+int RemovedApps::remove(std::string_view bundleIdentifier) {
   return clearUninstalled({std::string(bundleIdentifier)});
 }
 

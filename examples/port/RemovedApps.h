@@ -1,4 +1,4 @@
-// The installer's memory of removed apps, in a plain file.
+// The list of removed apps, in a text file.
 #pragma once
 
 #include <functional>
@@ -14,11 +14,10 @@
 
 namespace port {
 
-/// One bundle identifier a line. A file that is not there is an empty list.
+/// One bundle identifier per line. A missing file is an empty list.
 ///
-/// The header in platform/ promises more than "a list": it outlives the process, clearing takes off all or none, and
-/// every operation may come on any thread. So each change reads the file, changes the set in memory, and replaces the
-/// file in one step, under one lock.
+/// The contract requires persistence, atomic clearing and thread safety. So each change reads the file, changes the set
+/// in memory and replaces the file atomically, under one lock.
 class RemovedApps final : public appsync::platform::UninstalledAppsList {
  public:
   explicit RemovedApps(std::string path) : path_(std::move(path)) {}
@@ -27,9 +26,9 @@ class RemovedApps final : public appsync::platform::UninstalledAppsList {
   [[nodiscard]] std::optional<appsync::plist::Dictionary> lookupUninstalled() override;
   [[nodiscard]] int clearUninstalled(const std::vector<std::string>& bundleIdentifiers) override;
 
-  // For this device's installer: a real app was removed, or is installed again. Each returns 0, or an error number.
-  [[nodiscard]] int remember(std::string_view bundleIdentifier);
-  [[nodiscard]] int forget(std::string_view bundleIdentifier);
+  // For this device's installer, when an app was removed or reinstalled. Return 0 or an error number.
+  [[nodiscard]] int add(std::string_view bundleIdentifier);
+  [[nodiscard]] int remove(std::string_view bundleIdentifier);
 
  private:
   using Identifiers = std::set<std::string, std::less<>>;

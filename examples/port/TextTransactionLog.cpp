@@ -31,7 +31,7 @@ std::string number(Enumeration value) {
   return std::to_string(static_cast<std::uint32_t>(value));
 }
 
-/// What both kinds of entry end with.
+/// Returns the last fields of both kinds of entries.
 std::string outcome(bool success, std::string_view bundleIdentifier, std::string_view description) {
   return (success ? "ok\t" : "failed\t") + escaped(bundleIdentifier) + "\t" + escaped(description) + "\n";
 }
@@ -40,7 +40,7 @@ std::string outcome(bool success, std::string_view bundleIdentifier, std::string
 
 void TextTransactionLog::initializeWithLog(std::shared_ptr<appsync::platform::SystemLogHandle> log) {
   const std::scoped_lock lock(mutex_);
-  log_ = std::move(log);  // The plug-in drops its own share at once: whoever needs the handle keeps it.
+  log_ = std::move(log);  // The plug-in keeps no share of the handle.
 }
 
 void TextTransactionLog::logStep(appsync::platform::TransactionStep step, appsync::platform::TransactionParty party,
@@ -58,7 +58,7 @@ void TextTransactionLog::logScenario(std::string_view scenario, std::uint32_t st
 
 void TextTransactionLog::append(const std::string& line) {
   const std::scoped_lock lock(mutex_);
-  file_.clear();  // One failed write, of a full disk say, does not silence the log for good.
+  file_.clear();  // A failed write, such as on a full disk, must not disable the log.
   file_ << line << std::flush;
 }
 

@@ -1,4 +1,4 @@
-// The device's record of what was installed and removed, as a text file.
+// The transaction log, as a text file.
 #pragma once
 
 #include <cstdint>
@@ -12,13 +12,13 @@
 
 namespace port {
 
-/// Appends one line for each entry, its fields separated by tabs:
+/// Appends one line per entry, with fields separated by tabs:
 ///
 ///     step      STEP      PARTY  PHASE  ok|failed  IDENTIFIER  DESCRIPTION
 ///     scenario  SCENARIO  STEP          ok|failed  IDENTIFIER  DESCRIPTION
 ///
-/// In texts a backslash, a tab and the end of a line stand as \\, \t and \n, so that a line is always one entry.
-/// An entry that cannot be written is lost, as the header in platform/ allows: nothing fails towards the plug-in.
+/// In texts, backslash, tab and newline are written as \\, \t and \n, so that each entry is one line. An entry that
+/// cannot be written is lost, as the contract allows.
 class TextTransactionLog final : public appsync::platform::TransactionLog {
  public:
   explicit TextTransactionLog(const std::string& path) : file_(path, std::ios::app) {}
@@ -33,7 +33,7 @@ class TextTransactionLog final : public appsync::platform::TransactionLog {
  private:
   void append(const std::string& line);
 
-  std::mutex mutex_;  // Ten installs may write at once.
+  std::mutex mutex_;  // The plug-in installs up to ten apps concurrently.
   std::shared_ptr<appsync::platform::SystemLogHandle> log_;
   std::ofstream file_;
 };

@@ -1,5 +1,5 @@
-// appsync-port-daemon MODULE FOLDER: loads the plug-in into a daemon whose device is half a port: two services are real
-// and keep their files in FOLDER, all others are the kit's fakes. Replace these one by one until none is left.
+// appsync-port-daemon MODULE DIRECTORY: a daemon that loads the plug-in. Two services are real and store their files in
+// DIRECTORY; all others are the kit's fakes. A port replaces these one by one.
 #include <exception>
 #include <filesystem>
 #include <fstream>
@@ -17,7 +17,7 @@ namespace {
 using appsync::test::FakeApp;
 using appsync::test::FakePlatform;
 
-void tellApps(const FakePlatform& device) {
+void printApps(const FakePlatform& device) {
   for (const std::string& identifier : device.registry.identifiers()) {
     const FakeApp app = *device.registry.app(identifier);
     std::cout << (app.isInstalled ? "installed: " : "placeholder: ") << identifier << " "
@@ -25,12 +25,12 @@ void tellApps(const FakePlatform& device) {
   }
 }
 
-void tellTransactions(const std::string& path) {
+void printTransactions(const std::string& path) {
   std::cout << "--- transaction log\n";
   if (std::ifstream file(path); file.peek() != std::ifstream::traits_type::eof()) std::cout << file.rdbuf();
 }
 
-void tellLog(const FakePlatform& device) {
+void printLog(const FakePlatform& device) {
   std::cout << "--- log of the sync framework\n";
   for (const appsync::test::LogLine& line : device.log.lines())
     std::cout << line << "\n";
@@ -38,17 +38,17 @@ void tellLog(const FakePlatform& device) {
 
 int run(const std::string& modulePath, const std::string& folder) {
   std::filesystem::create_directories(folder);
-  // Our own services outlive the platform that lends them to the plug-in, and the platform outlives the client.
+  // The services must outlive the platform that refers to them, and the platform must outlive the client.
   port::TextTransactionLog transactions(folder + "/transactions.txt");
   port::RemovedApps removedApps(folder + "/removed-apps.txt");
   FakePlatform device;
   device.use(transactions);
   device.use(removedApps);
 
-  // What is on the device already, and what its owner removed since the last sync.
-  device.bundleFolders.setMainBundleIdentifier("com.corvel.zeph");  // The plug-in asks whether it is in the daemon.
+  // The device has one app, and the user has removed another one since the last sync.
+  device.bundleFolders.setMainBundleIdentifier("com.corvel.zeph");  // The plug-in checks that it runs in the daemon.
   device.registry.add(FakeApp::installed("com.example.notes"));
-  if (const int failure = removedApps.remember("com.example.chess"); failure != 0) {
+  if (const int failure = removedApps.add("com.example.chess"); failure != 0) {
     std::cerr << folder << " cannot be used (error " << failure << ")\n";
     return 3;
   }
@@ -56,9 +56,9 @@ int run(const std::string& modulePath, const std::string& folder) {
   const auto client = port::loadPlugin(modulePath, device);
   device.notify.deliver(appsync::platform::kZTStartupCompleteNotification);
   const bool isDone = port::sync(device, *client, {{"com.example.tides", "2.0", "Tides"}});
-  tellApps(device);
-  tellTransactions(folder + "/transactions.txt");
-  tellLog(device);
+  printApps(device);
+  printTransactions(folder + "/transactions.txt");
+  printLog(device);
   const auto tides = device.registry.app("com.example.tides");
   return isDone && tides && tides->isInstalled ? 0 : 1;
 }
@@ -67,7 +67,7 @@ int run(const std::string& modulePath, const std::string& folder) {
 
 int main(int count, char** arguments) {
   if (count != 3) {
-    std::cerr << "usage: appsync-port-daemon MODULE FOLDER\n";
+    std::cerr << "usage: appsync-port-daemon MODULE DIRECTORY\n";
     return 2;
   }
   try {
