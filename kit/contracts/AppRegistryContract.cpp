@@ -69,11 +69,11 @@ std::shared_ptr<platform::InstallProgress> AppRegistryContract::progressOf(std::
                           : registry().installProgressForApplication(*found, platform::TSInstallPhase::Loading);
 }
 
-std::vector<std::string> AppRegistryContract::walk(BundleKind kind) {
-  Identifiers met;
+std::vector<std::string> AppRegistryContract::enumerate(BundleKind kind) {
+  Identifiers found;
   registry().enumerateBundlesOfType(
-      kind, [&](const BundleRecord& bundle, bool&) { met.push_back(bundle.applicationIdentifier()); });
-  return met;
+      kind, [&](const BundleRecord& bundle, bool&) { found.push_back(bundle.applicationIdentifier()); });
+  return found;
 }
 
 std::vector<std::string> AppRegistryContract::removedApps() {
@@ -85,9 +85,9 @@ std::vector<std::string> AppRegistryContract::removedApps() {
   return removed;
 }
 
-// Looking up.
+// Look-ups.
 
-TEST_P(AppRegistryContract, AnUnknownAppIsNotThere) {
+TEST_P(AppRegistryContract, UnknownAppIsNotFound) {
   EXPECT_FALSE(registry().applicationIsInstalled("com.a"));
   EXPECT_EQ(registry().recordForIdentifier("com.a", PlaceholderLookup::on), nullptr);
   EXPECT_EQ(registry().recordForIdentifier("com.a", PlaceholderLookup::off), nullptr);
@@ -102,20 +102,20 @@ TEST_P(AppRegistryContract, AppsAndPlaceholdersCountAsInstalled) {
   EXPECT_FALSE(registry().applicationIsInstalled("com.APP"));
 }
 
-TEST_P(AppRegistryContract, APlaceholderIsFoundOnlyByThoseWhoLookForIt) {
+TEST_P(AppRegistryContract, LookupOffDoesNotFindPlaceholders) {
   placeholder("com.a");
   EXPECT_EQ(registry().recordForIdentifier("com.a", PlaceholderLookup::off), nullptr);
   EXPECT_NE(registry().recordForIdentifier("com.a", PlaceholderLookup::on), nullptr);
 }
 
-TEST_P(AppRegistryContract, AnAppThatIsBeingUpdatedIsFoundEitherWay) {
+TEST_P(AppRegistryContract, AppBeingUpdatedIsFoundByBothLookups) {
   install("com.a");
   placeholder("com.a", "2.0");
   EXPECT_NE(registry().recordForIdentifier("com.a", PlaceholderLookup::off), nullptr);
   EXPECT_NE(registry().recordForIdentifier("com.a", PlaceholderLookup::on), nullptr);
 }
 
-TEST_P(AppRegistryContract, ARecordDescribesTheApp) {
+TEST_P(AppRegistryContract, RecordDescribesTheApp) {
   install("com.a", "1.2.3");
   const auto found = record("com.a");
   ASSERT_NE(found, nullptr);
@@ -132,7 +132,7 @@ TEST_P(AppRegistryContract, ARecordDescribesTheApp) {
   EXPECT_TRUE(subject().isUsable(*found->bundlePath()));
 }
 
-TEST_P(AppRegistryContract, ARecordIsASnapshot) {
+TEST_P(AppRegistryContract, RecordIsASnapshot) {
   install("com.a", "1.0");
   const auto before = record("com.a");
   ASSERT_NE(before, nullptr);
@@ -143,7 +143,7 @@ TEST_P(AppRegistryContract, ARecordIsASnapshot) {
   EXPECT_TRUE(before->isInstalled());
 }
 
-TEST_P(AppRegistryContract, ARecordKnowsTheBytesOfTheBundleThatCanBeUsed) {
+TEST_P(AppRegistryContract, DiskUsageIsThatOfTheInstalledBundle) {
   install("com.a", "1.0");
   const std::uint64_t installed = record("com.a")->staticDiskUsage();
   EXPECT_GT(installed, 0U);
@@ -155,49 +155,49 @@ TEST_P(AppRegistryContract, ARecordKnowsTheBytesOfTheBundleThatCanBeUsed) {
   EXPECT_EQ(before->staticDiskUsage(), installed);
 }
 
-// Walks.
+// Enumerations.
 
-TEST_P(AppRegistryContract, AWalkMeetsEveryUserBundle) {
+TEST_P(AppRegistryContract, EnumeratesEveryUserBundle) {
   install("com.app");
   placeholder("com.placeholder");
   install("com.both");
   placeholder("com.both", "2.0");
   for (const BundleKind kind : {BundleKind::all, BundleKind::user}) {
-    Identifiers met = walk(kind);
-    std::ranges::sort(met);
-    EXPECT_EQ(met, (Identifiers{"com.app", "com.both", "com.placeholder"}));
+    Identifiers found = enumerate(kind);
+    std::ranges::sort(found);
+    EXPECT_EQ(found, (Identifiers{"com.app", "com.both", "com.placeholder"}));
   }
-  EXPECT_EQ(walk(BundleKind::system), Identifiers());
+  EXPECT_EQ(enumerate(BundleKind::system), Identifiers());
 }
 
-TEST_P(AppRegistryContract, AWalkOfTheSystemsBundlesMeetsThemAlone) {
+TEST_P(AppRegistryContract, EnumeratesSystemBundlesOnly) {
   install("com.user");
-  if (!subject().addSystemApp("com.system")) GTEST_SKIP() << "no system apps";
-  EXPECT_EQ(walk(BundleKind::system), Identifiers{"com.system"});
-  EXPECT_EQ(walk(BundleKind::user), Identifiers{"com.user"});
-  EXPECT_EQ(walk(BundleKind::all).size(), 2U);
+  if (!subject().addSystemApp("com.system")) GTEST_SKIP() << "the subject has no system apps";
+  EXPECT_EQ(enumerate(BundleKind::system), Identifiers{"com.system"});
+  EXPECT_EQ(enumerate(BundleKind::user), Identifiers{"com.user"});
+  EXPECT_EQ(enumerate(BundleKind::all).size(), 2U);
 }
 
-TEST_P(AppRegistryContract, AWalkMeetsBundlesThatAreNoAppsToo) {
+TEST_P(AppRegistryContract, EnumeratesBundlesThatAreNotApps) {
   install("com.app");
-  if (!subject().addExtension("com.app.extension")) GTEST_SKIP() << "nothing but apps";
-  Identifiers met;
+  if (!subject().addExtension("com.app.extension")) GTEST_SKIP() << "the subject has no extensions";
+  Identifiers found;
   registry().enumerateBundlesOfType(BundleKind::all, [&](const BundleRecord& bundle, bool&) {
-    met.push_back(bundle.applicationIdentifier());
-    EXPECT_EQ(bundle.asAppRecord() != nullptr, met.back() == "com.app") << met.back();
+    found.push_back(bundle.applicationIdentifier());
+    EXPECT_EQ(bundle.asAppRecord() != nullptr, found.back() == "com.app") << found.back();
     EXPECT_FALSE(bundle.description().empty());
   });
-  std::ranges::sort(met);
-  EXPECT_EQ(met, (Identifiers{"com.app", "com.app.extension"}));
+  std::ranges::sort(found);
+  EXPECT_EQ(found, (Identifiers{"com.app", "com.app.extension"}));
 }
 
-TEST_P(AppRegistryContract, TwoWalksMeetBundlesInOneOrder) {
+TEST_P(AppRegistryContract, EnumeratesInAStableOrder) {
   for (const char* identifier : {"com.c", "com.a", "com.b"})
     install(identifier);
-  EXPECT_EQ(walk(BundleKind::all), walk(BundleKind::all));
+  EXPECT_EQ(enumerate(BundleKind::all), enumerate(BundleKind::all));
 }
 
-TEST_P(AppRegistryContract, AWalkVisitsWithWholeRecords) {
+TEST_P(AppRegistryContract, EnumeratesCompleteRecords) {
   install("com.app", "1.5");
   placeholder("com.placeholder");
   registry().enumerateBundlesOfType(BundleKind::user, [](const BundleRecord& bundle, bool&) {
@@ -210,7 +210,7 @@ TEST_P(AppRegistryContract, AWalkVisitsWithWholeRecords) {
   });
 }
 
-TEST_P(AppRegistryContract, AWalkEndsWhenItIsTold) {
+TEST_P(AppRegistryContract, StopEndsAnEnumeration) {
   for (const char* identifier : {"com.a", "com.b", "com.c"})
     install(identifier);
   int visits = 0;
@@ -218,29 +218,29 @@ TEST_P(AppRegistryContract, AWalkEndsWhenItIsTold) {
   EXPECT_EQ(visits, 2);
 }
 
-TEST_P(AppRegistryContract, AWalkVisitsOnTheCallersThread) {
+TEST_P(AppRegistryContract, EnumeratesOnTheCallingThread) {
   install("com.a");
   registry().enumerateBundlesOfType(BundleKind::all, [caller = std::this_thread::get_id()](const BundleRecord&, bool&) {
     EXPECT_EQ(std::this_thread::get_id(), caller);
   });
 }
 
-TEST_P(AppRegistryContract, AWalkSeesTheRegistryAsItWasWhenItBegan) {
+TEST_P(AppRegistryContract, EnumeratesASnapshot) {
   for (const char* identifier : {"com.a", "com.b", "com.c"})
     install(identifier);
-  Identifiers met;
+  Identifiers found;
   registry().enumerateBundlesOfType(BundleKind::all, [&](const BundleRecord& bundle, bool&) {
-    if (met.empty()) {
+    if (found.empty()) {
       install("com.d");
       for (const char* identifier : {"com.a", "com.b", "com.c"}) {
         EXPECT_TRUE(registry().uninstallApplication(identifier).ok());
       }
     }
-    met.push_back(bundle.applicationIdentifier());
+    found.push_back(bundle.applicationIdentifier());
   });
-  std::ranges::sort(met);
-  EXPECT_EQ(met, (Identifiers{"com.a", "com.b", "com.c"}));
-  EXPECT_EQ(walk(BundleKind::all), Identifiers{"com.d"});
+  std::ranges::sort(found);
+  EXPECT_EQ(found, (Identifiers{"com.a", "com.b", "com.c"}));
+  EXPECT_EQ(enumerate(BundleKind::all), Identifiers{"com.d"});
 }
 
 }  // namespace appsync::test

@@ -1,4 +1,4 @@
-// Holds registers of apps to platform/AppRegistry.h, AppRecord.h and InstallProgress.h.
+// Contract of platform/AppRegistry.h, AppRecord.h and InstallProgress.h.
 #pragma once
 
 #include <memory>
@@ -17,42 +17,42 @@ class AppRegistrySubject {
  public:
   virtual ~AppRegistrySubject() = default;
 
-  /// Empty at first.
+  /// Initially empty.
   [[nodiscard]] virtual platform::AppRegistry& registry() = 0;
-  /// The installer's list that removals enter.
+  /// The list to which the registry adds removed apps.
   [[nodiscard]] virtual platform::UninstalledAppsList& uninstalledApps() = 0;
 
-  // Things to install, each at a location of its own.
+  // Each creates an item to install at a new location.
   [[nodiscard]] virtual platform::FileLocation makePackage(std::string_view identifier, std::string_view version) = 0;
   [[nodiscard]] virtual platform::FileLocation makeDamagedPackage(std::string_view identifier) = 0;
   [[nodiscard]] virtual platform::FileLocation makePlaceholderFolder(std::string_view identifier,
                                                                      std::string_view version) = 0;
-  /// Takes one of them away again.
+  /// Deletes such an item.
   virtual void removeLocation(const platform::FileLocation& location) = 0;
-  /// What distinguishes a location's contents from any other contents.
+  /// Returns a text that differs for different contents of the location.
   [[nodiscard]] virtual std::string fingerprint(const platform::FileLocation& location) = 0;
 
-  /// Whether the app's bundle, at this device path, is there and can be launched.
+  /// Returns true if the app's bundle exists at this device path and can be launched.
   [[nodiscard]] virtual bool isUsable(std::string_view bundlePath) = 0;
 
-  /// Makes the answer to which installs run first and which are paused another one.
+  /// Changes which installs are prioritized or paused, so that observers are notified.
   virtual void changeInstallOrder() = 0;
 
-  // What a registry cannot do is not tested.
+  // Optional: the default implementations skip the tests that need them.
 
-  /// Has an app of the system there, installed.
+  /// Installs a system app. Returns false if not supported.
   [[nodiscard]] virtual bool addSystemApp(std::string_view identifier) {
     static_cast<void>(identifier);
     return false;
   }
-  /// Has a user's bundle there that is no app.
+  /// Adds a user bundle that is not an app. Returns false if not supported.
   [[nodiscard]] virtual bool addExtension(std::string_view identifier) {
     static_cast<void>(identifier);
     return false;
   }
-  /// Licence data that is bound to this device.
+  /// Returns licence data that is bound to this device, or nullopt if not supported.
   [[nodiscard]] virtual std::optional<std::string> deviceBoundLicence() { return std::nullopt; }
-  /// What an app was installed with, where it can be told.
+  /// Return what the app was installed with, or nullopt if not supported.
   [[nodiscard]] virtual std::optional<std::string> storeMetadataOf(std::string_view identifier) {
     static_cast<void>(identifier);
     return std::nullopt;
@@ -61,7 +61,7 @@ class AppRegistrySubject {
     static_cast<void>(identifier);
     return std::nullopt;
   }
-  /// Ends the process that keeps the registry and begins another.
+  /// Restarts the registry's process. Returns false if not supported.
   [[nodiscard]] virtual bool restart() { return false; }
 };
 
@@ -75,14 +75,14 @@ class AppRegistryContract : public Contract<AppRegistrySubject> {
   void install(std::string_view identifier, std::string_view version = "1.0");
   void placeholder(std::string_view identifier, std::string_view version = "1.0");
 
-  /// The app's record, also of a placeholder.
+  /// Returns the record of an app or placeholder, or null.
   [[nodiscard]] std::shared_ptr<const platform::AppRecord> record(std::string_view identifier);
   /// "installed", "placeholder", "both" or "absent".
   [[nodiscard]] std::string stateOf(std::string_view identifier);
   [[nodiscard]] std::optional<std::string> versionOf(std::string_view identifier);
   [[nodiscard]] std::shared_ptr<platform::InstallProgress> progressOf(std::string_view identifier);
-  /// The identifiers that a walk meets.
-  [[nodiscard]] std::vector<std::string> walk(platform::BundleKind kind);
+  /// Returns the identifiers of an enumeration, in its order.
+  [[nodiscard]] std::vector<std::string> enumerate(platform::BundleKind kind);
   [[nodiscard]] std::vector<std::string> removedApps();
 };
 

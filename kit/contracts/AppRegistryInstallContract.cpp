@@ -1,4 +1,4 @@
-// The part of the registry's contract that is about installing and removing.
+// AppRegistryContract: installing and removing.
 #include <cstdint>
 
 #include "kit/contracts/AppRegistryContract.h"
@@ -28,27 +28,27 @@ bool isInstallersError(const Status& status) {
 
 }  // namespace
 
-TEST_P(AppRegistryContract, APackageBecomesAnInstalledApp) {
+TEST_P(AppRegistryContract, InstallsAPackage) {
   install("com.a");
   EXPECT_EQ(stateOf("com.a"), "installed");
 }
 
-TEST_P(AppRegistryContract, ALaterPackageTakesTheEarliersPlace) {
+TEST_P(AppRegistryContract, PackageReplacesEarlierVersion) {
   install("com.a", "1.0");
   install("com.a", "2.0");
   EXPECT_EQ(versionOf("com.a"), "2.0");
-  EXPECT_EQ(walk(BundleKind::all), Identifiers{"com.a"});
+  EXPECT_EQ(enumerate(BundleKind::all), Identifiers{"com.a"});
   EXPECT_TRUE(subject().isUsable(*record("com.a")->bundlePath()));
 }
 
-TEST_P(AppRegistryContract, APlaceholderIsNoApp) {
+TEST_P(AppRegistryContract, PlaceholderIsNotAnInstalledApp) {
   placeholder("com.a", "1.5");
   EXPECT_EQ(stateOf("com.a"), "placeholder");
   EXPECT_EQ(versionOf("com.a"), "1.5");
   EXPECT_EQ(record("com.a")->installType(), TSInstallType::Sync);
 }
 
-TEST_P(AppRegistryContract, APlaceholderLeavesAnInstalledAppUsable) {
+TEST_P(AppRegistryContract, PlaceholderLeavesInstalledAppUsable) {
   install("com.a", "1.0");
   placeholder("com.a", "2.0");
   EXPECT_EQ(stateOf("com.a"), "both");
@@ -58,13 +58,13 @@ TEST_P(AppRegistryContract, APlaceholderLeavesAnInstalledAppUsable) {
   EXPECT_TRUE(subject().isUsable(*app->bundlePath()));
 }
 
-TEST_P(AppRegistryContract, APackageTakesItsPlaceholdersPlace) {
+TEST_P(AppRegistryContract, PackageReplacesPlaceholder) {
   placeholder("com.a");
   install("com.a");
   EXPECT_EQ(stateOf("com.a"), "installed");
 }
 
-TEST_P(AppRegistryContract, APackageTakesThePlaceOfAppAndPlaceholder) {
+TEST_P(AppRegistryContract, PackageReplacesAppAndPlaceholder) {
   install("com.a", "1.0");
   placeholder("com.a", "2.0");
   install("com.a", "2.0");
@@ -72,28 +72,28 @@ TEST_P(AppRegistryContract, APackageTakesThePlaceOfAppAndPlaceholder) {
   EXPECT_EQ(versionOf("com.a"), "2.0");
 }
 
-TEST_P(AppRegistryContract, TheInstallTypeIsKept) {
+TEST_P(AppRegistryContract, StoresTheInstallType) {
   plist::Dictionary restoring = options(platform::PackageTypePlaceholder, "com.a");
   restoring.set(platform::kInstallTypeKey, static_cast<std::uint64_t>(TSInstallType::Restore));
   ASSERT_TRUE(registry().installApplication(subject().makePlaceholderFolder("com.a", "1.0"), restoring).ok());
   EXPECT_EQ(record("com.a")->installType(), TSInstallType::Restore);
 }
 
-TEST_P(AppRegistryContract, ARestoredAppsStoreMetadataAndLicenceAreKept) {
+TEST_P(AppRegistryContract, StoresMetadataAndLicence) {
   plist::Dictionary restored = options(platform::kPackageTypeCustomer, "com.a");
   restored.set(platform::kStoreMetadataKey, plist::Value::data(bytesOf("metadata")));
   restored.set(platform::kLicenceDataKey, plist::Value::data(bytesOf("licence")));
   ASSERT_TRUE(registry().installApplication(subject().makePackage("com.a", "1.0"), restored).ok());
   const std::optional<std::string> metadata = subject().storeMetadataOf("com.a");
   const std::optional<std::string> licence = subject().licenceDataOf("com.a");
-  if (!metadata && !licence) GTEST_SKIP() << "neither can be told";
+  if (!metadata && !licence) GTEST_SKIP() << "the subject cannot read metadata or licence";
   EXPECT_EQ(metadata.value_or("metadata"), "metadata");
   EXPECT_EQ(licence.value_or("licence"), "licence");
 }
 
-TEST_P(AppRegistryContract, ALicenceThatIsBoundToTheDeviceIsToldSo) {
+TEST_P(AppRegistryContract, ReportsDeviceBoundLicence) {
   const std::optional<std::string> licence = subject().deviceBoundLicence();
-  if (!licence) GTEST_SKIP() << "no licences for one device";
+  if (!licence) GTEST_SKIP() << "the subject has no device-bound licences";
   plist::Dictionary restored = options(platform::kPackageTypeCustomer, "com.a");
   restored.set(platform::kLicenceDataKey, plist::Value::data(bytesOf(*licence)));
   ASSERT_TRUE(registry().installApplication(subject().makePackage("com.a", "1.0"), restored).ok());
@@ -102,7 +102,7 @@ TEST_P(AppRegistryContract, ALicenceThatIsBoundToTheDeviceIsToldSo) {
   EXPECT_FALSE(record("com.b")->hasMIDBasedSINF());
 }
 
-TEST_P(AppRegistryContract, ANullForMetadataOrLicenceIsAsNone) {
+TEST_P(AppRegistryContract, IgnoresNullMetadataAndLicence) {
   plist::Dictionary restored = options(platform::PackageTypePlaceholder, "com.a");
   restored.set(platform::kStoreMetadataKey, nullptr);
   restored.set(platform::kLicenceDataKey, nullptr);
@@ -110,7 +110,7 @@ TEST_P(AppRegistryContract, ANullForMetadataOrLicenceIsAsNone) {
   EXPECT_FALSE(record("com.a")->hasMIDBasedSINF());
 }
 
-TEST_P(AppRegistryContract, TheLocationIsNotChanged) {
+TEST_P(AppRegistryContract, InstallDoesNotChangeTheLocation) {
   const FileLocation package = subject().makePackage("com.a", "1.0");
   const FileLocation folder = subject().makePlaceholderFolder("com.b", "1.0");
   const std::string before = subject().fingerprint(package) + subject().fingerprint(folder);
@@ -119,7 +119,7 @@ TEST_P(AppRegistryContract, TheLocationIsNotChanged) {
   EXPECT_EQ(subject().fingerprint(package) + subject().fingerprint(folder), before);
 }
 
-TEST_P(AppRegistryContract, TheLocationIsNeededDuringTheCallOnly) {
+TEST_P(AppRegistryContract, LocationIsNeededDuringInstallOnly) {
   const FileLocation package = subject().makePackage("com.a", "1.0");
   const FileLocation folder = subject().makePlaceholderFolder("com.b", "1.0");
   ASSERT_TRUE(tryInstall(package, "com.a").ok());
@@ -131,17 +131,17 @@ TEST_P(AppRegistryContract, TheLocationIsNeededDuringTheCallOnly) {
   EXPECT_EQ(stateOf("com.b"), "placeholder");
 }
 
-TEST_P(AppRegistryContract, APackageOfAnotherAppFails) {
+TEST_P(AppRegistryContract, PackageOfAnotherAppFails) {
   EXPECT_TRUE(isInstallersError(tryInstall(subject().makePackage("com.other", "1.0"), "com.a")));
-  EXPECT_EQ(walk(BundleKind::all), Identifiers());
+  EXPECT_EQ(enumerate(BundleKind::all), Identifiers());
 }
 
-TEST_P(AppRegistryContract, APlaceholderOfAnotherAppFails) {
+TEST_P(AppRegistryContract, PlaceholderOfAnotherAppFails) {
   EXPECT_TRUE(isInstallersError(tryPlaceholder(subject().makePlaceholderFolder("com.other", "1.0"), "com.a")));
-  EXPECT_EQ(walk(BundleKind::all), Identifiers());
+  EXPECT_EQ(enumerate(BundleKind::all), Identifiers());
 }
 
-TEST_P(AppRegistryContract, AMissingPackageFails) {
+TEST_P(AppRegistryContract, MissingPackageFails) {
   const FileLocation package = subject().makePackage("com.a", "1.0");
   const FileLocation folder = subject().makePlaceholderFolder("com.a", "1.0");
   subject().removeLocation(package);
@@ -151,7 +151,7 @@ TEST_P(AppRegistryContract, AMissingPackageFails) {
   EXPECT_EQ(stateOf("com.a"), "absent");
 }
 
-TEST_P(AppRegistryContract, ADamagedPackageLeavesTheAppAsItWas) {
+TEST_P(AppRegistryContract, DamagedPackageLeavesAppUnchanged) {
   install("com.a", "1.0");
   EXPECT_TRUE(isInstallersError(tryInstall(subject().makeDamagedPackage("com.a"), "com.a")));
   EXPECT_EQ(stateOf("com.a"), "installed");
@@ -159,13 +159,13 @@ TEST_P(AppRegistryContract, ADamagedPackageLeavesTheAppAsItWas) {
   EXPECT_TRUE(subject().isUsable(*record("com.a")->bundlePath()));
 }
 
-TEST_P(AppRegistryContract, ADamagedPackageLeavesThePlaceholderAsItWas) {
+TEST_P(AppRegistryContract, DamagedPackageLeavesPlaceholderUnchanged) {
   placeholder("com.a");
   EXPECT_TRUE(isInstallersError(tryInstall(subject().makeDamagedPackage("com.a"), "com.a")));
   EXPECT_EQ(stateOf("com.a"), "placeholder");
 }
 
-TEST_P(AppRegistryContract, TenAppsMayBeInstalledAtOnce) {
+TEST_P(AppRegistryContract, InstallsTenAppsConcurrently) {
   constexpr std::size_t kApps = 10;
   std::vector<FileLocation> packages;
   for (std::size_t index = 0; index < kApps; ++index) {
@@ -174,32 +174,32 @@ TEST_P(AppRegistryContract, TenAppsMayBeInstalledAtOnce) {
   runOnThreads(kApps, [&](std::size_t index) {
     EXPECT_TRUE(tryInstall(packages[index], "com.a" + std::to_string(index)).ok());
   });
-  EXPECT_EQ(walk(BundleKind::user).size(), kApps);
+  EXPECT_EQ(enumerate(BundleKind::user).size(), kApps);
 }
 
-TEST_P(AppRegistryContract, OneAppMayBeInstalledByManyAtOnce) {
+TEST_P(AppRegistryContract, InstallsOneAppConcurrently) {
   constexpr std::size_t kThreads = 6;
   std::vector<FileLocation> packages;
   for (std::size_t index = 0; index < kThreads; ++index) {
     packages.push_back(subject().makePackage("com.a", std::to_string(index)));
   }
   runOnThreads(kThreads, [&](std::size_t index) { EXPECT_TRUE(tryInstall(packages[index], "com.a").ok()); });
-  EXPECT_EQ(walk(BundleKind::user), Identifiers{"com.a"});
+  EXPECT_EQ(enumerate(BundleKind::user), Identifiers{"com.a"});
   EXPECT_EQ(stateOf("com.a"), "installed");
   EXPECT_TRUE(subject().isUsable(*record("com.a")->bundlePath()));
 }
 
-TEST_P(AppRegistryContract, AppsOutliveTheProcess) {
+TEST_P(AppRegistryContract, AppsSurviveARestart) {
   install("com.app", "1.5");
-  if (!subject().restart()) GTEST_SKIP() << "cannot be started again";
+  if (!subject().restart()) GTEST_SKIP() << "the subject cannot restart";
   EXPECT_EQ(stateOf("com.app"), "installed");
   EXPECT_EQ(versionOf("com.app"), "1.5");
   EXPECT_TRUE(subject().isUsable(*record("com.app")->bundlePath()));
 }
 
-// Uninstalling.
+// Removing.
 
-TEST_P(AppRegistryContract, AnAppIsRemoved) {
+TEST_P(AppRegistryContract, RemovesAnApp) {
   install("com.a");
   const std::string bundlePath = *record("com.a")->bundlePath();
   EXPECT_TRUE(registry().uninstallApplication("com.a").ok());
@@ -207,13 +207,13 @@ TEST_P(AppRegistryContract, AnAppIsRemoved) {
   EXPECT_FALSE(subject().isUsable(bundlePath));
 }
 
-TEST_P(AppRegistryContract, APlaceholderIsRemoved) {
+TEST_P(AppRegistryContract, RemovesAPlaceholder) {
   placeholder("com.a");
   EXPECT_TRUE(registry().uninstallApplication("com.a").ok());
   EXPECT_EQ(stateOf("com.a"), "absent");
 }
 
-TEST_P(AppRegistryContract, RemovalLeavesTheAppUnderAPlaceholder) {
+TEST_P(AppRegistryContract, RemovingAPlaceholderLeavesItsApp) {
   install("com.a", "1.0");
   placeholder("com.a", "2.0");
   EXPECT_TRUE(registry().uninstallApplication("com.a").ok());
@@ -223,7 +223,7 @@ TEST_P(AppRegistryContract, RemovalLeavesTheAppUnderAPlaceholder) {
   EXPECT_EQ(removedApps(), Identifiers());
 }
 
-TEST_P(AppRegistryContract, NextRemovalRemovesTheAppItself) {
+TEST_P(AppRegistryContract, SecondRemovalRemovesTheApp) {
   install("com.a");
   placeholder("com.a", "2.0");
   ASSERT_TRUE(registry().uninstallApplication("com.a").ok());
@@ -232,7 +232,7 @@ TEST_P(AppRegistryContract, NextRemovalRemovesTheAppItself) {
   EXPECT_EQ(removedApps(), Identifiers{"com.a"});
 }
 
-TEST_P(AppRegistryContract, RemovalAfterAFailedUpdateLeavesTheApp) {
+TEST_P(AppRegistryContract, RemovalAfterFailedUpdateLeavesTheApp) {
   install("com.a", "1.0");
   placeholder("com.a", "2.0");
   ASSERT_FALSE(tryInstall(subject().makeDamagedPackage("com.a"), "com.a").ok());
@@ -246,13 +246,13 @@ TEST_P(AppRegistryContract, RemovingAnUnknownAppFails) {
   EXPECT_FALSE(registry().uninstallApplication("com.a", placeholdersOnly()).ok());
 }
 
-TEST_P(AppRegistryContract, RemovingPlaceholdersOnlyRemovesAPlaceholder) {
+TEST_P(AppRegistryContract, PlaceholdersOnlyRemovesAPlaceholder) {
   placeholder("com.a");
   EXPECT_TRUE(registry().uninstallApplication("com.a", placeholdersOnly()).ok());
   EXPECT_EQ(stateOf("com.a"), "absent");
 }
 
-TEST_P(AppRegistryContract, RemovingPlaceholdersOnlyLeavesTheAppUnderIt) {
+TEST_P(AppRegistryContract, PlaceholdersOnlyLeavesThePlaceholdersApp) {
   install("com.a", "1.0");
   placeholder("com.a", "2.0");
   EXPECT_TRUE(registry().uninstallApplication("com.a", placeholdersOnly()).ok());
@@ -261,26 +261,26 @@ TEST_P(AppRegistryContract, RemovingPlaceholdersOnlyLeavesTheAppUnderIt) {
   EXPECT_TRUE(subject().isUsable(*record("com.a")->bundlePath()));
 }
 
-TEST_P(AppRegistryContract, RemovingPlaceholdersOnlyNeverRemovesAnApp) {
+TEST_P(AppRegistryContract, PlaceholdersOnlyNeverRemovesAnApp) {
   install("com.a");
   static_cast<void>(registry().uninstallApplication("com.a", placeholdersOnly()));
   EXPECT_EQ(stateOf("com.a"), "installed");
 }
 
-TEST_P(AppRegistryContract, RemovingNotOnlyPlaceholdersRemovesTheApp) {
+TEST_P(AppRegistryContract, PlaceholdersOnlyFalseRemovesTheApp) {
   install("com.a");
   EXPECT_TRUE(registry().uninstallApplication("com.a", {{platform::kUninstallPlaceholdersOnlyKey, false}}).ok());
   EXPECT_EQ(stateOf("com.a"), "absent");
 }
 
-TEST_P(AppRegistryContract, ARemovedAppEntersTheListOfUninstalledApps) {
+TEST_P(AppRegistryContract, RemovedAppIsListedAsUninstalled) {
   install("com.a");
   install("com.b");
   ASSERT_TRUE(registry().uninstallApplication("com.a").ok());
   EXPECT_EQ(removedApps(), Identifiers{"com.a"});
 }
 
-TEST_P(AppRegistryContract, ARemovedPlaceholderDoesNotEnterTheListOfUninstalledApps) {
+TEST_P(AppRegistryContract, RemovedPlaceholderIsNotListedAsUninstalled) {
   placeholder("com.placeholder");
   install("com.both");
   placeholder("com.both", "2.0");
@@ -289,7 +289,7 @@ TEST_P(AppRegistryContract, ARemovedPlaceholderDoesNotEnterTheListOfUninstalledA
   EXPECT_EQ(removedApps(), Identifiers());
 }
 
-TEST_P(AppRegistryContract, AnAppThatIsInstalledAgainLeavesTheListOfUninstalledApps) {
+TEST_P(AppRegistryContract, ReinstalledAppIsNotListedAsUninstalled) {
   install("com.a");
   ASSERT_TRUE(registry().uninstallApplication("com.a").ok());
   install("com.a");

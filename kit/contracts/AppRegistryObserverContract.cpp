@@ -1,4 +1,4 @@
-// The part of the registry's contract that is about running installs: their progress, and who hears of it.
+// AppRegistryContract: observers, and progress of running installs.
 #include <atomic>
 #include <functional>
 #include <mutex>
@@ -17,7 +17,7 @@ using platform::TSInstallState;
 
 namespace {
 
-/// Observes for as long as it lives.
+/// Registered as an observer during its lifetime.
 class Observer final : public platform::AppRegistryObserver {
  public:
   explicit Observer(platform::AppRegistry& registry, std::function<void()> inReport = nullptr)
@@ -31,7 +31,7 @@ class Observer final : public platform::AppRegistryObserver {
   void stop() { registry_.removeObserver(*this); }
 
   void applicationInstallsArePrioritized(const AppRecords&, const AppRecords&) override {
-    EXPECT_EQ(++inside_, 1) << "callbacks overlap";
+    EXPECT_EQ(++inside_, 1) << "callbacks to one observer must not overlap";
     thread = std::this_thread::get_id();
     if (inReport_) inReport_();
     --inside_;
@@ -39,7 +39,7 @@ class Observer final : public platform::AppRegistryObserver {
   }
 
   void applicationInstallsDidCancel(const AppRecords& records) override {
-    EXPECT_EQ(++inside_, 1) << "callbacks overlap";
+    EXPECT_EQ(++inside_, 1) << "callbacks to one observer must not overlap";
     {
       const std::scoped_lock lock(mutex_);
       for (const auto& record : records)
@@ -70,13 +70,13 @@ class Observer final : public platform::AppRegistryObserver {
 
 // Observers.
 
-TEST_P(AppRegistryContract, AnObserverHearsOnceAddedWhateverThereIsToReport) {
+TEST_P(AppRegistryContract, NotifiesANewObserver) {
   Observer observer(registry());
   ASSERT_TRUE(observer.reports.waitFor(1));
   EXPECT_NE(observer.thread.load(), std::this_thread::get_id());
 }
 
-TEST_P(AppRegistryContract, AnObserverHearsOfChanges) {
+TEST_P(AppRegistryContract, NotifiesObserversOfChanges) {
   Observer observer(registry());
   ASSERT_TRUE(observer.reports.waitFor(1));
   const std::size_t before = observer.reports.count();
@@ -84,7 +84,7 @@ TEST_P(AppRegistryContract, AnObserverHearsOfChanges) {
   EXPECT_TRUE(observer.reports.waitFor(before + 1));
 }
 
-TEST_P(AppRegistryContract, AnObserverAddedTwiceIsRemovedByOneRemoval) {
+TEST_P(AppRegistryContract, AddingAnObserverIsIdempotent) {
   Observer observer(registry());
   registry().addObserver(observer);
   ASSERT_TRUE(observer.reports.waitFor(1));
@@ -97,12 +97,12 @@ TEST_P(AppRegistryContract, AnObserverAddedTwiceIsRemovedByOneRemoval) {
   EXPECT_EQ(observer.reports.count(), before);
 }
 
-TEST_P(AppRegistryContract, RemovingAnObserverThatWasNeverAddedDoesNothing) {
+TEST_P(AppRegistryContract, RemovingAnUnknownObserverDoesNothing) {
   platform::AppRegistryObserver stranger;
   registry().removeObserver(stranger);
 }
 
-TEST_P(AppRegistryContract, AnObserverMayBeAddedAgain) {
+TEST_P(AppRegistryContract, ObserverCanBeAddedAgain) {
   Observer observer(registry());
   observer.stop();
   const std::size_t before = observer.reports.count();
@@ -110,7 +110,7 @@ TEST_P(AppRegistryContract, AnObserverMayBeAddedAgain) {
   EXPECT_TRUE(observer.reports.waitFor(before + 1));
 }
 
-TEST_P(AppRegistryContract, RemovalOfAnObserverWaitsForItsRunningCallback) {
+TEST_P(AppRegistryContract, RemovingAnObserverWaitsForItsCallback) {
   EventCounter begun;
   EventCounter mayEnd;
   std::atomic<bool> hasEnded = false;
@@ -127,7 +127,7 @@ TEST_P(AppRegistryContract, RemovalOfAnObserverWaitsForItsRunningCallback) {
   mayEnd.add();
 }
 
-TEST_P(AppRegistryContract, AnObserverMayBeRemovedFromItsOwnCallback) {
+TEST_P(AppRegistryContract, ObserverCanBeRemovedInItsCallback) {
   platform::AppRegistry& observed = registry();
   Observer* self = nullptr;
   EventCounter mayBegin;
@@ -145,7 +145,7 @@ TEST_P(AppRegistryContract, AnObserverMayBeRemovedFromItsOwnCallback) {
   EXPECT_EQ(observer.reports.count(), 1U);
 }
 
-TEST_P(AppRegistryContract, ACallbackMayUseTheRegistry) {
+TEST_P(AppRegistryContract, CallbackCanCallTheRegistry) {
   install("com.a");
   Observer observer(registry(), [&] {
     EXPECT_TRUE(registry().applicationIsInstalled("com.a"));
@@ -157,7 +157,7 @@ TEST_P(AppRegistryContract, ACallbackMayUseTheRegistry) {
   EXPECT_TRUE(observer.reports.waitFor(1));
 }
 
-TEST_P(AppRegistryContract, ObserversMayComeAndGoOnManyThreads) {
+TEST_P(AppRegistryContract, ObserversCanBeAddedAndRemovedConcurrently) {
   runOnThreads(6, [&](std::size_t) {
     for (int round = 0; round < 10; ++round) {
       Observer observer(registry());
@@ -168,13 +168,13 @@ TEST_P(AppRegistryContract, ObserversMayComeAndGoOnManyThreads) {
 
 // Progress.
 
-TEST_P(AppRegistryContract, AnAppThatIsNotBeingInstalledHasNoProgress) {
+TEST_P(AppRegistryContract, AppWithoutInstallHasNoProgress) {
   install("com.a");
   EXPECT_EQ(progressOf("com.a"), nullptr);
   EXPECT_EQ(record("com.a")->installProgress(), nullptr);
 }
 
-TEST_P(AppRegistryContract, APlaceholderHasAProgress) {
+TEST_P(AppRegistryContract, PlaceholderHasProgress) {
   placeholder("com.a");
   const auto progress = progressOf("com.a");
   ASSERT_NE(progress, nullptr);
@@ -182,7 +182,7 @@ TEST_P(AppRegistryContract, APlaceholderHasAProgress) {
   EXPECT_FALSE(progress->description().empty());
 }
 
-TEST_P(AppRegistryContract, AProgressKeepsWhatItIsTold) {
+TEST_P(AppRegistryContract, ProgressStoresItsValues) {
   placeholder("com.a");
   const auto progress = progressOf("com.a");
   ASSERT_NE(progress, nullptr);
@@ -196,7 +196,7 @@ TEST_P(AppRegistryContract, AProgressKeepsWhatItIsTold) {
   EXPECT_EQ(progress->completedUnitCount(), 456);
 }
 
-TEST_P(AppRegistryContract, AChangeOfProgressIsSeenByEveryone) {
+TEST_P(AppRegistryContract, ProgressIsShared) {
   placeholder("com.a");
   const auto before = record("com.a")->installProgress();
   const auto progress = progressOf("com.a");
@@ -212,7 +212,7 @@ TEST_P(AppRegistryContract, AChangeOfProgressIsSeenByEveryone) {
   EXPECT_EQ(after->totalUnitCount(), 1000);
 }
 
-TEST_P(AppRegistryContract, AnInstallEndsItsProgress) {
+TEST_P(AppRegistryContract, InstallEndsItsProgress) {
   placeholder("com.a");
   const auto progress = progressOf("com.a");
   ASSERT_NE(progress, nullptr);
@@ -220,7 +220,7 @@ TEST_P(AppRegistryContract, AnInstallEndsItsProgress) {
   EXPECT_EQ(progressOf("com.a"), nullptr);
 }
 
-TEST_P(AppRegistryContract, SettersAreWithoutEffectAfterTheInstall) {
+TEST_P(AppRegistryContract, ProgressIsConstantAfterTheInstall) {
   placeholder("com.a");
   const auto progress = progressOf("com.a");
   ASSERT_NE(progress, nullptr);
@@ -232,7 +232,7 @@ TEST_P(AppRegistryContract, SettersAreWithoutEffectAfterTheInstall) {
   EXPECT_EQ(stateOf("com.a"), "installed");
 }
 
-TEST_P(AppRegistryContract, AProgressOutlivesItsApp) {
+TEST_P(AppRegistryContract, ProgressCanOutliveItsApp) {
   placeholder("com.a");
   const auto progress = progressOf("com.a");
   ASSERT_NE(progress, nullptr);
@@ -245,7 +245,7 @@ TEST_P(AppRegistryContract, AProgressOutlivesItsApp) {
   EXPECT_EQ(stateOf("com.a"), "absent");
 }
 
-TEST_P(AppRegistryContract, CancellingIsHeardOf) {
+TEST_P(AppRegistryContract, NotifiesObserversOfCancellation) {
   placeholder("com.a");
   Observer observer(registry());
   const auto progress = progressOf("com.a");
@@ -256,7 +256,7 @@ TEST_P(AppRegistryContract, CancellingIsHeardOf) {
   EXPECT_EQ(observer.cancelled(), std::vector<std::string>{"com.a"});
 }
 
-TEST_P(AppRegistryContract, AFailedLoadIsNoLongerShownAsRunning) {
+TEST_P(AppRegistryContract, EndingAFailedLoadEndsItsProgress) {
   placeholder("com.a");
   const auto progress = progressOf("com.a");
   ASSERT_NE(progress, nullptr);
@@ -266,7 +266,7 @@ TEST_P(AppRegistryContract, AFailedLoadIsNoLongerShownAsRunning) {
   EXPECT_TRUE(shown == nullptr || shown->installState() >= TSInstallState::Canceled);
 }
 
-TEST_P(AppRegistryContract, ALoadedPackageGoesOnToBeInstalled) {
+TEST_P(AppRegistryContract, EndingALoadBeginsTheInstallingPhase) {
   placeholder("com.a");
   const auto progress = progressOf("com.a");
   ASSERT_NE(progress, nullptr);
@@ -277,7 +277,7 @@ TEST_P(AppRegistryContract, ALoadedPackageGoesOnToBeInstalled) {
   EXPECT_EQ(stateOf("com.a"), "installed");
 }
 
-TEST_P(AppRegistryContract, AProgressMayBeSetByManyThreadsAtOnce) {
+TEST_P(AppRegistryContract, ProgressIsThreadSafe) {
   placeholder("com.a");
   const auto progress = progressOf("com.a");
   ASSERT_NE(progress, nullptr);

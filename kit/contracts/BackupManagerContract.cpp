@@ -9,19 +9,19 @@ namespace appsync::test {
 
 GTEST_ALLOW_UNINSTANTIATED_PARAMETERIZED_TEST(BackupManagerContract);
 
-TEST_P(BackupManagerContract, AnAppWithoutDataHasNone) {
+TEST_P(BackupManagerContract, AppWithoutDataHasNoRestoreData) {
   subject().keepRestoreData("com.other", 5);
   EXPECT_FALSE(manager->restoreDataExists("com.a", nullptr));
 }
 
-TEST_P(BackupManagerContract, TheDatasSizeIsTold) {
+TEST_P(BackupManagerContract, ReturnsTheSizeOfTheData) {
   subject().keepRestoreData("com.a", 5'000'000'000);
   std::uint64_t size = 0;
   EXPECT_TRUE(manager->restoreDataExists("com.a", &size));
   EXPECT_EQ(size, 5'000'000'000U);
 }
 
-TEST_P(BackupManagerContract, NobodyNeedsToWantTheSize) {
+TEST_P(BackupManagerContract, AcceptsNullSize) {
   subject().keepRestoreData("com.a", 5);
   EXPECT_TRUE(manager->restoreDataExists("com.a", nullptr));
 }
@@ -33,7 +33,7 @@ TEST_P(BackupManagerContract, IdentifiersAreComparedExactly) {
   EXPECT_FALSE(manager->restoreDataExists("", nullptr));
 }
 
-TEST_P(BackupManagerContract, CancellingDropsTheAppsData) {
+TEST_P(BackupManagerContract, CancellingDeletesTheAppsData) {
   subject().keepRestoreData("com.a", 5);
   subject().keepRestoreData("com.b", 5);
   std::optional<Error> error;
@@ -43,18 +43,18 @@ TEST_P(BackupManagerContract, CancellingDropsTheAppsData) {
   EXPECT_TRUE(manager->restoreDataExists("com.b", nullptr));
 }
 
-TEST_P(BackupManagerContract, CancellingWithoutDataIsASuccess) {
+TEST_P(BackupManagerContract, CancellingWithoutDataSucceeds) {
   EXPECT_TRUE(manager->cancelApplicationRestore("com.a", nullptr));
 }
 
-TEST_P(BackupManagerContract, NobodyNeedsToWantTheError) {
+TEST_P(BackupManagerContract, AcceptsNullErrorSlot) {
   subject().keepRestoreData("com.a", 5);
   EXPECT_TRUE(manager->cancelApplicationRestore("com.a", nullptr));
 }
 
-TEST_P(BackupManagerContract, CancellingThatFailsTellsWhyAndDropsNothing) {
+TEST_P(BackupManagerContract, FailedCancellationSetsErrorAndKeepsData) {
   subject().keepRestoreData("com.a", 5);
-  if (!subject().failCancelling()) GTEST_SKIP() << "cannot be made to fail";
+  if (!subject().failCancelling()) GTEST_SKIP() << "the subject cannot fail cancellations";
   std::optional<Error> error;
   EXPECT_FALSE(manager->cancelApplicationRestore("com.a", &error));
   ASSERT_TRUE(error);
@@ -63,7 +63,7 @@ TEST_P(BackupManagerContract, CancellingThatFailsTellsWhyAndDropsNothing) {
   EXPECT_TRUE(manager->restoreDataExists("com.a", nullptr));
 }
 
-TEST_P(BackupManagerContract, ConnectionsSeeTheSame) {
+TEST_P(BackupManagerContract, ConnectionsShareTheirData) {
   subject().keepRestoreData("com.a", 5);
   const auto other = subject().makeManager();
   ASSERT_NE(other, nullptr);
@@ -71,7 +71,7 @@ TEST_P(BackupManagerContract, ConnectionsSeeTheSame) {
   EXPECT_FALSE(manager->restoreDataExists("com.a", nullptr));
 }
 
-TEST_P(BackupManagerContract, OneConnectionServesManyThreads) {
+TEST_P(BackupManagerContract, ConnectionIsThreadSafe) {
   constexpr std::size_t kThreads = 8;
   for (std::size_t index = 0; index < kThreads; ++index)
     subject().keepRestoreData("com.a" + std::to_string(index), 1);

@@ -1,4 +1,4 @@
-// Holds backup services to platform/BackupManager.h.
+// Contract of platform/BackupManager.h.
 #pragma once
 
 #include <cstdint>
@@ -15,9 +15,9 @@ class BackupManagerSubject {
   virtual ~BackupManagerSubject() = default;
 
   [[nodiscard]] virtual std::unique_ptr<platform::BackupManager> makeManager() = 0;
-  /// From now on a restore holds `size` bytes of data for the app.
+  /// Adds restore data of `size` bytes for the app.
   virtual void keepRestoreData(std::string_view identifier, std::uint64_t size) = 0;
-  /// From now on no restore of an app's data can be given up; false where that cannot be done.
+  /// Makes all later cancellations fail. Returns false if not supported.
   [[nodiscard]] virtual bool failCancelling() { return false; }
 };
 

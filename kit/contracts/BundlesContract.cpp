@@ -15,7 +15,7 @@ constexpr std::string_view kInfo =
 
 }  // namespace
 
-TEST_P(BundlesContract, TheInfoDictionarysValuesAreThere) {
+TEST_P(BundlesContract, ReadsTheInfoDictionary) {
   const auto bundle = openWithInfo(kInfo);
   ASSERT_NE(bundle, nullptr);
   const plist::Value* name = bundle->infoDictionaryValue("Name");
@@ -26,7 +26,7 @@ TEST_P(BundlesContract, TheInfoDictionarysValuesAreThere) {
   EXPECT_EQ(*number, plist::Value(7));
 }
 
-TEST_P(BundlesContract, ABinaryInfoDictionaryIsReadToo) {
+TEST_P(BundlesContract, ReadsABinaryInfoDictionary) {
   const Bytes binary = plist::writeBinary(plist::Dictionary{{"Name", "An app"}}).value();
   const auto bundle = openWithInfo(textOf(binary));
   ASSERT_NE(bundle, nullptr);
@@ -34,7 +34,7 @@ TEST_P(BundlesContract, ABinaryInfoDictionaryIsReadToo) {
   EXPECT_EQ(*bundle->infoDictionaryValue("Name"), plist::Value("An app"));
 }
 
-TEST_P(BundlesContract, ThereIsNoValueUnderAnotherKey) {
+TEST_P(BundlesContract, MissingKeyReturnsNull) {
   const auto bundle = openWithInfo(kInfo);
   ASSERT_NE(bundle, nullptr);
   EXPECT_EQ(bundle->infoDictionaryValue("Other"), nullptr);
@@ -51,29 +51,29 @@ TEST_P(BundlesContract, ValuesLiveAsLongAsTheBundle) {
   EXPECT_EQ(*name, plist::Value("An app"));
 }
 
-TEST_P(BundlesContract, TheLocationIsTheOneThatWasOpened) {
+TEST_P(BundlesContract, ReturnsItsLocation) {
   const auto bundle = openWithInfo(kInfo);
   ASSERT_NE(bundle, nullptr);
   EXPECT_EQ(bundle->location().path, subject().folder() + "/App.app");
   EXPECT_TRUE(bundle->location().isDirectory);
 }
 
-TEST_P(BundlesContract, AMissingFolderIsNoBundle) {
+TEST_P(BundlesContract, MissingDirectoryReturnsNull) {
   EXPECT_EQ(subject().bundles().openBundle({subject().folder() + "/Missing.app", true}), nullptr);
 }
 
-TEST_P(BundlesContract, AFileIsNoBundle) {
+TEST_P(BundlesContract, FileReturnsNull) {
   subject().put(subject().folder() + "/File.app", "x");
   EXPECT_EQ(subject().bundles().openBundle({subject().folder() + "/File.app", true}), nullptr);
 }
 
-TEST_P(BundlesContract, AFolderWithoutAnInfoDictionaryOpensWithoutInfo) {
+TEST_P(BundlesContract, MissingInfoDictionaryIsEmpty) {
   const auto bundle = subject().bundles().openBundle({subject().folder(), true});
   ASSERT_NE(bundle, nullptr);
   EXPECT_EQ(bundle->infoDictionaryValue("Name"), nullptr);
 }
 
-TEST_P(BundlesContract, AnUnusableInfoDictionaryOpensWithoutInfo) {
+TEST_P(BundlesContract, InvalidInfoDictionaryIsEmpty) {
   for (const char* info : {"", "garbage <", "bplist00", "<plist><array/></plist>"}) {
     const auto bundle = openWithInfo(info);
     ASSERT_NE(bundle, nullptr) << info;
@@ -81,7 +81,7 @@ TEST_P(BundlesContract, AnUnusableInfoDictionaryOpensWithoutInfo) {
   }
 }
 
-TEST_P(BundlesContract, ManyThreadsMayOpenAndReadAtOnce) {
+TEST_P(BundlesContract, OpensAndReadsConcurrently) {
   const auto shared = openWithInfo(kInfo);
   ASSERT_NE(shared, nullptr);
   runOnThreads(8, [&](std::size_t) {
@@ -95,7 +95,7 @@ TEST_P(BundlesContract, ManyThreadsMayOpenAndReadAtOnce) {
   });
 }
 
-TEST_P(BundlesContract, TheMainBundleStaysTheSame) {
+TEST_P(BundlesContract, MainBundleIdentifierDoesNotChange) {
   EXPECT_EQ(subject().bundles().mainBundleIdentifier(), subject().bundles().mainBundleIdentifier());
 }
 

@@ -1,4 +1,4 @@
-// Holds bundle services to platform/Bundle.h.
+// Contract of platform/Bundle.h.
 #pragma once
 
 #include <string>
@@ -14,15 +14,15 @@ class BundlesSubject {
   virtual ~BundlesSubject() = default;
 
   [[nodiscard]] virtual platform::Bundles& bundles() = 0;
-  /// Device path of a folder that exists and is empty, without a slash at its end.
+  /// Device path of an existing, empty directory, without a trailing slash.
   [[nodiscard]] virtual std::string folder() = 0;
-  /// Puts a file there, and the folders that lead to it.
+  /// Creates a file and its missing parent directories.
   virtual void put(std::string_view path, std::string_view contents) = 0;
 };
 
 class BundlesContract : public Contract<BundlesSubject> {
  protected:
-  /// Opens "App.app" in the test's folder after putting that info dictionary in it.
+  /// Writes the file "App.app/Info.plist" into the test's directory and opens that bundle.
   [[nodiscard]] std::unique_ptr<platform::Bundle> openWithInfo(std::string_view infoFile) {
     subject().put(subject().folder() + "/App.app/Info.plist", infoFile);
     return subject().bundles().openBundle({subject().folder() + "/App.app", true});

@@ -1,13 +1,15 @@
-// What all contract suites share. A suite holds an implementation of one platform service to what its header promises.
+// Base of all contract suites. A suite tests that an implementation of a platform service fulfils the contract in its
+// header.
 //
-// To hold your own implementation to a suite, derive from the suite's subject in a test program that links the suites
-// (`appsync::contracts` in CMake, `appsync-contracts` in pkg-config), and write there
+// To test your own implementation, derive from the suite's subject in a test program that links the suites
+// (`appsync::contracts` in CMake, `appsync-contracts` in pkg-config), and instantiate the suite there:
 //
 //     INSTANTIATE_TEST_SUITE_P(MyDevice, FileSystemContract,
 //                              testing::Values(implementation<FileSystemSubject, MyFileSystemSubject>("MyDevice")),
 //                              implementationName);
 //
-// The program runs the suites that are instantiated in it and no others; one that instantiates none fails.
+// The program runs only the suites that it instantiates; a program that instantiates none fails. Tests that need an
+// operation which the subject does not support are skipped.
 #pragma once
 
 #include <functional>
@@ -20,7 +22,7 @@
 
 namespace appsync::test {
 
-/// An implementation under test. `make` gives a subject in its first state, independent of all others.
+/// An implementation under test. `make` returns a new subject in its initial state, independent of all others.
 template <class Subject>
 struct Implementation {
   std::string name;  ///< letters and digits
@@ -32,16 +34,16 @@ std::ostream& operator<<(std::ostream& out, const Implementation<Subject>& imple
   return out << implementation.name;
 }
 
-/// An implementation whose subject is made without arguments.
+/// Returns an implementation whose subject is default-constructed.
 template <class Subject, class Made>
 [[nodiscard]] Implementation<Subject> implementation(std::string name) {
   return {std::move(name), [] { return std::make_unique<Made>(); }};
 }
 
-/// Names instantiated tests after the implementation.
+/// Name generator for INSTANTIATE_TEST_SUITE_P.
 inline constexpr auto implementationName = [](const auto& info) { return info.param.name; };
 
-/// Base of the suites' fixtures: a new subject for each test.
+/// Base of the suites' fixtures. Creates a new subject for each test.
 template <class SubjectType>
 class Contract : public testing::TestWithParam<Implementation<SubjectType>> {
  protected:

@@ -1,4 +1,4 @@
-// Keeps a porter's test program from passing because it runs nothing.
+// Makes a test program fail that links the contract suites but instantiates none.
 #include <string_view>
 
 #include <gtest/gtest.h>
@@ -20,7 +20,7 @@ TEST(Contracts, AtLeastOneIsInstantiated) {
   for (int index = 0; index < program.total_test_suite_count(); ++index) {
     if (isContract(*program.GetTestSuite(index))) return;
   }
-  FAIL() << "this program links the contract suites and holds nothing to them: see kit/contracts/Contract.h";
+  FAIL() << "no contract suite is instantiated in this program; see kit/contracts/Contract.h";
 }
 
 }  // namespace appsync::test

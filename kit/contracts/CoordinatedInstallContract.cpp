@@ -1,4 +1,4 @@
-// What the parts of the contract of coordinated installs share.
+// CoordinatedInstallContract: the fixture.
 #include "kit/contracts/InstallCoordinationContract.h"
 
 namespace appsync::test {

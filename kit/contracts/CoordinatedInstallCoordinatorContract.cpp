@@ -1,4 +1,4 @@
-// The part of the contract of coordinated installs that is about coordinators: looking them up and telling them things.
+// CoordinatedInstallContract: look-ups and set operations of coordinators.
 #include "kit/contracts/InstallCoordinationContract.h"
 
 namespace appsync::test {
@@ -11,12 +11,12 @@ TEST_P(CoordinatedInstallContract, CoordinationIsEnabled) {
 
 // Look-ups.
 
-TEST_P(CoordinatedInstallContract, WhereThereIsNoCoordinatorNoneIsFoundAndThatIsNoError) {
+TEST_P(CoordinatedInstallContract, FindingNoCoordinatorSetsNoError) {
   for (const Kind kind : {Kind::any, Kind::initiating, Kind::updating, Kind::restoring, Kind::restoringDemoted})
     EXPECT_EQ(find("com.a", kind), nullptr);
 }
 
-TEST_P(CoordinatedInstallContract, AMissingCoordinatorIsMadeForTheClientThatAsks) {
+TEST_P(CoordinatedInstallContract, CreatesAMissingCoordinatorForTheClient) {
   for (const Kind kind : {Kind::initiating, Kind::updating, Kind::restoring, Kind::restoringDemoted}) {
     bool created = false;
     std::optional<Error> error;
@@ -31,7 +31,7 @@ TEST_P(CoordinatedInstallContract, AMissingCoordinatorIsMadeForTheClientThatAsks
   }
 }
 
-TEST_P(CoordinatedInstallContract, ANewCoordinatorHasNothing) {
+TEST_P(CoordinatedInstallContract, NewCoordinatorHasNoOptionsOrPromises) {
   const Coordinator made = coordinator("com.a");
   EXPECT_FALSE(made->hasInstallOptions());
   EXPECT_FALSE(made->hasInitialODRAssetPromises());
@@ -42,7 +42,7 @@ TEST_P(CoordinatedInstallContract, ANewCoordinatorHasNothing) {
   EXPECT_EQ(made->coordinatorError(), std::nullopt);
 }
 
-TEST_P(CoordinatedInstallContract, ASecondLookUpFindsTheSameCoordinator) {
+TEST_P(CoordinatedInstallContract, SecondLookUpFindsTheSameCoordinator) {
   const Coordinator first = coordinator("com.a");
   bool created = true;
   const Coordinator second =
@@ -54,7 +54,7 @@ TEST_P(CoordinatedInstallContract, ASecondLookUpFindsTheSameCoordinator) {
   EXPECT_FALSE(second->setInstallOptions(options()));
 }
 
-TEST_P(CoordinatedInstallContract, AnotherClientsCoordinatorIsFoundAndStaysThatClients) {
+TEST_P(CoordinatedInstallContract, FindsAnotherClientsCoordinatorUnchanged) {
   const Coordinator foreign = coordinator("com.a", Kind::initiating, kStore);
   bool created = true;
   const Coordinator found =
@@ -64,13 +64,13 @@ TEST_P(CoordinatedInstallContract, AnotherClientsCoordinatorIsFoundAndStaysThatC
   EXPECT_EQ(found->creatorIdentifier(), kStore);
 }
 
-TEST_P(CoordinatedInstallContract, ClientsWithOtherNumbersAreKnownToo) {
+TEST_P(CoordinatedInstallContract, AcceptsOtherClientNumbers) {
   const Coordinator made = coordinator("com.a", Kind::initiating, Client{77});
   EXPECT_EQ(made->creatorIdentifier(), Client{77});
   EXPECT_EQ(find("com.a")->creatorIdentifier(), Client{77});
 }
 
-TEST_P(CoordinatedInstallContract, AnAppMayHaveOneCoordinatorOfEachKind) {
+TEST_P(CoordinatedInstallContract, AppCanHaveOneCoordinatorOfEachKind) {
   const Coordinator initiating = coordinator("com.a", Kind::initiating);
   const Coordinator restoring = coordinator("com.a", Kind::restoring);
   EXPECT_TRUE(initiating->setInstallOptions(options()));
@@ -78,7 +78,7 @@ TEST_P(CoordinatedInstallContract, AnAppMayHaveOneCoordinatorOfEachKind) {
   EXPECT_EQ(find("com.a", Kind::updating), nullptr);
 }
 
-TEST_P(CoordinatedInstallContract, CoordinatorsOfDifferentAppsHaveNothingInCommon) {
+TEST_P(CoordinatedInstallContract, CoordinatorsOfDifferentAppsAreIndependent) {
   const Coordinator first = coordinator("com.a");
   const Coordinator second = coordinator("com.b");
   EXPECT_TRUE(first->setInstallOptions(options()));
@@ -87,7 +87,7 @@ TEST_P(CoordinatedInstallContract, CoordinatorsOfDifferentAppsHaveNothingInCommo
   EXPECT_NE(find("com.b"), nullptr);
 }
 
-TEST_P(CoordinatedInstallContract, AnyKindIsFoundButNeverMade) {
+TEST_P(CoordinatedInstallContract, AnyKindFindsButNeverCreates) {
   bool created = true;
   std::optional<Error> error;
   EXPECT_EQ(service().coordinatorForApp(Kind::any, "com.a", kSync, IfMissing::create, &created, &error), nullptr);
@@ -98,7 +98,7 @@ TEST_P(CoordinatedInstallContract, AnyKindIsFoundButNeverMade) {
   EXPECT_EQ(found->kind(), Kind::updating);
 }
 
-TEST_P(CoordinatedInstallContract, OfAnyKindTheClientsOwnComesFirstThenTheOldest) {
+TEST_P(CoordinatedInstallContract, AnyKindPrefersTheClientsOwnThenTheOldest) {
   const Coordinator oldest = coordinator("com.a", Kind::restoring, kStore);
   const Coordinator younger = coordinator("com.a", Kind::initiating, Client{9});
   EXPECT_EQ(find("com.a")->kind(), Kind::restoring);
@@ -111,7 +111,7 @@ TEST_P(CoordinatedInstallContract, OfAnyKindTheClientsOwnComesFirstThenTheOldest
   EXPECT_EQ(find("com.a")->kind(), Kind::restoring);
 }
 
-TEST_P(CoordinatedInstallContract, DroppingEveryHandleChangesNothing) {
+TEST_P(CoordinatedInstallContract, CoordinatorOutlivesItsHandles) {
   Coordinator made = coordinator("com.a");
   EXPECT_TRUE(made->setInstallOptions(options()));
   EXPECT_TRUE(made->setAppAssetPromise(makeAsset()));
@@ -122,7 +122,7 @@ TEST_P(CoordinatedInstallContract, DroppingEveryHandleChangesNothing) {
   EXPECT_TRUE(found->hasAppAssetPromise());
 }
 
-TEST_P(CoordinatedInstallContract, ACoordinatorThatHasEndedMakesRoomForANewOne) {
+TEST_P(CoordinatedInstallContract, EndedCoordinatorCanBeReplaced) {
   const Coordinator ended = coordinator("com.a");
   EXPECT_TRUE(ended->setInstallOptions(options()));
   EXPECT_TRUE(cancel(*ended));
@@ -136,9 +136,9 @@ TEST_P(CoordinatedInstallContract, ACoordinatorThatHasEndedMakesRoomForANewOne) 
   EXPECT_EQ(ended->coordinatorError(), reason());
 }
 
-// Telling them things.
+// Set operations.
 
-TEST_P(CoordinatedInstallContract, EachThingIsSetOnce) {
+TEST_P(CoordinatedInstallContract, EachValueCanBeSetOnce) {
   const Coordinator made = coordinator("com.a");
   EXPECT_TRUE(made->setInstallOptions(options()));
   EXPECT_FALSE(made->setInstallOptions(options()));
@@ -156,13 +156,13 @@ TEST_P(CoordinatedInstallContract, EachThingIsSetOnce) {
   EXPECT_EQ(made->appAssetPromise()->name(), "asset");
 }
 
-TEST_P(CoordinatedInstallContract, NoOnDemandResourcesIsAnAnswerToo) {
+TEST_P(CoordinatedInstallContract, AcceptsAnEmptyListOfOnDemandResources) {
   const Coordinator made = coordinator("com.a");
   EXPECT_TRUE(made->setInitialODRAssetPromises({}));
   EXPECT_TRUE(made->hasInitialODRAssetPromises());
 }
 
-TEST_P(CoordinatedInstallContract, ThePackageIsTheCreatorsToBringUnlessSomebodyElseIsNamed) {
+TEST_P(CoordinatedInstallContract, CreatorIsResponsibleUnlessAnotherClientIsSet) {
   const Coordinator own = coordinator("com.a", Kind::restoring);
   const Coordinator foreign = coordinator("com.b", Kind::restoring, kStore);
   std::optional<Error> error;
@@ -175,7 +175,7 @@ TEST_P(CoordinatedInstallContract, ThePackageIsTheCreatorsToBringUnlessSomebodyE
   EXPECT_EQ(own->appAssetPromiseResponsibleClient(&error), kStore);
 }
 
-TEST_P(CoordinatedInstallContract, WhatIsRefusedHasAnErrorOfTheServices) {
+TEST_P(CoordinatedInstallContract, RefusalsHaveTheServicesErrorDomain) {
   const Coordinator made = coordinator("com.a");
   EXPECT_TRUE(made->setInstallOptions(options()));
   const Status refused = made->setInstallOptions(options());
@@ -184,7 +184,7 @@ TEST_P(CoordinatedInstallContract, WhatIsRefusedHasAnErrorOfTheServices) {
   EXPECT_NE(refused.error().code, 1);
 }
 
-TEST_P(CoordinatedInstallContract, ACoordinatorThatHasEndedTakesNothingMore) {
+TEST_P(CoordinatedInstallContract, EndedCoordinatorCannotBeChanged) {
   const Coordinator ended = coordinator("com.a");
   EXPECT_TRUE(cancel(*ended));
   const Asset asset = makeAsset();
@@ -195,12 +195,13 @@ TEST_P(CoordinatedInstallContract, ACoordinatorThatHasEndedTakesNothingMore) {
   EXPECT_FALSE(ended->setUserDataPromise(makeUserData()));
   EXPECT_FALSE(ended->setPlaceholderPromise(makePlaceholder("com.a")));
   EXPECT_FALSE(cancel(*ended));
-  EXPECT_TRUE(coordinator("com.a")->setAppAssetPromise(asset)) << "what was refused is still the caller's";
+  EXPECT_TRUE(coordinator("com.a")->setAppAssetPromise(asset))
+      << "a refused promise must stay with the caller and be usable";
 }
 
-// Errors for people.
+// User-presentable errors.
 
-TEST_P(CoordinatedInstallContract, AnErrorForPeopleKeepsWhatWentWrongUnderneath) {
+TEST_P(CoordinatedInstallContract, UserPresentableErrorKeepsUnderlyingError) {
   const Error shown = service().createUserPresentableError(1, {}, reason());
   EXPECT_EQ(shown.domain, platform::kInstallCoordinationErrorDomain);
   EXPECT_EQ(shown.code, 1);

@@ -1,4 +1,4 @@
-// The part of the contract of coordinated installs that is about ending one early: cancelling and uninstalling.
+// CoordinatedInstallContract: cancelling and uninstalling.
 #include <thread>
 
 #include "kit/contracts/CoordinationListener.h"
@@ -12,7 +12,7 @@ using platform::UserConfirmation;
 
 // Cancelling.
 
-TEST_P(CoordinatedInstallContract, CancellingEndsTheCoordinatorAndItsPlaceholder) {
+TEST_P(CoordinatedInstallContract, CancellingEndsCoordinatorAndPlaceholder) {
   const Coordinator made = coordinator("com.a");
   const Asset asset = prepare(*made);
   subject().waitUntilIdle();
@@ -23,7 +23,7 @@ TEST_P(CoordinatedInstallContract, CancellingEndsTheCoordinatorAndItsPlaceholder
   EXPECT_EQ(made->coordinatorError(), reason());
 }
 
-TEST_P(CoordinatedInstallContract, AnyClientMayCancel) {
+TEST_P(CoordinatedInstallContract, AnyClientCanCancel) {
   const Coordinator made = coordinator("com.a", Kind::initiating, kStore);
   const Coordinator found = find("com.a");
   EXPECT_TRUE(found->cancelForReason(reason(), kSync));
@@ -31,7 +31,7 @@ TEST_P(CoordinatedInstallContract, AnyClientMayCancel) {
   EXPECT_EQ(made->coordinatorError(), reason());
 }
 
-TEST_P(CoordinatedInstallContract, ACoordinatorIsCancelledOnce) {
+TEST_P(CoordinatedInstallContract, CoordinatorCanBeCancelledOnce) {
   const Coordinator made = coordinator("com.a");
   EXPECT_TRUE(cancel(*made));
   EXPECT_FALSE(made->cancelForReason(Error{"ZTError", 1, "again", nullptr}, kSync));
@@ -49,7 +49,7 @@ TEST_P(CoordinatedInstallContract, CancellingAnUpdateLeavesTheInstalledApp) {
   EXPECT_EQ(versionOf("com.a"), "1.0");
 }
 
-TEST_P(CoordinatedInstallContract, CancellingRemovesThePackageOnlyWhenItIsTheServices) {
+TEST_P(CoordinatedInstallContract, CancellingDeletesTheServicesPackageOnly) {
   const Coordinator waiting = coordinator("com.a");
   const Coordinator loading = coordinator("com.b");
   const FileLocation services = subject().makePackage("com.a", "1.0");
@@ -67,7 +67,7 @@ TEST_P(CoordinatedInstallContract, CancellingRemovesThePackageOnlyWhenItIsTheSer
   EXPECT_TRUE(subject().exists(clients));
 }
 
-TEST_P(CoordinatedInstallContract, CancellingEndsThePromisesToo) {
+TEST_P(CoordinatedInstallContract, CancellingEndsThePromises) {
   const Coordinator made = coordinator("com.a");
   const Asset asset = prepare(*made);
   const UserData data = makeUserData();
@@ -80,7 +80,7 @@ TEST_P(CoordinatedInstallContract, CancellingEndsThePromisesToo) {
   EXPECT_FALSE(next->setAppAssetPromise(asset));
 }
 
-TEST_P(CoordinatedInstallContract, CancellingOneKindLeavesTheOthers) {
+TEST_P(CoordinatedInstallContract, CancellingOneKindLeavesOtherKinds) {
   const Coordinator made = coordinator("com.a");
   const Coordinator other = coordinator("com.a", Kind::restoring);
   EXPECT_TRUE(cancel(*made));
@@ -89,7 +89,7 @@ TEST_P(CoordinatedInstallContract, CancellingOneKindLeavesTheOthers) {
   EXPECT_EQ(find("com.a")->kind(), Kind::restoring);
 }
 
-TEST_P(CoordinatedInstallContract, TheUserCancelsToo) {
+TEST_P(CoordinatedInstallContract, UserCanCancel) {
   const Coordinator made = coordinator("com.a");
   const Asset asset = prepare(*made);
   subject().waitUntilIdle();
@@ -104,7 +104,7 @@ TEST_P(CoordinatedInstallContract, TheUserCancelsToo) {
 
 namespace {
 
-/// How an uninstall ended.
+/// The result of an uninstall.
 struct Uninstalled {
   EventCounter completions;
   std::optional<Error> error;
@@ -121,7 +121,7 @@ struct Uninstalled {
 
 }  // namespace
 
-TEST_P(CoordinatedInstallContract, UninstallingRemovesTheAppAndThenSaysSo) {
+TEST_P(CoordinatedInstallContract, UninstallingRemovesTheAppThenCompletes) {
   install("com.a", "1.0");
   Uninstalled uninstalled;
   service().uninstallApp("com.a", UserConfirmation::skip, uninstalled.completion());
@@ -153,7 +153,7 @@ TEST_P(CoordinatedInstallContract, UninstallingCancelsTheAppsCoordinatorsFirst) 
   EXPECT_NE(find("com.b"), nullptr);
 }
 
-TEST_P(CoordinatedInstallContract, UninstallingIsToldAsACancellationByTheUser) {
+TEST_P(CoordinatedInstallContract, UninstallingReportsCancellationByTheUser) {
   CoordinationListener listener;
   const auto connection = service().initWithMachServiceName("com.corvel.contract.observer", {kSync}, listener);
   const Coordinator made = coordinator("com.a");
@@ -161,11 +161,11 @@ TEST_P(CoordinatedInstallContract, UninstallingIsToldAsACancellationByTheUser) {
   service().uninstallApp("com.a", UserConfirmation::skip, uninstalled.completion());
   ASSERT_TRUE(uninstalled.completions.waitFor(1));
   subject().waitUntilIdle();
-  ASSERT_EQ(listener.heard().size(), 1U);
-  EXPECT_TRUE(listener.heard().front().starts_with("cancelled com.a by 2 for ")) << listener.heard().front();
+  ASSERT_EQ(listener.events().size(), 1U);
+  EXPECT_TRUE(listener.events().front().starts_with("cancelled com.a by 2 for ")) << listener.events().front();
 }
 
-TEST_P(CoordinatedInstallContract, AnAppThatWasOnlyAPlaceholderIsNotRememberedAsRemoved) {
+TEST_P(CoordinatedInstallContract, UninstallingAPlaceholderListsNothingAsRemoved) {
   const Coordinator made = coordinator("com.a");
   const Asset asset = prepare(*made);
   subject().waitUntilIdle();
@@ -178,7 +178,7 @@ TEST_P(CoordinatedInstallContract, AnAppThatWasOnlyAPlaceholderIsNotRememberedAs
   EXPECT_TRUE(!list || list->find("com.a") == nullptr);
 }
 
-TEST_P(CoordinatedInstallContract, AnUninstallOfAnUnknownAppCompletesOnceToo) {
+TEST_P(CoordinatedInstallContract, UninstallingAnUnknownAppCompletesOnce) {
   Uninstalled uninstalled;
   service().uninstallApp("com.unknown", UserConfirmation::skip, uninstalled.completion());
   ASSERT_TRUE(uninstalled.completions.waitFor(1));
@@ -186,7 +186,7 @@ TEST_P(CoordinatedInstallContract, AnUninstallOfAnUnknownAppCompletesOnceToo) {
   EXPECT_EQ(uninstalled.completions.count(), 1U);
 }
 
-TEST_P(CoordinatedInstallContract, AnUninstallCompletesBeforeTheServiceEnds) {
+TEST_P(CoordinatedInstallContract, UninstallCompletesBeforeTheServiceEnds) {
   auto another = GetParam().make();
   Uninstalled uninstalled;
   another->coordination().uninstallApp("com.unknown", UserConfirmation::skip, uninstalled.completion());
@@ -194,7 +194,7 @@ TEST_P(CoordinatedInstallContract, AnUninstallCompletesBeforeTheServiceEnds) {
   EXPECT_EQ(uninstalled.completions.count(), 1U);
 }
 
-TEST_P(CoordinatedInstallContract, ACompletionMayUseTheService) {
+TEST_P(CoordinatedInstallContract, UninstallCompletionCanCallTheService) {
   install("com.a", "1.0");
   install("com.b", "1.0");
   Uninstalled second;

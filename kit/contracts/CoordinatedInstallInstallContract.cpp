@@ -1,4 +1,4 @@
-// The part of the contract of coordinated installs that is about the installs themselves.
+// CoordinatedInstallContract: installs.
 #include "kit/contracts/InstallCoordinationContract.h"
 
 namespace appsync::test {
@@ -24,7 +24,7 @@ TEST_P(CoordinatedInstallContract, FulfilledPromisesInstallTheApp) {
   EXPECT_EQ(made->coordinatorError(), std::nullopt);
 }
 
-TEST_P(CoordinatedInstallContract, AnInstallThatHasEndedTakesNothingMore) {
+TEST_P(CoordinatedInstallContract, EndedInstallCannotBeChanged) {
   const Coordinator made = coordinator("com.a");
   deliver(*prepare(*made), subject().makePackage("com.a", "2.0"));
   subject().waitUntilIdle();
@@ -35,7 +35,7 @@ TEST_P(CoordinatedInstallContract, AnInstallThatHasEndedTakesNothingMore) {
   EXPECT_EQ(made->coordinatorError(), std::nullopt);
 }
 
-TEST_P(CoordinatedInstallContract, StoreMetadataIsKeptWithTheApp) {
+TEST_P(CoordinatedInstallContract, StoresStoreMetadataWithTheApp) {
   const Coordinator made = coordinator("com.a");
   platform::InstallOptions withMetadata = options();
   withMetadata.setStoreMetadata(platform::StoreMetadata::initWithDictionary({{"itemName", "Kept"}}));
@@ -47,14 +47,14 @@ TEST_P(CoordinatedInstallContract, StoreMetadataIsKeptWithTheApp) {
   subject().waitUntilIdle();
   ASSERT_EQ(stateOf("com.a"), "installed");
   const std::optional<plist::Dictionary> kept = subject().storeMetadataOf("com.a");
-  if (!kept) GTEST_SKIP() << "cannot be told";
+  if (!kept) GTEST_SKIP() << "the subject cannot read store metadata";
   ASSERT_NE(kept->find("itemName"), nullptr);
   EXPECT_EQ(kept->find("itemName")->string(), "Kept");
 }
 
-// What an install waits for.
+// Preconditions of an install.
 
-TEST_P(CoordinatedInstallContract, AnInstallWaitsForItsPackage) {
+TEST_P(CoordinatedInstallContract, InstallWaitsForThePackage) {
   const Coordinator made = coordinator("com.a");
   const Asset asset = prepare(*made);
   asset->setTransferPath(subject().makePackage("com.a", "1.0"));
@@ -66,7 +66,7 @@ TEST_P(CoordinatedInstallContract, AnInstallWaitsForItsPackage) {
   EXPECT_EQ(stateOf("com.a"), "installed");
 }
 
-TEST_P(CoordinatedInstallContract, AnInstallWaitsForItsOptions) {
+TEST_P(CoordinatedInstallContract, InstallWaitsForInstallOptions) {
   const Coordinator made = coordinator("com.a");
   const Asset asset = makeAsset();
   deliver(*asset, subject().makePackage("com.a", "1.0"));
@@ -79,7 +79,7 @@ TEST_P(CoordinatedInstallContract, AnInstallWaitsForItsOptions) {
   EXPECT_EQ(stateOf("com.a"), "installed");
 }
 
-TEST_P(CoordinatedInstallContract, AnInstallWaitsForItsPlaceholder) {
+TEST_P(CoordinatedInstallContract, InstallWaitsForThePlaceholder) {
   const Coordinator made = coordinator("com.a");
   const Asset asset = makeAsset();
   EXPECT_TRUE(made->setInstallOptions(options()));
@@ -92,7 +92,7 @@ TEST_P(CoordinatedInstallContract, AnInstallWaitsForItsPlaceholder) {
   EXPECT_EQ(stateOf("com.a"), "installed");
 }
 
-TEST_P(CoordinatedInstallContract, AnInstallWaitsForUserDataThatWasPromised) {
+TEST_P(CoordinatedInstallContract, InstallWaitsForPromisedUserData) {
   const Coordinator made = coordinator("com.a");
   const UserData data = makeUserData();
   EXPECT_TRUE(made->setUserDataPromise(data));
@@ -105,7 +105,7 @@ TEST_P(CoordinatedInstallContract, AnInstallWaitsForUserDataThatWasPromised) {
   EXPECT_EQ(stateOf("com.a"), "installed");
 }
 
-TEST_P(CoordinatedInstallContract, APlaceholderThatIsNeverConfiguredKeepsNoAppFromBeingInstalled) {
+TEST_P(CoordinatedInstallContract, InstallsWithUnconfiguredPlaceholder) {
   const Coordinator made = coordinator("com.a");
   const Asset asset = makeAsset();
   EXPECT_TRUE(made->setInstallOptions(options()));
@@ -116,7 +116,7 @@ TEST_P(CoordinatedInstallContract, APlaceholderThatIsNeverConfiguredKeepsNoAppFr
   EXPECT_EQ(stateOf("com.a"), "installed");
 }
 
-TEST_P(CoordinatedInstallContract, ARestoredAppIsInstalledFromWhatTheResponsibleClientBrings) {
+TEST_P(CoordinatedInstallContract, InstallsThePackageOfTheResponsibleClient) {
   {
     const Coordinator made = coordinator("com.a", Kind::restoring);
     const UserData data = makeUserData();
@@ -138,7 +138,7 @@ TEST_P(CoordinatedInstallContract, ARestoredAppIsInstalledFromWhatTheResponsible
 
 // Updates.
 
-TEST_P(CoordinatedInstallContract, AnUpdateLeavesTheAppUsableUntilTheNewVersionIsIn) {
+TEST_P(CoordinatedInstallContract, AppIsUsableUntilItsUpdateIsInstalled) {
   install("com.a", "1.0");
   const Coordinator made = coordinator("com.a", Kind::updating);
   const Asset asset = prepare(*made);
@@ -151,7 +151,7 @@ TEST_P(CoordinatedInstallContract, AnUpdateLeavesTheAppUsableUntilTheNewVersionI
   EXPECT_EQ(versionOf("com.a"), "2.0");
 }
 
-TEST_P(CoordinatedInstallContract, AnUpdateThatFailsLeavesTheAppAsItWas) {
+TEST_P(CoordinatedInstallContract, FailedUpdateLeavesAppUnchanged) {
   install("com.a", "1.0");
   const Coordinator made = coordinator("com.a", Kind::updating);
   deliver(*prepare(*made), subject().makeDamagedPackage("com.a"));
@@ -163,7 +163,7 @@ TEST_P(CoordinatedInstallContract, AnUpdateThatFailsLeavesTheAppAsItWas) {
 
 // Failures.
 
-TEST_P(CoordinatedInstallContract, AnInstallThatFailsEndsWithAnErrorAndLeavesNothing) {
+TEST_P(CoordinatedInstallContract, FailedInstallSetsErrorAndLeavesNothing) {
   const Coordinator made = coordinator("com.a");
   const FileLocation package = subject().makeDamagedPackage("com.a");
   deliver(*prepare(*made), package);
@@ -174,7 +174,7 @@ TEST_P(CoordinatedInstallContract, AnInstallThatFailsEndsWithAnErrorAndLeavesNot
   EXPECT_FALSE(subject().exists(package));
 }
 
-TEST_P(CoordinatedInstallContract, APackageOfAnotherAppIsNotInstalled) {
+TEST_P(CoordinatedInstallContract, PackageOfAnotherAppFailsTheInstall) {
   const Coordinator made = coordinator("com.a");
   deliver(*prepare(*made), subject().makePackage("com.b", "1.0"));
   subject().waitUntilIdle();
@@ -183,7 +183,7 @@ TEST_P(CoordinatedInstallContract, APackageOfAnotherAppIsNotInstalled) {
   EXPECT_EQ(stateOf("com.b"), "absent");
 }
 
-TEST_P(CoordinatedInstallContract, APackageThatIsNotThereFailsTheInstall) {
+TEST_P(CoordinatedInstallContract, MissingPackageFailsTheInstall) {
   const Coordinator made = coordinator("com.a");
   FileLocation missing = subject().makePackage("com.a", "1.0");
   missing.path += ".missing";
@@ -193,7 +193,7 @@ TEST_P(CoordinatedInstallContract, APackageThatIsNotThereFailsTheInstall) {
   EXPECT_EQ(stateOf("com.a"), "absent");
 }
 
-TEST_P(CoordinatedInstallContract, ACompletePromiseWithoutAPathFailsTheInstall) {
+TEST_P(CoordinatedInstallContract, CompletePromiseWithoutPathFailsTheInstall) {
   const Coordinator made = coordinator("com.a");
   prepare(*made)->setComplete(true);
   subject().waitUntilIdle();
@@ -202,7 +202,7 @@ TEST_P(CoordinatedInstallContract, ACompletePromiseWithoutAPathFailsTheInstall) 
   EXPECT_EQ(stateOf("com.a"), "absent");
 }
 
-TEST_P(CoordinatedInstallContract, OneBadAppDoesNotStopTheOthers) {
+TEST_P(CoordinatedInstallContract, FailedInstallLeavesOtherInstallsRunning) {
   const Coordinator bad = coordinator("com.bad");
   const Coordinator good = coordinator("com.good");
   deliver(*prepare(*bad), subject().makeDamagedPackage("com.bad"));
@@ -212,15 +212,15 @@ TEST_P(CoordinatedInstallContract, OneBadAppDoesNotStopTheOthers) {
   EXPECT_EQ(stateOf("com.good"), "installed");
 }
 
-TEST_P(CoordinatedInstallContract, AFailedInstallMayBeTriedAgain) {
+TEST_P(CoordinatedInstallContract, FailedInstallCanBeRetried) {
   deliver(*prepare(*coordinator("com.a")), subject().makeDamagedPackage("com.a"));
   subject().waitUntilIdle();
   install("com.a", "1.0");
 }
 
-// Whose the files are.
+// Ownership of files.
 
-TEST_P(CoordinatedInstallContract, AnIconsFileStaysTheClients) {
+TEST_P(CoordinatedInstallContract, ServiceLeavesTheIconFile) {
   const FileLocation icon = subject().makeIcon();
   const Coordinator made = coordinator("com.a");
   const Asset iconPromise = service().makePromisedTransferToPath("icon", kSync, icon, 9);

@@ -1,4 +1,4 @@
-// The part of the contract of coordinated installs that is about who hears of them.
+// CoordinatedInstallContract: observers and connections.
 #include <atomic>
 #include <future>
 #include <memory>
@@ -30,28 +30,28 @@ Connection connect(platform::InstallCoordination& service, platform::InstallObse
 
 }  // namespace
 
-// What is told.
+// Events.
 
-TEST_P(CoordinatedInstallContract, AnInstallIsToldFromPlaceholderToCompletion) {
+TEST_P(CoordinatedInstallContract, ReportsPlaceholderAndCompletion) {
   CoordinationListener listener;
   const Connection connection = connect(service(), listener);
   const Asset asset = prepare(*coordinator("com.a"));
   subject().waitUntilIdle();
-  EXPECT_EQ(listener.heard(), Lines{"placeholder com.a"});
+  EXPECT_EQ(listener.events(), Lines{"placeholder com.a"});
   EXPECT_NE(listener.thread(), std::this_thread::get_id());
   deliver(*asset, subject().makePackage("com.a", "1.0"));
   subject().waitUntilIdle();
-  EXPECT_EQ(listener.heard(), (Lines{"placeholder com.a", "complete com.a"}));
+  EXPECT_EQ(listener.events(), (Lines{"placeholder com.a", "complete com.a"}));
 }
 
-TEST_P(CoordinatedInstallContract, AnInstallThatFailsIsToldAsCompleteWithAnError) {
+TEST_P(CoordinatedInstallContract, ReportsFailedInstallAsCompleteWithError) {
   CoordinationListener listener;
   const Connection connection = connect(service(), listener);
   const Asset asset = prepare(*coordinator("com.a"));
   subject().waitUntilIdle();
   deliver(*asset, subject().makeDamagedPackage("com.a"));
   subject().waitUntilIdle();
-  EXPECT_EQ(listener.heard(), (Lines{"placeholder com.a", "complete com.a with error"}));
+  EXPECT_EQ(listener.events(), (Lines{"placeholder com.a", "complete com.a with error"}));
 }
 
 TEST_P(CoordinatedInstallContract, NoOperationWaitsForACallback) {
@@ -62,10 +62,10 @@ TEST_P(CoordinatedInstallContract, NoOperationWaitsForACallback) {
   const Asset asset = prepare(*coordinator("com.a"));
   done.set_value();
   subject().waitUntilIdle();
-  EXPECT_EQ(listener.heard(), Lines{"placeholder com.a"});
+  EXPECT_EQ(listener.events(), Lines{"placeholder com.a"});
 }
 
-TEST_P(CoordinatedInstallContract, WhatTheUserWantsIsTold) {
+TEST_P(CoordinatedInstallContract, ReportsActionsOfTheUser) {
   CoordinationListener listener;
   const Connection connection = connect(service(), listener);
   const Asset asset = prepare(*coordinator("com.a"));
@@ -74,29 +74,29 @@ TEST_P(CoordinatedInstallContract, WhatTheUserWantsIsTold) {
   subject().waitUntilIdle();
   subject().cancelByUser("com.a");
   subject().waitUntilIdle();
-  const Lines heard = listener.heard();
-  ASSERT_EQ(heard.size(), 3U);
-  EXPECT_EQ(heard[1], "prioritize com.a");
-  EXPECT_TRUE(heard[2].starts_with("cancelled com.a by 2 for ")) << heard[2];
+  const Lines events = listener.events();
+  ASSERT_EQ(events.size(), 3U);
+  EXPECT_EQ(events[1], "prioritize com.a");
+  EXPECT_TRUE(events[2].starts_with("cancelled com.a by 2 for ")) << events[2];
 }
 
-TEST_P(CoordinatedInstallContract, ACancellationByAnotherClientIsToldWithItsReason) {
+TEST_P(CoordinatedInstallContract, ReportsCancellationByAnotherClient) {
   CoordinationListener listener;
   const Connection connection = connect(service(), listener);
   EXPECT_TRUE(coordinator("com.a")->cancelForReason(reason(), kStore));
   subject().waitUntilIdle();
-  EXPECT_EQ(listener.heard(), Lines{"cancelled com.a by 1 for ZTError 30"});
+  EXPECT_EQ(listener.events(), Lines{"cancelled com.a by 1 for ZTError 30"});
 }
 
-TEST_P(CoordinatedInstallContract, WhoCancelsItsOwnIsNotToldSo) {
+TEST_P(CoordinatedInstallContract, DoesNotReportCancellationByTheCreator) {
   CoordinationListener listener;
   const Connection connection = connect(service(), listener);
   EXPECT_TRUE(cancel(*coordinator("com.a")));
   subject().waitUntilIdle();
-  EXPECT_EQ(listener.heard(), Lines{});
+  EXPECT_EQ(listener.events(), Lines{});
 }
 
-TEST_P(CoordinatedInstallContract, WhatHappenedToOneAppIsToldInOrder) {
+TEST_P(CoordinatedInstallContract, ReportsEventsOfAnAppInOrder) {
   CoordinationListener listener;
   const Connection connection = connect(service(), listener);
   const Asset asset = prepare(*coordinator("com.a"));
@@ -105,25 +105,25 @@ TEST_P(CoordinatedInstallContract, WhatHappenedToOneAppIsToldInOrder) {
   subject().waitUntilIdle();
   EXPECT_EQ(listener.count("placeholder com.a"), 1U);
   EXPECT_EQ(listener.count("prioritize com.a"), 1U);
-  EXPECT_EQ(listener.heard().back(), "complete com.a");
+  EXPECT_EQ(listener.events().back(), "complete com.a");
 }
 
-TEST_P(CoordinatedInstallContract, ACallbackGetsTheCoordinatorThatItIsAbout) {
-  CoordinationListener listener([](InstallCoordinator& told) {
-    EXPECT_EQ(told.kind(), Kind::updating);
-    EXPECT_EQ(told.creatorIdentifier(), kSync);
-    EXPECT_TRUE(told.hasPlaceholderPromise());
-    EXPECT_FALSE(told.description().empty());
+TEST_P(CoordinatedInstallContract, PassesTheCoordinatorToTheCallback) {
+  CoordinationListener listener([](InstallCoordinator& reported) {
+    EXPECT_EQ(reported.kind(), Kind::updating);
+    EXPECT_EQ(reported.creatorIdentifier(), kSync);
+    EXPECT_TRUE(reported.hasPlaceholderPromise());
+    EXPECT_FALSE(reported.description().empty());
   });
   const Connection connection = connect(service(), listener);
   EXPECT_TRUE(coordinator("com.a", Kind::updating)->setPlaceholderPromise(makeConfiguredPlaceholder("com.a")));
   subject().waitUntilIdle();
-  EXPECT_EQ(listener.heard(), Lines{"placeholder com.a"});
+  EXPECT_EQ(listener.events(), Lines{"placeholder com.a"});
 }
 
-// Who is told.
+// Observers.
 
-TEST_P(CoordinatedInstallContract, AConnectionReportsTheCoordinatorsOfItsClientsOnly) {
+TEST_P(CoordinatedInstallContract, ConnectionReportsItsClientsCoordinatorsOnly) {
   CoordinationListener syncs;
   CoordinationListener stores;
   CoordinationListener both;
@@ -138,23 +138,23 @@ TEST_P(CoordinatedInstallContract, AConnectionReportsTheCoordinatorsOfItsClients
   subject().waitUntilIdle();
   subject().prioritize("com.b");
   subject().waitUntilIdle();
-  EXPECT_EQ(syncs.heard(), Lines{"prioritize com.a"});
-  EXPECT_EQ(stores.heard(), Lines{"prioritize com.b"});
-  EXPECT_EQ(both.heard(), (Lines{"prioritize com.a", "prioritize com.b"}));
-  EXPECT_EQ(nobodys.heard(), Lines{});
+  EXPECT_EQ(syncs.events(), Lines{"prioritize com.a"});
+  EXPECT_EQ(stores.events(), Lines{"prioritize com.b"});
+  EXPECT_EQ(both.events(), (Lines{"prioritize com.a", "prioritize com.b"}));
+  EXPECT_EQ(nobodys.events(), Lines{});
 }
 
-TEST_P(CoordinatedInstallContract, ACoordinatorReportsToItsOwnObserver) {
+TEST_P(CoordinatedInstallContract, CoordinatorReportsToItsObserver) {
   const auto observer = std::make_shared<CoordinationListener>();
   coordinator("com.a")->setObserver(observer);
   const Coordinator other = coordinator("com.b");
   subject().prioritize("com.a");
   subject().prioritize("com.b");
   subject().waitUntilIdle();
-  EXPECT_EQ(observer->heard(), Lines{"prioritize com.a"});
+  EXPECT_EQ(observer->events(), Lines{"prioritize com.a"});
 }
 
-TEST_P(CoordinatedInstallContract, WhoObservesTwiceHearsOnce) {
+TEST_P(CoordinatedInstallContract, ObserverWithConnectionIsNotifiedOnce) {
   const auto observer = std::make_shared<CoordinationListener>();
   const Connection connection = connect(service(), *observer);
   const Coordinator made = coordinator("com.a");
@@ -163,10 +163,10 @@ TEST_P(CoordinatedInstallContract, WhoObservesTwiceHearsOnce) {
   const Asset asset = prepare(*made);
   deliver(*asset, subject().makePackage("com.a", "1.0"));
   subject().waitUntilIdle();
-  EXPECT_EQ(observer->heard(), (Lines{"placeholder com.a", "complete com.a"}));
+  EXPECT_EQ(observer->events(), (Lines{"placeholder com.a", "complete com.a"}));
 }
 
-TEST_P(CoordinatedInstallContract, ALaterObserverTakesThePlaceOfAnEarlierOne) {
+TEST_P(CoordinatedInstallContract, LaterObserverReplacesEarlierObserver) {
   const auto earlier = std::make_shared<CoordinationListener>();
   const auto later = std::make_shared<CoordinationListener>();
   const Coordinator made = coordinator("com.a");
@@ -174,11 +174,11 @@ TEST_P(CoordinatedInstallContract, ALaterObserverTakesThePlaceOfAnEarlierOne) {
   made->setObserver(later);
   subject().prioritize("com.a");
   subject().waitUntilIdle();
-  EXPECT_EQ(earlier->heard(), Lines{});
-  EXPECT_EQ(later->heard(), Lines{"prioritize com.a"});
+  EXPECT_EQ(earlier->events(), Lines{});
+  EXPECT_EQ(later->events(), Lines{"prioritize com.a"});
 }
 
-TEST_P(CoordinatedInstallContract, AnObserverThatHasGoneIsNotMissed) {
+TEST_P(CoordinatedInstallContract, DestroyedObserverIsIgnored) {
   auto observer = std::make_shared<CoordinationListener>();
   const Coordinator made = coordinator("com.a");
   made->setObserver(observer);
@@ -189,19 +189,19 @@ TEST_P(CoordinatedInstallContract, AnObserverThatHasGoneIsNotMissed) {
   EXPECT_EQ(stateOf("com.a"), "installed");
 }
 
-TEST_P(CoordinatedInstallContract, AnObserverStillHearsWhenItsConnectionHasClosed) {
+TEST_P(CoordinatedInstallContract, ObserverIsNotifiedAfterItsConnectionCloses) {
   const auto observer = std::make_shared<CoordinationListener>();
   Connection connection = connect(service(), *observer);
   coordinator("com.a")->setObserver(observer);
   connection.reset();
   subject().prioritize("com.a");
   subject().waitUntilIdle();
-  EXPECT_EQ(observer->heard(), Lines{"prioritize com.a"});
+  EXPECT_EQ(observer->events(), Lines{"prioritize com.a"});
 }
 
 // Connections.
 
-TEST_P(CoordinatedInstallContract, AClosedConnectionReportsNothingMore) {
+TEST_P(CoordinatedInstallContract, ClosedConnectionReportsNothing) {
   CoordinationListener listener;
   CoordinationListener witness;
   Connection connection = connect(service(), listener);
@@ -210,11 +210,11 @@ TEST_P(CoordinatedInstallContract, AClosedConnectionReportsNothingMore) {
   connection.reset();
   subject().prioritize("com.a");
   subject().waitUntilIdle();
-  EXPECT_EQ(listener.heard(), Lines{});
-  EXPECT_EQ(witness.heard(), Lines{"prioritize com.a"});
+  EXPECT_EQ(listener.events(), Lines{});
+  EXPECT_EQ(witness.events(), Lines{"prioritize com.a"});
 }
 
-TEST_P(CoordinatedInstallContract, ClosingAConnectionWaitsForItsRunningCallback) {
+TEST_P(CoordinatedInstallContract, ClosingAConnectionWaitsForItsCallback) {
   EventCounter begun;
   EventCounter mayEnd;
   std::atomic<bool> hasEnded = false;
@@ -234,7 +234,7 @@ TEST_P(CoordinatedInstallContract, ClosingAConnectionWaitsForItsRunningCallback)
   mayEnd.add();
 }
 
-TEST_P(CoordinatedInstallContract, AConnectionMayCloseInItsOwnCallback) {
+TEST_P(CoordinatedInstallContract, ConnectionCanCloseInItsCallback) {
   Connection connection;
   CoordinationListener listener([&](InstallCoordinator&) { connection.reset(); });
   connection = connect(service(), listener);
@@ -243,16 +243,16 @@ TEST_P(CoordinatedInstallContract, AConnectionMayCloseInItsOwnCallback) {
   subject().waitUntilIdle();
   subject().prioritize("com.a");
   subject().waitUntilIdle();
-  EXPECT_EQ(listener.heard(), Lines{"prioritize com.a"});
+  EXPECT_EQ(listener.events(), Lines{"prioritize com.a"});
 }
 
-TEST_P(CoordinatedInstallContract, ACallbackMayUseTheService) {
-  CoordinationListener listener([&](InstallCoordinator& told) {
-    if (told.bundleID() != "com.a") return;
+TEST_P(CoordinatedInstallContract, CallbackCanCallTheService) {
+  CoordinationListener listener([&](InstallCoordinator& reported) {
+    if (reported.bundleID() != "com.a") return;
     EXPECT_NE(find("com.a"), nullptr);
     EXPECT_TRUE(coordinator("com.b")->setInstallOptions(options()));
-    EXPECT_TRUE(told.setInitialODRAssetPromises({}));
-    EXPECT_TRUE(cancel(told));
+    EXPECT_TRUE(reported.setInitialODRAssetPromises({}));
+    EXPECT_TRUE(cancel(reported));
     CoordinationListener other;
     const Connection inner = connect(service(), other);
   });
@@ -260,7 +260,7 @@ TEST_P(CoordinatedInstallContract, ACallbackMayUseTheService) {
   const Coordinator made = coordinator("com.a");
   subject().prioritize("com.a");
   subject().waitUntilIdle();
-  EXPECT_EQ(listener.heard(), Lines{"prioritize com.a"});
+  EXPECT_EQ(listener.events(), Lines{"prioritize com.a"});
   EXPECT_EQ(find("com.a"), nullptr);
   EXPECT_NE(find("com.b"), nullptr);
 }

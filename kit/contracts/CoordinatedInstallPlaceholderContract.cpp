@@ -1,4 +1,4 @@
-// The part of the contract of coordinated installs that is about placeholders.
+// CoordinatedInstallContract: placeholders.
 #include "kit/contracts/InstallCoordinationContract.h"
 
 namespace appsync::test {
@@ -8,7 +8,7 @@ using platform::PlaceholderLookup;
 using platform::StoreMetadata;
 using platform::TSInstallType;
 
-TEST_P(CoordinatedInstallContract, APlaceholderKeepsWhatItWasMadeWith) {
+TEST_P(CoordinatedInstallContract, PlaceholderReturnsItsInitialValues) {
   const AppPlaceholder placeholder = service().initAppPlaceholder("An App", "com.a", TSInstallType::Sync, kStore);
   ASSERT_NE(placeholder, nullptr);
   EXPECT_EQ(placeholder->bundleName(), "An App");
@@ -18,7 +18,7 @@ TEST_P(CoordinatedInstallContract, APlaceholderKeepsWhatItWasMadeWith) {
   EXPECT_FALSE(placeholder->description().empty());
 }
 
-TEST_P(CoordinatedInstallContract, APlaceholderMayBeWithoutAName) {
+TEST_P(CoordinatedInstallContract, PlaceholderNameCanBeEmpty) {
   const AppPlaceholder placeholder = service().initAppPlaceholder("", "com.a", TSInstallType::Sync, kSync);
   ASSERT_NE(placeholder, nullptr);
   EXPECT_EQ(placeholder->bundleName(), "");
@@ -28,7 +28,7 @@ TEST_P(CoordinatedInstallContract, APlaceholderMayBeWithoutAName) {
   EXPECT_EQ(stateOf("com.a"), "placeholder");
 }
 
-TEST_P(CoordinatedInstallContract, APlaceholderIsConfiguredStepByStep) {
+TEST_P(CoordinatedInstallContract, ConfiguresAPlaceholder) {
   const AppPlaceholder placeholder = makePlaceholder("com.a");
   const Asset icon = service().makePromisedTransferToPath("com.a-Icon", kSync, subject().makeIcon(), 9);
   icon->setPercentComplete(1);
@@ -46,7 +46,7 @@ TEST_P(CoordinatedInstallContract, APlaceholderIsConfiguredStepByStep) {
   EXPECT_EQ(stateOf("com.a"), "placeholder");
 }
 
-TEST_P(CoordinatedInstallContract, ACompleteConfigurationIsNotChanged) {
+TEST_P(CoordinatedInstallContract, CompleteConfigurationCannotBeChanged) {
   const AppPlaceholder placeholder = makePlaceholder("com.a");
   EXPECT_TRUE(placeholder->setConfigurationComplete());
   const Asset icon = makeAsset("icon");
@@ -55,16 +55,17 @@ TEST_P(CoordinatedInstallContract, ACompleteConfigurationIsNotChanged) {
   EXPECT_FALSE(placeholder->setMetadata(std::nullopt));
   EXPECT_FALSE(placeholder->setSinfData(bytesOf("licence")));
   EXPECT_FALSE(placeholder->setConfigurationComplete());
-  EXPECT_TRUE(coordinator("com.a")->setAppAssetPromise(icon)) << "what was refused is still the caller's";
+  EXPECT_TRUE(coordinator("com.a")->setAppAssetPromise(icon))
+      << "a refused promise must stay with the caller and be usable";
 }
 
-TEST_P(CoordinatedInstallContract, AConfiguredPlaceholderThatIsNobodysCanBeGivenUp) {
+TEST_P(CoordinatedInstallContract, ConfiguredPlaceholderCanBeCancelled) {
   const AppPlaceholder placeholder = makeConfiguredPlaceholder("com.a");
   EXPECT_TRUE(placeholder->cancelForReason(reason(), kSync));
   EXPECT_FALSE(coordinator("com.a")->setPlaceholderPromise(placeholder));
 }
 
-TEST_P(CoordinatedInstallContract, ACancelledPlaceholderTakesNothingMore) {
+TEST_P(CoordinatedInstallContract, CancelledPlaceholderCannotBeChanged) {
   const AppPlaceholder placeholder = makePlaceholder("com.a");
   EXPECT_TRUE(placeholder->cancelForReason(reason(), kSync));
   EXPECT_FALSE(placeholder->setIconPromise(makeAsset("icon")));
@@ -78,7 +79,7 @@ TEST_P(CoordinatedInstallContract, ACancelledPlaceholderTakesNothingMore) {
   EXPECT_FALSE(made->hasPlaceholderPromise());
 }
 
-TEST_P(CoordinatedInstallContract, APlaceholderThatIsGivenUpTakesItsIconWithIt) {
+TEST_P(CoordinatedInstallContract, CancellingAPlaceholderCancelsItsIconPromise) {
   const AppPlaceholder placeholder = makePlaceholder("com.a");
   const Asset icon = makeAsset("icon");
   EXPECT_TRUE(placeholder->setIconPromise(icon));
@@ -88,7 +89,7 @@ TEST_P(CoordinatedInstallContract, APlaceholderThatIsGivenUpTakesItsIconWithIt) 
   EXPECT_FALSE(makePlaceholder("com.a")->setIconPromise(icon));
 }
 
-TEST_P(CoordinatedInstallContract, ACoordinatorsPlaceholderGoesWithItOnly) {
+TEST_P(CoordinatedInstallContract, OnlyTheCoordinatorEndsItsPlaceholder) {
   const AppPlaceholder placeholder = makeConfiguredPlaceholder("com.a");
   EXPECT_TRUE(coordinator("com.a")->setPlaceholderPromise(placeholder));
   EXPECT_FALSE(placeholder->cancelForReason(reason(), kSync));
@@ -96,7 +97,7 @@ TEST_P(CoordinatedInstallContract, ACoordinatorsPlaceholderGoesWithItOnly) {
   EXPECT_EQ(stateOf("com.a"), "placeholder");
 }
 
-TEST_P(CoordinatedInstallContract, APlaceholderFitsItsOwnAppAndOneCoordinator) {
+TEST_P(CoordinatedInstallContract, PlaceholderFitsItsAppAndOneCoordinator) {
   const AppPlaceholder placeholder = makeConfiguredPlaceholder("com.a");
   EXPECT_FALSE(coordinator("com.b")->setPlaceholderPromise(placeholder));
   EXPECT_FALSE(coordinator("com.b")->hasPlaceholderPromise());
@@ -105,7 +106,7 @@ TEST_P(CoordinatedInstallContract, APlaceholderFitsItsOwnAppAndOneCoordinator) {
   EXPECT_FALSE(coordinator("com.a", Kind::restoring)->setPlaceholderPromise(placeholder));
 }
 
-TEST_P(CoordinatedInstallContract, APlaceholderThatWasRefusedIsStillTheCallers) {
+TEST_P(CoordinatedInstallContract, RefusedPlaceholderStaysWithTheCaller) {
   EXPECT_TRUE(coordinator("com.a")->setPlaceholderPromise(makePlaceholder("com.a")));
   const AppPlaceholder placeholder = makeConfiguredPlaceholder("com.a");
   EXPECT_FALSE(coordinator("com.a")->setPlaceholderPromise(placeholder));
@@ -114,7 +115,7 @@ TEST_P(CoordinatedInstallContract, APlaceholderThatWasRefusedIsStillTheCallers) 
 
 // On the home screen.
 
-TEST_P(CoordinatedInstallContract, APlaceholderThatIsDroppedLeavesNothingBehind) {
+TEST_P(CoordinatedInstallContract, DestroyedPlaceholderLeavesNothing) {
   AppPlaceholder placeholder = makeConfiguredPlaceholder("com.a");
   subject().waitUntilIdle();
   EXPECT_EQ(stateOf("com.a"), "absent");
@@ -123,7 +124,7 @@ TEST_P(CoordinatedInstallContract, APlaceholderThatIsDroppedLeavesNothingBehind)
   EXPECT_EQ(stateOf("com.a"), "absent");
 }
 
-TEST_P(CoordinatedInstallContract, ACoordinatorsConfiguredPlaceholderIsShown) {
+TEST_P(CoordinatedInstallContract, ShowsAConfiguredPlaceholder) {
   const AppPlaceholder placeholder = makePlaceholder("com.a", TSInstallType::IntentionalDowngrade);
   EXPECT_TRUE(placeholder->setConfigurationComplete());
   EXPECT_TRUE(coordinator("com.a")->setPlaceholderPromise(placeholder));
@@ -134,7 +135,7 @@ TEST_P(CoordinatedInstallContract, ACoordinatorsConfiguredPlaceholderIsShown) {
   EXPECT_EQ(record->installType(), TSInstallType::IntentionalDowngrade);
 }
 
-TEST_P(CoordinatedInstallContract, APlaceholderIsNotShownBeforeItIsConfigured) {
+TEST_P(CoordinatedInstallContract, DoesNotShowAnUnconfiguredPlaceholder) {
   const AppPlaceholder placeholder = makePlaceholder("com.a");
   EXPECT_TRUE(coordinator("com.a")->setPlaceholderPromise(placeholder));
   subject().waitUntilIdle();
@@ -144,7 +145,7 @@ TEST_P(CoordinatedInstallContract, APlaceholderIsNotShownBeforeItIsConfigured) {
   EXPECT_EQ(stateOf("com.a"), "placeholder");
 }
 
-TEST_P(CoordinatedInstallContract, APlaceholderOverAnInstalledAppLeavesThatUsable) {
+TEST_P(CoordinatedInstallContract, PlaceholderLeavesInstalledAppUsable) {
   install("com.a", "1.0");
   EXPECT_TRUE(coordinator("com.a", Kind::updating)->setPlaceholderPromise(makeConfiguredPlaceholder("com.a")));
   subject().waitUntilIdle();

@@ -1,10 +1,10 @@
-// The part of the contract of coordinated installs that is about promises.
+// CoordinatedInstallContract: promises.
 #include "kit/contracts/InstallCoordinationContract.h"
 #include "kit/fakes/Threads.h"
 
 namespace appsync::test {
 
-TEST_P(CoordinatedInstallContract, APromiseKeepsWhatItWasMadeWith) {
+TEST_P(CoordinatedInstallContract, PromiseReturnsItsInitialValues) {
   const platform::FileLocation icon = subject().makeIcon();
   const Asset transfer = service().makePromisedTransferToPath("com.a-Icon", kStore, icon, 456);
   ASSERT_NE(transfer, nullptr);
@@ -21,21 +21,21 @@ TEST_P(CoordinatedInstallContract, APromiseKeepsWhatItWasMadeWith) {
   EXPECT_FALSE(data->description().empty());
 }
 
-TEST_P(CoordinatedInstallContract, ANewPromiseHasDeliveredNothing) {
+TEST_P(CoordinatedInstallContract, NewPromiseIsNotComplete) {
   const Asset asset = makeAsset();
   EXPECT_EQ(asset->percentComplete(), 0);
   EXPECT_FALSE(asset->isComplete());
   EXPECT_EQ(asset->transferPath(), std::nullopt);
 }
 
-TEST_P(CoordinatedInstallContract, ATransferPathMayBeToldLater) {
+TEST_P(CoordinatedInstallContract, TransferPathCanBeSetLater) {
   const Asset asset = makeAsset();
   const platform::FileLocation package = subject().makePackage("com.a", "1.0");
   asset->setTransferPath(package);
   EXPECT_EQ(asset->transferPath(), package);
 }
 
-TEST_P(CoordinatedInstallContract, AFractionOutOfRangeCountsAsTheNearerEnd) {
+TEST_P(CoordinatedInstallContract, ClampsFractionsOutOfRange) {
   const Asset asset = makeAsset();
   asset->setPercentComplete(0.25);
   EXPECT_EQ(asset->percentComplete(), 0.25);
@@ -45,7 +45,7 @@ TEST_P(CoordinatedInstallContract, AFractionOutOfRangeCountsAsTheNearerEnd) {
   EXPECT_EQ(asset->percentComplete(), 0);
 }
 
-TEST_P(CoordinatedInstallContract, ACompletePromiseStaysSo) {
+TEST_P(CoordinatedInstallContract, CompletePromiseStaysComplete) {
   const UserData data = makeUserData();
   data->setComplete(false);
   EXPECT_FALSE(data->isComplete());
@@ -54,7 +54,7 @@ TEST_P(CoordinatedInstallContract, ACompletePromiseStaysSo) {
   EXPECT_TRUE(data->isComplete());
 }
 
-TEST_P(CoordinatedInstallContract, AnAttachedPromiseIsSeenThroughItsCoordinator) {
+TEST_P(CoordinatedInstallContract, CoordinatorReturnsItsPromise) {
   const Coordinator made = coordinator("com.a");
   const Asset asset = makeAsset("com.a-Asset");
   EXPECT_TRUE(made->setAppAssetPromise(asset));
@@ -66,7 +66,7 @@ TEST_P(CoordinatedInstallContract, AnAttachedPromiseIsSeenThroughItsCoordinator)
   EXPECT_EQ(asset->percentComplete(), 0.5);
 }
 
-TEST_P(CoordinatedInstallContract, TheServiceKeepsAPromiseThatItsMakerLetsGoOf) {
+TEST_P(CoordinatedInstallContract, ServiceKeepsAPromiseReleasedByItsClient) {
   const Coordinator made = coordinator("com.a");
   Asset asset = prepare(*made);
   asset.reset();
@@ -76,7 +76,7 @@ TEST_P(CoordinatedInstallContract, TheServiceKeepsAPromiseThatItsMakerLetsGoOf) 
   EXPECT_EQ(stateOf("com.a"), "installed");
 }
 
-TEST_P(CoordinatedInstallContract, APromiseIsAttachedOnce) {
+TEST_P(CoordinatedInstallContract, PromiseCanBeAttachedOnce) {
   const Asset asset = makeAsset();
   EXPECT_TRUE(coordinator("com.a")->setAppAssetPromise(asset));
   EXPECT_FALSE(coordinator("com.b")->setAppAssetPromise(asset));
@@ -88,7 +88,7 @@ TEST_P(CoordinatedInstallContract, APromiseIsAttachedOnce) {
   EXPECT_FALSE(coordinator("com.b")->hasUserDataPromise());
 }
 
-TEST_P(CoordinatedInstallContract, AListWithAPromiseThatIsTakenIsRefusedWhole) {
+TEST_P(CoordinatedInstallContract, RefusesAListWithAnAttachedPromise) {
   const UserData taken = makeUserData("taken");
   const UserData free = makeUserData("free");
   EXPECT_TRUE(coordinator("com.a")->setInitialODRAssetPromises({taken}));
@@ -97,16 +97,16 @@ TEST_P(CoordinatedInstallContract, AListWithAPromiseThatIsTakenIsRefusedWhole) {
   EXPECT_TRUE(coordinator("com.b")->setInitialODRAssetPromises({free}));
 }
 
-TEST_P(CoordinatedInstallContract, APromiseThatWasRefusedMayBeGivenToAnother) {
+TEST_P(CoordinatedInstallContract, RefusedPromiseCanBeAttachedElsewhere) {
   EXPECT_TRUE(coordinator("com.a")->setAppAssetPromise(makeAsset()));
   const Asset asset = makeAsset();
   EXPECT_FALSE(coordinator("com.a")->setAppAssetPromise(asset));
   EXPECT_TRUE(coordinator("com.b")->setAppAssetPromise(asset));
 }
 
-// Taking back.
+// Cancelling.
 
-TEST_P(CoordinatedInstallContract, ACancelledPromiseIsRefusedEverywhere) {
+TEST_P(CoordinatedInstallContract, CancelledPromiseCannotBeAttached) {
   const Asset asset = makeAsset();
   const UserData data = makeUserData();
   EXPECT_TRUE(asset->cancelForReason(reason(), kSync));
@@ -119,7 +119,7 @@ TEST_P(CoordinatedInstallContract, ACancelledPromiseIsRefusedEverywhere) {
   EXPECT_FALSE(made->hasAppAssetPromise() || made->hasUserDataPromise() || made->hasInitialODRAssetPromises());
 }
 
-TEST_P(CoordinatedInstallContract, ChangesOfACancelledPromiseDoNothing) {
+TEST_P(CoordinatedInstallContract, CancelledPromiseCannotBeChanged) {
   const Asset asset = makeAsset();
   asset->setPercentComplete(0.5);
   EXPECT_TRUE(asset->cancelForReason(reason(), kSync));
@@ -131,7 +131,7 @@ TEST_P(CoordinatedInstallContract, ChangesOfACancelledPromiseDoNothing) {
   EXPECT_EQ(asset->transferPath(), std::nullopt);
 }
 
-TEST_P(CoordinatedInstallContract, OnlyItsMakerTakesAnAttachedPromiseBack) {
+TEST_P(CoordinatedInstallContract, OnlyTheCreatorCancelsAnAttachedPromise) {
   const Coordinator made = coordinator("com.a");
   const Asset asset = prepare(*made);
   EXPECT_FALSE(asset->cancelForReason(reason(), kStore));
@@ -140,7 +140,7 @@ TEST_P(CoordinatedInstallContract, OnlyItsMakerTakesAnAttachedPromiseBack) {
   EXPECT_EQ(stateOf("com.a"), "installed");
 }
 
-TEST_P(CoordinatedInstallContract, APromiseThatWasTakenBackCompletesNothing) {
+TEST_P(CoordinatedInstallContract, CancelledPromiseCompletesNothing) {
   const Coordinator made = coordinator("com.a");
   const Asset asset = prepare(*made);
   EXPECT_TRUE(asset->cancelForReason(reason(), kSync));
@@ -149,7 +149,7 @@ TEST_P(CoordinatedInstallContract, APromiseThatWasTakenBackCompletesNothing) {
   EXPECT_NE(stateOf("com.a"), "installed");
 }
 
-TEST_P(CoordinatedInstallContract, ThePackageOfAnInstallThatHasBegunIsNotTakenBack) {
+TEST_P(CoordinatedInstallContract, PackageOfARunningInstallCannotBeCancelled) {
   const Coordinator made = coordinator("com.a");
   const Asset asset = prepare(*made);
   deliver(*asset, subject().makePackage("com.a", "1.0"));
@@ -158,7 +158,7 @@ TEST_P(CoordinatedInstallContract, ThePackageOfAnInstallThatHasBegunIsNotTakenBa
   EXPECT_EQ(stateOf("com.a"), "installed");
 }
 
-TEST_P(CoordinatedInstallContract, APromiseOutlivesWhatItBelongedTo) {
+TEST_P(CoordinatedInstallContract, PromiseCanOutliveItsCoordinator) {
   const Coordinator made = coordinator("com.a");
   const Asset asset = prepare(*made);
   asset->setPercentComplete(0.5);
@@ -172,7 +172,7 @@ TEST_P(CoordinatedInstallContract, APromiseOutlivesWhatItBelongedTo) {
   EXPECT_FALSE(coordinator("com.b")->setAppAssetPromise(asset));
 }
 
-TEST_P(CoordinatedInstallContract, APromiseThatNobodyWaitedForEndsWithItsInstall) {
+TEST_P(CoordinatedInstallContract, UnneededPromiseEndsWithItsInstall) {
   const Coordinator made = coordinator("com.a");
   const UserData resource = makeUserData("resource");
   EXPECT_TRUE(made->setInstallOptions(options()));
@@ -189,7 +189,7 @@ TEST_P(CoordinatedInstallContract, APromiseThatNobodyWaitedForEndsWithItsInstall
   EXPECT_FALSE(resource->isComplete());
 }
 
-TEST_P(CoordinatedInstallContract, APromiseMayBeChangedByManyThreadsAtOnce) {
+TEST_P(CoordinatedInstallContract, PromiseIsThreadSafe) {
   const Asset asset = makeAsset();
   EXPECT_TRUE(coordinator("com.a")->setAppAssetPromise(asset));
   runOnThreads(4, [&](std::size_t index) {

@@ -1,4 +1,4 @@
-// The part of the contract of coordinated installs that is about a new start of the service's process.
+// CoordinatedInstallContract: restarts of the service's process.
 #include "kit/contracts/CoordinationListener.h"
 #include "kit/contracts/InstallCoordinationContract.h"
 
@@ -6,7 +6,7 @@ namespace appsync::test {
 
 using platform::FileLocation;
 
-TEST_P(CoordinatedInstallContract, ACoordinatorOutlivesTheProcess) {
+TEST_P(CoordinatedInstallContract, CoordinatorSurvivesARestart) {
   {
     const Coordinator made = coordinator("com.a", Kind::restoring);
     EXPECT_TRUE(made->setInstallOptions(options()));
@@ -17,7 +17,7 @@ TEST_P(CoordinatedInstallContract, ACoordinatorOutlivesTheProcess) {
     const Coordinator bare = coordinator("com.b", Kind::updating, kStore);
     subject().waitUntilIdle();
   }
-  if (!subject().restart()) GTEST_SKIP() << "cannot be started again";
+  if (!subject().restart()) GTEST_SKIP() << "the subject cannot restart";
   const Coordinator found = find("com.a", Kind::restoring);
   ASSERT_NE(found, nullptr);
   EXPECT_EQ(found->bundleID(), "com.a");
@@ -38,13 +38,13 @@ TEST_P(CoordinatedInstallContract, ACoordinatorOutlivesTheProcess) {
                bare->hasPlaceholderPromise());
 }
 
-TEST_P(CoordinatedInstallContract, APromiseIsFulfilledAfterANewStart) {
+TEST_P(CoordinatedInstallContract, PromiseCanBeFulfilledAfterARestart) {
   {
     const Asset asset = prepare(*coordinator("com.a"));
     asset->setPercentComplete(0.5);
     subject().waitUntilIdle();
   }
-  if (!subject().restart()) GTEST_SKIP() << "cannot be started again";
+  if (!subject().restart()) GTEST_SKIP() << "the subject cannot restart";
   CoordinationListener listener;
   const auto connection = service().initWithMachServiceName("com.corvel.contract.observer", {kSync}, listener);
   const Coordinator found = find("com.a");
@@ -60,7 +60,7 @@ TEST_P(CoordinatedInstallContract, APromiseIsFulfilledAfterANewStart) {
   EXPECT_EQ(listener.count("complete com.a"), 1U);
 }
 
-TEST_P(CoordinatedInstallContract, WhatWasDeliveredBeforeANewStartNeedNotComeAgain) {
+TEST_P(CoordinatedInstallContract, CompletePromiseSurvivesARestart) {
   const FileLocation package = subject().makePackage("com.a", "1.0");
   {
     const Coordinator made = coordinator("com.a");
@@ -70,7 +70,7 @@ TEST_P(CoordinatedInstallContract, WhatWasDeliveredBeforeANewStartNeedNotComeAga
     EXPECT_TRUE(made->setPlaceholderPromise(makeConfiguredPlaceholder("com.a")));
     subject().waitUntilIdle();
   }
-  if (!subject().restart()) GTEST_SKIP() << "cannot be started again";
+  if (!subject().restart()) GTEST_SKIP() << "the subject cannot restart";
   const Coordinator found = find("com.a");
   ASSERT_NE(found, nullptr);
   ASSERT_NE(found->appAssetPromise(), nullptr);
@@ -82,7 +82,7 @@ TEST_P(CoordinatedInstallContract, WhatWasDeliveredBeforeANewStartNeedNotComeAga
   EXPECT_FALSE(subject().exists(package));
 }
 
-TEST_P(CoordinatedInstallContract, WhatEndedBeforeANewStartStaysEnded) {
+TEST_P(CoordinatedInstallContract, EndedCoordinatorStaysEndedAfterARestart) {
   {
     install("com.a", "1.0");
     const Coordinator made = coordinator("com.b");
@@ -91,19 +91,19 @@ TEST_P(CoordinatedInstallContract, WhatEndedBeforeANewStartStaysEnded) {
     EXPECT_TRUE(cancel(*made));
     subject().waitUntilIdle();
   }
-  if (!subject().restart()) GTEST_SKIP() << "cannot be started again";
+  if (!subject().restart()) GTEST_SKIP() << "the subject cannot restart";
   EXPECT_EQ(find("com.a"), nullptr);
   EXPECT_EQ(find("com.b"), nullptr);
   EXPECT_EQ(stateOf("com.a"), "installed");
   EXPECT_EQ(stateOf("com.b"), "absent");
 }
 
-TEST_P(CoordinatedInstallContract, ACoordinatorMayBeCancelledAfterANewStart) {
+TEST_P(CoordinatedInstallContract, CoordinatorCanBeCancelledAfterARestart) {
   {
     const Asset asset = prepare(*coordinator("com.a"));
     subject().waitUntilIdle();
   }
-  if (!subject().restart()) GTEST_SKIP() << "cannot be started again";
+  if (!subject().restart()) GTEST_SKIP() << "the subject cannot restart";
   const Coordinator found = find("com.a");
   ASSERT_NE(found, nullptr);
   EXPECT_TRUE(cancel(*found));
@@ -112,12 +112,12 @@ TEST_P(CoordinatedInstallContract, ACoordinatorMayBeCancelledAfterANewStart) {
   EXPECT_EQ(stateOf("com.a"), "absent");
 }
 
-TEST_P(CoordinatedInstallContract, TheOldestIsStillTheOldestAfterANewStart) {
+TEST_P(CoordinatedInstallContract, OrderOfCoordinatorsSurvivesARestart) {
   {
     const Coordinator oldest = coordinator("com.a", Kind::restoring, kStore);
     const Coordinator youngest = coordinator("com.a", Kind::initiating, kStore);
   }
-  if (!subject().restart()) GTEST_SKIP() << "cannot be started again";
+  if (!subject().restart()) GTEST_SKIP() << "the subject cannot restart";
   ASSERT_NE(find("com.a"), nullptr);
   EXPECT_EQ(find("com.a")->kind(), Kind::restoring);
 }

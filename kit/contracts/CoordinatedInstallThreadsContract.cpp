@@ -1,4 +1,4 @@
-// The part of the contract of coordinated installs that is about many threads at once.
+// CoordinatedInstallContract: thread safety.
 #include <atomic>
 #include <memory>
 #include <string>
@@ -26,7 +26,7 @@ std::string appOf(std::size_t index, int round) {
 
 }  // namespace
 
-TEST_P(CoordinatedInstallContract, OneOfManyThreadsMakesTheCoordinator) {
+TEST_P(CoordinatedInstallContract, OneOfManyThreadsCreatesTheCoordinator) {
   for (int round = 0; round < 10; ++round) {
     std::atomic<int> made = 0;
     runOnThreads(kThreads, [&](std::size_t) {
@@ -40,7 +40,7 @@ TEST_P(CoordinatedInstallContract, OneOfManyThreadsMakesTheCoordinator) {
   }
 }
 
-TEST_P(CoordinatedInstallContract, OneOfManyThreadsSetsAThing) {
+TEST_P(CoordinatedInstallContract, OneOfManyThreadsSetsAValue) {
   const Coordinator made = coordinator("com.a");
   std::atomic<int> options = 0;
   std::atomic<int> assets = 0;
@@ -73,10 +73,10 @@ TEST_P(CoordinatedInstallContract, OneOfManyThreadsCancels) {
   runOnThreads(kThreads, [&](std::size_t) { cancelled += made->cancelForReason(reason(), kStore).ok() ? 1 : 0; });
   subject().waitUntilIdle();
   EXPECT_EQ(cancelled, 1);
-  EXPECT_EQ(listener.heard(), std::vector<std::string>{"cancelled com.a by 1 for ZTError 30"});
+  EXPECT_EQ(listener.events(), std::vector<std::string>{"cancelled com.a by 1 for ZTError 30"});
 }
 
-TEST_P(CoordinatedInstallContract, ACancellationThatMeetsTheInstallWinsOrLosesWhole) {
+TEST_P(CoordinatedInstallContract, CancellationDuringInstallIsAtomic) {
   for (int round = 0; round < 10; ++round) {
     const std::string identifier = appOf(0, round);
     const Coordinator made = coordinator(identifier);
@@ -92,14 +92,14 @@ TEST_P(CoordinatedInstallContract, ACancellationThatMeetsTheInstallWinsOrLosesWh
     EXPECT_EQ(find(identifier), nullptr);
     EXPECT_EQ(stateOf(identifier), wasCancelled ? "absent" : "installed");
     EXPECT_EQ(made->coordinatorError(), wasCancelled ? std::optional(reason()) : std::nullopt);
-    // Whose the package is when the cancellation wins depends on which of the two came first.
+    // If the cancellation wins, either side may own the package: the promise may not have been complete yet.
     if (!wasCancelled) {
       EXPECT_FALSE(subject().exists(package));
     }
   }
 }
 
-TEST_P(CoordinatedInstallContract, ManyAppsAreInstalledWhileObserversComeAndGo) {
+TEST_P(CoordinatedInstallContract, InstallsAppsWhileConnectionsOpenAndClose) {
   constexpr int kRounds = 3;
   CoordinationListener all;
   const auto connection = service().initWithMachServiceName(kServiceName, {kSync}, all);
@@ -132,7 +132,7 @@ TEST_P(CoordinatedInstallContract, ManyAppsAreInstalledWhileObserversComeAndGo) 
   }
 }
 
-TEST_P(CoordinatedInstallContract, OneAppMayBeDrivenByManyThreads) {
+TEST_P(CoordinatedInstallContract, CoordinatorIsThreadSafe) {
   EventCounter completions;
   runOnThreads(kThreads, [&](std::size_t index) {
     for (int round = 0; round < 5; ++round) {

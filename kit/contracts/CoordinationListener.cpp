@@ -22,13 +22,13 @@ std::string errorOf(InstallCoordinator& coordinator) {
 
 }  // namespace
 
-std::vector<std::string> CoordinationListener::heard() {
+std::vector<std::string> CoordinationListener::events() {
   const std::scoped_lock lock(mutex_);
-  return heard_;
+  return events_;
 }
 
 std::size_t CoordinationListener::count(const std::string& line) {
-  const std::vector<std::string> lines = heard();
+  const std::vector<std::string> lines = events();
   return static_cast<std::size_t>(std::ranges::count(lines, line));
 }
 
@@ -52,11 +52,11 @@ void CoordinationListener::coordinatorCanceledWithReason(InstallCoordinator& coo
 }
 
 void CoordinationListener::note(std::string line, InstallCoordinator& coordinator) {
-  EXPECT_EQ(++inside_, 1) << "callbacks overlap";
+  EXPECT_EQ(++inside_, 1) << "callbacks to one delegate must not overlap";
   thread_ = std::this_thread::get_id();
   {
     const std::scoped_lock lock(mutex_);
-    heard_.push_back(std::move(line));
+    events_.push_back(std::move(line));
   }
   if (inCallback_) inCallback_(coordinator);
   --inside_;

@@ -1,4 +1,4 @@
-// Hears what an install-coordination service tells, as tests want to see it.
+// Records the callbacks of an install-coordination service.
 #pragma once
 
 #include <atomic>
@@ -13,18 +13,19 @@
 
 namespace appsync::test {
 
-/// Notes "placeholder com.a", "complete com.a", "prioritize com.a", "cancelled com.a by 2 for ZTError 30"; with " with
-/// error" after it when the coordinator has one. Fails the test when two callbacks overlap. Threads: any.
+/// Records callbacks as texts: "placeholder com.a", "complete com.a", "prioritize com.a", "cancelled com.a by 2 for
+/// ZTError 30". The first two end in " with error" if the coordinator has an error. Fails the test if callbacks
+/// overlap. Thread-safe.
 class CoordinationListener final : public platform::InstallObserverDelegate {
  public:
-  /// `inCallback` runs in each.
+  /// `inCallback` runs in each callback.
   explicit CoordinationListener(std::function<void(platform::InstallCoordinator&)> inCallback = nullptr)
       : inCallback_(std::move(inCallback)) {}
 
-  [[nodiscard]] std::vector<std::string> heard();
-  /// How often exactly this was heard.
+  [[nodiscard]] std::vector<std::string> events();
+  /// Returns how many times `line` was recorded.
   [[nodiscard]] std::size_t count(const std::string& line);
-  /// Where the latest callback ran.
+  /// The thread of the latest callback.
   [[nodiscard]] std::thread::id thread() const { return thread_; }
 
   void coordinatorDidInstallPlaceholder(platform::InstallCoordinator& coordinator) override;
@@ -40,7 +41,7 @@ class CoordinationListener final : public platform::InstallObserverDelegate {
   std::atomic<int> inside_ = 0;
   std::atomic<std::thread::id> thread_;
   std::mutex mutex_;
-  std::vector<std::string> heard_;
+  std::vector<std::string> events_;
 };
 
 }  // namespace appsync::test

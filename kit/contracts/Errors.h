@@ -1,4 +1,4 @@
-// What came of an operation, and whether it failed as promised.
+// Assertions on the errors of operations.
 #pragma once
 
 #include <optional>
@@ -9,11 +9,12 @@
 
 namespace appsync::test {
 
-/// A failure of the system's own numbering.
+/// Succeeds if `error` has the domain "POSIX" and this error number.
 [[nodiscard]] inline testing::AssertionResult failsWith(int number, const std::optional<Error>& error) {
-  if (!error) return testing::AssertionFailure() << "it succeeded";
+  if (!error) return testing::AssertionFailure() << "must fail with POSIX error " << number << ", but succeeded";
   if (error->domain == domains::kPOSIX && error->code == number) return testing::AssertionSuccess();
-  return testing::AssertionFailure() << error->domain << " " << error->code << " " << error->text;
+  return testing::AssertionFailure() << "must fail with POSIX error " << number << ", but failed with " << error->domain
+                                     << " " << error->code << " " << error->text;
 }
 
 template <class T>

@@ -1,4 +1,4 @@
-// Counts what happens on other threads.
+// A counter of events on other threads.
 #pragma once
 
 #include <chrono>
@@ -8,7 +8,7 @@
 
 namespace appsync::test {
 
-/// Threads: any.
+/// Thread-safe.
 class EventCounter {
  public:
   void add() {
@@ -17,10 +17,10 @@ class EventCounter {
     changed_.notify_all();
   }
 
-  /// Blocks until it has happened `count` times; false when that takes unreasonably long.
+  /// Blocks until there were `count` events. Returns false on a time-out.
   [[nodiscard]] bool waitFor(std::size_t count) {
     std::unique_lock lock(mutex_);
-    return changed_.wait_for(lock, kPatience, [&] { return count_ >= count; });
+    return changed_.wait_for(lock, kTimeout, [&] { return count_ >= count; });
   }
 
   [[nodiscard]] std::size_t count() {
@@ -29,8 +29,8 @@ class EventCounter {
   }
 
  private:
-  /// The end of a test that would hang, never a pace.
-  static constexpr std::chrono::seconds kPatience{20};
+  /// Only a failing test waits this long.
+  static constexpr std::chrono::seconds kTimeout{20};
 
   std::mutex mutex_;
   std::condition_variable changed_;

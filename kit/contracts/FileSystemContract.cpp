@@ -40,27 +40,27 @@ bool isOnePattern(const std::string& text) {
 
 }  // namespace
 
-// Looking.
+// Reading.
 
-TEST_P(FileSystemContract, AFileReadsBackAsItWasWritten) {
+TEST_P(FileSystemContract, ReadsBackAFile) {
   const std::string text("a\0b\xff\n", 5);
   write("file", text);
   EXPECT_EQ(read("file"), text);
 }
 
-TEST_P(FileSystemContract, AnEmptyFileIsThere) {
+TEST_P(FileSystemContract, EmptyFileExists) {
   write("file", "");
   EXPECT_TRUE(exists("file"));
   EXPECT_EQ(read("file"), "");
 }
 
-TEST_P(FileSystemContract, ALargeFileIsReadInOneGo) {
+TEST_P(FileSystemContract, ReadsALargeFile) {
   const std::string text(3'000'001, 'x');
   write("file", text);
   EXPECT_EQ(read("file"), text);
 }
 
-TEST_P(FileSystemContract, FilesAndFoldersExistAndNothingElse) {
+TEST_P(FileSystemContract, OnlyFilesAndDirectoriesExist) {
   write("file", "x");
   makeFolder("folder");
   EXPECT_TRUE(exists("file"));
@@ -69,15 +69,15 @@ TEST_P(FileSystemContract, FilesAndFoldersExistAndNothingElse) {
   EXPECT_FALSE(exists("file/below"));
 }
 
-TEST_P(FileSystemContract, ALinkExistsWhenItLeadsToSomething) {
+TEST_P(FileSystemContract, LinkExistsIfItsTargetExists) {
   write("file", "x");
-  if (!subject().makeLink(at("link"), "file")) GTEST_SKIP() << "no links";
+  if (!subject().makeLink(at("link"), "file")) GTEST_SKIP() << "the subject has no symbolic links";
   ASSERT_TRUE(subject().makeLink(at("dangling"), "missing"));
   EXPECT_TRUE(exists("link"));
   EXPECT_FALSE(exists("dangling"));
 }
 
-TEST_P(FileSystemContract, AttributesTellSizeAndKind) {
+TEST_P(FileSystemContract, AttributesAreSizeAndKind) {
   write("file", "12345");
   makeFolder("folder");
   const Result<FileAttributes> file = files().attributesOfItem(at("file"));
@@ -92,13 +92,13 @@ TEST_P(FileSystemContract, AttributesTellSizeAndKind) {
 
 TEST_P(FileSystemContract, AttributesFollowLinks) {
   write("file", "12345");
-  if (!subject().makeLink(at("link"), "file")) GTEST_SKIP() << "no links";
+  if (!subject().makeLink(at("link"), "file")) GTEST_SKIP() << "the subject has no symbolic links";
   const Result<FileAttributes> link = files().attributesOfItem(at("link"));
   ASSERT_TRUE(link.ok());
   EXPECT_EQ(link->size, 5U);
 }
 
-TEST_P(FileSystemContract, WhatIsMissingFailsWithTheSystemsNumberAndNamesThePath) {
+TEST_P(FileSystemContract, MissingItemFailsWithPOSIXErrorNamingThePath) {
   const std::optional<Error> attributes = errorOf(files().attributesOfItem(at("missing")));
   EXPECT_TRUE(failsWith(ENOENT, attributes));
   EXPECT_NE(attributes->text.find(at("missing")), std::string::npos) << attributes->text;
@@ -107,38 +107,38 @@ TEST_P(FileSystemContract, WhatIsMissingFailsWithTheSystemsNumberAndNamesThePath
   EXPECT_NE(contents->text.find(at("missing")), std::string::npos) << contents->text;
 }
 
-TEST_P(FileSystemContract, AFolderCannotBeRead) {
+TEST_P(FileSystemContract, ReadingADirectoryFails) {
   makeFolder("folder");
   EXPECT_TRUE(failsWith(EISDIR, errorOf(files().readFile(at("folder")))));
 }
 
 // Writing.
 
-TEST_P(FileSystemContract, AWriteReplacesAFile) {
+TEST_P(FileSystemContract, WriteReplacesAFile) {
   write("file", "a long first text");
   write("file", "second");
   EXPECT_EQ(read("file"), "second");
 }
 
-TEST_P(FileSystemContract, AWriteNeedsTheParent) {
+TEST_P(FileSystemContract, WriteNeedsTheParent) {
   EXPECT_TRUE(failsWith(ENOENT, errorOf(files().writeFileAtomically(at("missing/file"), bytesOf("x")))));
   EXPECT_FALSE(exists("missing"));
 }
 
-TEST_P(FileSystemContract, AWriteDoesNotReplaceAFolder) {
+TEST_P(FileSystemContract, WriteDoesNotReplaceADirectory) {
   makeFolder("folder");
   write("folder/file", "kept");
   EXPECT_FALSE(files().writeFileAtomically(at("folder"), bytesOf("x")).ok());
   EXPECT_EQ(read("folder/file"), "kept");
 }
 
-TEST_P(FileSystemContract, AWriteBelowAFileFails) {
+TEST_P(FileSystemContract, WriteBelowAFileFails) {
   write("file", "kept");
   EXPECT_TRUE(failsWith(ENOTDIR, errorOf(files().writeFileAtomically(at("file/below"), bytesOf("x")))));
   EXPECT_EQ(read("file"), "kept");
 }
 
-TEST_P(FileSystemContract, AReaderFindsTheOldBytesOrTheNew) {
+TEST_P(FileSystemContract, WriteIsAtomicForReaders) {
   write("file", patternOf('a'));
   std::atomic<bool> isDone = false;
   runOnThreads(3, [&](std::size_t index) {
@@ -155,7 +155,7 @@ TEST_P(FileSystemContract, AReaderFindsTheOldBytesOrTheNew) {
   });
 }
 
-TEST_P(FileSystemContract, TwoWritersOfOnePathDoNotMix) {
+TEST_P(FileSystemContract, ConcurrentWritesDoNotMix) {
   runOnThreads(4, [&](std::size_t index) {
     for (int round = 0; round < 20; ++round)
       write("file", patternOf(static_cast<char>('a' + index)));
@@ -163,7 +163,7 @@ TEST_P(FileSystemContract, TwoWritersOfOnePathDoNotMix) {
   EXPECT_TRUE(isOnePattern(read("file")));
 }
 
-TEST_P(FileSystemContract, CreatingAFileMakesItAndReplacesIt) {
+TEST_P(FileSystemContract, CreatesAndReplacesAFile) {
   EXPECT_TRUE(files().createFile(at("file"), bytesOf("a long first text"), {}).ok());
   EXPECT_EQ(read("file"), "a long first text");
   EXPECT_TRUE(files().createFile(at("file"), bytesOf("second"), {}).ok());
@@ -175,23 +175,23 @@ TEST_P(FileSystemContract, CreatingAFileNeedsTheParent) {
   EXPECT_FALSE(exists("missing"));
 }
 
-TEST_P(FileSystemContract, ACreatedFileBelongsToTheGivenAccounts) {
+TEST_P(FileSystemContract, CreatedFileHasTheGivenOwners) {
   const OwnerAttributes owners{"mobile", "mobile"};
   ASSERT_TRUE(files().createFile(at("file"), bytesOf("x"), owners).ok());
   const std::optional<OwnerAttributes> kept = subject().ownersOf(at("file"));
-  if (!kept) GTEST_SKIP() << "owners cannot be told";
+  if (!kept) GTEST_SKIP() << "the subject cannot read owners";
   EXPECT_EQ(*kept, owners);
 }
 
-TEST_P(FileSystemContract, AReplacedFileBelongsToTheNewAccounts) {
+TEST_P(FileSystemContract, ReplacedFileHasTheNewOwners) {
   ASSERT_TRUE(files().createFile(at("file"), bytesOf("x"), {"mobile", "mobile"}).ok());
   ASSERT_TRUE(files().createFile(at("file"), bytesOf("x"), {"root", "wheel"}).ok());
   const std::optional<OwnerAttributes> kept = subject().ownersOf(at("file"));
-  if (!kept) GTEST_SKIP() << "owners cannot be told";
+  if (!kept) GTEST_SKIP() << "the subject cannot read owners";
   EXPECT_EQ(*kept, (OwnerAttributes{"root", "wheel"}));
 }
 
-TEST_P(FileSystemContract, ManyThreadsMayWorkAtOnce) {
+TEST_P(FileSystemContract, IsThreadSafe) {
   runOnThreads(10, [&](std::size_t index) {
     const std::string name = "file" + std::to_string(index);
     for (int round = 0; round < 20; ++round) {

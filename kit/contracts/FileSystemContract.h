@@ -1,4 +1,4 @@
-// Holds file systems to platform/FileSystem.h.
+// Contract of platform/FileSystem.h.
 #pragma once
 
 #include <optional>
@@ -16,22 +16,22 @@ class FileSystemSubject {
 
   [[nodiscard]] virtual platform::FileSystem& fileSystem() = 0;
 
-  /// Device path of a folder that exists and is empty, without a slash at its end.
+  /// Device path of an existing, empty directory, without a trailing slash.
   [[nodiscard]] virtual std::string folder() = 0;
 
-  // What a file system cannot do or tell is not tested.
+  // Optional: the default implementations skip the tests that need them.
 
-  /// Makes a symbolic link; false where there are none.
+  /// Creates a symbolic link. Returns false if not supported.
   [[nodiscard]] virtual bool makeLink(std::string_view path, std::string_view target) {
     static_cast<void>(path), static_cast<void>(target);
     return false;
   }
-  /// The owners that the item was made with; none where they cannot be told.
+  /// Returns the owners that the item was created with, or nullopt if not supported.
   [[nodiscard]] virtual std::optional<platform::OwnerAttributes> ownersOf(std::string_view path) {
     static_cast<void>(path);
     return std::nullopt;
   }
-  /// Sets the item's times long into the past; false where that cannot be done.
+  /// Sets the item's times to the distant past. Returns false if not supported.
   [[nodiscard]] virtual bool makeOld(std::string_view path) {
     static_cast<void>(path);
     return false;
@@ -45,11 +45,11 @@ class FileSystemSubject {
 class FileSystemContract : public Contract<FileSystemSubject> {
  protected:
   [[nodiscard]] platform::FileSystem& files() { return subject().fileSystem(); }
-  /// A path in the test's folder.
+  /// A path in the test's directory.
   [[nodiscard]] std::string at(std::string_view name) { return subject().folder().append("/").append(name); }
   void write(std::string_view name, std::string_view text);
   void makeFolder(std::string_view name);
-  /// The file's text; "(none)" when it cannot be read.
+  /// Returns the file's text, or "(none)" if it cannot be read.
   [[nodiscard]] std::string read(std::string_view name);
   [[nodiscard]] bool exists(std::string_view name) { return files().fileExists(at(name)); }
 };

@@ -1,4 +1,4 @@
-// The part of a file system's contract that is about times, the temporary folder, and paths that lead nowhere or out.
+// FileSystemContract: times, the temporary directory, and paths that must fail.
 #include <cerrno>
 #include <functional>
 #include <vector>
@@ -13,7 +13,7 @@ using platform::IntermediateDirectories;
 
 namespace {
 
-/// Every operation on one path.
+/// Every operation that takes a path.
 std::vector<std::function<std::optional<Error>(platform::FileSystem&, const std::string&)>> operations(
     const std::string& existingFile, const std::string& freePath) {
   using Files = platform::FileSystem;
@@ -39,10 +39,10 @@ std::vector<std::function<std::optional<Error>(platform::FileSystem&, const std:
 
 }  // namespace
 
-TEST_P(FileSystemContract, TouchingBringsTheTimesUpToNow) {
+TEST_P(FileSystemContract, TouchSetsTheTimesToNow) {
   write("file", "x");
   makeFolder("folder");
-  if (!subject().makeOld(at("file"))) GTEST_SKIP() << "times cannot be set";
+  if (!subject().makeOld(at("file"))) GTEST_SKIP() << "the subject cannot set times";
   ASSERT_TRUE(subject().makeOld(at("folder")));
   ASSERT_TRUE(subject().isOld(at("folder")));
   EXPECT_TRUE(files().touch(at("file")).ok());
@@ -51,16 +51,16 @@ TEST_P(FileSystemContract, TouchingBringsTheTimesUpToNow) {
   EXPECT_FALSE(subject().isOld(at("folder")));
 }
 
-TEST_P(FileSystemContract, TouchingNothingFailsInTheSystemsOwnWords) {
+TEST_P(FileSystemContract, TouchingAMissingItemReturnsTheSystemsText) {
   const Status touched = files().touch(at("missing"));
   ASSERT_TRUE(failsWith(ENOENT, touched.failure()));
   EXPECT_EQ(touched.error().text, Error::fromErrno(ENOENT).text);
   EXPECT_FALSE(exists("missing"));
 }
 
-// The temporary folder.
+// The temporary directory.
 
-TEST_P(FileSystemContract, TheTemporaryFolderIsThere) {
+TEST_P(FileSystemContract, TemporaryDirectoryExists) {
   const std::string folder = files().temporaryDirectory();
   ASSERT_FALSE(folder.empty());
   EXPECT_EQ(folder.front(), '/');
@@ -71,15 +71,15 @@ TEST_P(FileSystemContract, TheTemporaryFolderIsThere) {
   EXPECT_EQ(files().temporaryDirectory(), folder);
 }
 
-TEST_P(FileSystemContract, TheTemporaryFolderTakesFiles) {
+TEST_P(FileSystemContract, TemporaryDirectoryIsWritable) {
   const std::string path = files().temporaryDirectory() + "/contract-file";
   EXPECT_TRUE(files().writeFileAtomically(path, bytesOf("x")).ok());
   EXPECT_TRUE(files().removeItem(path).ok());
 }
 
-// The way out.
+// Confinement.
 
-TEST_P(FileSystemContract, NoPathLeadsOut) {
+TEST_P(FileSystemContract, PathsOutsideTheDeviceFail) {
   write("file", "kept");
   const std::string way = subject().folder() + std::string("/../../../../../../../../../../../..");
   for (const std::string& path :
@@ -91,9 +91,10 @@ TEST_P(FileSystemContract, NoPathLeadsOut) {
   EXPECT_FALSE(exists("free"));
 }
 
-TEST_P(FileSystemContract, NoLinkLeadsOut) {
+TEST_P(FileSystemContract, LinksOutsideTheDeviceFail) {
   write("file", "kept");
-  if (!subject().makeLink(at("out"), "../../../../../../../../../../../../..")) GTEST_SKIP() << "no links";
+  if (!subject().makeLink(at("out"), "../../../../../../../../../../../../.."))
+    GTEST_SKIP() << "the subject has no symbolic links";
   for (const auto& operation : operations(at("file"), at("free"))) {
     EXPECT_TRUE(operation(files(), at("out/etc/hostname")));
     EXPECT_TRUE(operation(files(), at("out/contract-escape")));
@@ -102,7 +103,7 @@ TEST_P(FileSystemContract, NoLinkLeadsOut) {
   EXPECT_EQ(read("file"), "kept");
 }
 
-TEST_P(FileSystemContract, PathsThatCannotBeFail) {
+TEST_P(FileSystemContract, InvalidPathsFail) {
   write("file", "kept");
   const std::string withNull = at("a") + std::string("\0b", 2);
   for (const std::string& path : {std::string(), std::string("relative"), withNull, at(std::string(300, 'x'))}) {
@@ -113,8 +114,8 @@ TEST_P(FileSystemContract, PathsThatCannotBeFail) {
   EXPECT_FALSE(exists("a"));
 }
 
-TEST_P(FileSystemContract, LinksInACircleFail) {
-  if (!subject().makeLink(at("a"), "b")) GTEST_SKIP() << "no links";
+TEST_P(FileSystemContract, CircularLinksFail) {
+  if (!subject().makeLink(at("a"), "b")) GTEST_SKIP() << "the subject has no symbolic links";
   ASSERT_TRUE(subject().makeLink(at("b"), "a"));
   EXPECT_FALSE(exists("a"));
   EXPECT_TRUE(failsWith(ELOOP, errorOf(files().readFile(at("a")))));

@@ -31,24 +31,24 @@ std::vector<std::string> orderOf(platform::HomeScreenService& screen) {
 }
 
 void handOver(platform::HomeScreenService& screen, std::string_view layout) {
-  // From a buffer that is gone afterwards.
+  // The buffer is destroyed after the call.
   const std::string buffer(layout);
   screen.setIconState(screen.blockableServerPort(), bytesOf(buffer));
 }
 
 }  // namespace
 
-TEST_P(HomeScreenContract, ThePortStaysTheSame) {
+TEST_P(HomeScreenContract, PortDoesNotChange) {
   EXPECT_EQ(subject().homeScreen().blockableServerPort(), subject().homeScreen().blockableServerPort());
 }
 
-TEST_P(HomeScreenContract, TheOrderIsAnArrayOfIdentifiers) {
+TEST_P(HomeScreenContract, OrderIsAnArrayOfIdentifiers) {
   subject().addApp("com.b");
   subject().addApp("com.a");
   EXPECT_EQ(orderOf(subject().homeScreen()), (std::vector<std::string>{"com.b", "com.a"}));
 }
 
-TEST_P(HomeScreenContract, TheOrdersBytesAreTheCallersOwn) {
+TEST_P(HomeScreenContract, CallerOwnsTheOrder) {
   subject().addApp("com.a");
   platform::HomeScreenService& screen = subject().homeScreen();
   std::optional<Bytes> bytes = screen.getFlattenedIconState(screen.blockableServerPort(), 1);
@@ -57,17 +57,17 @@ TEST_P(HomeScreenContract, TheOrdersBytesAreTheCallersOwn) {
   EXPECT_EQ(orderOf(screen), std::vector<std::string>{"com.a"});
 }
 
-TEST_P(HomeScreenContract, AHostsLayoutIsTakenOver) {
+TEST_P(HomeScreenContract, AppliesAHostsLayout) {
   const std::vector<std::string> wanted{"com.b", "com.c", "com.a"};
   const std::optional<std::string> layout = subject().layoutOf(wanted);
-  if (!layout) GTEST_SKIP() << "no layouts";
+  if (!layout) GTEST_SKIP() << "the subject has no layouts";
   for (const char* identifier : {"com.a", "com.b", "com.c"})
     subject().addApp(identifier);
   handOver(subject().homeScreen(), *layout);
   EXPECT_EQ(orderOf(subject().homeScreen()), wanted);
 }
 
-TEST_P(HomeScreenContract, ALayoutThatCannotBeUsedIsIgnored) {
+TEST_P(HomeScreenContract, IgnoresAnInvalidLayout) {
   subject().addApp("com.b");
   subject().addApp("com.a");
   const std::vector<std::string> order = orderOf(subject().homeScreen());
@@ -77,7 +77,7 @@ TEST_P(HomeScreenContract, ALayoutThatCannotBeUsedIsIgnored) {
   }
 }
 
-TEST_P(HomeScreenContract, AnAssertionOnAnAppIsGranted) {
+TEST_P(HomeScreenContract, GrantsAnAssertion) {
   subject().addApp("com.a");
   TerminationAssertionOutcome outcome = kNotSet;
   const auto assertion = subject().homeScreen().terminationAssertionCreate("com.a", 0, outcome);
@@ -85,22 +85,22 @@ TEST_P(HomeScreenContract, AnAssertionOnAnAppIsGranted) {
   EXPECT_NE(assertion, nullptr);
 }
 
-TEST_P(HomeScreenContract, TheHomeScreenTellsThatItDoesNotKnowAnApp) {
+TEST_P(HomeScreenContract, UnknownAppIsNotFound) {
   TerminationAssertionOutcome outcome = kNotSet;
   const auto assertion = subject().homeScreen().terminationAssertionCreate("com.unknown", 0, outcome);
   EXPECT_EQ(outcome, TerminationAssertionOutcome::notFound);
 }
 
-TEST_P(HomeScreenContract, ADeniedAssertionIsNoAssertion) {
+TEST_P(HomeScreenContract, DeniedRequestReturnsNull) {
   subject().addApp("com.a");
-  if (!subject().denyAssertions("com.a")) GTEST_SKIP() << "cannot be made to deny";
+  if (!subject().denyAssertions("com.a")) GTEST_SKIP() << "the subject cannot deny assertions";
   TerminationAssertionOutcome outcome = kNotSet;
   const auto assertion = subject().homeScreen().terminationAssertionCreate("com.a", 0, outcome);
   EXPECT_EQ(outcome, TerminationAssertionOutcome::denied);
   EXPECT_EQ(assertion, nullptr);
 }
 
-TEST_P(HomeScreenContract, TheOutcomeIsAlwaysSet) {
+TEST_P(HomeScreenContract, AlwaysSetsTheOutcome) {
   for (const char* identifier : {"", "com.a", "not an identifier /.."}) {
     TerminationAssertionOutcome outcome = kNotSet;
     static_cast<void>(subject().homeScreen().terminationAssertionCreate(identifier, 0, outcome));
@@ -108,7 +108,7 @@ TEST_P(HomeScreenContract, TheOutcomeIsAlwaysSet) {
   }
 }
 
-TEST_P(HomeScreenContract, AnAssertionMayEndOnAnotherThread) {
+TEST_P(HomeScreenContract, AssertionCanEndOnAnotherThread) {
   subject().addApp("com.a");
   TerminationAssertionOutcome outcome = kNotSet;
   std::unique_ptr<TerminationAssertion> assertion =
@@ -118,7 +118,7 @@ TEST_P(HomeScreenContract, AnAssertionMayEndOnAnotherThread) {
   EXPECT_EQ(outcome, TerminationAssertionOutcome::granted);
 }
 
-TEST_P(HomeScreenContract, ManyThreadsMayAskAtOnce) {
+TEST_P(HomeScreenContract, IsThreadSafe) {
   subject().addApp("com.a");
   runOnThreads(10, [&](std::size_t) {
     TerminationAssertionOutcome outcome = kNotSet;

@@ -1,4 +1,4 @@
-// Holds home screens to platform/HomeScreenService.h.
+// Contract of platform/HomeScreenService.h.
 #pragma once
 
 #include <optional>
@@ -16,15 +16,14 @@ class HomeScreenSubject {
   virtual ~HomeScreenSubject() = default;
 
   [[nodiscard]] virtual platform::HomeScreenService& homeScreen() = 0;
-  /// Has an icon of that app on the home screen, after those that are there.
+  /// Adds an icon of the app after the existing ones.
   virtual void addApp(std::string_view identifier) = 0;
-  /// An icon layout, as a host writes it for this home screen, in which these apps stand in this order; none where
-  /// hosts write none.
+  /// Returns an icon layout in the host's format with these apps in this order, or nullopt if not supported.
   [[nodiscard]] virtual std::optional<std::string> layoutOf(const std::vector<std::string>& identifiers) {
     static_cast<void>(identifiers);
     return std::nullopt;
   }
-  /// From now on requests for an assertion on the app are denied; false where that cannot be done.
+  /// Makes the home screen deny assertions on the app. Returns false if not supported.
   [[nodiscard]] virtual bool denyAssertions(std::string_view identifier) {
     static_cast<void>(identifier);
     return false;

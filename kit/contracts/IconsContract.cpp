@@ -27,17 +27,17 @@ Bytes encoded(platform::PNGEncoders& encoders, const platform::Image& image) {
 
 }  // namespace
 
-TEST_P(IconsContract, AnAppsIconIsRendered) {
+TEST_P(IconsContract, RendersAnAppsIcon) {
   EXPECT_NE(iconOf(IconKind::usable), nullptr);
 }
 
-TEST_P(IconsContract, AnIconThatCannotBeUsedIsNone) {
+TEST_P(IconsContract, UnusableIconReturnsNull) {
   EXPECT_EQ(iconOf(IconKind::damaged), nullptr);
   EXPECT_EQ(iconOf(IconKind::missingFile), nullptr);
   EXPECT_EQ(iconOf(IconKind::notNamed), nullptr);
 }
 
-TEST_P(IconsContract, ARenderedIconOutlivesItsBundle) {
+TEST_P(IconsContract, ImageCanOutliveItsBundle) {
   auto bundle = subject().makeApp(IconKind::usable);
   const auto image = subject().renderer().createHomeScreenIconImage(*bundle);
   bundle.reset();
@@ -45,19 +45,19 @@ TEST_P(IconsContract, ARenderedIconOutlivesItsBundle) {
   EXPECT_TRUE(isPicture(encoded(subject().encoders(), *image)));
 }
 
-TEST_P(IconsContract, AnImageBecomesAPicture) {
+TEST_P(IconsContract, EncodesAnImage) {
   const auto image = iconOf(IconKind::usable);
   ASSERT_NE(image, nullptr);
   EXPECT_TRUE(isPicture(encoded(subject().encoders(), *image)));
 }
 
-TEST_P(IconsContract, EqualImagesBecomeEqualPictures) {
+TEST_P(IconsContract, EncodesEqualImagesEqually) {
   const auto image = iconOf(IconKind::usable);
   ASSERT_NE(image, nullptr);
   EXPECT_EQ(encoded(subject().encoders(), *image), encoded(subject().encoders(), *image));
 }
 
-TEST_P(IconsContract, AnImageIsNeededUntilItWasAddedOnly) {
+TEST_P(IconsContract, ImageIsNeededDuringAddOnly) {
   auto image = iconOf(IconKind::usable);
   ASSERT_NE(image, nullptr);
   Bytes destination;
@@ -69,14 +69,14 @@ TEST_P(IconsContract, AnImageIsNeededUntilItWasAddedOnly) {
   EXPECT_TRUE(isPicture(destination));
 }
 
-TEST_P(IconsContract, AnEncodingWithoutItsImageFails) {
+TEST_P(IconsContract, EncodingWithoutItsImageFails) {
   Bytes destination;
   const auto encoder = subject().encoders().createEncoder(destination, 1);
   ASSERT_NE(encoder, nullptr);
   EXPECT_FALSE(encoder->finalize());
 }
 
-TEST_P(IconsContract, AnEncoderMayBeGivenUp) {
+TEST_P(IconsContract, EncodingCanBeAbandoned) {
   const auto image = iconOf(IconKind::usable);
   ASSERT_NE(image, nullptr);
   Bytes destination;
@@ -86,7 +86,7 @@ TEST_P(IconsContract, AnEncoderMayBeGivenUp) {
   encoder.reset();
 }
 
-TEST_P(IconsContract, ManyThreadsMayRenderAndEncodeAtOnce) {
+TEST_P(IconsContract, RendersAndEncodesConcurrently) {
   const auto image = iconOf(IconKind::usable);
   ASSERT_NE(image, nullptr);
   const auto bundle = subject().makeApp(IconKind::usable);

@@ -1,4 +1,4 @@
-// Holds icon renderers and PNG encoders to platform/IconRenderer.h.
+// Contract of platform/IconRenderer.h.
 #pragma once
 
 #include <memory>
@@ -9,7 +9,7 @@
 
 namespace appsync::test {
 
-/// What an app's icon is like.
+/// The state of an app's icon file.
 enum class IconKind { usable, damaged, missingFile, notNamed };
 
 class IconsSubject {
@@ -18,7 +18,7 @@ class IconsSubject {
 
   [[nodiscard]] virtual platform::IconRenderer& renderer() = 0;
   [[nodiscard]] virtual platform::PNGEncoders& encoders() = 0;
-  /// A new app's bundle.
+  /// Returns the bundle of a new app.
   [[nodiscard]] virtual std::unique_ptr<platform::Bundle> makeApp(IconKind icon) = 0;
 };
 

@@ -1,4 +1,5 @@
-// Holds install-coordination services to platform/InstallCoordination.h and the headers of what it hands out.
+// Contract of platform/InstallCoordination.h, InstallCoordinator.h, InstallObserver.h, InstallPromise.h and
+// Placeholder.h.
 #pragma once
 
 #include <cstdint>
@@ -21,45 +22,45 @@ class InstallCoordinationSubject {
   [[nodiscard]] virtual platform::InstallCoordination& coordination() = 0;
 };
 
-/// What any such service does, also that of a device which installs without coordinators.
+/// For every service, including those of devices that install without coordinators.
 class InstallCoordinationContract : public Contract<InstallCoordinationSubject> {
  protected:
   platform::InstallObserverDelegate delegate;
 };
 
-/// A device that installs through coordinators.
+/// For services of devices that install through coordinators.
 class CoordinatedInstallSubject {
  public:
   virtual ~CoordinatedInstallSubject() = default;
 
-  /// Has no coordinators at first.
+  /// Initially without coordinators.
   [[nodiscard]] virtual platform::InstallCoordination& coordination() = 0;
-  /// Where placeholders and apps go; empty at first.
+  /// The registry in which the service installs apps and placeholders; initially empty.
   [[nodiscard]] virtual platform::AppRegistry& registry() = 0;
   [[nodiscard]] virtual platform::UninstalledAppsList& uninstalledApps() = 0;
 
-  // Files for promises, each at a path of its own. Threads: any.
+  // Each creates a file for a promise at a new path. Thread-safe.
   [[nodiscard]] virtual platform::FileLocation makePackage(std::string_view identifier, std::string_view version) = 0;
   [[nodiscard]] virtual platform::FileLocation makeDamagedPackage(std::string_view identifier) = 0;
-  /// A PNG picture.
+  /// A PNG file.
   [[nodiscard]] virtual platform::FileLocation makeIcon() = 0;
   [[nodiscard]] virtual bool exists(const platform::FileLocation& location) = 0;
 
-  // What the person who holds the device does to an app that is being installed.
+  // Actions of the user on an app that is being installed.
   virtual void prioritize(std::string_view identifier) = 0;
   virtual void cancelByUser(std::string_view identifier) = 0;
 
-  /// Blocks until the service has nothing left to do and to tell.
+  /// Blocks until the service has no pending operations or callbacks.
   virtual void waitUntilIdle() = 0;
 
-  // What a device cannot do is not tested.
+  // Optional: the default implementations skip the tests that need them.
 
-  /// The store metadata that is kept with an installed app.
+  /// Returns the store metadata of an installed app, or nullopt if not supported.
   [[nodiscard]] virtual std::optional<plist::Dictionary> storeMetadataOf(std::string_view identifier) {
     static_cast<void>(identifier);
     return std::nullopt;
   }
-  /// Ends the process of the service and begins another; false where that cannot be. Nothing of the service is held.
+  /// Restarts the service's process. Returns false if not supported. The tests hold no object of the service then.
   [[nodiscard]] virtual bool restart() { return false; }
 };
 
@@ -77,7 +78,7 @@ class CoordinatedInstallContract : public Contract<CoordinatedInstallSubject> {
 
   [[nodiscard]] platform::InstallCoordination& service() { return subject().coordination(); }
 
-  /// The coordinator of that kind, made if there is none; fails the test when there is none then.
+  /// Finds or creates the coordinator. Fails the test if the service returns null.
   [[nodiscard]] Coordinator coordinator(std::string_view identifier, Kind kind = Kind::initiating,
                                         Client client = kSync);
   [[nodiscard]] Coordinator find(std::string_view identifier, Kind kind = Kind::any, Client client = kSync);
@@ -86,19 +87,19 @@ class CoordinatedInstallContract : public Contract<CoordinatedInstallSubject> {
   [[nodiscard]] UserData makeUserData(std::string_view name = "data", Client client = kSync);
   [[nodiscard]] AppPlaceholder makePlaceholder(std::string_view identifier,
                                                platform::TSInstallType installType = platform::TSInstallType::Restore);
-  /// With its configuration complete.
+  /// The placeholder's configuration is complete.
   [[nodiscard]] AppPlaceholder makeConfiguredPlaceholder(std::string_view identifier);
   [[nodiscard]] static platform::InstallOptions options();
 
-  /// Gives the coordinator all that its app needs but the package, which is promised.
+  /// Sets everything that the install needs. Returns the app-asset promise, which is not complete.
   [[nodiscard]] Asset prepare(platform::InstallCoordinator& coordinator);
-  /// Fulfils the promise with what is there.
+  /// Fulfils the promise with `package`.
   static void deliver(platform::PromisedTransferToPath& asset, const platform::FileLocation& package);
-  /// Installs an app through a coordinator of its own.
+  /// Installs an app through a new coordinator.
   void install(std::string_view identifier, std::string_view version);
 
   [[nodiscard]] static Error reason();
-  /// Cancels as the one who made it.
+  /// Cancels as the coordinator's creator.
   [[nodiscard]] static Status cancel(platform::InstallCoordinator& coordinator);
 
   /// "installed", "placeholder", "both" or "absent".

@@ -32,7 +32,7 @@ std::array<const void*, 16> servicesOf(platform::Platform& platform) {
 
 }  // namespace
 
-TEST_P(PlatformContract, EachServiceIsTheSameOnEveryThread) {
+TEST_P(PlatformContract, ServicesAreTheSameOnEveryThread) {
   const auto services = servicesOf(subject().platform());
   runOnThreads(6, [&](std::size_t) { EXPECT_EQ(servicesOf(subject().platform()), services); });
 }
@@ -50,7 +50,7 @@ TEST_P(PlatformContract, ConnectionsAreNew) {
   EXPECT_NE(firstLibrary, secondLibrary);
 }
 
-TEST_P(PlatformContract, ConnectionsMayBeMadeOnAnyThread) {
+TEST_P(PlatformContract, ConnectionsCanBeMadeOnAnyThread) {
   runOnThreads(6, [&](std::size_t) {
     EXPECT_NE(subject().platform().makeBackupManager(), nullptr);
     EXPECT_NE(subject().platform().makeSoftwareLibrary(), nullptr);

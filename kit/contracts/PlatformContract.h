@@ -1,4 +1,4 @@
-// Holds bundles of services to platform/Platform.h.
+// Contract of platform/Platform.h.
 #pragma once
 
 #include "kit/contracts/Contract.h"

@@ -9,14 +9,14 @@ using platform::RestrictionValue;
 
 GTEST_ALLOW_UNINSTANTIATED_PARAMETERIZED_TEST(ProfileConnectionContract);
 
-TEST_P(ProfileConnectionContract, NothingIsSetAtFirst) {
+TEST_P(ProfileConnectionContract, SettingsAreInitiallyUnset) {
   platform::ProfileConnection& connection = subject().connection();
   EXPECT_EQ(connection.effectiveBoolValueForSetting(RestrictionSetting::appInstallationAllowed),
             RestrictionValue::unset);
   EXPECT_EQ(connection.effectiveBoolValueForSetting(RestrictionSetting::appRemovalAllowed), RestrictionValue::unset);
 }
 
-TEST_P(ProfileConnectionContract, TheAnswerFollowsTheSetting) {
+TEST_P(ProfileConnectionContract, ReturnsTheCurrentSetting) {
   platform::ProfileConnection& connection = subject().connection();
   for (const RestrictionValue value : {RestrictionValue::no, RestrictionValue::yes, RestrictionValue::unset}) {
     subject().set(RestrictionSetting::appRemovalAllowed, value);
@@ -31,7 +31,7 @@ TEST_P(ProfileConnectionContract, SettingsAreIndependent) {
   EXPECT_EQ(connection.effectiveBoolValueForSetting(RestrictionSetting::appRemovalAllowed), RestrictionValue::unset);
 }
 
-TEST_P(ProfileConnectionContract, ManyThreadsMayAskAtOnce) {
+TEST_P(ProfileConnectionContract, IsThreadSafe) {
   subject().set(RestrictionSetting::appInstallationAllowed, RestrictionValue::no);
   runOnThreads(8, [&](std::size_t) {
     EXPECT_EQ(subject().connection().effectiveBoolValueForSetting(RestrictionSetting::appInstallationAllowed),

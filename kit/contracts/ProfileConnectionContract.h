@@ -1,4 +1,4 @@
-// Holds restrictions to platform/ProfileConnection.h.
+// Contract of platform/ProfileConnection.h.
 #pragma once
 
 #include "kit/contracts/Contract.h"

@@ -8,7 +8,7 @@ namespace appsync::test {
 
 GTEST_ALLOW_UNINSTANTIATED_PARAMETERIZED_TEST(SoftwareLibraryContract);
 
-TEST_P(SoftwareLibraryContract, ARefreshCompletesOnce) {
+TEST_P(SoftwareLibraryContract, RefreshCompletesOnce) {
   EventCounter completions;
   std::optional<Error> failure = Error{};
   auto library = subject().makeLibrary();
@@ -23,8 +23,8 @@ TEST_P(SoftwareLibraryContract, ARefreshCompletesOnce) {
   EXPECT_EQ(completions.count(), 1U);
 }
 
-TEST_P(SoftwareLibraryContract, AFailedRefreshTellsWhy) {
-  if (!subject().failRefreshes()) GTEST_SKIP() << "cannot be made to fail";
+TEST_P(SoftwareLibraryContract, FailedRefreshReturnsAnError) {
+  if (!subject().failRefreshes()) GTEST_SKIP() << "the subject cannot fail refreshes";
   EventCounter completions;
   std::optional<Error> failure;
   const auto library = subject().makeLibrary();
@@ -46,7 +46,7 @@ TEST_P(SoftwareLibraryContract, EveryRefreshCompletes) {
   EXPECT_TRUE(completions.waitFor(3));
 }
 
-TEST_P(SoftwareLibraryContract, TheLibraryMayBeDestroyedByItsCompletion) {
+TEST_P(SoftwareLibraryContract, CompletionCanDestroyTheLibrary) {
   EventCounter completions;
   std::shared_ptr<platform::SoftwareLibrary> library = subject().makeLibrary();
   platform::SoftwareLibrary& stillHeld = *library;

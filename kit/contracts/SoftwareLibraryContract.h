@@ -1,4 +1,4 @@
-// Holds store libraries to platform/SoftwareLibrary.h.
+// Contract of platform/SoftwareLibrary.h.
 #pragma once
 
 #include <memory>
@@ -13,7 +13,7 @@ class SoftwareLibrarySubject {
   virtual ~SoftwareLibrarySubject() = default;
 
   [[nodiscard]] virtual std::unique_ptr<platform::SoftwareLibrary> makeLibrary() = 0;
-  /// From now on refreshes fail; false where that cannot be done.
+  /// Makes all later refreshes fail. Returns false if not supported.
   [[nodiscard]] virtual bool failRefreshes() { return false; }
 };
 

@@ -9,7 +9,7 @@ namespace appsync::test {
 
 GTEST_ALLOW_UNINSTANTIATED_PARAMETERIZED_TEST(SyncFrameworkContract);
 
-TEST_P(SyncFrameworkContract, ACategoryStaysTheSame) {
+TEST_P(SyncFrameworkContract, CategoryDoesNotChange) {
   EXPECT_EQ(&framework().ZTGetLogCategory(8), &framework().ZTGetLogCategory(8));
   EXPECT_NE(&framework().ZTGetLogCategory(8), &framework().ZTGetLogCategory(14));
 }
@@ -36,7 +36,7 @@ TEST_P(SyncFrameworkContract, MessagesAreLoggedInOrder) {
   EXPECT_NE(lines[1].find("second"), std::string::npos);
 }
 
-TEST_P(SyncFrameworkContract, MessagesOfManyThreadsStayWhole) {
+TEST_P(SyncFrameworkContract, MessagesOfManyThreadsDoNotMix) {
   runOnThreads(8, [&](std::size_t index) {
     LogCategory& category = framework().ZTGetLogCategory(static_cast<int>(index));
     for (int round = 0; round < 20; ++round)
@@ -48,14 +48,14 @@ TEST_P(SyncFrameworkContract, MessagesOfManyThreadsStayWhole) {
       lines, [](const std::string& line) { return line.find(std::string(200, 'x')) != std::string::npos; }));
 }
 
-TEST_P(SyncFrameworkContract, AnErrorIsAlwaysJudgedTheSame) {
+TEST_P(SyncFrameworkContract, RecoverabilityDoesNotChange) {
   for (const Error& error : {Error{"POSIX", 4, "interrupted", nullptr}, Error{"InstallerError", 1, "damaged", nullptr},
                              Error{"", 0, "", nullptr}}) {
     EXPECT_EQ(framework().ZTIsRecoverableError(error), framework().ZTIsRecoverableError(error)) << error.text;
   }
 }
 
-TEST_P(SyncFrameworkContract, AnAssetIsADownloadOfThatApp) {
+TEST_P(SyncFrameworkContract, AssetIsADownloadOfTheApp) {
   const auto asset = framework().downloadAssetWithIdentifier("com.a", "Application", "A");
   ASSERT_NE(asset, nullptr);
   EXPECT_EQ(asset->identifier(), "com.a");
@@ -64,7 +64,7 @@ TEST_P(SyncFrameworkContract, AnAssetIsADownloadOfThatApp) {
   EXPECT_TRUE(asset->isDownload());
 }
 
-TEST_P(SyncFrameworkContract, ANewAssetHasNothingElse) {
+TEST_P(SyncFrameworkContract, NewAssetIsOtherwiseEmpty) {
   const auto asset = framework().downloadAssetWithIdentifier("com.a", "Application", std::nullopt);
   ASSERT_NE(asset, nullptr);
   EXPECT_EQ(asset->prettyName(), std::nullopt);

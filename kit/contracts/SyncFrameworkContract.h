@@ -1,4 +1,4 @@
-// Holds sync frameworks to platform/SyncFramework.h.
+// Contract of platform/SyncFramework.h.
 #pragma once
 
 #include <string>
@@ -13,9 +13,9 @@ class SyncFrameworkSubject {
  public:
   virtual ~SyncFrameworkSubject() = default;
 
-  /// With a log that takes everything.
+  /// Its log must record messages of every level.
   [[nodiscard]] virtual platform::SyncFramework& framework() = 0;
-  /// What the log took in, in order: each line contains its message.
+  /// Returns the logged lines in order; each contains its message.
   [[nodiscard]] virtual std::vector<std::string> loggedLines() = 0;
 };
 

@@ -22,7 +22,7 @@ namespace {
 constexpr std::string_view kName = "com.corvel.contract.first";
 constexpr std::string_view kOtherName = "com.corvel.contract.second";
 
-/// Observes for as long as it lives.
+/// Registered as an observer during its lifetime.
 class Listener {
  public:
   explicit Listener(SystemNotify& notify, std::string_view name = kName, const void* object = nullptr)
@@ -41,14 +41,14 @@ class Listener {
   }
 
   EventCounter calls;
-  /// Runs in each call; set before anything is posted.
+  /// Runs in each callback. Must be set before the first post.
   std::function<void()> inCall;
   std::thread::id thread;
 
  private:
   static void called(void* context, std::string_view name, const void*) {
     Listener& self = *static_cast<Listener*>(context);
-    EXPECT_EQ(++self.inside_, 1) << "calls overlap";
+    EXPECT_EQ(++self.inside_, 1) << "callbacks to one observer must not overlap";
     {
       const std::scoped_lock lock(self.mutex_);
       self.heard_ = name;
@@ -68,21 +68,21 @@ class Listener {
 
 }  // namespace
 
-TEST_P(SystemNotifyContract, APostReachesItsObserver) {
+TEST_P(SystemNotifyContract, PostReachesItsObserver) {
   Listener listener(subject().notify());
   subject().notify().post(kName);
   ASSERT_TRUE(listener.calls.waitFor(1));
   EXPECT_EQ(listener.heard(), kName);
 }
 
-TEST_P(SystemNotifyContract, ObserversAreCalledOnTheServicesOwnThread) {
+TEST_P(SystemNotifyContract, CallsObserversOnAnotherThread) {
   Listener listener(subject().notify());
   subject().notify().post(kName);
   ASSERT_TRUE(listener.calls.waitFor(1));
   EXPECT_NE(listener.thread, std::this_thread::get_id());
 }
 
-TEST_P(SystemNotifyContract, EveryObserverOfTheNameIsCalled) {
+TEST_P(SystemNotifyContract, CallsEveryObserverOfTheName) {
   Listener first(subject().notify());
   Listener second(subject().notify());
   subject().notify().post(kName);
@@ -90,7 +90,7 @@ TEST_P(SystemNotifyContract, EveryObserverOfTheNameIsCalled) {
   EXPECT_TRUE(second.calls.waitFor(1));
 }
 
-TEST_P(SystemNotifyContract, OtherNamesAreNotHeard) {
+TEST_P(SystemNotifyContract, DoesNotCallObserversOfOtherNames) {
   Listener other(subject().notify(), kOtherName);
   Listener listener(subject().notify());
   subject().notify().post(kName);
@@ -101,7 +101,7 @@ TEST_P(SystemNotifyContract, OtherNamesAreNotHeard) {
   EXPECT_EQ(listener.calls.count(), 1U);
 }
 
-TEST_P(SystemNotifyContract, AnObserverOfOneSenderDoesNotHearPostsWithoutOne) {
+TEST_P(SystemNotifyContract, FiltersPostsBySender) {
   const int sender = 0;
   Listener choosy(subject().notify(), kName, &sender);
   Listener listener(subject().notify());
@@ -111,7 +111,7 @@ TEST_P(SystemNotifyContract, AnObserverOfOneSenderDoesNotHearPostsWithoutOne) {
   EXPECT_EQ(choosy.calls.count(), 0U);
 }
 
-TEST_P(SystemNotifyContract, APostWithoutObserversIsLost) {
+TEST_P(SystemNotifyContract, PostWithoutObserversIsLost) {
   subject().notify().post(kName);
   Listener listener(subject().notify());
   subject().notify().post(kName);
@@ -119,7 +119,7 @@ TEST_P(SystemNotifyContract, APostWithoutObserversIsLost) {
   EXPECT_EQ(listener.calls.count(), 1U);
 }
 
-TEST_P(SystemNotifyContract, ARemovedObserverHearsNothing) {
+TEST_P(SystemNotifyContract, DoesNotCallRemovedObservers) {
   Listener removed(subject().notify());
   Listener listener(subject().notify());
   removed.stop();
@@ -128,7 +128,7 @@ TEST_P(SystemNotifyContract, ARemovedObserverHearsNothing) {
   EXPECT_EQ(removed.calls.count(), 0U);
 }
 
-TEST_P(SystemNotifyContract, RemovalEndsOneNameOnly) {
+TEST_P(SystemNotifyContract, RemovalAffectsOneNameOnly) {
   Listener listener(subject().notify());
   subject().notify().removeObserver(&listener, kOtherName);
   subject().notify().post(kName);
@@ -140,7 +140,7 @@ TEST_P(SystemNotifyContract, RemovingAnUnknownObserverDoesNothing) {
   subject().notify().removeObserver(&nobody, kName);
 }
 
-TEST_P(SystemNotifyContract, RemovalWaitsForTheRunningCall) {
+TEST_P(SystemNotifyContract, RemovalWaitsForTheRunningCallback) {
   EventCounter begun;
   EventCounter mayEnd;
   std::atomic<bool> hasEnded = false;
@@ -159,7 +159,7 @@ TEST_P(SystemNotifyContract, RemovalWaitsForTheRunningCall) {
   mayEnd.add();
 }
 
-TEST_P(SystemNotifyContract, AnObserverMayBeRemovedFromItsOwnCall) {
+TEST_P(SystemNotifyContract, ObserverCanBeRemovedInItsCallback) {
   Listener listener(subject().notify());
   listener.inCall = [&] { listener.stop(); };
   Listener other(subject().notify());
@@ -171,7 +171,7 @@ TEST_P(SystemNotifyContract, AnObserverMayBeRemovedFromItsOwnCall) {
   EXPECT_EQ(listener.calls.count(), 1U);
 }
 
-TEST_P(SystemNotifyContract, ACallMayUseTheService) {
+TEST_P(SystemNotifyContract, CallbackCanCallTheService) {
   Listener other(subject().notify(), kOtherName);
   Listener listener(subject().notify());
   listener.inCall = [&] {
@@ -184,7 +184,7 @@ TEST_P(SystemNotifyContract, ACallMayUseTheService) {
   EXPECT_TRUE(other.calls.waitFor(1));
 }
 
-TEST_P(SystemNotifyContract, AStateIsSeenWhenThePostArrives) {
+TEST_P(SystemNotifyContract, StateIsSetBeforeThePostIsDelivered) {
   const SystemNotify::Registration registration = subject().notify().registerCheck(kName);
   ASSERT_EQ(registration.status, 0U);
   std::optional<std::uint64_t> seen;
@@ -193,23 +193,23 @@ TEST_P(SystemNotifyContract, AStateIsSeenWhenThePostArrives) {
   subject().notify().setState(registration.token, 0x1'0000'0001);
   subject().notify().post(kName);
   ASSERT_TRUE(listener.calls.waitFor(1));
-  if (!seen) GTEST_SKIP() << "states cannot be told";
+  if (!seen) GTEST_SKIP() << "the subject cannot read states";
   EXPECT_EQ(*seen, 0x1'0000'0001U);
 }
 
-TEST_P(SystemNotifyContract, TokensOfDifferentNamesSetDifferentStates) {
+TEST_P(SystemNotifyContract, StatesOfNamesAreIndependent) {
   const SystemNotify::Registration first = subject().notify().registerCheck(kName);
   const SystemNotify::Registration second = subject().notify().registerCheck(kOtherName);
   ASSERT_EQ(first.status, 0U);
   ASSERT_EQ(second.status, 0U);
   subject().notify().setState(first.token, 1);
   subject().notify().setState(second.token, 2);
-  if (!subject().stateOf(kName)) GTEST_SKIP() << "states cannot be told";
+  if (!subject().stateOf(kName)) GTEST_SKIP() << "the subject cannot read states";
   EXPECT_EQ(subject().stateOf(kName), 1U);
   EXPECT_EQ(subject().stateOf(kOtherName), 2U);
 }
 
-TEST_P(SystemNotifyContract, ANameMayBeRegisteredAgainAndAgain) {
+TEST_P(SystemNotifyContract, NameCanBeRegisteredRepeatedly) {
   for (std::uint64_t state = 1; state <= 3; ++state) {
     const SystemNotify::Registration registration = subject().notify().registerCheck(kName);
     ASSERT_EQ(registration.status, 0U);
@@ -220,7 +220,7 @@ TEST_P(SystemNotifyContract, ANameMayBeRegisteredAgainAndAgain) {
   }
 }
 
-TEST_P(SystemNotifyContract, CallsToOneObserverNeverOverlap) {
+TEST_P(SystemNotifyContract, CallbacksToOneObserverNeverOverlap) {
   Listener listener(subject().notify());
   listener.inCall = [] { std::this_thread::yield(); };
   runOnThreads(4, [&](std::size_t) {
@@ -230,7 +230,7 @@ TEST_P(SystemNotifyContract, CallsToOneObserverNeverOverlap) {
   EXPECT_TRUE(listener.calls.waitFor(20));
 }
 
-TEST_P(SystemNotifyContract, ManyThreadsMayUseItAtOnce) {
+TEST_P(SystemNotifyContract, IsThreadSafe) {
   Listener listener(subject().notify());
   runOnThreads(8, [&](std::size_t) {
     Listener own(subject().notify());

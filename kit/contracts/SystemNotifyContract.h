@@ -1,4 +1,4 @@
-// Holds notification services to platform/SystemNotify.h.
+// Contract of platform/SystemNotify.h.
 #pragma once
 
 #include <cstdint>
@@ -15,7 +15,7 @@ class SystemNotifySubject {
   virtual ~SystemNotifySubject() = default;
 
   [[nodiscard]] virtual platform::SystemNotify& notify() = 0;
-  /// The state of a name as everyone sees it; none where that cannot be told.
+  /// Returns the state of a name, or nullopt if not supported.
   [[nodiscard]] virtual std::optional<std::uint64_t> stateOf(std::string_view name) {
     static_cast<void>(name);
     return std::nullopt;

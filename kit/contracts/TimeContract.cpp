@@ -15,7 +15,7 @@ using std::chrono::milliseconds;
 
 GTEST_ALLOW_UNINSTANTIATED_PARAMETERIZED_TEST(TimeContract);
 
-TEST_P(TimeContract, TheClockNeverGoesBack) {
+TEST_P(TimeContract, ClockIsMonotonic) {
   TimePoint last = subject().clock().now();
   for (int round = 0; round < 1000; ++round) {
     const TimePoint now = subject().clock().now();
@@ -24,7 +24,7 @@ TEST_P(TimeContract, TheClockNeverGoesBack) {
   }
 }
 
-TEST_P(TimeContract, WhatIsReadyIsNotWaitedFor) {
+TEST_P(TimeContract, ReadyConditionReturnsAtOnce) {
   std::mutex mutex;
   std::condition_variable condition;
   std::unique_lock lock(mutex);
@@ -32,7 +32,7 @@ TEST_P(TimeContract, WhatIsReadyIsNotWaitedFor) {
   EXPECT_TRUE(lock.owns_lock());
 }
 
-TEST_P(TimeContract, AWaitEndsAtItsDeadline) {
+TEST_P(TimeContract, WaitEndsAtItsDeadline) {
   std::mutex mutex;
   std::condition_variable condition;
   std::unique_lock lock(mutex);
@@ -40,7 +40,7 @@ TEST_P(TimeContract, AWaitEndsAtItsDeadline) {
   EXPECT_TRUE(lock.owns_lock());
 }
 
-TEST_P(TimeContract, AWaitWithoutADeadlineEndsWhenItIsTold) {
+TEST_P(TimeContract, WaitWithoutDeadlineEndsWhenNotified) {
   std::mutex mutex;
   std::condition_variable condition;
   bool isReady = false;
@@ -53,7 +53,7 @@ TEST_P(TimeContract, AWaitWithoutADeadlineEndsWhenItIsTold) {
   EXPECT_TRUE(subject().clock().wait(condition, lock, kForever, [&] { return isReady; }));
 }
 
-TEST_P(TimeContract, ATaskRunsWhenItIsDue) {
+TEST_P(TimeContract, TaskRunsWhenItIsDue) {
   EventCounter runs;
   const TimePoint due = subject().clock().now() + milliseconds(2);
   TimePoint ran;
@@ -66,13 +66,13 @@ TEST_P(TimeContract, ATaskRunsWhenItIsDue) {
   EXPECT_GE(ran, due);
 }
 
-TEST_P(TimeContract, ATaskNeverRunsInsideTheCall) {
+TEST_P(TimeContract, TaskNeverRunsInsideTheCall) {
   EventCounter runs;
   std::atomic<bool> hasReturned = false;
   std::mutex mutex;
   std::unique_lock lock(mutex);
   subject().scheduler().after(milliseconds(0), [&] {
-    { const std::scoped_lock waitForTheCall(mutex); }  // Let go of before the test may end.
+    { const std::scoped_lock waitForTheCall(mutex); }  // Released before the test ends.
     EXPECT_TRUE(hasReturned);
     runs.add();
   });
@@ -82,7 +82,7 @@ TEST_P(TimeContract, ATaskNeverRunsInsideTheCall) {
   EXPECT_TRUE(runs.waitFor(1));
 }
 
-TEST_P(TimeContract, TasksRunInOrderOfDueTimeAndThenOfCalls) {
+TEST_P(TimeContract, TasksRunInOrderOfDueTimeThenOfCalls) {
   EventCounter runs;
   std::vector<int> order;
   const auto task = [&](int number) {
@@ -99,7 +99,7 @@ TEST_P(TimeContract, TasksRunInOrderOfDueTimeAndThenOfCalls) {
   EXPECT_EQ(order, (std::vector<int>{1, 2, 3}));
 }
 
-TEST_P(TimeContract, ATaskMayScheduleTheNext) {
+TEST_P(TimeContract, TaskCanScheduleATask) {
   EventCounter runs;
   subject().scheduler().after(milliseconds(1),
                               [&] { subject().scheduler().after(milliseconds(1), [&] { runs.add(); }); });
@@ -107,14 +107,14 @@ TEST_P(TimeContract, ATaskMayScheduleTheNext) {
   EXPECT_TRUE(runs.waitFor(1));
 }
 
-TEST_P(TimeContract, ADelayThatIsNotPositiveMeansAtOnce) {
+TEST_P(TimeContract, NonPositiveDelayMeansAtOnce) {
   EventCounter runs;
   subject().scheduler().after(milliseconds(-5), [&] { runs.add(); });
   subject().pass(milliseconds(0));
   EXPECT_TRUE(runs.waitFor(1));
 }
 
-TEST_P(TimeContract, WhatATaskHoldsGoesRightAfterItRan) {
+TEST_P(TimeContract, TaskIsDestroyedRightAfterItRan) {
   EventCounter runs;
   auto held = std::make_shared<int>(0);
   const std::weak_ptr<int> watched = held;
@@ -125,7 +125,7 @@ TEST_P(TimeContract, WhatATaskHoldsGoesRightAfterItRan) {
   EXPECT_TRUE(watched.expired());
 }
 
-TEST_P(TimeContract, ManyThreadsMayScheduleAtOnce) {
+TEST_P(TimeContract, SchedulesConcurrently) {
   EventCounter runs;
   runOnThreads(8, [&](std::size_t) { subject().scheduler().after(milliseconds(1), [&] { runs.add(); }); });
   subject().pass(milliseconds(1));

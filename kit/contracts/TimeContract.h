@@ -1,4 +1,4 @@
-// Holds clocks and schedulers to base/Clock.h and base/Scheduler.h.
+// Contract of base/Clock.h and base/Scheduler.h.
 #pragma once
 
 #include "base/Clock.h"
@@ -13,7 +13,7 @@ class TimeSubject {
 
   [[nodiscard]] virtual Clock& clock() = 0;
   [[nodiscard]] virtual Scheduler& scheduler() = 0;
-  /// Has that much time pass where somebody must see to it; time that passes by itself is waited for by the tests.
+  /// Advances a virtual clock by `duration`. Does nothing with a real clock, for which the tests wait.
   virtual void pass(Duration duration) = 0;
 };
 

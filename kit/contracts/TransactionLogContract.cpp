@@ -19,12 +19,12 @@ static void PrintTo(const KeptEntry& entry, std::ostream* out) {
        << " " << entry.description;
 }
 
-TEST_P(TransactionLogContract, AHandleIsAlwaysMade) {
+TEST_P(TransactionLogContract, HandleIsNeverNull) {
   EXPECT_NE(subject().systemLog().createHandle("subsystem", "category"), nullptr);
   EXPECT_NE(subject().systemLog().createHandle("", ""), nullptr);
 }
 
-TEST_P(TransactionLogContract, AScenariosEventIsKeptWhole) {
+TEST_P(TransactionLogContract, RecordsAScenarioCompletely) {
   initialize();
   subject().log().logScenario("Harvo Sync", 0, true, "com.a", "Uninstall succeeded");
   subject().log().logScenario("Asset install", 3, false, "com.b", "");
@@ -33,7 +33,7 @@ TEST_P(TransactionLogContract, AScenariosEventIsKeptWhole) {
                                     {3, "Asset install", {}, {}, false, "com.b", ""}}));
 }
 
-TEST_P(TransactionLogContract, AStepIsKeptWhole) {
+TEST_P(TransactionLogContract, RecordsAStepCompletely) {
   initialize();
   subject().log().logStep(TransactionStep::uninstallApp, TransactionParty::syncClient, TransactionPhase::end, false,
                           "com.a", "it failed");
@@ -42,7 +42,7 @@ TEST_P(TransactionLogContract, AStepIsKeptWhole) {
                 {7, {}, TransactionParty::syncClient, TransactionPhase::end, false, "com.a", "it failed"}}));
 }
 
-TEST_P(TransactionLogContract, TheTextsAreNeededDuringTheCallOnly) {
+TEST_P(TransactionLogContract, TextsAreNeededDuringTheCallOnly) {
   initialize();
   {
     const std::string identifier(100, 'i');
@@ -55,7 +55,7 @@ TEST_P(TransactionLogContract, TheTextsAreNeededDuringTheCallOnly) {
   EXPECT_EQ(entries[0].description, std::string(100, 'd'));
 }
 
-TEST_P(TransactionLogContract, TextsAreKeptToTheByte) {
+TEST_P(TransactionLogContract, RecordsTextsByteForByte) {
   initialize();
   const std::string text = "first\tline\\\nsecond 'line', \"quoted\"; \xC3\xA4 \\n %s ";
   subject().log().logStep(TransactionStep::installApp, TransactionParty::syncClient, TransactionPhase::begin, true,
@@ -66,7 +66,7 @@ TEST_P(TransactionLogContract, TextsAreKeptToTheByte) {
                                     {0, text, {}, {}, true, text, text}}));
 }
 
-TEST_P(TransactionLogContract, ALaterHandleReplacesTheFirst) {
+TEST_P(TransactionLogContract, LaterHandleReplacesTheFirst) {
   initialize();
   subject().log().logScenario("s", 0, true, "com.a", "before");
   initialize();

@@ -1,4 +1,4 @@
-// Holds transaction logs and the system's log to platform/TransactionLog.h.
+// Contract of platform/TransactionLog.h.
 #pragma once
 
 #include <cstdint>
@@ -11,7 +11,7 @@
 
 namespace appsync::test {
 
-/// An entry as the log kept it: a step's, with party and phase, or a scenario's.
+/// A recorded entry: a step with party and phase, or a scenario.
 struct KeptEntry {
   std::uint32_t step = 0;
   std::optional<std::string> scenario;
@@ -29,13 +29,13 @@ class TransactionLogSubject {
 
   [[nodiscard]] virtual platform::TransactionLog& log() = 0;
   [[nodiscard]] virtual platform::SystemLog& systemLog() = 0;
-  /// What the log has kept, oldest first.
+  /// Returns the recorded entries, oldest first.
   [[nodiscard]] virtual std::vector<KeptEntry> entries() = 0;
 };
 
 class TransactionLogContract : public Contract<TransactionLogSubject> {
  protected:
-  /// As clients do it: the log is then the handle's only owner.
+  /// Passes ownership of the handle to the log, as clients do.
   void initialize() { subject().log().initializeWithLog(subject().systemLog().createHandle("subsystem", "category")); }
 };
 

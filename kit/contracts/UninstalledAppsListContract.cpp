@@ -35,41 +35,41 @@ TEST_P(UninstalledAppsListContract, ListsRemovedApps) {
   EXPECT_EQ(identifiersIn(subject().list()), (Identifiers{"com.a", "com.b"}));
 }
 
-TEST_P(UninstalledAppsListContract, AnAppThatIsInstalledAgainIsTakenOff) {
+TEST_P(UninstalledAppsListContract, ReinstalledAppIsRemoved) {
   subject().removeRealApp("com.a");
   subject().removeRealApp("com.b");
   subject().installApp("com.a");
   EXPECT_EQ(identifiersIn(subject().list()), Identifiers{"com.b"});
 }
 
-TEST_P(UninstalledAppsListContract, ClearingTakesOffTheNamedApps) {
+TEST_P(UninstalledAppsListContract, ClearingRemovesTheGivenApps) {
   for (const char* identifier : {"com.a", "com.b", "com.c"})
     subject().removeRealApp(identifier);
   EXPECT_EQ(subject().list().clearUninstalled({"com.a", "com.c"}), 0);
   EXPECT_EQ(identifiersIn(subject().list()), Identifiers{"com.b"});
 }
 
-TEST_P(UninstalledAppsListContract, UnknownAppsDoNotMatterWhenClearing) {
+TEST_P(UninstalledAppsListContract, ClearingIgnoresUnknownApps) {
   subject().removeRealApp("com.a");
   EXPECT_EQ(subject().list().clearUninstalled({"com.unknown", "com.a", "com.a", ""}), 0);
   EXPECT_EQ(identifiersIn(subject().list()), Identifiers());
 }
 
-TEST_P(UninstalledAppsListContract, ClearingNothingIsASuccess) {
+TEST_P(UninstalledAppsListContract, ClearingNothingSucceeds) {
   subject().removeRealApp("com.a");
   EXPECT_EQ(subject().list().clearUninstalled({}), 0);
   EXPECT_EQ(identifiersIn(subject().list()), Identifiers{"com.a"});
 }
 
-TEST_P(UninstalledAppsListContract, ClearingThatFailsTakesOffNone) {
+TEST_P(UninstalledAppsListContract, FailedClearingChangesNothing) {
   subject().removeRealApp("com.a");
   subject().removeRealApp("com.b");
-  if (!subject().failClearing()) GTEST_SKIP() << "cannot be made to fail";
+  if (!subject().failClearing()) GTEST_SKIP() << "the subject cannot fail clearing";
   EXPECT_NE(subject().list().clearUninstalled({"com.a", "com.b"}), 0);
   EXPECT_EQ(identifiersIn(subject().list()), (Identifiers{"com.a", "com.b"}));
 }
 
-TEST_P(UninstalledAppsListContract, TheAnswerIsTheCallersOwn) {
+TEST_P(UninstalledAppsListContract, CallerOwnsTheResult) {
   subject().removeRealApp("com.a");
   std::optional<plist::Dictionary> answer = subject().list().lookupUninstalled();
   ASSERT_TRUE(answer);
@@ -77,15 +77,15 @@ TEST_P(UninstalledAppsListContract, TheAnswerIsTheCallersOwn) {
   EXPECT_EQ(identifiersIn(subject().list()), Identifiers{"com.a"});
 }
 
-TEST_P(UninstalledAppsListContract, OutlivesTheProcess) {
+TEST_P(UninstalledAppsListContract, SurvivesARestart) {
   subject().removeRealApp("com.a");
   subject().removeRealApp("com.b");
   ASSERT_EQ(subject().list().clearUninstalled({"com.b"}), 0);
-  if (!subject().restart()) GTEST_SKIP() << "cannot be started again";
+  if (!subject().restart()) GTEST_SKIP() << "the subject cannot restart";
   EXPECT_EQ(identifiersIn(subject().list()), Identifiers{"com.a"});
 }
 
-TEST_P(UninstalledAppsListContract, ManyThreadsMayAskAndClearAtOnce) {
+TEST_P(UninstalledAppsListContract, IsThreadSafe) {
   constexpr std::size_t kThreads = 8;
   for (std::size_t index = 0; index < kThreads; ++index)
     subject().removeRealApp("com.a" + std::to_string(index));

@@ -1,4 +1,4 @@
-// Holds lists of removed apps to platform/UninstalledAppsList.h.
+// Contract of platform/UninstalledAppsList.h.
 #pragma once
 
 #include <string_view>
@@ -12,15 +12,15 @@ class UninstalledAppsListSubject {
  public:
   virtual ~UninstalledAppsListSubject() = default;
 
-  /// Empty at first.
+  /// Initially empty.
   [[nodiscard]] virtual platform::UninstalledAppsList& list() = 0;
-  /// Has a real app of that identifier removed.
+  /// Removes an installed app.
   virtual void removeRealApp(std::string_view identifier) = 0;
-  /// Has an app of that identifier installed.
+  /// Installs an app.
   virtual void installApp(std::string_view identifier) = 0;
-  /// From now on nothing can be cleared; false where that cannot be done.
+  /// Makes all later clearing fail. Returns false if not supported.
   [[nodiscard]] virtual bool failClearing() { return false; }
-  /// Ends the process that keeps the list and begins another; false where that cannot be done.
+  /// Restarts the list's process. Returns false if not supported.
   [[nodiscard]] virtual bool restart() { return false; }
 };
 

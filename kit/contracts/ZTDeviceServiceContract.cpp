@@ -11,7 +11,7 @@ std::shared_ptr<platform::ZTAsset> ZTDeviceServiceContract::asset(std::string_vi
   return std::make_shared<platform::ZTAsset>(std::string(identifier), "Application", std::nullopt);
 }
 
-TEST_P(ZTDeviceServiceContract, WhatIsSupportedDoesNotChange) {
+TEST_P(ZTDeviceServiceContract, SupportDoesNotChange) {
   const bool prioritizes = service().supports(Operation::prioritizeAsset);
   const bool cancels = service().supports(Operation::cancelAssetTransferForFailedAsset);
   runOnThreads(4, [&](std::size_t) {
@@ -20,8 +20,8 @@ TEST_P(ZTDeviceServiceContract, WhatIsSupportedDoesNotChange) {
   });
 }
 
-TEST_P(ZTDeviceServiceContract, PrioritizingCompletesOnceAlsoWhenNothingIsToBeTransferred) {
-  if (!service().supports(Operation::prioritizeAsset)) GTEST_SKIP() << "not supported";
+TEST_P(ZTDeviceServiceContract, PrioritizingAnUnknownAssetCompletesOnce) {
+  if (!service().supports(Operation::prioritizeAsset)) GTEST_SKIP() << "the subject does not support the operation";
   EventCounter completions;
   service().prioritizeAsset(asset("com.a"), [&](const std::optional<Error>&) { completions.add(); });
   EXPECT_TRUE(completions.waitFor(1));
@@ -31,7 +31,7 @@ TEST_P(ZTDeviceServiceContract, PrioritizingCompletesOnceAlsoWhenNothingIsToBeTr
 }
 
 TEST_P(ZTDeviceServiceContract, PrioritizingCompletesBeforeTheServiceEnds) {
-  if (!service().supports(Operation::prioritizeAsset)) GTEST_SKIP() << "not supported";
+  if (!service().supports(Operation::prioritizeAsset)) GTEST_SKIP() << "the subject does not support the operation";
   EventCounter completions;
   auto another = GetParam().make();
   another->service().prioritizeAsset(asset("com.a"), [&](const std::optional<Error>&) { completions.add(); });
@@ -39,15 +39,16 @@ TEST_P(ZTDeviceServiceContract, PrioritizingCompletesBeforeTheServiceEnds) {
   EXPECT_EQ(completions.count(), 1U);
 }
 
-TEST_P(ZTDeviceServiceContract, CancellingWhatIsNotToBeTransferredDoesNothing) {
-  if (!service().supports(Operation::cancelAssetTransferForFailedAsset)) GTEST_SKIP() << "not supported";
+TEST_P(ZTDeviceServiceContract, CancellingAnUnknownAssetDoesNothing) {
+  if (!service().supports(Operation::cancelAssetTransferForFailedAsset))
+    GTEST_SKIP() << "the subject does not support the operation";
   service().cancelAssetTransferForFailedAsset(asset("com.a"));
   service().cancelAssetTransferForFailedAsset(asset("com.a"));
   EXPECT_TRUE(service().supports(Operation::cancelAssetTransferForFailedAsset));
 }
 
-TEST_P(ZTDeviceServiceContract, ACompletionMayUseTheService) {
-  if (!service().supports(Operation::prioritizeAsset)) GTEST_SKIP() << "not supported";
+TEST_P(ZTDeviceServiceContract, CompletionCanCallTheService) {
+  if (!service().supports(Operation::prioritizeAsset)) GTEST_SKIP() << "the subject does not support the operation";
   EventCounter completions;
   service().prioritizeAsset(asset("com.a"), [&](const std::optional<Error>&) {
     service().prioritizeAsset(asset("com.b"), [&](const std::optional<Error>&) { completions.add(); });
@@ -55,7 +56,7 @@ TEST_P(ZTDeviceServiceContract, ACompletionMayUseTheService) {
   EXPECT_TRUE(completions.waitFor(1));
 }
 
-TEST_P(ZTDeviceServiceContract, ManyThreadsMayAskAtOnce) {
+TEST_P(ZTDeviceServiceContract, IsThreadSafe) {
   const bool prioritizes = service().supports(Operation::prioritizeAsset);
   const bool cancels = service().supports(Operation::cancelAssetTransferForFailedAsset);
   EventCounter completions;

@@ -1,4 +1,4 @@
-// Holds a sync daemon's service for its device to platform/ZTDeviceService.h.
+// Contract of platform/ZTDeviceService.h.
 #pragma once
 
 #include <memory>
@@ -13,7 +13,7 @@ class ZTDeviceServiceSubject {
  public:
   virtual ~ZTDeviceServiceSubject() = default;
 
-  /// No transfer is under way.
+  /// Must have no transfers.
   [[nodiscard]] virtual platform::ZTDeviceService& service() = 0;
 };
 

@@ -18,36 +18,35 @@ namespace appsync::test {
 /// a daemon on fakes, prints the failure on standard output. Thread-safe.
 void misuse(std::string_view contract);
 
-/// What all fakes of a platform were asked, in one order: "registry.uninstallApplication com.a",
-/// "fileSystem.moveItem /a /b". Only questions that a client asks for every message (log categories, the time) are left
-/// out. Threads: any.
+/// The calls of all fakes of a platform in one order: "registry.uninstallApplication com.a", "fileSystem.moveItem /a
+/// /b". Calls that a client makes for every message (log categories, the time) are omitted. Thread-safe.
 class CallJournal {
  public:
-  /// Asked before a call is carried out, on the caller's thread. An error makes the call fail in whichever way its
-  /// contract has: with that error, with false, with nothing. Calls that cannot fail by their contract ignore it.
+  /// Runs before each call, on the caller's thread. If it returns an error, the call fails as its contract says: with
+  /// that error, false, null or nullopt. Calls that cannot fail ignore it.
   using Hook = std::function<std::optional<Error>(std::string_view operation, std::string_view arguments)>;
 
-  /// For fakes: notes a call and tells whether it is to fail.
+  /// For fakes: records a call. Returns the error with which it must fail, or nullopt.
   [[nodiscard]] std::optional<Error> beforeCall(std::string_view operation, std::string_view arguments = {});
 
-  /// For fakes: notes what is no call but has its place in the order, such as a release.
+  /// For fakes: records an event that is not a call, such as the release of an object.
   void note(std::string line);
 
-  /// All lines so far, or those that start with one of the prefixes ("registry.", "fileSystem.moveItem").
+  /// Return all lines, or those that start with one of the prefixes ("registry.", "fileSystem.moveItem").
   [[nodiscard]] std::vector<std::string> lines() const;
   [[nodiscard]] std::vector<std::string> lines(std::initializer_list<std::string_view> prefixes) const;
   [[nodiscard]] std::size_t count(std::string_view prefix) const;
   [[nodiscard]] bool contains(std::string_view line) const;
 
-  /// Forgets the lines; hook and number of calls stay.
+  /// Deletes the lines. Hook and number of calls are unchanged.
   void clear();
 
   void setHook(Hook hook);
 
-  /// Replaces the hook by one that fails the `number`-th call from now, the next one being 1.
+  /// Replaces the hook by one that fails the `number`-th call from now; 1 is the next call.
   void failCall(std::size_t number, Error error);
 
-  /// Calls since the journal was made.
+  /// Number of calls since construction.
   [[nodiscard]] std::size_t callCount() const;
 
  private:

@@ -7,7 +7,7 @@ namespace appsync::test {
 
 namespace {
 
-/// No message of the plug-in's has this category.
+/// A category that the plug-in does not use.
 constexpr int kCallCategory = 99;
 
 }  // namespace

@@ -1,4 +1,4 @@
-// Calls and messages in one order.
+// Records calls and log messages in one order.
 #pragma once
 
 #include <string_view>
@@ -8,11 +8,10 @@
 
 namespace appsync::test {
 
-/// From now on every call of a fake stands in the platform's log too, in its place among the messages. Takes the
-/// journal's hook.
+/// Adds each later call of a fake to the platform's log, in order with the messages. Replaces the journal's hook.
 void logCalls(FakePlatform& platform);
 
-/// The line of such a call: `called("fileSystem.readFile /a")`.
+/// Returns the log line of a call: `called("fileSystem.readFile /a")`.
 [[nodiscard]] LogLine called(std::string_view line);
 
 }  // namespace appsync::test

@@ -16,10 +16,10 @@ using platform::InstallObserverDelegate;
 
 namespace {
 
-/// Any of the service's own but 1.
+/// Any code except 1.
 constexpr long kRefused = 2;
 
-/// The install options of the registry that say what the coordinator was told.
+/// Returns the registry's install options for the coordinator's options.
 plist::Dictionary installerOptions(const FakeCoordinator& coordinator) {
   plist::Dictionary options{{platform::PackageTypeKey, platform::kPackageTypeCustomer},
                             {platform::BundleIdentifierKey, coordinator.identifier}};
@@ -92,7 +92,7 @@ CoordinationState::Coordinator CoordinationState::find(CoordinatorKind kind, std
   return others;
 }
 
-// What the service does of itself.
+// Automatic actions.
 
 bool CoordinationState::isFulfilled(const FakeCoordinator& coordinator) const {
   const bool restores =
@@ -117,7 +117,7 @@ void CoordinationState::advance() {
     }
     if (!isFulfilled(*coordinator)) continue;
     coordinator->appAsset->isTaken = true;
-    // What becomes of the placeholder is told first.
+    // The placeholder is reported first.
     if (coordinator->showing != FakeShowing::underWay) {
       coordinator->stage = FakeCoordinatorStage::installing;
       post([this, coordinator] { install(coordinator); });
@@ -137,7 +137,7 @@ void CoordinationState::showPlaceholder(const Coordinator& coordinator, std::opt
 }
 
 void CoordinationState::install(const Coordinator& coordinator) {
-  // Nobody changes a coordinator that installs.
+  // Nothing changes a coordinator that is installing.
   const FakeCoordinator now = read([&] { return coordinator->snapshot(); });
   const Status status = installPackage(now);
   removePackage(now);

@@ -1,4 +1,4 @@
-// What a fake install-coordination service keeps, and what it does of itself.
+// State of a fake install-coordination service, and its automatic actions.
 #pragma once
 
 #include <atomic>
@@ -21,21 +21,21 @@
 
 namespace appsync::test {
 
-/// Where callbacks run.
+/// The thread on which callbacks run.
 enum class CallbackOn { ownThread, callingThread };
 
-/// For `CoordinationState::failures`: the home screen cannot show an app's placeholder.
+/// Operation for `CoordinationState::failures`: showing an app's placeholder.
 inline constexpr std::string_view kShowingPlaceholder = "showingPlaceholder";
 
-/// An error of the service's own domain.
+/// Returns an error of the service's domain.
 [[nodiscard]] Error coordinationError(std::string text);
 
-/// Shared by the service and everything that it hands out. Threads: any.
+/// Shared by the service and every object that it returned. Thread-safe.
 class CoordinationState : public std::enable_shared_from_this<CoordinationState> {
  public:
   using Coordinator = std::shared_ptr<FakeCoordinator>;
   using Report = std::function<void(platform::InstallObserverDelegate&, platform::InstallCoordinator&)>;
-  /// Made with the lock held; an error says that nothing was changed.
+  /// Runs with the lock held. An error means that it changed nothing.
   using Change = std::function<Status()>;
   struct Connection {
     std::string serviceName;
@@ -48,13 +48,13 @@ class CoordinationState : public std::enable_shared_from_this<CoordinationState>
   CoordinationState(CallJournal& journal, FakeFileSystem& files, FakeAppRegistry& registry)
       : journal_(journal), files_(files), registry_(registry) {}
 
-  /// Notes a call that is about `subject` and tells whether it is to fail.
+  /// Records a call on `subject`. Returns the error with which it must fail, or nullopt.
   [[nodiscard]] std::optional<Error> begin(std::string_view operation, std::string_view subject,
                                            std::string_view arguments = {});
 
-  /// Makes a change, then whatever follows from it; what is to be told is told on that thread.
+  /// Runs `change` and the automatic actions that result from it. Callbacks run on `where`.
   [[nodiscard]] Status change(const Change& change, CallbackOn where = CallbackOn::ownThread);
-  /// A change that cannot be refused.
+  /// Runs a change that cannot fail.
   template <class Update>
   void update(const Update& update, CallbackOn where = CallbackOn::ownThread) {
     const Change wrapped = [&] {
@@ -69,7 +69,7 @@ class CoordinationState : public std::enable_shared_from_this<CoordinationState>
     return read();
   }
 
-  // In changes.
+  // Only within a change.
   [[nodiscard]] Coordinator find(platform::CoordinatorKind kind, std::string_view identifier,
                                  platform::ClientIdentity client) const;
   void end(const Coordinator& coordinator, std::optional<Error> error);
@@ -80,7 +80,7 @@ class CoordinationState : public std::enable_shared_from_this<CoordinationState>
   /// Runs `work` on the service's thread.
   void post(std::function<void()> work);
 
-  // Looked at in `read`, changed in changes.
+  // Read only within `read`, changed only within a change.
   std::vector<Coordinator> living;
   std::vector<FakeCoordinator> ended;
   std::vector<std::shared_ptr<FakePlaceholder>> placeholders;
@@ -90,10 +90,10 @@ class CoordinationState : public std::enable_shared_from_this<CoordinationState>
   bool isAutomatic = false;
   CallbackOn uninstallCompletion = CallbackOn::ownThread;
 
-  // At any time.
+  // Thread-safe.
   FailurePlan<std::string> failures;
   Gate gate;
-  /// How many things that it handed out are held.
+  /// Number of objects that the service returned and clients still hold.
   std::atomic<std::size_t> held = 0;
 
   [[nodiscard]] CallJournal& journal() { return journal_; }
@@ -116,7 +116,7 @@ class CoordinationState : public std::enable_shared_from_this<CoordinationState>
   FakeFileSystem& files_;
   FakeAppRegistry& registry_;
   mutable std::mutex mutex_;
-  /// What the change under way has to tell.
+  /// Callbacks of the running change.
   std::vector<Delivery> deliveries_;
   FakeCallbackThread thread_;
   const FakeCallbackThread::Subscription own_ = thread_.subscribe();

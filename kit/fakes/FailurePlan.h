@@ -1,4 +1,4 @@
-// Which calls of a fake are to fail.
+// Planned failures of a fake's calls.
 #pragma once
 
 #include <deque>
@@ -13,20 +13,20 @@
 
 namespace appsync::test {
 
-/// Stands for every path or identifier.
+/// Matches every path or identifier.
 inline constexpr std::string_view kAnything = "*";
 
-/// Failures by operation and by what the operation is about (a path, a bundle identifier). Threads: any.
+/// Failures by operation and subject (a path, a bundle identifier). Thread-safe.
 template <class Operation>
 class FailurePlan {
  public:
-  /// The next call fails once; several wait their turn.
+  /// Makes the next call fail. Several failures apply to consecutive calls.
   void failNext(Operation operation, std::string_view subject, Error error) {
     const std::scoped_lock lock(mutex_);
     plans_[{operation, std::string(subject)}].once.push_back(std::move(error));
   }
 
-  /// Every call fails that no `failNext` has a say in.
+  /// Makes every call fail for which no `failNext` is pending.
   void failAlways(Operation operation, std::string_view subject, Error error) {
     const std::scoped_lock lock(mutex_);
     plans_[{operation, std::string(subject)}].always = std::move(error);
@@ -37,7 +37,7 @@ class FailurePlan {
     plans_.clear();
   }
 
-  /// For fakes: how this call is to fail, if it is.
+  /// For fakes: returns the failure of this call, or nullopt.
   [[nodiscard]] std::optional<Error> take(Operation operation, std::string_view subject) {
     const std::scoped_lock lock(mutex_);
     if (std::optional<Error> error = takeExactly(operation, subject)) return error;

@@ -1,4 +1,4 @@
-// Apps as tests describe them, and as the fake registry reports them.
+// Apps and records of the fake registry.
 #pragma once
 
 #include <cstdint>
@@ -14,7 +14,7 @@
 
 namespace appsync::test {
 
-/// One app of the registry. Made by what it is, then adapted:
+/// One app of the registry. Created by one of the factories, then modified:
 /// `FakeApp::placeholder("com.a").ofType(kApplicationTypeSystem).withVersion("2")`.
 struct FakeApp {
   std::string identifier;
@@ -23,27 +23,28 @@ struct FakeApp {
   std::optional<std::string> containerPath;
   std::optional<std::string> bundlePath;
   std::string applicationType;
-  /// The walks that meet it; unless said otherwise what its type makes of it.
+  /// The kind of enumeration that visits it; nullopt derives it from the type.
   std::optional<platform::BundleKind> kind;
   std::uint64_t staticDiskUsage = 0;
   platform::TSInstallType installType = platform::TSInstallType::None;
   bool isInstalled = false;
   bool isPlaceholder = false;
-  /// Whether its licence data is bound to the device.
+  /// Whether the licence data is bound to this device.
   bool hasMIDBasedSINF = false;
-  /// Live; null when no install runs.
+  /// Null if no install is running.
   std::shared_ptr<FakeInstallProgress> progress;
-  /// Of the latest install: what came with it.
+  /// Options of the latest install.
   plist::Dictionary installOptions;
 
-  /// A user's app, version "1.0", in "/var/mobile/Containers/Bundle/<identifier>", neither installed nor placeholder.
+  /// Returns a user app, version "1.0", in "/var/mobile/Containers/Bundle/<identifier>", neither installed nor
+  /// placeholder.
   explicit FakeApp(std::string appIdentifier);
 
   [[nodiscard]] static FakeApp installed(std::string identifier);
-  /// With a progress that waits and loads.
+  /// Adds a progress with state Waiting and phase Loading.
   [[nodiscard]] static FakeApp placeholder(std::string identifier,
                                            platform::TSInstallType type = platform::TSInstallType::Sync);
-  /// Installed, and a placeholder of a later version over it.
+  /// Returns an installed app that also has a placeholder of a later version.
   [[nodiscard]] static FakeApp updating(std::string identifier,
                                         platform::TSInstallType type = platform::TSInstallType::Sync);
 
@@ -52,7 +53,7 @@ struct FakeApp {
   [[nodiscard]] FakeApp withContainerPath(std::optional<std::string> value) const;
   [[nodiscard]] FakeApp withBundlePath(std::optional<std::string> value) const;
   [[nodiscard]] FakeApp ofType(std::string_view type) const;
-  /// As registries may that know more types than kinds of bundles.
+  /// For registries with more application types than kinds of bundles.
   [[nodiscard]] FakeApp metByWalksOf(platform::BundleKind kind) const;
   [[nodiscard]] FakeApp withStaticDiskUsage(std::uint64_t bytes) const;
   [[nodiscard]] FakeApp withInstallType(platform::TSInstallType type) const;
@@ -84,7 +85,7 @@ class FakeAppRecord final : public platform::AppRecord {
   FakeApp app_;
 };
 
-/// A bundle that is no app.
+/// A bundle that is not an app.
 class FakeBundleRecord final : public platform::BundleRecord {
  public:
   explicit FakeBundleRecord(std::string identifier) : identifier_(std::move(identifier)) {}

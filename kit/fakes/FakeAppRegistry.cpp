@@ -15,7 +15,7 @@ using platform::TSInstallState;
 
 namespace {
 
-/// Whether a walk of kind `walked` meets a bundle of kind `kind`.
+/// Returns true if an enumeration of kind `walked` visits a bundle of kind `kind`.
 bool meets(BundleKind walked, BundleKind kind) {
   return walked == BundleKind::all || walked == kind;
 }
@@ -37,7 +37,7 @@ FakeAppRegistry::FakeAppRegistry(CallJournal& journal, FakeFileSystem& files, Fa
     : journal_(journal), files_(files), uninstalledApps_(uninstalledApps) {}
 
 FakeAppRegistry::~FakeAppRegistry() {
-  if (!observers_.empty()) misuse("the registry goes while it is still observed");
+  if (!observers_.empty()) misuse("the registry is destroyed while an observer is registered");
   reportGate.open();
   for (const auto& progress : attached_)
     progress->detach();
@@ -305,7 +305,7 @@ std::shared_ptr<platform::InstallProgress> FakeAppRegistry::installProgressForAp
 
 void FakeAppRegistry::installPhaseFinishedForProgress(platform::InstallProgress& progress) {
   const auto* known = dynamic_cast<FakeInstallProgress*>(&progress);
-  if (known == nullptr) return misuse("a progress that is not the registry's");
+  if (known == nullptr) return misuse("a progress of another registry");
   if (journal_.beforeCall("registry.installPhaseFinishedForProgress", known->identifier())) return;
   const std::scoped_lock lock(mutex_);
   const auto found = apps_.find(known->identifier());

@@ -1,4 +1,4 @@
-// The device's register of apps, and its installer.
+// The app registry and its installer.
 #pragma once
 
 #include <cstddef>
@@ -25,13 +25,13 @@ namespace appsync::test {
 
 enum class RegistryOperation { installApplication, uninstallApplication };
 
-/// Keeps apps by identifier, in that order, and reports to observers on a thread of its own.
+/// Stores apps in the order of their identifiers. Calls observers on a separate thread.
 ///
-/// A package is any file that is there and not empty. When it is a property list with "BundleIdentifier" and
-/// "BundleVersion" these count, see `packageOf` in FakePackages.h; a placeholder's folder is judged by its
-/// "Info.plist". Journal lines: "registry.installApplication com.a /path", "registry.installPhaseFinishedForProgress
-/// com.a", "registry.recordForIdentifier com.a", "progress.setInstallState 1 com.a" and so on. Fails the test when it
-/// goes while somebody still observes it, and when it is given a progress that is not its own.
+/// A package is any file that is not empty. If it is a property list with "BundleIdentifier" and "BundleVersion", these
+/// apply, see `packageOf` in FakePackages.h; for a placeholder's directory, its "Info.plist" applies. Journal lines:
+/// "registry.installApplication com.a /path", "registry.installPhaseFinishedForProgress com.a",
+/// "registry.recordForIdentifier com.a", "progress.setInstallState 1 com.a" and so on. Fails the test if it is
+/// destroyed while an observer is registered, or receives a progress of another registry.
 class FakeAppRegistry final : public platform::AppRegistry {
  public:
   struct Install {
@@ -50,36 +50,36 @@ class FakeAppRegistry final : public platform::AppRegistry {
   FakeAppRegistry(const FakeAppRegistry&) = delete;
   FakeAppRegistry& operator=(const FakeAppRegistry&) = delete;
 
-  // What is there.
+  // Contents.
   void add(FakeApp app);
-  /// A bundle that is no app, met by walks of that kind and of all; may share an identifier with others.
+  /// Adds a bundle that is not an app, visited by enumerations of `kind` and of all. Identifiers may be equal.
   void addBundle(std::string identifier, platform::BundleKind kind);
-  /// The app as it is now.
+  /// Returns the current state of the app.
   [[nodiscard]] std::optional<FakeApp> app(std::string_view identifier) const;
   [[nodiscard]] std::vector<std::string> identifiers() const;
 
   /// Failures of installs and uninstalls, by identifier.
   FailurePlan<RegistryOperation> failures;
 
-  // What other services of the device do, which is no call: as the installer does on a call.
+  // For other services of the device: not journaled, otherwise like the corresponding call.
   [[nodiscard]] Status install(const platform::FileLocation& location, const plist::Dictionary& options);
   void showPlaceholder(const std::string& identifier, platform::TSInstallType type);
   void removePlaceholder(std::string_view identifier);
   [[nodiscard]] Status uninstall(std::string_view identifier, const plist::Dictionary& options = {});
 
-  // What was asked.
+  // Calls.
   [[nodiscard]] std::vector<Install> installs() const;
   [[nodiscard]] std::vector<Uninstall> uninstalls() const;
   [[nodiscard]] std::size_t mostInstallsAtOnce() const;
 
-  /// Stops installs after they were asked for and before they do anything.
+  /// Stops each install before it begins.
   Gate installGate;
-  /// Stops reports to observers before each one; a stopped report counts as running.
+  /// Stops before each callback to an observer; a stopped callback counts as running.
   Gate reportGate;
 
-  /// Which installs run first and which are paused, in these orders; observers hear of it.
+  /// Sets the prioritized and the paused installs, in order, and notifies observers.
   void setInstallOrder(std::vector<std::string> prioritized, std::vector<std::string> paused = {});
-  /// Blocks until observers have heard everything so far.
+  /// Blocks until all pending callbacks have returned.
   void waitUntilReported() { reports_.waitUntilIdle(); }
   [[nodiscard]] std::size_t observerCount() const { return reports_.subscriptions(); }
 
@@ -108,7 +108,7 @@ class FakeAppRegistry final : public platform::AppRegistry {
     platform::BundleKind kind;
   };
 
-  /// Not with the lock held: a progress holds its own while it tells of a call.
+  /// Must be called without the lock, to avoid a deadlock with the lock that a progress holds during a call.
   void attach(const std::string& identifier, const std::shared_ptr<FakeInstallProgress>& progress);
   void reportCancellation(const std::string& identifier);
   [[nodiscard]] platform::AppRecords recordsOf(const std::vector<std::string>& identifiers) const;

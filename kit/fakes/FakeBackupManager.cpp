@@ -8,8 +8,8 @@ namespace appsync::test {
 
 namespace {
 
-/// Real time: the end of a test that hangs, never a pace.
-constexpr std::chrono::seconds kPatience(20);
+/// Only a failing test waits this long.
+constexpr std::chrono::seconds kTimeout(20);
 
 }  // namespace
 
@@ -54,7 +54,7 @@ class FakeBackups::Connection final : public platform::BackupManager {
 };
 
 FakeBackups::~FakeBackups() {
-  if (connections_ != 0) misuse("the backup service goes while a connection is open");
+  if (connections_ != 0) misuse("the backup service is destroyed while a connection is open");
 }
 
 void FakeBackups::addRestoreData(std::string_view identifier, std::uint64_t size) {
@@ -75,7 +75,7 @@ std::unique_ptr<platform::BackupManager> FakeBackups::connect() {
 void FakeBackups::waitUntilReleased() {
   std::unique_lock lock(mutex_);
   const auto isReleased = [this] { return connections_ == 0; };
-  if (!released_.wait_for(lock, kPatience, isReleased)) misuse("a connection to the backup service stays open");
+  if (!released_.wait_for(lock, kTimeout, isReleased)) misuse("a connection to the backup service stays open");
 }
 
 std::size_t FakeBackups::connections() const {

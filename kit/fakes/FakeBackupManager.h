@@ -20,7 +20,7 @@ namespace appsync::test {
 enum class BackupOperation { cancelApplicationRestore };
 
 /// The service behind all connections. Journal lines: "backupManager.make", "backupManager.restoreDataExists com.a",
-/// "backupManager.cancelApplicationRestore com.a". Fails the test when it goes while a connection is open.
+/// "backupManager.cancelApplicationRestore com.a". Fails the test if it is destroyed while a connection is open.
 class FakeBackups {
  public:
   explicit FakeBackups(CallJournal& journal) : journal_(journal) {}
@@ -28,14 +28,14 @@ class FakeBackups {
   FakeBackups(const FakeBackups&) = delete;
   FakeBackups& operator=(const FakeBackups&) = delete;
 
-  /// The going restore holds this many bytes for the app.
+  /// Sets the number of bytes that the running restore holds for the app.
   void addRestoreData(std::string_view identifier, std::uint64_t size = 1);
   [[nodiscard]] bool hasRestoreData(std::string_view identifier) const;
   FailurePlan<BackupOperation> failures;
 
   [[nodiscard]] std::unique_ptr<platform::BackupManager> connect();
   [[nodiscard]] std::size_t connections() const;
-  /// Blocks until no connection is open; fails the test when that takes unreasonably long.
+  /// Blocks until no connection is open. Fails the test on a time-out.
   void waitUntilReleased();
 
  private:

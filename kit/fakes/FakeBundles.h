@@ -1,4 +1,4 @@
-// App bundles as folders of the fake file system.
+// App bundles in the fake file system.
 #pragma once
 
 #include <memory>
@@ -13,13 +13,13 @@
 
 namespace appsync::test {
 
-/// The process has no bundle unless told. Journal lines: "bundles.openBundle /path", "bundles.mainBundleIdentifier".
+/// By default the process has no bundle. Journal lines: "bundles.openBundle /path", "bundles.mainBundleIdentifier".
 class FakeBundles final : public platform::Bundles {
  public:
   FakeBundles(CallJournal& journal, FakeFileSystem& files) : journal_(journal), files_(files) {}
 
   void setMainBundleIdentifier(std::optional<std::string> identifier);
-  /// From now on the folder cannot be opened as a bundle.
+  /// Makes all later attempts to open the directory as a bundle fail.
   void failOpening(std::string path);
 
   [[nodiscard]] std::unique_ptr<platform::Bundle> openBundle(const platform::FileLocation& location) override;

@@ -1,4 +1,4 @@
-// The thread on which a fake service calls back.
+// The thread on which a fake service runs callbacks.
 #pragma once
 
 #include <condition_variable>
@@ -13,20 +13,21 @@
 
 namespace appsync::test {
 
-/// Calls subscribers back one call at a time, never on the thread that asks for it. Threads: any.
+/// Runs callbacks to subscribers one at a time, never on the posting thread. Thread-safe.
 class FakeCallbackThread {
  public:
   using Subscription = std::uint64_t;
 
   [[nodiscard]] Subscription subscribe();
 
-  /// When this returns none of the subscription's callbacks runs on another thread and none will begin.
+  /// Ends the subscription: blocks until its running callback has returned, unless called from that callback; no
+  /// further callback begins.
   void unsubscribe(Subscription subscription);
 
-  /// Runs `callback` soon, unless the subscription has ended by then.
+  /// Runs `callback` asynchronously, unless the subscription ends first.
   void post(Subscription subscription, std::function<void()> callback);
 
-  /// Blocks until everything that was posted has run or was dropped.
+  /// Blocks until every posted callback has run or was discarded.
   void waitUntilIdle();
 
   [[nodiscard]] std::size_t subscriptions() const;
@@ -39,7 +40,7 @@ class FakeCallbackThread {
   std::set<Subscription> subscriptions_;
   Subscription last_ = 0;
   std::size_t pending_ = 0;
-  /// Whose callback is running, 0 for nobody's, and where.
+  /// Subscription of the running callback, or 0, and the thread on which it runs.
   Subscription running_ = 0;
   std::thread::id runner_;
   OperationQueue queue_{1};

@@ -1,4 +1,4 @@
-// Coordinators, placeholders and promises as tests describe them, and as the fake service reports them.
+// Coordinators, placeholders and promises of the fake service.
 #pragma once
 
 #include <cstdint>
@@ -14,7 +14,7 @@
 
 namespace appsync::test {
 
-/// Who took something back, and why.
+/// A cancellation: its client and reason.
 struct FakeCancellation {
   Error reason;
   platform::ClientIdentity client = platform::ClientIdentity::CXClientSync;
@@ -31,11 +31,11 @@ struct FakePromise {
   std::optional<platform::FileLocation> transferPath;
   double percentComplete = 0;
   bool isComplete = false;
-  /// Whether a coordinator or placeholder has or had it.
+  /// Whether it is or was attached to a coordinator or placeholder.
   bool isAttached = false;
-  /// The app is being installed with it.
+  /// Whether the app is being installed with it.
   bool isTaken = false;
-  /// What it belonged to has ended.
+  /// Whether the coordinator or placeholder that it is attached to has ended.
   bool hasEnded = false;
   std::optional<FakeCancellation> cancellation;
 };
@@ -47,11 +47,11 @@ struct FakePlaceholder {
   platform::ClientIdentity client = platform::ClientIdentity::CXClientSync;
   std::shared_ptr<FakePromise> icon;
   std::optional<platform::PlaceholderAttributes> attributes;
-  /// The outer one tells whether it was set at all.
+  /// The outer nullopt means that it was not set.
   std::optional<std::optional<platform::StoreMetadata>> metadata;
   std::optional<Bytes> sinfData;
   bool isConfigured = false;
-  /// Whether a coordinator has or had it.
+  /// Whether it belongs or belonged to a coordinator.
   bool isAttached = false;
   /// Whether the home screen shows it.
   bool isShown = false;
@@ -60,23 +60,23 @@ struct FakePlaceholder {
 
 enum class FakeCoordinatorStage : std::uint8_t { waiting, installing, ended };
 
-/// How far the service is with putting a placeholder on the home screen.
+/// Progress of showing a placeholder on the home screen.
 enum class FakeShowing : std::uint8_t { notBegun, underWay, over };
 
-/// One coordinator. Made by what it is, then adapted:
-/// `FakeCoordinator::of("com.a", CoordinatorKind::updating).madeBy(ClientIdentity::CXClientBazaarly)`.
+/// One coordinator. Created by `of`, then modified: `FakeCoordinator::of("com.a",
+/// CoordinatorKind::updating).madeBy(ClientIdentity::CXClientBazaarly)`.
 struct FakeCoordinator {
   std::string identifier;
   platform::CoordinatorKind kind = platform::CoordinatorKind::initiating;
   platform::ClientIdentity creator = platform::ClientIdentity::CXClientSync;
-  /// Whether clients are told no identifier.
+  /// Whether `bundleID` returns nullopt.
   bool hasLostIdentifier = false;
   FakeCoordinatorStage stage = FakeCoordinatorStage::waiting;
   std::optional<Error> error;
   std::optional<FakeCancellation> cancellation;
   std::weak_ptr<platform::InstallObserverDelegate> observer;
   std::optional<platform::InstallOptions> options;
-  /// None while there are no such promises; empty when it was said that there is nothing to wait for.
+  /// nullopt if not set; empty if set to an empty list.
   std::optional<std::vector<std::shared_ptr<FakePromise>>> initialODRAssets;
   std::shared_ptr<FakePromise> appAsset;
   std::optional<platform::ClientIdentity> responsibleClient;
@@ -91,21 +91,21 @@ struct FakeCoordinator {
   [[nodiscard]] FakeCoordinator withoutIdentifier() const;
   [[nodiscard]] FakeCoordinator withError(Error value) const;
   [[nodiscard]] FakeCoordinator withOptions(platform::InstallOptions value) const;
-  /// With the message that there are none.
+  /// Sets an empty list of on-demand resources.
   [[nodiscard]] FakeCoordinator withoutODRAssets() const;
   [[nodiscard]] FakeCoordinator withAppAsset(FakePromise promise) const;
   [[nodiscard]] FakeCoordinator withResponsibleClient(platform::ClientIdentity client) const;
   [[nodiscard]] FakeCoordinator withUserData(FakePromise promise) const;
   [[nodiscard]] FakeCoordinator withPlaceholder(FakePlaceholder value) const;
 
-  /// A copy that shares nothing that changes.
+  /// Returns a deep copy.
   [[nodiscard]] FakeCoordinator snapshot() const;
-  /// Everything that it promises, its icon included.
+  /// Returns all promises, including that of the icon.
   [[nodiscard]] std::vector<std::shared_ptr<FakePromise>> promises() const;
 };
 
-/// The word for a kind in journal lines and descriptions: "initiating", "updating", "restoring", "restoringDemoted",
-/// "any".
+/// Returns the name of a kind in journal lines and descriptions: "initiating", "updating", "restoring",
+/// "restoringDemoted", "any".
 [[nodiscard]] std::string_view nameOf(platform::CoordinatorKind kind);
 
 }  // namespace appsync::test

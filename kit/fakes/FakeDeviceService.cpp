@@ -67,7 +67,7 @@ void FakeDeviceService::cancelAssetTransferForFailedAsset(const std::shared_ptr<
 }
 
 void FakeDeviceService::check(Operation operation, const platform::ZTAsset& asset) {
-  if (asset.dataclass() != "Application") misuse("an asset of the dataclass " + asset.dataclass());
+  if (asset.dataclass() != "Application") misuse("an asset of dataclass " + asset.dataclass());
   const std::scoped_lock lock(mutex_);
   if (unsupported_.contains(operation)) misuse(nameOf(operation) + " is not supported");
 }

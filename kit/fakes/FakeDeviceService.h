@@ -1,4 +1,4 @@
-// The sync daemon's service for its device.
+// The sync daemon's device service.
 #pragma once
 
 #include <cstddef>
@@ -13,23 +13,23 @@
 
 namespace appsync::test {
 
-/// Supports everything at first. Journal lines: "deviceService.supports prioritizeAsset",
-/// "deviceService.prioritizeAsset com.a", "deviceService.cancelAssetTransferForFailedAsset com.a". Fails the test when
-/// it is asked for what it does not support or about an asset that does not come as an app.
+/// Initially supports all operations. Journal lines: "deviceService.supports prioritizeAsset",
+/// "deviceService.prioritizeAsset com.a", "deviceService.cancelAssetTransferForFailedAsset com.a". Fails the test
+/// if it receives an unsupported call or an asset of another dataclass.
 class FakeDeviceService final : public platform::ZTDeviceService {
  public:
   explicit FakeDeviceService(CallJournal& journal) : journal_(journal) {}
-  /// Completes what still waits for it.
+  /// Calls all pending completions.
   ~FakeDeviceService() override { complete(); }
   FakeDeviceService(const FakeDeviceService&) = delete;
   FakeDeviceService& operator=(const FakeDeviceService&) = delete;
 
   void stopSupporting(Operation operation);
-  /// From now on prioritising ends with this error; none ends that.
+  /// Sets the error of all later completions; nullopt means success.
   void failPrioritizing(std::optional<Error> error);
-  /// From now on completions wait for `complete`.
+  /// Delays all later completions until `complete`.
   void holdCompletions();
-  /// Calls, on the calling thread, the completions that wait.
+  /// Calls the pending completions on the calling thread.
   void complete();
 
   [[nodiscard]] bool supports(Operation operation) override;

@@ -1,4 +1,4 @@
-// The device's file system, in memory.
+// An in-memory file system.
 #pragma once
 
 #include <cstddef>
@@ -30,13 +30,13 @@ enum class FileOperation {
   touch
 };
 
-/// Begins with "/tmp" alone. Fails the test when the test puts something where nothing can be. Journal lines:
+/// Initially contains only "/tmp". Fails the test if the test puts an item at an impossible path. Journal lines:
 /// "fileSystem.readFile /path", "fileSystem.moveItem /from /to".
 class FakeFileSystem : public platform::FileSystem {
  public:
   explicit FakeFileSystem(CallJournal& journal);
 
-  // What is there. None of these is journaled or made to fail; writing makes missing folders.
+  // Contents. These are not journaled and ignore planned failures; missing parents are created.
   void put(std::string_view path, ByteView bytes);
   void put(std::string_view path, std::string_view text) { put(path, bytesOf(text)); }
   void putFolder(std::string_view path);
@@ -44,19 +44,19 @@ class FakeFileSystem : public platform::FileSystem {
   void erase(std::string_view path);
   [[nodiscard]] bool has(std::string_view path);
   [[nodiscard]] bool hasFolder(std::string_view path);
-  /// The file's contents, links followed; none when there is no such file.
+  /// Returns the file's contents, or nullopt if it does not exist. Follows links.
   [[nodiscard]] std::optional<Bytes> contents(std::string_view path);
   [[nodiscard]] std::optional<std::string> text(std::string_view path);
-  /// As given when it was made; none when nothing is there.
+  /// Returns the owners given at creation, or nullopt if the item does not exist.
   [[nodiscard]] std::optional<platform::OwnerAttributes> owners(std::string_view path);
-  /// How often it was touched.
+  /// Returns how many times the item was touched.
   [[nodiscard]] std::size_t touches(std::string_view path);
-  /// How often the file was written with success, by that path, since the beginning.
+  /// Returns how many times the file was written successfully under this path.
   [[nodiscard]] std::size_t writes(std::string_view path) const;
-  /// Every path below `folder`, in order; folders end with a slash.
+  /// Returns every path below `folder`, in order; directories end with a slash.
   [[nodiscard]] std::vector<std::string> paths(std::string_view folder = "/");
 
-  /// Failures by operation and path; copies and moves fail by either of their paths.
+  /// Failures by operation and path. Either path of a copy or move matches.
   FailurePlan<FileOperation> failures;
 
   [[nodiscard]] bool fileExists(std::string_view path) override;

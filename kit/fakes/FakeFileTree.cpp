@@ -21,19 +21,19 @@ std::deque<std::string> componentsOf(std::string_view path) {
   return components;
 }
 
-/// 0, or why no file can have that path.
+/// Returns 0, or the error number of an invalid path.
 int faultOf(std::string_view path) {
   if (path.empty()) return ENOENT;
   return path.front() == '/' && path.find('\0') == std::string_view::npos ? 0 : EINVAL;
 }
 
-/// One walk from the root along a path.
+/// Resolves one path, from the root.
 class Walk {
  public:
   Walk(FileNode& root, std::string_view path, LastLink lastLink)
       : lastLink_(lastLink), rest_(componentsOf(path)), folders_{&root} {}
 
-  /// 0, or an error number.
+  /// Returns 0 or an error number.
   int run() {
     while (!rest_.empty()) {
       if (const int error = step()) return error;

@@ -1,4 +1,4 @@
-// A file system's folders, files and links in memory.
+// An in-memory tree of directories, files and links.
 #pragma once
 
 #include <cstddef>
@@ -27,14 +27,14 @@ struct FileNode {
   [[nodiscard]] std::unique_ptr<FileNode> clone() const;
 };
 
-/// Whether a link at a path's end stands for itself or for what it leads to.
+/// Whether a link at the end of a path is followed.
 enum class LastLink { itself, followed };
 
-/// Paths are absolute; "." and ".." and links are understood as the system does, and leaving the root is an error.
-/// Errors: domain "POSIX", the text names the path. Not safe for use by several threads at once.
+/// Paths are absolute. Resolves ".", ".." and links as POSIX does; leaving the root is an error. Errors: domain
+/// "POSIX"; the text names the path. Not thread-safe.
 class FakeFileTree {
  public:
-  /// Where a path leads. `node` is null when nothing is there; `parent` is null for the root.
+  /// The result of resolving a path. `node` is null if nothing exists there; `parent` is null for the root.
   struct Place {
     FileNode* parent = nullptr;
     std::string name;
@@ -43,22 +43,22 @@ class FakeFileTree {
 
   FakeFileTree();
 
-  /// Fails when the path cannot be, or a folder on the way is missing.
+  /// Resolves a path. Fails if the path is invalid or a parent is missing.
   [[nodiscard]] Result<Place> find(std::string_view path, LastLink lastLink);
 
-  /// The same, but fails with ENOENT when nothing is there.
+  /// Like `find`; also fails with ENOENT if nothing exists there.
   [[nodiscard]] Result<Place> findExisting(std::string_view path, LastLink lastLink);
 
-  /// The same, but fails with EEXIST when something is there.
+  /// Like `find`; also fails with EEXIST if an item exists there.
   [[nodiscard]] Result<Place> findFree(std::string_view path);
 
-  /// Makes a folder, and the missing ones that lead to it, all with these owners. One that exists is a success.
+  /// Creates a directory and its missing parents, all with these owners. Succeeds if it exists.
   [[nodiscard]] Status makeFolders(std::string_view path, const platform::OwnerAttributes& owners);
 
-  /// Puts a node at a place that has a parent, in place of what is there.
+  /// Puts `node` at `place`, which must have a parent, and replaces an existing node.
   static FileNode& put(const Place& place, std::unique_ptr<FileNode> node);
 
-  /// Every path below `folder`, in order; folders end with a slash.
+  /// Returns every path below `folder`, in order; directories end with a slash.
   [[nodiscard]] std::vector<std::string> paths(std::string_view folder);
 
  private:

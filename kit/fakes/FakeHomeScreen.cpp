@@ -35,7 +35,7 @@ class FakeHomeScreen::Assertion final : public platform::TerminationAssertion {
 };
 
 FakeHomeScreen::~FakeHomeScreen() {
-  if (!held_.empty()) misuse("the home screen goes while an assertion is held on " + *held_.begin());
+  if (!held_.empty()) misuse("the home screen is destroyed while an assertion is held on " + *held_.begin());
 }
 
 std::vector<std::string> FakeHomeScreen::iconStates() const {
@@ -82,7 +82,7 @@ void FakeHomeScreen::setIconState(Port port, ByteView layout) {
 
 std::optional<Bytes> FakeHomeScreen::getFlattenedIconState(Port port, std::uint32_t format) {
   checkPort(port);
-  if (format != 1) misuse("format 1 is the home screen's only one");
+  if (format != 1) misuse("the home screen supports format 1 only");
   if (journal_.beforeCall("homeScreen.getFlattenedIconState")) return std::nullopt;
   const std::scoped_lock lock(mutex_);
   return flattened_;

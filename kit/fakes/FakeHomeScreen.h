@@ -18,7 +18,7 @@
 
 namespace appsync::test {
 
-/// What a fake home screen answers to one request for an assertion.
+/// The answer to one request for an assertion.
 struct AssertionAnswer {
   enum class Object { made, none };
 
@@ -28,16 +28,16 @@ struct AssertionAnswer {
   [[nodiscard]] static AssertionAnswer granted() { return {}; }
   [[nodiscard]] static AssertionAnswer denied() { return without(1); }
   [[nodiscard]] static AssertionAnswer notFound() { return without(2); }
-  /// Any code, without an assertion.
+  /// An undocumented code, without an assertion.
   [[nodiscard]] static AssertionAnswer without(std::uint8_t code) {
     return {platform::TerminationAssertionOutcome{code}, Object::none};
   }
 };
 
-/// Grants every assertion unless told otherwise. Journal lines: "homeScreen.setIconState", and so on;
-/// "homeScreen.terminationAssertionCreate com.a", and "homeScreen.release com.a" when an assertion goes.
-/// Fails the test when a port is not its own, when `format` is not 1 or `reason` not 0, and when it goes while an
-/// assertion is held.
+/// By default grants every assertion. Journal lines: "homeScreen.setIconState" and so on;
+/// "homeScreen.terminationAssertionCreate com.a", and "homeScreen.release com.a" when an assertion is destroyed. Fails
+/// the test if a port is invalid, `format` is not 1 or `reason` is not 0, or if it is destroyed while an assertion is
+/// held.
 class FakeHomeScreen final : public platform::HomeScreenService {
  public:
   explicit FakeHomeScreen(CallJournal& journal) : journal_(journal) {}
@@ -45,18 +45,18 @@ class FakeHomeScreen final : public platform::HomeScreenService {
   FakeHomeScreen(const FakeHomeScreen&) = delete;
   FakeHomeScreen& operator=(const FakeHomeScreen&) = delete;
 
-  /// The layouts that were handed over, in order.
+  /// The layouts received, in order.
   [[nodiscard]] std::vector<std::string> iconStates() const;
 
-  /// The answer to the question for the order: these identifiers, these bytes, or nothing (as in the beginning).
+  /// Set the result of `getFlattenedIconState`: these identifiers, these bytes, or nullopt (the default).
   void setFlattenedIconState(const std::vector<std::string>& identifiers);
   void setFlattenedIconState(std::optional<Bytes> bytes);
 
-  /// Answers the app's next requests with these, one after the other, and later ones as before.
+  /// Answers the app's next requests with these, in order, and later ones by default.
   void answerNext(std::string_view identifier, std::initializer_list<AssertionAnswer> answers);
   void answerAlways(std::string_view identifier, AssertionAnswer answer);
 
-  /// The apps on which an assertion is held now.
+  /// The apps on which assertions are held.
   [[nodiscard]] std::multiset<std::string> held() const;
 
   [[nodiscard]] Port blockableServerPort() override;

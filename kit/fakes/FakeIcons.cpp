@@ -27,15 +27,15 @@ class FakePNGEncoder final : public platform::PNGEncoder {
 
   void addImage(const platform::Image& image) override {
     const auto* known = dynamic_cast<const FakeImage*>(&image);
-    if (known == nullptr) return misuse("an encoder gets an image of another service");
-    if (imagesLeft_ == 0) return misuse("an encoder gets more images than it was made for");
+    if (known == nullptr) return misuse("an encoder receives an image of another service");
+    if (imagesLeft_ == 0) return misuse("an encoder receives more images than announced");
     if (journal_.beforeCall("pngEncoder.addImage")) return;
     --imagesLeft_;
     encoded_ += FakePNGEncoders::pngOf(known->iconFile());
   }
 
   [[nodiscard]] bool finalize() override {
-    if (std::exchange(isFinished_, true)) misuse("an encoder is finished twice");
+    if (std::exchange(isFinished_, true)) misuse("an encoder is finalized twice");
     if (journal_.beforeCall("pngEncoder.finalize")) return false;
     if (failure_ == EncoderFailure::finalization || imagesLeft_ != 0) return false;
     const ByteView bytes = bytesOf(encoded_);

@@ -1,4 +1,4 @@
-// Icons and their encoders.
+// Icons and PNG encoders.
 #pragma once
 
 #include <cstddef>
@@ -13,7 +13,7 @@
 
 namespace appsync::test {
 
-/// Renders a bundle whose info dictionary names an icon file that is there and not empty. Journal line:
+/// Renders a bundle whose info dictionary names an existing icon file that is not empty. Journal line:
 /// "iconRenderer.createHomeScreenIconImage /path".
 class FakeIconRenderer final : public platform::IconRenderer {
  public:
@@ -29,7 +29,7 @@ class FakeIconRenderer final : public platform::IconRenderer {
 enum class EncoderFailure { none, creation, finalization };
 
 /// Journal lines: "pngEncoders.createEncoder", "pngEncoder.addImage", "pngEncoder.finalize".
-/// Fails the test when an encoder gets more images than it was made for or one of another service, or is finished
+/// Fails the test if an encoder receives more images than announced or an image of another service, or is finalized
 /// twice.
 class FakePNGEncoders final : public platform::PNGEncoders {
  public:
@@ -37,7 +37,7 @@ class FakePNGEncoders final : public platform::PNGEncoders {
 
   void fail(EncoderFailure failure);
 
-  /// What an encoder makes of the icon with these contents.
+  /// Returns the encoding of an icon with these contents.
   [[nodiscard]] static std::string pngOf(std::string_view iconFile);
 
   [[nodiscard]] std::unique_ptr<platform::PNGEncoder> createEncoder(Bytes& destination,

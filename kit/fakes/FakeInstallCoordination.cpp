@@ -56,9 +56,9 @@ FakeInstallCoordination::~FakeInstallCoordination() {
   gate.open();
   waitUntilIdle();
   if (std::ranges::any_of(connections(), &Connection::isOpen)) {
-    misuse("install coordination goes while a connection is open");
+    misuse("install coordination is destroyed while a connection is open");
   }
-  if (state_->held != 0) misuse("install coordination goes while something of it is held");
+  if (state_->held != 0) misuse("install coordination is destroyed while an object of it is held");
 }
 
 bool FakeInstallCoordination::coordinationIsEnabled() {

@@ -13,7 +13,7 @@
 
 namespace appsync::test {
 
-/// Off at first, and at first it does nothing of itself: a test says when a coordinator goes on. Journal lines:
+/// Initially disabled, and without automatic actions: tests trigger each event. Journal lines:
 /// "installCoordination.coordinatorForApp initiating com.a create" (or "find"),
 /// "installCoordination.initAppPlaceholder com.a 4 Name", "installCoordination.makePromisedTransferToPath com.a-Asset 0
 /// /path" (or without a path), "installCoordination.makePromisedOutOfBandTransfer com.a-UserData 0",
@@ -21,7 +21,7 @@ namespace appsync::test {
 /// "installCoordination.coordinationIsEnabled", "installCoordination.initWithMachServiceName name",
 /// "installCoordination.close name".
 ///
-/// Of what it hands out, each call but `name`, `client`, `kind`, `description` and whatever else never changes:
+/// For the objects that it returns, each call except getters of constant values (`name`, `client`, `kind`, ...):
 /// "coordinator.hasInstallOptions com.a", "coordinator.setInitialODRAssetPromises com.a 0" (how many),
 /// "coordinator.setAppAssetPromise com.a com.a-Asset", "coordinator.setPlaceholderPromise com.a" (or "com.a none"),
 /// "coordinator.setAppAssetPromiseResponsibleClient com.a 1", "coordinator.cancelForReason com.a ZTError 30 3" (domain,
@@ -29,8 +29,8 @@ namespace appsync::test {
 /// "promise.setPercentComplete com.a-Asset 0.5", "promise.setComplete com.a-Asset", "promise.setTransferPath
 /// com.a-Asset /path", "promise.cancelForReason com.a-Asset ZTError 30 3" and so on.
 ///
-/// Fails the test when it goes while a connection is open or something that it handed out is held, when a client drives
-/// a coordinator of another one, and when it is given what is not its own.
+/// Fails the test if it is destroyed while a connection is open or an object of it is held, if a client changes a
+/// coordinator of another client, or if it receives an object of another service.
 class FakeInstallCoordination final : public platform::InstallCoordination {
  public:
   using Connection = CoordinationState::Connection;
@@ -41,41 +41,42 @@ class FakeInstallCoordination final : public platform::InstallCoordination {
   FakeInstallCoordination& operator=(const FakeInstallCoordination&) = delete;
 
   void enable();
-  /// From now on coordinators go on as the contract says, on a thread of the service's: placeholders are shown in the
-  /// registry, apps installed there from their packages, observers told.
+  /// Enables automatic actions, on a thread of the service: coordinators show placeholders in the registry, install
+  /// packages there and notify observers as the contract says.
   void installAutomatically();
   void completeUninstalls(CallbackOn where);
 
-  /// Failures of calls, by what they are about: `failNext("coordinator.setInstallOptions", "com.a", error)`, promises
-  /// by their name; and of `kShowingPlaceholder`. That an install fails is the registry's matter.
+  /// Failures by operation and subject: `failNext("coordinator.setInstallOptions", "com.a", error)`. The subject of a
+  /// promise is its name. `kShowingPlaceholder` is an operation too. To make an install fail, use the registry's
+  /// failures.
   FailurePlan<std::string>& failures;
-  /// Stops the service's thread before each step: showing, installing, uninstalling, a callback.
+  /// Stops the service's thread before each action: showing, installing, uninstalling, a callback.
   Gate& gate;
-  /// Blocks until everything has been done and told.
+  /// Blocks until there are no pending actions or callbacks.
   void waitUntilIdle() { state_->thread().waitUntilIdle(); }
-  /// With a closed gate: lets everything be done and told, then closes it again.
+  /// Opens a closed gate until there are no pending actions or callbacks, then closes it.
   void runUntilIdle();
 
-  // What is there. All are copies; of several the latest.
+  // Contents, as copies. If several objects match, the latest.
   void add(const FakeCoordinator& coordinator);
   [[nodiscard]] std::optional<FakeCoordinator> coordinator(std::string_view identifier) const;
   [[nodiscard]] std::vector<FakeCoordinator> coordinators() const;
-  /// Those that are no more, in the order in which they ended.
+  /// Ended coordinators, in the order of their ends.
   [[nodiscard]] std::vector<FakeCoordinator> endedCoordinators() const;
-  /// Every placeholder, every promise that was ever made, in order; also those that were dropped.
+  /// Every placeholder and promise ever created, in order, including destroyed ones.
   [[nodiscard]] std::vector<FakePlaceholder> placeholders() const;
   [[nodiscard]] std::optional<FakePlaceholder> placeholder(std::string_view identifier) const;
   [[nodiscard]] std::vector<FakePromise> promises() const;
   [[nodiscard]] std::optional<FakePromise> promise(std::string_view name) const;
-  /// Names of promises and identifiers of placeholders that are neither somebody's nor cancelled.
+  /// Names of promises and identifiers of placeholders that are neither attached nor cancelled.
   [[nodiscard]] std::vector<std::string> abandoned() const;
-  /// Every connection that was ever opened, in order.
+  /// Every connection ever opened, in order.
   [[nodiscard]] std::vector<Connection> connections() const;
 
-  // What happens to the app's first coordinator, and is told. On the calling thread it has been told on return.
+  // Events of the app's first coordinator, with their callbacks; those on the calling thread run before the return.
   void didInstallPlaceholder(std::string_view identifier, std::optional<Error> error = std::nullopt,
                              CallbackOn where = CallbackOn::ownThread);
-  /// The coordinator is gone then; nothing is installed.
+  /// Ends the coordinator. Installs nothing.
   void complete(std::string_view identifier, std::optional<Error> error = std::nullopt,
                 CallbackOn where = CallbackOn::ownThread);
   void prioritize(std::string_view identifier, CallbackOn where = CallbackOn::ownThread);
@@ -110,7 +111,7 @@ class FakeInstallCoordination final : public platform::InstallCoordination {
   class Observer;
 
   explicit FakeInstallCoordination(std::shared_ptr<CoordinationState> state);
-  /// Makes something happen to the app's first coordinator; fails the test when there is none.
+  /// Applies `event` to the app's first coordinator. Fails the test if there is none.
   template <class Event>
   void happen(std::string_view identifier, CallbackOn where, const Event& event);
   void tell(std::string_view identifier, CallbackOn where,

@@ -1,4 +1,4 @@
-// What tests see of a fake install-coordination service, and what they make happen there.
+// Inspection and events of a fake install-coordination service.
 #include <algorithm>
 #include <utility>
 
@@ -28,7 +28,7 @@ void FakeInstallCoordination::runUntilIdle() {
   gate.close();
 }
 
-// What is there.
+// Contents.
 
 namespace {
 
@@ -118,7 +118,7 @@ std::vector<FakeInstallCoordination::Connection> FakeInstallCoordination::connec
   return state_->read([this] { return state_->connections; });
 }
 
-// What happens.
+// Events.
 
 template <class Event>
 void FakeInstallCoordination::happen(std::string_view identifier, CallbackOn where, const Event& event) {

@@ -17,7 +17,7 @@ std::shared_ptr<FakePromise> ownPromise(InstallPromise* promise) {
   if (promise == nullptr) return nullptr;
   if (auto* transfer = dynamic_cast<FakePromisedTransferToPath*>(promise)) return transfer->promise();
   if (auto* transfer = dynamic_cast<FakePromisedOutOfBandTransfer*>(promise)) return transfer->promise();
-  misuse("a promise that is not the service's");
+  misuse("a promise of another service");
   return nullptr;
 }
 
@@ -176,7 +176,7 @@ Status FakeInstallCoordinator::setPlaceholderPromise(std::shared_ptr<platform::P
     if (!placeholder) return coordinationError("there is no placeholder");
     const auto* own = dynamic_cast<FakeAppPlaceholder*>(placeholder.get());
     if (own == nullptr) {
-      misuse("a placeholder that is not the service's");
+      misuse("a placeholder of another service");
       return coordinationError("the placeholder is not the service's");
     }
     FakePlaceholder& given = *own->placeholder();

@@ -1,4 +1,4 @@
-// What the fake install-coordination service hands out: coordinators, placeholders and promises.
+// The objects of the fake install-coordination service: coordinators, placeholders and promises.
 #pragma once
 
 #include <memory>
@@ -9,13 +9,13 @@
 
 namespace appsync::test {
 
-/// Of a cancellation, for journal lines: "ZTError 30 3".
+/// Returns the text of a cancellation in journal lines: "ZTError 30 3".
 [[nodiscard]] std::string textOf(const Error& reason, platform::ClientIdentity client);
 
-/// In a change: puts a promise where none is; fails when it cannot be put there.
+/// Attaches a promise, within a change. Fails if it cannot be attached.
 [[nodiscard]] Status attach(std::shared_ptr<FakePromise>& place, platform::InstallPromise* promise);
 
-/// Says that one more thing of the service is held, as long as it lives.
+/// Counts as one held object of the service during its lifetime.
 class HeldThing {
  public:
   explicit HeldThing(std::shared_ptr<CoordinationState> state) : state_(std::move(state)) { ++state_->held; }
@@ -50,7 +50,7 @@ class FakeInstallPromise : public Interface {
   [[nodiscard]] const std::shared_ptr<FakePromise>& promise() const { return promise_; }
 
  protected:
-  /// Changes the promise unless it is over with it.
+  /// Changes the promise unless it was cancelled or has ended.
   template <class Change>
   void change(const Change& change);
 
@@ -91,7 +91,7 @@ class FakeAppPlaceholder final : public platform::Placeholder {
   [[nodiscard]] const std::shared_ptr<FakePlaceholder>& placeholder() const { return placeholder_; }
 
  private:
-  /// Carries out a call as long as the placeholder can be configured.
+  /// Runs `change` if the placeholder can still be configured.
   template <class Change>
   Status configure(std::string_view operation, std::string_view arguments, const Change& change);
 
@@ -102,7 +102,7 @@ class FakeAppPlaceholder final : public platform::Placeholder {
 /// Described as "<initiating coordinator com.a>".
 class FakeInstallCoordinator final : public platform::InstallCoordinator {
  public:
-  /// A handle of a client's.
+  /// A handle of `client`.
   FakeInstallCoordinator(std::shared_ptr<CoordinationState> state, std::shared_ptr<FakeCoordinator> coordinator,
                          platform::ClientIdentity client)
       : state_(std::move(state)), coordinator_(std::move(coordinator)), client_(client) {}
@@ -133,11 +133,11 @@ class FakeInstallCoordinator final : public platform::InstallCoordinator {
   [[nodiscard]] std::optional<Error> begin(std::string_view operation, std::string_view arguments = {}) const;
   template <class Field>
   [[nodiscard]] bool has(std::string_view operation, Field FakeCoordinator::*field) const;
-  /// Carries out a call that makes `field` another one, once, as long as the coordinator lives.
+  /// Runs `change` if `field` is not set and the coordinator has not ended.
   template <class Field, class Change>
   Status set(std::string_view operation, Field FakeCoordinator::*field, std::string_view arguments,
              const Change& change);
-  /// Fails the test when the handle's client may not do this.
+  /// Fails the test if the handle's client may not call `operation`.
   void checkDriver(std::string_view operation) const;
 
   const HeldThing state_;

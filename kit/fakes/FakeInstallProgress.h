@@ -1,4 +1,4 @@
-// Progress of one app's install, with every call to it kept.
+// Progress of one app's install; records every call.
 #pragma once
 
 #include <cstdint>
@@ -13,7 +13,7 @@
 
 namespace appsync::test {
 
-/// Begins as Waiting and Loading, with 0 of 100 units. Described as "progress of <identifier>". Threads: any.
+/// Initially Waiting and Loading, with 0 of 100 units. Described as "progress of <identifier>". Thread-safe.
 class FakeInstallProgress final : public platform::InstallProgress {
  public:
   explicit FakeInstallProgress(std::string identifier,
@@ -23,22 +23,22 @@ class FakeInstallProgress final : public platform::InstallProgress {
 
   [[nodiscard]] const std::string& identifier() const { return identifier_; }
 
-  /// The setters' calls in order, as "setInstallState 1", "setCompletedUnitCount 456", "cancel".
+  /// Calls of setters, in order: "setInstallState 1", "setCompletedUnitCount 456", "cancel".
   [[nodiscard]] std::vector<std::string> calls() const;
 
-  /// For the registry, which detaches before it goes. Both are called on the setter's thread.
+  /// For the registry, which detaches before its destruction. Both are called on the setter's thread.
   struct Listener {
-    /// Asked at each setter's call; false makes the setter do nothing.
+    /// Called by each setter; false makes the setter do nothing.
     std::function<bool(std::string_view call)> mayCall;
-    /// The install was given up.
+    /// The install was cancelled.
     std::function<void()> wasCancelled;
   };
   void attach(Listener listener);
   void detach() { attach({}); }
 
-  /// The install is over: setters are without effect from now on.
+  /// Ends the install: setters have no effect from now on.
   void end(platform::TSInstallState lastState);
-  /// Moves on to a phase, as the installer does.
+  /// Begins a phase, as the installer does.
   void enter(platform::TSInstallPhase phase);
 
   [[nodiscard]] platform::TSInstallState installState() const override;
@@ -53,12 +53,12 @@ class FakeInstallProgress final : public platform::InstallProgress {
   [[nodiscard]] std::string description() const override { return "progress of " + identifier_; }
 
  private:
-  /// Whether the value took effect.
+  /// Returns false if the setter must have no effect.
   template <class T>
   bool set(std::string call, T& field, T value);
 
   const std::string identifier_;
-  /// Held while the listener is told, so that it can go.
+  /// Held while the listener is called, so that detaching waits for the call.
   std::recursive_mutex listenerMutex_;
   Listener listener_;
   mutable std::mutex mutex_;

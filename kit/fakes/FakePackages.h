@@ -1,4 +1,4 @@
-// Packages as the fake registry understands them.
+// Packages of the fake registry.
 #pragma once
 
 #include <cstdint>
@@ -18,25 +18,25 @@ enum class PackageKind { app, placeholder };
 
 struct FakePackage {
   PackageKind kind = PackageKind::app;
-  std::optional<std::string> version;  ///< none when the package does not tell
-  std::uint64_t size = 0;              ///< of the package, or of a placeholder's info dictionary, in bytes
+  std::optional<std::string> version;  ///< nullopt if the package has none
+  std::uint64_t size = 0;              ///< bytes of the package or of a placeholder's info dictionary
 };
 
-/// The bytes of a package that tells its identifier and version. (Any other bytes are a package of any app.)
+/// Returns a package with identifier and version. Any other bytes are a package of any app.
 [[nodiscard]] Bytes packageOf(std::string_view identifier, std::string_view version);
 
-/// An error of the installer's own domain.
+/// Returns an error of the installer's domain.
 [[nodiscard]] Error installerError(std::string text);
 
-/// The app that install options name; empty when they name none.
+/// Returns the app in the install options, or an empty text.
 [[nodiscard]] std::string identifierIn(const plist::Dictionary& options);
 
-/// Reads what is to be installed; fails as an installer would when it is not there, empty, another app's, or of a kind
-/// that the options do not name.
+/// Reads the package or placeholder at `location`. Fails if it is missing, empty, of another app, or not of the kind in
+/// the options.
 [[nodiscard]] Result<FakePackage> readPackage(FakeFileSystem& files, const platform::FileLocation& location,
                                               const plist::Dictionary& options);
 
-/// What the app's record becomes when the package has been installed.
+/// Returns the app's state after the package is installed.
 void applyPackage(FakeApp& app, const FakePackage& package, const plist::Dictionary& options);
 
 }  // namespace appsync::test

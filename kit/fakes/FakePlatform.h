@@ -1,4 +1,4 @@
-// A whole device of fakes.
+// A platform of fakes.
 #pragma once
 
 #include <functional>
@@ -26,19 +26,18 @@
 
 namespace appsync::test {
 
-/// Every service is a stateful fake, open to tests as a member, and may be replaced by `use`:
+/// Each service is a stateful fake, accessible to tests as a member, and can be replaced by `use`:
 ///
 ///     FakePlatform platform;
 ///     platform.registry.add(FakeApp::placeholder("com.a"));
 ///     platform.use(myHomeScreen);
 ///
-/// Each fake's comment says what it does, what it notes in the journal and what misuse it catches; one that mentions no
-/// misuse catches none. Whoever uses the platform must be gone before it: the services fail the test when something of
-/// theirs is still held.
+/// Each fake documents its behaviour, its journal lines and the misuse that it detects. Clients must be destroyed
+/// before the platform: a service fails the test if an object of it is still held.
 ///
-/// The fakes know each other, not what replaces them: registry, bundles, icons and coordination look for files in
-/// `files`, coordination installs into `registry`, and `registry` enters removals in `uninstalledList`. Whoever
-/// replaces one of these three replaces those that look there as well, or sees to it that nothing is missed.
+/// The fakes use each other, not their replacements: registry, bundles, icons and coordination read from `files`,
+/// coordination installs into `registry`, and `registry` adds removals to `uninstalledList`. To replace one of these
+/// three, also replace the fakes that use it.
 class FakePlatform final : public platform::Platform {
  public:
   CallJournal journal;
@@ -57,13 +56,13 @@ class FakePlatform final : public platform::Platform {
   FakePNGEncoders encoders{journal};
   FakeBackups backups{journal};
   FakeStore store{journal};
-  // What these still have to tell when they go reaches the others.
+  // Destroyed before the services above, which may receive their last callbacks.
   FakeDeviceService deviceService{journal};
   FakeInstallCoordination coordination{journal, files, registry};
-  /// Clock and scheduler. Goes first, with the tasks that are still to come and all that these keep alive.
+  /// Clock and scheduler. Destroyed first, with its pending tasks and everything that they own.
   VirtualTime time;
 
-  // The replacement stays the caller's and must outlive the platform.
+  // The caller owns the replacement, which must outlive the platform.
   void use(platform::SyncFramework& service) { syncFramework_ = &service; }
   void use(platform::ZTDeviceService& service) { sharedInstance_ = &service; }
   void use(platform::AppRegistry& service) { defaultRegistry_ = &service; }

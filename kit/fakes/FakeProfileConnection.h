@@ -1,4 +1,4 @@
-// Restrictions that profiles place on the device.
+// Restrictions that configuration profiles impose on the device.
 #pragma once
 
 #include <map>
@@ -9,7 +9,7 @@
 
 namespace appsync::test {
 
-/// Everything is unset at first. Journal line: "profileConnection.effectiveBoolValueForSetting appRemovalAllowed".
+/// All settings are initially unset. Journal line: "profileConnection.effectiveBoolValueForSetting appRemovalAllowed".
 class FakeProfileConnection final : public platform::ProfileConnection {
  public:
   explicit FakeProfileConnection(CallJournal& journal) : journal_(journal) {}

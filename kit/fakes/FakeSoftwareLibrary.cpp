@@ -21,7 +21,7 @@ class FakeStore::Connection final : public platform::SoftwareLibrary {
 };
 
 FakeStore::~FakeStore() {
-  if (connections_ != 0) misuse("the store goes while a connection is open");
+  if (connections_ != 0) misuse("the store is destroyed while a connection is open");
 }
 
 void FakeStore::completeRefreshes(RefreshCompletion when, std::optional<Error> error) {
@@ -85,7 +85,7 @@ void FakeStore::close(Connection& connection) {
   --connections_;
   const auto pending = std::ranges::find(pending_, &connection, &Pending::connection);
   if (pending == pending_.end()) return;
-  misuse("a connection to the store goes before its refresh completed");
+  misuse("a connection to the store is destroyed before its refresh completed");
   std::erase_if(pending_, [&](const Pending& refresh) { return refresh.connection == &connection; });
 }
 

@@ -15,7 +15,7 @@
 
 namespace appsync::test {
 
-/// When a refresh of receipts completes.
+/// The time at which a refresh of receipts completes.
 enum class RefreshCompletion {
   beforeReturn,
   onOwnThread,
@@ -23,8 +23,8 @@ enum class RefreshCompletion {
 };
 
 /// The store behind all connections. Journal lines: "softwareLibrary.make", "softwareLibrary.refreshReceipts",
-/// "softwareLibrary.release". Fails the test when a connection goes before its completion began, and when the store
-/// goes while a connection is open.
+/// "softwareLibrary.release". Fails the test if a connection is destroyed before its completion has begun, or the store
+/// is destroyed while a connection is open.
 class FakeStore {
  public:
   explicit FakeStore(CallJournal& journal) : journal_(journal) {}
@@ -33,9 +33,9 @@ class FakeStore {
   FakeStore& operator=(const FakeStore&) = delete;
 
   void completeRefreshes(RefreshCompletion when, std::optional<Error> error = std::nullopt);
-  /// Completes, on the calling thread, the refreshes that wait for it.
+  /// Completes the pending refreshes on the calling thread.
   void complete();
-  /// Blocks until `count` refreshes wait to be completed.
+  /// Blocks until `count` refreshes are pending.
   void waitUntilPending(std::size_t count);
 
   [[nodiscard]] std::unique_ptr<platform::SoftwareLibrary> connect();

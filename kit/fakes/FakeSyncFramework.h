@@ -17,7 +17,7 @@
 
 namespace appsync::test {
 
-/// An asset whose restore flag answers as told: first the given answers in order, then the last one for ever.
+/// An asset whose restore flag changes: returns the given values in order, then the last one.
 class ReclassifiedAsset final : public platform::ZTAsset {
  public:
   ReclassifiedAsset(std::string identifier, std::vector<bool> answers)
@@ -31,8 +31,8 @@ class ReclassifiedAsset final : public platform::ZTAsset {
   std::vector<bool> answers_;
 };
 
-/// Takes no error for recoverable unless told. Journal lines: "syncFramework.ZTIsRecoverableError",
-/// "syncFramework.downloadAssetWithIdentifier com.a". Categories of the log are not journaled.
+/// By default no error is recoverable. Journal lines: "syncFramework.ZTIsRecoverableError",
+/// "syncFramework.downloadAssetWithIdentifier com.a". Look-ups of log categories are not journaled.
 class FakeSyncFramework final : public platform::SyncFramework {
  public:
   struct Download {
@@ -47,7 +47,7 @@ class FakeSyncFramework final : public platform::SyncFramework {
   using Judge = std::function<bool(const Error& error)>;
   void judgeErrorsBy(Judge isRecoverable);
 
-  /// The assets that were asked for.
+  /// The assets created so far.
   [[nodiscard]] std::vector<Download> downloads() const;
 
   [[nodiscard]] LogCategory& ZTGetLogCategory(int number) override { return log_.category(number); }

@@ -23,7 +23,8 @@ std::ostream& operator<<(std::ostream& out, const Post& post) {
 }
 
 FakeSystemNotify::~FakeSystemNotify() {
-  if (!observations_.empty()) misuse("notifications go while they are observed: " + observations_.front().name);
+  if (!observations_.empty())
+    misuse("the notification service is destroyed while an observer is registered: " + observations_.front().name);
 }
 
 void FakeSystemNotify::failRegistrationsWith(std::uint32_t status) {
@@ -63,7 +64,7 @@ void FakeSystemNotify::tellObservers(std::string_view name, const void* sender) 
 void FakeSystemNotify::addObserver(void* observer, Callback callback, std::string_view name, const void* object,
                                    platform::SuspensionBehavior) {
   static_cast<void>(journal_.beforeCall("systemNotify.addObserver", name));
-  if (callback == nullptr) return misuse("notifications are observed without a callback");
+  if (callback == nullptr) return misuse("an observer is registered without a callback");
   const std::scoped_lock lock(mutex_);
   observations_.push_back({observer, callback, std::string(name), object, thread_.subscribe()});
 }

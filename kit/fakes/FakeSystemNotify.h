@@ -16,7 +16,7 @@
 
 namespace appsync::test {
 
-/// One post, with the state that its name had then.
+/// One post, with the state of its name at that time.
 struct Post {
   std::string name;
   std::uint64_t state = 0;
@@ -24,9 +24,9 @@ struct Post {
 };
 std::ostream& operator<<(std::ostream& out, const Post& post);
 
-/// Calls observers back on a thread of its own. Journal lines: "systemNotify.addObserver name",
-/// "systemNotify.registerCheck name", "systemNotify.setState name 1", "systemNotify.post name". Fails the test when it
-/// goes while it is observed, when there is no callback, and when a state is set with a token that it did not give.
+/// Calls observers on a separate thread. Journal lines: "systemNotify.addObserver name",
+/// "systemNotify.registerCheck name", "systemNotify.setState name 1", "systemNotify.post name". Fails the test if it
+/// is destroyed while an observer is registered, if a callback is null, or if a token is invalid.
 class FakeSystemNotify final : public platform::SystemNotify {
  public:
   explicit FakeSystemNotify(CallJournal& journal) : journal_(journal) {}
@@ -34,15 +34,15 @@ class FakeSystemNotify final : public platform::SystemNotify {
   FakeSystemNotify(const FakeSystemNotify&) = delete;
   FakeSystemNotify& operator=(const FakeSystemNotify&) = delete;
 
-  /// From now on registrations for tokens end with this status; 0 ends it.
+  /// Sets the status of all later registrations; 0 means success.
   void failRegistrationsWith(std::uint32_t status);
 
-  /// Every post by a client, in order.
+  /// Posts by clients, in order.
   [[nodiscard]] std::vector<Post> posts() const;
   [[nodiscard]] std::uint64_t state(std::string_view name) const;
   [[nodiscard]] std::size_t observerCount(std::string_view name) const;
 
-  /// Posts as somebody else, and waits until all observers have been called.
+  /// Posts as another process. Blocks until all observers were called.
   void deliver(std::string_view name, const void* sender = nullptr);
 
   void addObserver(void* observer, Callback callback, std::string_view name, const void* object,

@@ -64,7 +64,7 @@ void FakeTransactionLog::initializeWithLog(std::shared_ptr<platform::SystemLogHa
 }
 
 void FakeTransactionLog::checkInitialized() const {
-  if (log_ == nullptr) misuse("an entry comes before the transaction log has a log");
+  if (log_ == nullptr) misuse("an entry is logged before the transaction log has a log");
 }
 
 void FakeTransactionLog::logStep(platform::TransactionStep step, platform::TransactionParty party,

@@ -1,4 +1,4 @@
-// The device's record of transactions, and the system's log that it writes to.
+// The transaction log and the system log.
 #pragma once
 
 #include <cstdint>
@@ -36,7 +36,7 @@ class FakeSystemLog final : public platform::SystemLog {
 
 enum class Success : bool { no, yes };
 
-/// One event of a scenario as the transaction log received it.
+/// One event of a scenario.
 struct ScenarioEntry {
   std::string scenario;
   Success success = Success::yes;
@@ -59,14 +59,14 @@ struct StepEntry {
 std::ostream& operator<<(std::ostream& out, const StepEntry& entry);
 
 /// Journal lines: "transactionLog.initializeWithLog", "transactionLog.logScenario Harvo Sync com.a y Uninstall
-/// succeeded". Fails the test when an entry comes before a log to write to, and when it is given none.
+/// succeeded". Fails the test if an entry precedes `initializeWithLog`, or if the log is null.
 class FakeTransactionLog final : public platform::TransactionLog {
  public:
   explicit FakeTransactionLog(CallJournal& journal) : journal_(journal) {}
 
   [[nodiscard]] std::vector<ScenarioEntry> scenarios() const;
   [[nodiscard]] std::vector<StepEntry> steps() const;
-  /// The handle that it was given last; null before the first.
+  /// The latest handle; null before `initializeWithLog`.
   [[nodiscard]] std::shared_ptr<FakeSystemLogHandle> log() const;
 
   void initializeWithLog(std::shared_ptr<platform::SystemLogHandle> log) override;

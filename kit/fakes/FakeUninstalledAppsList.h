@@ -1,4 +1,4 @@
-// The installer's memory of removed apps.
+// The installer's list of removed apps.
 #pragma once
 
 #include <mutex>
@@ -21,9 +21,9 @@ class FakeUninstalledAppsList final : public platform::UninstalledAppsList {
   void remove(std::string_view identifier);
   [[nodiscard]] std::set<std::string> identifiers() const;
 
-  /// From now on a look-up has no answer.
+  /// Makes all later look-ups return nullopt.
   void loseAnswers();
-  /// From now on clearing fails with this number; 0 ends it.
+  /// Sets the error number of all later clearing; 0 means success.
   void failClearingWith(int errorNumber);
 
   [[nodiscard]] std::optional<plist::Dictionary> lookupUninstalled() override;

@@ -1,4 +1,4 @@
-// Stops threads at a chosen place until a test lets them go on.
+// Stops threads until a test lets them continue.
 #pragma once
 
 #include <condition_variable>
@@ -7,11 +7,11 @@
 
 namespace appsync::test {
 
-/// Open at first. Threads: any.
+/// Initially open. Thread-safe.
 class Gate {
  public:
   void close();
-  /// Lets everyone go on.
+  /// Lets all stopped threads continue.
   void open();
 
   /// Blocks while the gate is closed.

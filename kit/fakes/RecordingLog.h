@@ -1,4 +1,4 @@
-// A log that keeps every line.
+// A log that records every line.
 #pragma once
 
 #include <map>
@@ -27,26 +27,25 @@ std::ostream& operator<<(std::ostream& out, const LogLine& line);
 
 using LogLines = std::vector<LogLine>;
 
-/// Lines of the plug-in as tests expect them: the text without the plug-in's identifier and bar.
+/// Return a line of the plug-in, for comparison. `text` omits the plug-in's identifier and bar.
 [[nodiscard]] LogLine logged(std::string_view text);                  ///< category 8, default level
 [[nodiscard]] LogLine loggedError(std::string_view text);             ///< category 8, error level
 [[nodiscard]] LogLine loggedIn(int category, std::string_view text);  ///< default level
 
-/// The categories of a sync framework's log; everything is enabled at first. Threads: any, also while lines are
-/// written.
+/// The categories of a sync framework's log, initially all enabled. Thread-safe.
 class RecordingLog {
  public:
-  /// Made on first use; lives as long as the log.
+  /// Returns a category, created on first use, which lives as long as the log.
   [[nodiscard]] LogCategory& category(int number);
 
   void enable(int category, LogLevel level);
   void disable(int category, LogLevel level);
-  void disable(int category);  ///< on all levels
+  void disable(int category);  ///< at all levels
 
-  /// All lines, or those of a category, in order.
+  /// Return all lines, or those of a category, in order.
   [[nodiscard]] LogLines lines() const;
   [[nodiscard]] LogLines lines(int category) const;
-  /// The same as texts without the plug-in's identifier and bar.
+  /// Returns the texts of the lines, without the plug-in's identifier and bar.
   [[nodiscard]] std::vector<std::string> messages() const;
   [[nodiscard]] std::vector<std::string> messages(int category) const;
   [[nodiscard]] bool contains(const LogLine& line) const;
@@ -64,7 +63,7 @@ class RecordingLog {
   LogLines lines_;
 };
 
-/// Succeeds when both are equal, else shows what is missing and what is too much.
+/// Succeeds if both are equal, else shows missing and unexpected lines.
 [[nodiscard]] testing::AssertionResult sameLines(const LogLines& expected, const LogLines& actual);
 
 }  // namespace appsync::test

@@ -1,4 +1,4 @@
-// A folder of this machine that lasts as long as a test needs it.
+// A temporary directory on the host.
 #pragma once
 
 #include <filesystem>
@@ -9,7 +9,7 @@
 
 namespace appsync::test {
 
-/// Empty at first; removed with all that is in it.
+/// Initially empty. The destructor removes it with its contents.
 class TemporaryFolder {
  public:
   TemporaryFolder() : path_((std::filesystem::temp_directory_path() / "appsync-test.XXXXXX").string()) {
@@ -23,7 +23,7 @@ class TemporaryFolder {
   TemporaryFolder& operator=(const TemporaryFolder&) = delete;
 
   [[nodiscard]] const std::string& path() const { return path_; }
-  /// The path of `name` in it.
+  /// Returns the path of `name` in the directory.
   [[nodiscard]] std::string path(std::string_view name) const { return path_ + "/" + std::string(name); }
 
  private:

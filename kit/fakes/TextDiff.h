@@ -1,4 +1,4 @@
-// Differences between two lists of lines, for people.
+// Readable differences between two lists of lines.
 #pragma once
 
 #include <string>
@@ -8,8 +8,8 @@
 
 namespace appsync::test {
 
-/// Succeeds when both are equal; else shows the lines in order, "-" before those that are missing and "+" before those
-/// that are too many: `EXPECT_TRUE(sameLines({"registry.addObserver"}, platform.journal.lines({"registry."})))`.
+/// Succeeds if both are equal; else shows all lines in order, "-" before missing and "+" before unexpected ones:
+/// `EXPECT_TRUE(sameLines({"registry.addObserver"}, platform.journal.lines({"registry."})))`.
 [[nodiscard]] testing::AssertionResult sameLines(const std::vector<std::string>& expected,
                                                  const std::vector<std::string>& actual);
 

@@ -1,4 +1,4 @@
-// Work on many threads at once.
+// Runs work on several threads.
 #pragma once
 
 #include <cstddef>
@@ -6,8 +6,7 @@
 
 namespace appsync::test {
 
-/// Runs `work(0)` to `work(count - 1)`, each on a thread of its own, all starting together; returns when all have
-/// ended.
+/// Runs `work(0)` to `work(count - 1)`, each on its own thread, starting at the same time. Blocks until all have ended.
 void runOnThreads(std::size_t count, const std::function<void(std::size_t index)>& work);
 
 }  // namespace appsync::test

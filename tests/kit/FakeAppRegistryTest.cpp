@@ -51,7 +51,7 @@ class FakeAppRegistryTest : public testing::Test {
   FakePlatform platform;
 };
 
-TEST_F(FakeAppRegistryTest, InstallsMayBeHeldAndLookedAt) {
+TEST_F(FakeAppRegistryTest, GateHoldsInstalls) {
   platform.registry.installGate.close();
   std::vector<std::jthread> threads;
   for (int index = 0; index < 3; ++index) {
@@ -66,13 +66,13 @@ TEST_F(FakeAppRegistryTest, InstallsMayBeHeldAndLookedAt) {
   EXPECT_EQ(platform.registry.identifiers(), (Lines{"com.a0", "com.a1", "com.a2"}));
 }
 
-TEST_F(FakeAppRegistryTest, InstallsOneAfterTheOtherAreNeverAtOnce) {
+TEST_F(FakeAppRegistryTest, CountsNoConcurrencyOfSequentialInstalls) {
   EXPECT_TRUE(install("com.a").ok());
   EXPECT_TRUE(install("com.b").ok());
   EXPECT_EQ(platform.registry.mostInstallsAtOnce(), 1U);
 }
 
-TEST_F(FakeAppRegistryTest, AnInstallsOptionsAndLocationAreKept) {
+TEST_F(FakeAppRegistryTest, RecordsOptionsAndLocationOfInstalls) {
   EXPECT_TRUE(install("com.a").ok());
   const auto installs = platform.registry.installs();
   ASSERT_EQ(installs.size(), 1U);
@@ -81,7 +81,7 @@ TEST_F(FakeAppRegistryTest, AnInstallsOptionsAndLocationAreKept) {
   EXPECT_EQ(installs[0].options.size(), 2U);
 }
 
-TEST_F(FakeAppRegistryTest, AnInjectedFailureChangesNothing) {
+TEST_F(FakeAppRegistryTest, InjectedFailureChangesNothing) {
   platform.registry.failures.failNext(RegistryOperation::installApplication, "com.a", kFailure);
   EXPECT_EQ(install("com.a").failure(), kFailure);
   EXPECT_EQ(platform.registry.identifiers(), Lines());
@@ -89,7 +89,7 @@ TEST_F(FakeAppRegistryTest, AnInjectedFailureChangesNothing) {
   EXPECT_TRUE(install("com.a").ok());
 }
 
-TEST_F(FakeAppRegistryTest, AnInjectedFailureKeepsAnAppFromBeingRemoved) {
+TEST_F(FakeAppRegistryTest, InjectedFailureLeavesTheApp) {
   platform.registry.add(FakeApp::installed("com.a"));
   platform.registry.failures.failAlways(RegistryOperation::uninstallApplication, "com.a", kFailure);
   EXPECT_EQ(platform.registry.uninstallApplication("com.a").failure(), kFailure);
@@ -97,7 +97,7 @@ TEST_F(FakeAppRegistryTest, AnInjectedFailureKeepsAnAppFromBeingRemoved) {
   EXPECT_EQ(platform.registry.uninstalls(), (std::vector<FakeAppRegistry::Uninstall>{{"com.a", {}}}));
 }
 
-TEST_F(FakeAppRegistryTest, ObserversHearTheOrderThatWasSet) {
+TEST_F(FakeAppRegistryTest, ObserversReceiveTheInstallOrder) {
   platform.registry.add(FakeApp::placeholder("com.a"));
   platform.registry.add(FakeApp::installed("com.b"));
   platform.registry.add(FakeApp::placeholder("com.c"));
@@ -110,7 +110,7 @@ TEST_F(FakeAppRegistryTest, ObserversHearTheOrderThatWasSet) {
   platform.registry.removeObserver(observer);
 }
 
-TEST_F(FakeAppRegistryTest, ReportsMayBeHeld) {
+TEST_F(FakeAppRegistryTest, GateHoldsReports) {
   Observer observer;
   platform.registry.reportGate.close();
   platform.registry.addObserver(observer);
@@ -120,7 +120,7 @@ TEST_F(FakeAppRegistryTest, ReportsMayBeHeld) {
   platform.registry.removeObserver(observer);
 }
 
-TEST_F(FakeAppRegistryTest, AProgressesSettersAreJournaled) {
+TEST_F(FakeAppRegistryTest, JournalsSettersOfProgress) {
   platform.registry.add(FakeApp::placeholder("com.a"));
   const auto progress = platform.registry.app("com.a")->progress;
   progress->setInstallState(TSInstallState::Active);
@@ -136,7 +136,7 @@ TEST_F(FakeAppRegistryTest, AProgressesSettersAreJournaled) {
                    "progress.cancel com.a"}));
 }
 
-TEST_F(FakeAppRegistryTest, ACancelledInstallIsReportedAfterItsStateChanged) {
+TEST_F(FakeAppRegistryTest, ReportsCancellationAfterTheStateChanged) {
   platform.registry.add(FakeApp::placeholder("com.a"));
   Observer observer;
   platform.registry.addObserver(observer);
@@ -148,7 +148,7 @@ TEST_F(FakeAppRegistryTest, ACancelledInstallIsReportedAfterItsStateChanged) {
   platform.registry.removeObserver(observer);
 }
 
-TEST_F(FakeAppRegistryTest, BundlesThatAreNoAppsAreWalkedByTheirKind) {
+TEST_F(FakeAppRegistryTest, EnumeratesBundlesThatAreNotAppsByKind) {
   platform.registry.add(FakeApp::installed("com.app"));
   platform.registry.addBundle("com.app", BundleKind::user);
   platform.registry.addBundle("com.extension", BundleKind::system);
@@ -164,7 +164,7 @@ TEST_F(FakeAppRegistryTest, BundlesThatAreNoAppsAreWalkedByTheirKind) {
   EXPECT_EQ(walk(BundleKind::system), Lines{"other com.extension"});
 }
 
-TEST_F(FakeAppRegistryTest, EveryOperationFailsWhenTheJournalSaysSo) {
+TEST_F(FakeAppRegistryTest, JournalHookFailsEveryOperation) {
   platform.registry.add(FakeApp::placeholder("com.a"));
   const auto record = platform.registry.recordForIdentifier("com.a", platform::PlaceholderLookup::on);
   const auto progress = platform.registry.app("com.a")->progress;
@@ -180,17 +180,17 @@ TEST_F(FakeAppRegistryTest, EveryOperationFailsWhenTheJournalSaysSo) {
   EXPECT_EQ(platform.registry.identifiers(), Lines{"com.a"});
 }
 
-TEST(FakeAppRegistry, AnObserverThatWasNotRemovedFailsTheTest) {
+TEST(FakeAppRegistry, RegisteredObserverFailsTheTest) {
   Observer observer;
   EXPECT_NONFATAL_FAILURE(
       {
         FakePlatform platform;
         platform.registry.addObserver(observer);
       },
-      "the registry goes while it is still observed");
+      "the registry is destroyed while an observer is registered");
 }
 
-TEST(FakeAppRegistry, AProgressOutlivesTheRegistry) {
+TEST(FakeAppRegistry, ProgressCanOutliveTheRegistry) {
   std::shared_ptr<FakeInstallProgress> progress;
   {
     FakePlatform platform;

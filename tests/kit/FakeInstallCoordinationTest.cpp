@@ -20,7 +20,7 @@ namespace {
 constexpr std::string_view kPath = "/staging/a.zip";
 const Error kReason{"ZTError", 30, {}, nullptr};
 
-/// Notes what it hears, and on which thread.
+/// Records callbacks and their threads.
 class Listener final : public platform::InstallObserverDelegate {
  public:
   void coordinatorDidInstallPlaceholder(InstallCoordinator& coordinator) override { note("placeholder", coordinator); }
@@ -52,7 +52,7 @@ class FakeInstallCoordinationTest : public testing::Test {
     return service.coordinatorForApp(kind, "com.a", ClientIdentity::CXClientSync, IfMissing::create, nullptr, nullptr);
   }
 
-  /// Gives the coordinator all that it needs but the package.
+  /// Sets everything that the coordinator needs except the package.
   [[nodiscard]] std::shared_ptr<platform::PromisedTransferToPath> prepare(InstallCoordinator& coordinator) {
     platform::InstallOptions options;
     options.setInstallType(platform::TSInstallType::Sync);
@@ -78,7 +78,7 @@ class FakeInstallCoordinationTest : public testing::Test {
 
 }  // namespace
 
-TEST_F(FakeInstallCoordinationTest, CallsAreJournaledWithWhatTheyAreAbout) {
+TEST_F(FakeInstallCoordinationTest, JournalsCallsWithTheirSubjects) {
   const auto coordinator = make();
   const auto asset = prepare(*coordinator);
   asset->setPercentComplete(0.5);
@@ -95,7 +95,7 @@ TEST_F(FakeInstallCoordinationTest, CallsAreJournaledWithWhatTheyAreAbout) {
           "coordinator.cancelForReason com.a ZTError 30 3"}));
 }
 
-TEST_F(FakeInstallCoordinationTest, ByItselfNothingHappens) {
+TEST_F(FakeInstallCoordinationTest, HasNoAutomaticActionsByDefault) {
   const auto coordinator = make();
   deliver(*prepare(*coordinator));
   service.waitUntilIdle();
@@ -103,7 +103,7 @@ TEST_F(FakeInstallCoordinationTest, ByItselfNothingHappens) {
   EXPECT_TRUE(platform.registry.identifiers().empty());
 }
 
-TEST_F(FakeInstallCoordinationTest, AutomaticallyAnAppIsInstalledFromItsPackage) {
+TEST_F(FakeInstallCoordinationTest, AutomaticModeInstallsThePackage) {
   service.installAutomatically();
   Listener listener;
   const auto connection = service.initWithMachServiceName("name", {kSync}, listener);
@@ -125,7 +125,7 @@ TEST_F(FakeInstallCoordinationTest, AutomaticallyAnAppIsInstalledFromItsPackage)
   EXPECT_EQ(platform.journal.count("registry."), 0U);
 }
 
-TEST_F(FakeInstallCoordinationTest, AnInstallThatFailsEndsWithTheInstallersError) {
+TEST_F(FakeInstallCoordinationTest, FailedInstallHasTheInstallersError) {
   service.installAutomatically();
   Listener listener;
   const auto connection = service.initWithMachServiceName("name", {kSync}, listener);
@@ -140,7 +140,7 @@ TEST_F(FakeInstallCoordinationTest, AnInstallThatFailsEndsWithTheInstallersError
   EXPECT_EQ(listener.heard, (std::vector<std::string>{"placeholder com.a", "complete com.a with error"}));
 }
 
-TEST_F(FakeInstallCoordinationTest, APlaceholderMayFailToBeShown) {
+TEST_F(FakeInstallCoordinationTest, ShowingAPlaceholderCanFail) {
   service.installAutomatically();
   Listener listener;
   const auto connection = service.initWithMachServiceName("name", {kSync}, listener);
@@ -152,7 +152,7 @@ TEST_F(FakeInstallCoordinationTest, APlaceholderMayFailToBeShown) {
   EXPECT_TRUE(platform.registry.identifiers().empty());
 }
 
-TEST_F(FakeInstallCoordinationTest, AClosedGateHoldsEverythingBack) {
+TEST_F(FakeInstallCoordinationTest, ClosedGateHoldsAllActions) {
   service.installAutomatically();
   service.gate.close();
   const auto coordinator = make();
@@ -163,7 +163,7 @@ TEST_F(FakeInstallCoordinationTest, AClosedGateHoldsEverythingBack) {
   EXPECT_TRUE(platform.registry.app("com.a")->isInstalled);
 }
 
-TEST_F(FakeInstallCoordinationTest, AnInstallUnderWayIsNotCancelled) {
+TEST_F(FakeInstallCoordinationTest, RunningInstallIsNotCancelled) {
   service.installAutomatically();
   const auto coordinator = make();
   const auto asset = prepare(*coordinator);
@@ -178,7 +178,7 @@ TEST_F(FakeInstallCoordinationTest, AnInstallUnderWayIsNotCancelled) {
   EXPECT_TRUE(platform.registry.app("com.a")->isInstalled);
 }
 
-TEST_F(FakeInstallCoordinationTest, ATestTellsWhatHappens) {
+TEST_F(FakeInstallCoordinationTest, TestsTriggerEvents) {
   Listener listener;
   const auto connection = service.initWithMachServiceName("name", {kSync}, listener);
   service.add(FakeCoordinator::of("com.a"));
@@ -195,7 +195,7 @@ TEST_F(FakeInstallCoordinationTest, ATestTellsWhatHappens) {
   EXPECT_TRUE(service.coordinators().empty());
 }
 
-TEST_F(FakeInstallCoordinationTest, ACallbackMayComeOnTheCallingThread) {
+TEST_F(FakeInstallCoordinationTest, CallbacksCanRunOnTheCallingThread) {
   Listener listener;
   const auto connection = service.initWithMachServiceName("name", {kSync}, listener);
   service.add(FakeCoordinator::of("com.a").withoutIdentifier());
@@ -204,7 +204,7 @@ TEST_F(FakeInstallCoordinationTest, ACallbackMayComeOnTheCallingThread) {
   EXPECT_EQ(listener.thread, std::this_thread::get_id());
 }
 
-TEST_F(FakeInstallCoordinationTest, WhatIsThereIsSeenAsItIs) {
+TEST_F(FakeInstallCoordinationTest, ReturnsItsContents) {
   FakePromise asset;
   asset.name = "com.a-Asset";
   asset.isComplete = true;
@@ -222,7 +222,7 @@ TEST_F(FakeInstallCoordinationTest, WhatIsThereIsSeenAsItIs) {
   EXPECT_EQ(service.coordinator("com.a")->kind, CoordinatorKind::restoring);
 }
 
-TEST_F(FakeInstallCoordinationTest, CallsFailAsToldOnceOrAlways) {
+TEST_F(FakeInstallCoordinationTest, CallsFailOnceOrAlwaysAsPlanned) {
   service.failures.failNext("coordinator.setInstallOptions", "com.a", kReason);
   service.failures.failAlways("installCoordination.initAppPlaceholder", "com.a", kReason);
   const auto coordinator = make();
@@ -232,7 +232,7 @@ TEST_F(FakeInstallCoordinationTest, CallsFailAsToldOnceOrAlways) {
   EXPECT_EQ(service.initAppPlaceholder("A", "com.a", platform::TSInstallType::Sync, kSync), nullptr);
 }
 
-TEST_F(FakeInstallCoordinationTest, TheJournalsHookFailsACallInItsOwnWay) {
+TEST_F(FakeInstallCoordinationTest, JournalHookFailsEveryOperation) {
   const auto coordinator = make();
   const auto asset = prepare(*coordinator);
   platform.journal.setHook([](std::string_view, std::string_view) { return std::optional<Error>(kReason); });
@@ -251,7 +251,7 @@ TEST_F(FakeInstallCoordinationTest, TheJournalsHookFailsACallInItsOwnWay) {
   EXPECT_TRUE(coordinator->hasAppAssetPromise());
 }
 
-TEST_F(FakeInstallCoordinationTest, WhatIsNeitherGivenAwayNorCancelledIsAbandoned) {
+TEST_F(FakeInstallCoordinationTest, ListsAbandonedObjects) {
   const auto coordinator = make();
   const auto asset = prepare(*coordinator);
   EXPECT_TRUE(service.abandoned().empty());
@@ -264,7 +264,7 @@ TEST_F(FakeInstallCoordinationTest, WhatIsNeitherGivenAwayNorCancelledIsAbandone
   EXPECT_EQ(service.placeholder("com.b")->cancellation, (FakeCancellation{kReason, kSync}));
 }
 
-TEST_F(FakeInstallCoordinationTest, AnUninstallCompletesOnTheServicesThreadOrAtOnce) {
+TEST_F(FakeInstallCoordinationTest, UninstallCompletesOnEitherThread) {
   platform.registry.add(FakeApp::installed("com.a"));
   platform.registry.add(FakeApp::installed("com.b"));
   std::thread::id thread;
@@ -286,7 +286,7 @@ TEST_F(FakeInstallCoordinationTest, AnUninstallCompletesOnTheServicesThreadOrAtO
 
 // Misuse.
 
-TEST(FakeInstallCoordinationMisuse, DrivingAnotherClientsCoordinator) {
+TEST(FakeInstallCoordinationMisuse, ChangingAnotherClientsCoordinator) {
   FakePlatform platform;
   platform.coordination.add(FakeCoordinator::of("com.a").madeBy(ClientIdentity::CXClientBazaarly));
   const auto coordinator = platform.coordination.coordinatorForApp(
@@ -296,15 +296,15 @@ TEST(FakeInstallCoordinationMisuse, DrivingAnotherClientsCoordinator) {
   EXPECT_TRUE(coordinator->cancelForReason(kReason, ClientIdentity::CXClientSync));
 }
 
-TEST(FakeInstallCoordinationMisuse, TheServiceGoesWhileSomethingIsHeld) {
+TEST(FakeInstallCoordinationMisuse, DestroyingTheServiceWithHeldObjects) {
   auto platform = std::make_unique<FakePlatform>();
   auto promise =
       platform->coordination.makePromisedTransferToPath("com.a", ClientIdentity::CXClientSync, std::nullopt, 0);
-  EXPECT_NONFATAL_FAILURE(platform.reset(), "something of it is held");
+  EXPECT_NONFATAL_FAILURE(platform.reset(), "an object of it is held");
   promise.reset();
 }
 
-TEST(FakeInstallCoordinationMisuse, TheServiceGoesWhileAConnectionIsOpen) {
+TEST(FakeInstallCoordinationMisuse, DestroyingTheServiceWithAnOpenConnection) {
   CallJournal journal;
   FakeFileSystem files(journal);
   FakeUninstalledAppsList uninstalled(journal);
@@ -316,7 +316,7 @@ TEST(FakeInstallCoordinationMisuse, TheServiceGoesWhileAConnectionIsOpen) {
   connection.reset();
 }
 
-TEST(FakeInstallCoordinationMisuse, TellingOfACoordinatorThatIsNotThere) {
+TEST(FakeInstallCoordinationMisuse, TriggeringAnEventWithoutCoordinator) {
   FakePlatform platform;
   EXPECT_NONFATAL_FAILURE(platform.coordination.prioritize("com.a"), "no coordinator of com.a");
 }
