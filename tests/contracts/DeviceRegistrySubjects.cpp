@@ -1,4 +1,4 @@
-// Holds the embedded device's files, registry and time to the contracts. Each subject is a device of its own.
+// Contract subjects of the embedded device's files, registry and time. Each subject has its own device.
 #include <chrono>
 #include <filesystem>
 
@@ -14,7 +14,7 @@ namespace {
 
 constexpr std::string_view kFolder = "/var/contract";
 
-/// Puts a file on the device, and the folders that lead to it.
+/// Writes a file and its missing parent directories on the device.
 void putFile(const TestDevice& device, std::string_view path, std::string_view contents) {
   std::filesystem::create_directories(std::filesystem::path(device.host(path)).parent_path());
   writeHostFile(device.host(path), contents);
@@ -31,7 +31,7 @@ class DeviceFiles final : public FileSystemSubject {
   }
   std::optional<platform::OwnerAttributes> ownersOf(std::string_view path) override {
     const Result<platform::OwnerAttributes> owners = device_.files().ownersOfItem(path);
-    // Where the host's file system keeps no attributes there is nothing to look at.
+    // Not every host file system stores extended attributes.
     if (!owners || !owners->ownerAccountName) return std::nullopt;
     return *owners;
   }

@@ -1,4 +1,4 @@
-// Holds the embedded device's services to the contracts.
+// Contract subjects of the embedded device's services.
 #include <atomic>
 #include <chrono>
 #include <fstream>
@@ -211,7 +211,7 @@ class DeviceInstalls final : public CoordinatedInstallSubject {
   std::atomic<int> made_ = 0;
 };
 
-/// With a daemon behind it.
+/// A device service with a running daemon.
 class DeviceAndDaemon final : public ZTDeviceServiceSubject {
  public:
   DeviceAndDaemon() { service_.connect(&daemon_); }

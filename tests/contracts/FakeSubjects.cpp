@@ -1,4 +1,4 @@
-// Holds the fakes to the contracts, so that what passes on them passes on a device.
+// Contract subjects of the fakes.
 #include <atomic>
 #include <utility>
 
@@ -144,7 +144,7 @@ class FakeScreen final : public HomeScreenSubject {
   std::vector<std::string> order_;
 };
 
-/// Connections go before the service.
+/// Closes its connections before the service is destroyed.
 class FakeBackupsSubject final : public BackupManagerSubject {
  public:
   std::unique_ptr<platform::BackupManager> makeManager() override { return platform_.makeBackupManager(); }

@@ -1,4 +1,4 @@
-// Suites come out of an archive: that each one is run, and is not empty, is no matter of course.
+// Checks that every suite of the archive is linked and instantiated.
 #include <filesystem>
 #include <fstream>
 #include <iterator>
@@ -40,7 +40,7 @@ std::map<std::string, int> testsInThisProgram() {
 
 }  // namespace
 
-TEST(Suites, EachIsRunOverTheFakesAndTheEmbeddedDevice) {
+TEST(Suites, EachRunsOnTheFakesAndTheEmbeddedDevice) {
   const std::vector<std::string> suites = suitesInHeaders();
   EXPECT_GE(suites.size(), 17U);
   std::map<std::string, int> tests = testsInThisProgram();
@@ -50,7 +50,7 @@ TEST(Suites, EachIsRunOverTheFakesAndTheEmbeddedDevice) {
   }
 }
 
-TEST(Suites, EachIsNamedInThePortingGuide) {
+TEST(Suites, EachIsListedInThePortingGuide) {
   std::ifstream file(std::string(kSourceFolder) + "/docs/porting.md");
   const std::string guide{std::istreambuf_iterator<char>(file), {}};
   for (const std::string& suite : suitesInHeaders())

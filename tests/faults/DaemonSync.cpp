@@ -14,7 +14,7 @@ namespace {
 
 using platform::ZTAsset;
 
-/// More attempts than any single failure can cost.
+/// More attempts than a single failure can cause.
 constexpr int kMostAttempts = 10;
 
 }  // namespace
@@ -40,10 +40,10 @@ void DaemonSync::run(const std::function<void()>& meanwhile) {
     waitForInstalls();
     client_->syncEndedWithSuccess(true);
   } else {
-    EXPECT_TRUE(error) << "a refused sync must say why";
+    EXPECT_TRUE(error) << "a refused sync must set an error";
     client_->syncEndedWithSuccess(false);
   }
-  EXPECT_EQ(client_.use_count(), 1) << "work of the plug-in outlives the sync";
+  EXPECT_EQ(client_.use_count(), 1) << "the plug-in still has work after the sync";
   client_.reset();
 }
 
@@ -79,7 +79,7 @@ void DaemonSync::send(const Asset& asset) {
   waitForInstalls();
 }
 
-/// The data part is a transfer of its own: an asset whose transfer has ended belongs to the plug-in.
+/// The data part is a separate transfer: after the end of a transfer, only the plug-in may change its asset.
 void DaemonSync::sendData(const Asset& asset) {
   const auto data = std::make_shared<ZTAsset>(asset->identifier(), asset->dataclass(), asset->prettyName());
   data->setIsDownload(true);
@@ -90,7 +90,7 @@ void DaemonSync::sendData(const Asset& asset) {
   waitForInstalls();
 }
 
-/// While the daemon calls the client the service's thread stands still: all calls come in one order.
+/// The service's thread is stopped while the daemon calls the client, so that the order of all calls is fixed.
 void DaemonSync::waitForInstalls() {
   if (mode_ == Mode::coordinated) {
     platform_.coordination.runUntilIdle();
@@ -99,7 +99,7 @@ void DaemonSync::waitForInstalls() {
   }
 }
 
-/// Installs own a share of the client until their last call is over, and so do those that wait to be tried again.
+/// Running and postponed installs share ownership of the client until their last call has returned.
 void DaemonSync::waitForDirectInstalls() {
   for (int attempt = 0; attempt < kMostAttempts; ++attempt) {
     while (true) {
@@ -110,7 +110,7 @@ void DaemonSync::waitForDirectInstalls() {
     if (platform_.time.pendingTasks() == 0) return;
     platform_.time.advance(std::chrono::seconds(30));
   }
-  ADD_FAILURE() << "an install is tried again without end";
+  ADD_FAILURE() << "an install is retried indefinitely";
 }
 
 }  // namespace appsync::test

@@ -1,4 +1,4 @@
-// A daemon that syncs a device of fakes.
+// A daemon that syncs a platform of fakes.
 #pragma once
 
 #include <functional>
@@ -11,25 +11,25 @@
 
 namespace appsync::test {
 
-/// How a device installs.
+/// The way a device installs apps.
 enum class Mode { direct, coordinated };
 
-/// Makes a new device one of that mode. Its install coordination stands still but for when it is waited for.
+/// Sets the mode of a new device. Its install coordination runs only while a test waits for it.
 void setMode(FakePlatform& platform, Mode mode);
 
-/// One sync, one asset at a time: the order of all platform calls is the same in every run.
+/// Runs one sync, one asset at a time, so that the order of all platform calls is the same in every run.
 class DaemonSync {
  public:
-  /// The host's side.
+  /// The host.
   struct Host {
     std::function<Bytes(const std::string& identifier)> packageOf;
-    /// Why the app's transfer fails; none when it does not.
+    /// The error of the app's transfer, or nullopt if it succeeds.
     std::function<std::optional<Error>(const std::string& identifier)> failureOf;
   };
 
   DaemonSync(FakePlatform& platform, Mode mode, Host host) : platform_(platform), mode_(mode), host_(std::move(host)) {}
 
-  /// From the making of the client to its end. `meanwhile` is what happens on the device while assets come.
+  /// Runs a sync with a new client. `meanwhile` runs on the device during the transfers.
   void run(const std::function<void()>& meanwhile = [] {});
 
  private:

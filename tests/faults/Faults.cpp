@@ -15,8 +15,8 @@ namespace appsync::test {
 
 namespace {
 
-/// Real time: the end of a test that hangs, never a pace.
-constexpr std::chrono::seconds kPatience(60);
+/// Only a failing test waits this long.
+constexpr std::chrono::seconds kTimeout(60);
 
 const Error kInjected{"POSIX", 5, "Input/output error", nullptr};
 
@@ -29,7 +29,7 @@ CallJournal::Hook Fault::hook() const {
     const std::scoped_lock lock(self.state_->mutex);
     const std::size_t call = ++self.state_->calls;
     if (call == self.number_) self.state_->failed = std::string(operation) + " " + std::string(arguments);
-    // What kind of device it is no call changes.
+    // No call changes the mode of the device.
     if (operation == "installCoordination.coordinationIsEnabled") return std::nullopt;
     const bool fails = self.extent_ == Extent::once ? call == self.number_ : call >= self.number_;
     return fails ? std::optional(kInjected) : std::nullopt;
@@ -45,9 +45,9 @@ std::string Fault::call() const {
   return state_->failed;
 }
 
-void expectInOrder(FakePlatform& platform) {
+void expectNothingPending(FakePlatform& platform) {
   EXPECT_EQ(platform.time.pendingTasks(), 0U);
-  EXPECT_TRUE(platform.screen.held().empty()) << "an app stays held";
+  EXPECT_TRUE(platform.screen.held().empty()) << "a termination assertion is still held";
   EXPECT_EQ(platform.registry.observerCount(), 0U);
   EXPECT_EQ(platform.notify.observerCount(platform::kZTStartupCompleteNotification), 0U);
   EXPECT_EQ(platform.backups.connections(), 0U);
@@ -60,10 +60,10 @@ void expectInOrder(FakePlatform& platform) {
   }
 }
 
-void runWithinPatience(std::size_t number, const std::function<void()>& run) {
+void runWithTimeout(std::size_t number, const std::function<void()>& run) {
   const auto done = std::async(std::launch::async, run);
-  if (done.wait_for(kPatience) == std::future_status::ready) return;
-  std::cerr << "it hangs when call " << number << " fails\n";
+  if (done.wait_for(kTimeout) == std::future_status::ready) return;
+  std::cerr << "the test hangs if call " << number << " fails\n";
   std::abort();
 }
 

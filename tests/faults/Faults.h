@@ -1,4 +1,4 @@
-// Failures of chosen platform calls, and what must hold after them.
+// Failures of selected platform calls, and invariants after them.
 #pragma once
 
 #include <cstddef>
@@ -12,18 +12,18 @@
 
 namespace appsync::test {
 
-/// Whether one call fails or, as when a service has died, every call from that one on.
+/// Whether one call fails or, as after the crash of a service, all calls from that one on.
 enum class Extent { once, fromThenOn };
 
-/// Fails the `number`-th call of those that it hears of, the first being 1. Copies share their count. Threads: any.
+/// Fails the `number`-th call, starting at 1. Copies share their count. Thread-safe.
 class Fault {
  public:
   Fault(std::size_t number, Extent extent);
 
-  /// For a device's journal.
+  /// Hook for a journal.
   [[nodiscard]] CallJournal::Hook hook() const;
   [[nodiscard]] bool hasHappened() const;
-  /// The call that failed, "fileSystem.moveItem /a /b".
+  /// Returns the failed call, "fileSystem.moveItem /a /b".
   [[nodiscard]] std::string call() const;
 
  private:
@@ -38,10 +38,10 @@ class Fault {
   std::shared_ptr<State> state_ = std::make_shared<State>();
 };
 
-/// Fails the test when a client has left something open, held, scheduled or half written.
-void expectInOrder(FakePlatform& platform);
+/// Fails the test if a client has left something open, held, scheduled or incomplete.
+void expectNothingPending(FakePlatform& platform);
 
-/// Runs it on another thread, so that a hang ends the program with a word instead of waiting for ever.
-void runWithinPatience(std::size_t number, const std::function<void()>& run);
+/// Calls `run` on another thread. If it hangs, ends the program with a message that contains `number`.
+void runWithTimeout(std::size_t number, const std::function<void()>& run);
 
 }  // namespace appsync::test

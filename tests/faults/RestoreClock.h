@@ -1,12 +1,12 @@
-// The time of a restore's wait.
+// A clock for the wait of a restore.
 #pragma once
 
 #include "kit/fakes/FakePlatform.h"
 
 namespace appsync::test {
 
-/// Virtual time in which nobody waits but for the install-coordination service: it does what it has to do, and if that
-/// was not what the waiter waits for, the deadline is reached. So all calls come in one order.
+/// Virtual time: a wait lets the install-coordination service finish its pending actions; if the condition is still
+/// false, the deadline is reached. So the order of all calls is fixed.
 class RestoreClock final : public Clock {
  public:
   explicit RestoreClock(FakePlatform& platform) : platform_(platform) {}

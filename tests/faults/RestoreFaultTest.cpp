@@ -1,5 +1,5 @@
-// Every platform call of a whole backup, wipe, restore and sync fails once: nothing breaks, and doing it again makes
-// good what was missed.
+// Fails each platform call of a backup, wipe, restore and sync once: all invariants hold, and a repetition completes
+// the restore.
 #include <cstddef>
 #include <iostream>
 #include <optional>
@@ -45,7 +45,7 @@ class RestoreFault : public testing::TestWithParam<Conditions> {
     return calls;
   }
 
-  /// All of it with a failure of the `number`-th call, and again from where it may have gone wrong.
+  /// Runs all steps with a failure of the `number`-th call, then repeats them from the step that may have failed.
   static void restoreWithFault(std::size_t number) {
     const auto& [mode, extent] = GetParam();
     const Fault fault(number, extent);
@@ -59,39 +59,40 @@ class RestoreFault : public testing::TestWithParam<Conditions> {
     whole.setHook(nullptr);
     SCOPED_TRACE("call " + std::to_string(number) + ": " + fault.call());
     EXPECT_TRUE(fault.hasHappened());
-    expectInOrder(whole.device());
-    whole.giveUpWhatHangs();
+    expectNothingPending(whole.device());
+    whole.cancelStalledInstalls();
     if (!isRestored) whole.restore();
     whole.sync();
-    expectInOrder(whole.device());
-    EXPECT_EQ(whole.apps(), WholeRestore::everyAppButTheUnreadable());
-    EXPECT_EQ(whole.filesFiledAway(), whole.filesLeft());
+    expectNothingPending(whole.device());
+    EXPECT_EQ(whole.apps(), WholeRestore::readableApps());
+    EXPECT_EQ(whole.archivedFiles(), whole.writtenFiles());
     if (extent == Extent::once) {
-      EXPECT_TRUE(whole.device().coordination.abandoned().empty()) << "something is neither attached nor cancelled";
+      EXPECT_TRUE(whole.device().coordination.abandoned().empty())
+          << "a promise or placeholder is neither attached nor cancelled";
     }
   }
 };
 
-TEST_P(RestoreFault, WhicheverCallFailsTheRestoredDeviceIsTheSameInTheEnd) {
+TEST_P(RestoreFault, RestoreAfterAnyFailedCallReachesTheSameState) {
   const std::size_t count = calls(std::get<Mode>(GetParam())).size();
-  EXPECT_GT(count, 200U) << "the restore has lost most of what it did";
+  EXPECT_GT(count, 200U) << "the restore makes fewer calls than expected";
   RecordProperty("calls", static_cast<int>(count));
   std::cout << "platform calls: " << count << '\n';
   for (std::size_t number = 1; number <= count; ++number)
-    runWithinPatience(number, [number] { restoreWithFault(number); });
+    runWithTimeout(number, [number] { restoreWithFault(number); });
 }
 
-TEST_P(RestoreFault, TheCallsComeInTheSameOrderInEveryRun) {
+TEST_P(RestoreFault, OrderOfCallsIsTheSameInEveryRun) {
   const Mode mode = std::get<Mode>(GetParam());
   EXPECT_EQ(calls(mode), calls(mode));
 }
 
-TEST_P(RestoreFault, UndisturbedOneRestoreAndOneSyncBringEveryAppBack) {
+TEST_P(RestoreFault, RestoreAndSyncBringBackEveryApp) {
   WholeRestore whole(std::get<Mode>(GetParam()));
   runAll(whole);
-  EXPECT_EQ(whole.apps(), WholeRestore::everyAppButTheUnreadable());
-  EXPECT_EQ(whole.filesFiledAway(), 1U);
-  EXPECT_EQ(whole.device().time.now(), TimePoint()) << "who waits for placeholders does so until the last one";
+  EXPECT_EQ(whole.apps(), WholeRestore::readableApps());
+  EXPECT_EQ(whole.archivedFiles(), 1U);
+  EXPECT_EQ(whole.device().time.now(), TimePoint()) << "the wait for placeholders must end with the last one";
 }
 
 INSTANTIATE_TEST_SUITE_P(Modes, RestoreFault,

@@ -1,4 +1,4 @@
-// Every platform call of a whole sync fails once: nothing breaks, and the next sync makes good what was missed.
+// Fails each platform call of a sync once: all invariants hold, and the next sync completes it.
 #include <cstddef>
 #include <iostream>
 #include <string>
@@ -14,7 +14,7 @@ namespace {
 
 using Transfers = WholeSync::Transfers;
 
-/// Whether the sync framework calls the injected failure one that may pass.
+/// Whether the sync framework calls the injected failure recoverable.
 enum class Judgement { unrecoverable, recoverable };
 using Conditions = std::tuple<Mode, Judgement, Extent>;
 
@@ -25,15 +25,15 @@ std::string nameOf(const testing::TestParamInfo<Conditions>& info) {
          (extent == Extent::once ? "Once" : "FromThenOn");
 }
 
-/// Whatever failed, this holds after a sync.
+/// Invariants after a sync, whichever call failed.
 void expectWholeDevice(WholeSync& sync) {
-  expectInOrder(sync.platform);
+  expectNothingPending(sync.platform);
   const auto kept = sync.platform.registry.app("com.keep");
-  ASSERT_TRUE(kept) << "an app that nobody asked about is gone";
+  ASSERT_TRUE(kept) << "an unrelated app was removed";
   EXPECT_TRUE(kept->isInstalled && !kept->isPlaceholder);
 }
 
-/// The state that two undisturbed syncs end in.
+/// The state after two syncs without failures.
 DeviceState undisturbed(Mode mode) {
   WholeSync sync(mode);
   sync.run(Transfers::someFail);
@@ -41,7 +41,7 @@ DeviceState undisturbed(Mode mode) {
   sync.restartDevice();
   sync.run(Transfers::allArrive);
   expectWholeDevice(sync);
-  EXPECT_EQ(sync.todoWords(), sync.expectedTodoWords());
+  EXPECT_EQ(sync.todoOperations(), sync.expectedTodoOperations());
   return sync.deviceState();
 }
 
@@ -61,7 +61,7 @@ class SyncFault : public testing::TestWithParam<Conditions> {
     return sync.platform.journal.callCount();
   }
 
-  /// A first sync whose `number`-th call fails, and a second one.
+  /// Runs a sync whose `number`-th call fails, and a second one.
   static void syncWithFault(std::size_t number, const DeviceState& expected) {
     WholeSync sync(mode());
     judge(sync);
@@ -76,25 +76,26 @@ class SyncFault : public testing::TestWithParam<Conditions> {
     sync.restartDevice();
     sync.run(Transfers::allArrive);
     expectWholeDevice(sync);
-    EXPECT_EQ(sync.todoWords(), sync.expectedTodoWords());
+    EXPECT_EQ(sync.todoOperations(), sync.expectedTodoOperations());
     EXPECT_EQ(sync.deviceState(), expected);
-    // Who cannot call any more cannot clean up: an app's state stays until its next install, a promise for good.
-    // A parked package that is the store's stays parked.
+    // If all later calls fail, nothing can be cleaned up: an app's state remains until its next install, a promise
+    // permanently. A parked package of the store stays parked.
     if (extent == Extent::once) {
-      EXPECT_TRUE(sync.platform.coordination.abandoned().empty()) << "something is neither attached nor cancelled";
+      EXPECT_TRUE(sync.platform.coordination.abandoned().empty())
+          << "a promise or placeholder is neither attached nor cancelled";
       EXPECT_EQ(sync.platform.files.has(kRestoreStatePath), mode() == Mode::coordinated);
     }
   }
 };
 
-TEST_P(SyncFault, WhicheverCallFailsTheNextSyncEndsInTheSameState) {
+TEST_P(SyncFault, SyncAfterAnyFailedCallReachesTheSameState) {
   const DeviceState expected = undisturbed(mode());
   const std::size_t calls = callsOfOneSync();
-  EXPECT_GT(calls, 300U) << "the sync has lost most of what it did";
+  EXPECT_GT(calls, 300U) << "the sync makes fewer calls than expected";
   RecordProperty("calls", static_cast<int>(calls));
   std::cout << "platform calls: " << calls << '\n';
   for (std::size_t number = 1; number <= calls; ++number)
-    runWithinPatience(number, [&] { syncWithFault(number, expected); });
+    runWithTimeout(number, [&] { syncWithFault(number, expected); });
 }
 
 INSTANTIATE_TEST_SUITE_P(Direct, SyncFault,
@@ -102,13 +103,13 @@ INSTANTIATE_TEST_SUITE_P(Direct, SyncFault,
                                           testing::Values(Judgement::unrecoverable, Judgement::recoverable),
                                           testing::Values(Extent::once, Extent::fromThenOn)),
                          nameOf);
-// Under coordination every error is unrecoverable, whatever the framework says.
+// In coordinated mode every error is unrecoverable, regardless of the framework.
 INSTANTIATE_TEST_SUITE_P(Coordinated, SyncFault,
                          testing::Combine(testing::Values(Mode::coordinated), testing::Values(Judgement::unrecoverable),
                                           testing::Values(Extent::once, Extent::fromThenOn)),
                          nameOf);
 
-TEST(WholeSyncTest, TheCallsComeInTheSameOrderInEveryRun) {
+TEST(WholeSyncTest, OrderOfCallsIsTheSameInEveryRun) {
   const auto linesOf = [](Mode mode) {
     WholeSync sync(mode);
     sync.run(Transfers::someFail);
@@ -118,7 +119,7 @@ TEST(WholeSyncTest, TheCallsComeInTheSameOrderInEveryRun) {
   EXPECT_EQ(linesOf(Mode::coordinated), linesOf(Mode::coordinated));
 }
 
-TEST(WholeSyncTest, UndisturbedItEndsWithEveryAppButTheBadOne) {
+TEST(WholeSyncTest, SyncWithoutFailuresInstallsAllButTheBadApp) {
   EXPECT_EQ(undisturbed(Mode::direct), (DeviceState{{"com.broken", "2.0", true, false},
                                                     {"com.denied", "2.0", true, false},
                                                     {"com.flaky", "2.0", true, false},
@@ -129,7 +130,7 @@ TEST(WholeSyncTest, UndisturbedItEndsWithEveryAppButTheBadOne) {
                                                     {"com.update", "2.0", true, false}}));
 }
 
-TEST(WholeSyncTest, UnderCoordinationRestoresWaitForTheStore) {
+TEST(WholeSyncTest, CoordinatedRestoresWaitForTheStore) {
   EXPECT_EQ(undisturbed(Mode::coordinated), (DeviceState{{"com.broken", "2.0", true, false},
                                                          {"com.denied", "2.0", true, false},
                                                          {"com.flaky", "2.0", true, false},

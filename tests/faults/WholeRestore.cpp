@@ -21,7 +21,7 @@ using platform::TSInstallType;
 constexpr std::string_view kUnreadable = "com.unreadable";
 constexpr std::string_view kWithData = "com.data";
 constexpr std::string_view kWithLicence = "com.licensed";
-/// There is nothing to prepare for its backup.
+/// An app whose backup needs no preparation.
 constexpr std::string_view kUnchanged = "com.plain";
 constexpr auto kMostPerApp = std::chrono::seconds(5);
 
@@ -46,7 +46,7 @@ plist::Dictionary metadataOf(const std::string& identifier) {
   return {{"title", "App " + identifier}, {"bundleVersion", "2.0"}};
 }
 
-/// What preparing for a backup is to make of an app's metadata.
+/// The app's metadata after preparation for a backup.
 plist::Dictionary preparedMetadataOf(const std::string& identifier) {
   plist::Dictionary metadata = metadataOf(identifier);
   if (identifier == kWithLicence) metadata.set("DeviceBasedKLP", true);
@@ -118,15 +118,15 @@ void WholeRestore::wipe() {
                   plist::Dictionary{{"AutomaticDowngrades", automatic}, {"IntentionalDowngrades", intentional}});
 }
 
-void WholeRestore::leaveRestoreFile() {
+void WholeRestore::writeRestoreFile() {
   if (device_->files.has(kRestoreInfo)) return;
   device_->files.put(kRestoreInfo, backup_);
   device_->files.erase(kFiledRestoreInfo);
-  ++left_;
+  ++written_;
 }
 
 void WholeRestore::restore() {
-  leaveRestoreFile();
+  writeRestoreFile();
   device_->bundleFolders.setMainBundleIdentifier("com.corvel.migrator");
   RestoreClock clock(*device_);
   device_->use(clock);
@@ -135,22 +135,22 @@ void WholeRestore::restore() {
   EXPECT_TRUE(client->reconcileRestoreOfType(kHostRestore, nullptr));
   EXPECT_LE(clock.now() - start, kMostPerApp * kApps.size());
   if (mode_ == Mode::coordinated) device_->coordination.runUntilIdle();
-  noteWhereTheFileIs();
+  countRestoreFiles();
   expectBalance(*client);
-  EXPECT_EQ(client.use_count(), 1) << "work of the plug-in outlives the restore";
+  EXPECT_EQ(client.use_count(), 1) << "the plug-in still has work after the restore";
   client.reset();
   device_->use(static_cast<Clock&>(device_->time));
   if (mode_ == Mode::direct) demoteDirectly();
 }
 
-void WholeRestore::noteWhereTheFileIs() {
+void WholeRestore::countRestoreFiles() {
   const bool isFiledAway = device_->files.has(kFiledRestoreInfo);
   EXPECT_NE(device_->files.has(kRestoreInfo), isFiledAway);
   EXPECT_EQ(device_->files.contents(isFiledAway ? kFiledRestoreInfo : kRestoreInfo), backup_);
-  if (isFiledAway) ++filedAway_;
+  if (isFiledAway) ++archived_;
 }
 
-/// Once all that may still be awaited has been withdrawn the next one is the only one.
+/// After all pending placeholders are withdrawn, the next one is the only one.
 void WholeRestore::expectBalance(AppsClient& client) {
   mutedThread_ = std::this_thread::get_id();
   for (const auto& [identifier, type] : kApps)
@@ -164,7 +164,7 @@ void WholeRestore::expectBalance(AppsClient& client) {
   mutedThread_ = std::thread::id();
 }
 
-/// The host's part: without coordination the plug-in makes all placeholders alike.
+/// The host's part: in direct mode all placeholders are equal.
 void WholeRestore::demoteDirectly() {
   for (const auto& [identifier, type] : kApps) {
     const auto app = device_->registry.app(identifier);
@@ -179,7 +179,7 @@ void WholeRestore::sync() {
   DaemonSync(*device_, mode_, {packageFor, neverFails}).run([this] { deliverFromStore(); });
 }
 
-/// A client of the service's like the plug-in, and none of whose calls are the plug-in's.
+/// Another client of the service, whose calls are not counted.
 void WholeRestore::deliverFromStore() {
   constexpr ClientIdentity kStore = ClientIdentity::CXClientBazaarly;
   mutedThread_ = std::this_thread::get_id();
@@ -197,7 +197,7 @@ void WholeRestore::deliverFromStore() {
   mutedThread_ = std::thread::id();
 }
 
-void WholeRestore::giveUpWhatHangs() {
+void WholeRestore::cancelStalledInstalls() {
   for (const FakeCoordinator& waiting : device_->coordination.coordinators()) {
     if (waiting.appAsset && waiting.appAsset->isComplete) device_->coordination.cancelByUser(waiting.identifier);
   }
@@ -213,7 +213,7 @@ WholeRestore::Apps WholeRestore::apps() const {
   return apps;
 }
 
-WholeRestore::Apps WholeRestore::everyAppButTheUnreadable() {
+WholeRestore::Apps WholeRestore::readableApps() {
   return {"com.auto placeholder 7", "com.data 2.0", "com.demoted placeholder 8", "com.licensed 2.0", "com.plain 2.0"};
 }
 

@@ -1,4 +1,4 @@
-// A device that is backed up and wiped, the new one that its backup is restored to, and the syncs that follow.
+// Backs up and wipes a device, restores the backup to a new one and syncs it.
 #pragma once
 
 #include <atomic>
@@ -14,45 +14,45 @@
 
 namespace appsync::test {
 
-/// Apps with and without data and licence, demoted in either way, and one whose store metadata is no property list. The
-/// order of the plug-in's platform calls is the same in every run.
+/// Apps with and without data and licence, demoted in both ways, and one whose store metadata is not a property list.
+/// The order of the plug-in's platform calls is the same in every run.
 class WholeRestore {
  public:
-  /// Which apps a device holds, "com.a 2.0" or "com.a placeholder 7".
+  /// The apps of a device, "com.a 2.0" or "com.a placeholder 7".
   using Apps = std::vector<std::string>;
 
   explicit WholeRestore(Mode mode);
 
-  /// Hears of each platform call that the plug-in makes from now on, on whichever device: one at a time, on any thread.
+  /// Sets a hook for the plug-in's platform calls on both devices. Calls are sequential, on any thread.
   void setHook(CallJournal::Hook hook);
 
-  /// What is the plug-in's of a backup, and the host's.
+  /// Backs up the device, with the parts of the plug-in and the host.
   void backUp();
-  /// Ends the device that was backed up. Before that it shows that a backup undisturbed makes good what one missed.
+  /// Destroys the device that was backed up, after checking that a backup without failures is complete.
   void wipe();
-  /// In the process that waits for placeholders. The host leaves its file unless it still lies there. When it returns
-  /// the wait was in its bound, the file in one place and the count of placeholders balanced.
+  /// Restores the new device. The host writes its file unless it exists. Checks that the wait was bounded, the file is
+  /// in one place and the count of placeholders is balanced.
   void restore();
-  /// Brings packages, in a coordinated device through its store.
+  /// Syncs packages; in coordinated mode through the store.
   void sync();
 
-  /// What the person does about an install that has its package and never ends: that an app has no data to wait for
-  /// is said by a call that cannot fail, so nobody learns when it was lost.
-  void giveUpWhatHangs();
+  /// Cancels, as the user, installs that have their package and never end: the call that reports an app without data
+  /// cannot fail, so its loss is not detected.
+  void cancelStalledInstalls();
 
   [[nodiscard]] FakePlatform& device() { return *device_; }
   [[nodiscard]] Apps apps() const;
-  /// The undisturbed end.
-  [[nodiscard]] static Apps everyAppButTheUnreadable();
-  /// How many host's files were filed away, and how many the host left.
-  [[nodiscard]] std::size_t filesFiledAway() const { return filedAway_; }
-  [[nodiscard]] std::size_t filesLeft() const { return left_; }
+  /// The expected state without failures.
+  [[nodiscard]] static Apps readableApps();
+  /// The numbers of files that were archived and that the host wrote.
+  [[nodiscard]] std::size_t archivedFiles() const { return archived_; }
+  [[nodiscard]] std::size_t writtenFiles() const { return written_; }
 
  private:
   void makeNewDevice();
   void prepareForBackup();
-  void leaveRestoreFile();
-  void noteWhereTheFileIs();
+  void writeRestoreFile();
+  void countRestoreFiles();
   void expectBalance(AppsClient& client);
   void demoteDirectly();
   void deliverFromStore();
@@ -60,13 +60,13 @@ class WholeRestore {
   const Mode mode_;
   std::mutex hookMutex_;
   CallJournal::Hook hook_;
-  /// Whose calls are not the plug-in's.
+  /// Runs calls that are not counted as the plug-in's.
   std::atomic<std::thread::id> mutedThread_;
   std::unique_ptr<FakePlatform> device_;
-  /// The host's backup: what the restore file will hold.
+  /// The backup: the contents of the restore file.
   Bytes backup_;
-  std::size_t left_ = 0;
-  std::size_t filedAway_ = 0;
+  std::size_t written_ = 0;
+  std::size_t archived_ = 0;
 };
 
 }  // namespace appsync::test

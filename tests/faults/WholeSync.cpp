@@ -16,12 +16,12 @@ using platform::TSInstallType;
 
 constexpr std::string_view kParkedPackage = "/var/mobile/Media/PublicStaging/parked.zip";
 
-/// What the host wants on the device.
+/// The apps that the host wants on the device.
 const std::map<std::string, std::string> kLibrary{
-    {"com.bad", "2.0"},     // its package is another app's
-    {"com.broken", "2.0"},  // its transfer fails for good at first
-    {"com.denied", "2.0"},  // the home screen holds it back at first
-    {"com.flaky", "2.0"},   // its transfer fails for now at first
+    {"com.bad", "2.0"},     // the package is of another app
+    {"com.broken", "2.0"},  // the first transfer fails unrecoverably
+    {"com.denied", "2.0"},  // the home screen first denies the assertion
+    {"com.flaky", "2.0"},   // the first transfer fails recoverably
     {"com.new", "2.0"},    {"com.parked", "2.0"}, {"com.restored", "2.0"}, {"com.update", "2.0"},
 };
 constexpr std::string_view kToRemove = "com.gone";
@@ -93,35 +93,35 @@ DeviceState WholeSync::deviceState() const {
   return state;
 }
 
-std::map<std::string, std::string> WholeSync::todoWords() {
+std::map<std::string, std::string> WholeSync::todoOperations() {
   std::map<std::string, std::string> words;
-  for (const auto& [identifier, word] : asked_)
+  for (const auto& [identifier, word] : requested_)
     words[identifier] = operationWord(platform.files, identifier).value_or("none");
   return words;
 }
 
-std::map<std::string, std::string> WholeSync::expectedTodoWords() const {
-  std::map<std::string, std::string> words = asked_;
+std::map<std::string, std::string> WholeSync::expectedTodoOperations() const {
+  std::map<std::string, std::string> words = requested_;
   for (auto& [identifier, word] : words) {
     if (word == "install") word = identifier == "com.bad" ? "FAILED" : "INSTALLED";
   }
   return words;
 }
 
-/// The host's part before the sync. None of it passes through the platform's calls.
+/// The host's part before the sync; makes no platform calls.
 void WholeSync::stage() {
   platform.files.erase(kStagingFolder);
-  asked_.clear();
+  requested_.clear();
   plist::Array todoList;
   for (const auto& [identifier, version] : kLibrary) {
     if (!isWanted(identifier, version)) continue;
     todoList.emplace_back(installEntry(identifier, version, "Name of " + identifier));
-    asked_[identifier] = "install";
+    requested_[identifier] = "install";
     putAppFolder(platform.files, std::string(kStagingFolder) + "/" + identifier, identifier, "App " + identifier);
   }
   if (platform.registry.app(kToRemove)) {
     todoList.emplace_back(removeEntry(kToRemove));
-    asked_[std::string(kToRemove)] = "remove";
+    requested_[std::string(kToRemove)] = "remove";
   }
   platform.files.put(kStagedTodoListPath, binaryForm(std::move(todoList)));
   putPropertyList(platform.files, std::string(kStagingFolder) + "/SolvaryIconState.plist",

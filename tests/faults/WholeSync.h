@@ -1,4 +1,4 @@
-// A host and a daemon that sync a device of fakes, one asset at a time.
+// A host and a daemon that sync a platform of fakes, one asset at a time.
 #pragma once
 
 #include <map>
@@ -11,10 +11,10 @@
 
 namespace appsync::test {
 
-/// Where packages that wait for their data are noted.
+/// The file that lists packages waiting for their data.
 inline constexpr std::string_view kRestoreStatePath = "/var/mobile/Library/ApplicationSync/RestoreState.plist";
 
-/// One app of the device as a person would see it.
+/// One app of the device as the user sees it.
 struct AppState {
   std::string identifier;
   std::string version;
@@ -26,27 +26,27 @@ std::ostream& operator<<(std::ostream& out, const AppState& state);
 
 using DeviceState = std::vector<AppState>;
 
-/// A device on which everything happens that a sync knows: new apps, an update, a removal, a denied assertion, a
-/// package that no installer takes, transfers that fail for now and for good, a restore whose data follows its package
-/// and one whose package was parked by an earlier sync (under coordination both are the store's, and wait for it). The
-/// order of all platform calls is the same in every run.
+/// A sync with all kinds of events: new apps, an update, a removal, a denied assertion, an invalid package, transfers
+/// that fail recoverably and unrecoverably, a restore whose data follows its package, and one whose package was parked
+/// by an earlier sync (in coordinated mode both wait for the store). The order of all platform calls is the same in
+/// every run.
 class WholeSync {
  public:
   enum class Transfers { someFail, allArrive };
 
   explicit WholeSync(Mode mode);
 
-  /// From the making of the client to its end. The host asks for what the device lacks, as it finds it.
+  /// Runs a sync with a new client. The host requests the apps that the device lacks.
   void run(Transfers transfers);
 
-  /// Between two syncs: what a device does when it starts again.
+  /// Restarts the device between two syncs.
   void restartDevice();
 
   [[nodiscard]] DeviceState deviceState() const;
-  /// By identifier, of the last sync's todo list.
-  [[nodiscard]] std::map<std::string, std::string> todoWords();
-  /// What the words are when the last sync went well.
-  [[nodiscard]] std::map<std::string, std::string> expectedTodoWords() const;
+  /// The operations in the last sync's todo list, by identifier.
+  [[nodiscard]] std::map<std::string, std::string> todoOperations();
+  /// The expected operations after a successful sync.
+  [[nodiscard]] std::map<std::string, std::string> expectedTodoOperations() const;
 
   FakePlatform platform;
 
@@ -55,7 +55,7 @@ class WholeSync {
   [[nodiscard]] bool isWanted(const std::string& identifier, const std::string& version) const;
 
   const Mode mode_;
-  std::map<std::string, std::string> asked_;
+  std::map<std::string, std::string> requested_;
 };
 
 }  // namespace appsync::test

@@ -1,4 +1,4 @@
-// What becomes of coordinators in whole syncs on an embedded device.
+// Coordinators in syncs of an embedded device.
 #include <memory>
 #include <string>
 #include <utility>
@@ -25,7 +25,7 @@ class CoordinatedDeviceSync : public testing::Test {
     return coordination().coordinatorForApp(CoordinatorKind::initiating, identifier, client, ifMissing, nullptr,
                                             nullptr);
   }
-  /// Notes the app's coordinator when its transfer has been reported.
+  /// Records the app's coordinator after its transfer was reported.
   void noteCoordinatorOf(std::string identifier) {
     sync.beforeTransfersEnd = [this, identifier = std::move(identifier)] { noted = coordinator(identifier); };
   }
@@ -35,7 +35,7 @@ class CoordinatedDeviceSync : public testing::Test {
   std::shared_ptr<platform::InstallCoordinator> noted;
 };
 
-TEST_F(CoordinatedDeviceSync, ACoordinatorWhosePackageNeverComesEndsWithTheFailedSync) {
+TEST_F(CoordinatedDeviceSync, FailedSyncEndsCoordinatorsWithoutPackage) {
   noteCoordinatorOf("com.stalled");
   sync.run({{"com.a", "1.0"}, {"com.stalled", "1.0", Package::stalled}}, {});
   ASSERT_NE(noted, nullptr);
@@ -48,7 +48,7 @@ TEST_F(CoordinatedDeviceSync, ACoordinatorWhosePackageNeverComesEndsWithTheFaile
   EXPECT_TRUE(device.record("com.a")->isInstalled());
 }
 
-TEST_F(CoordinatedDeviceSync, ACoordinatorWhoseTransferFailsEndsWithIt) {
+TEST_F(CoordinatedDeviceSync, FailedTransferEndsItsCoordinator) {
   noteCoordinatorOf("com.lost");
   sync.run({{"com.lost", "1.0", Package::lost}}, {});
   EXPECT_EQ(noted, nullptr);
@@ -56,17 +56,17 @@ TEST_F(CoordinatedDeviceSync, ACoordinatorWhoseTransferFailsEndsWithIt) {
   EXPECT_EQ(device.record("com.lost"), nullptr);
 }
 
-TEST_F(CoordinatedDeviceSync, AnAppThatTheStoreIsInstallingIsLeftToIt) {
+TEST_F(CoordinatedDeviceSync, LeavesAppsThatTheStoreIsInstalling) {
   ASSERT_NE(coordinator("com.store", ClientIdentity::CXClientBazaarly, platform::IfMissing::create), nullptr);
   EXPECT_THAT(sync.run({{"com.store", "1.0"}}, {}), IsEmpty());
-  EXPECT_EQ(sync.todoWords().at("com.store"), "FAILED");
+  EXPECT_EQ(sync.todoOperations().at("com.store"), "FAILED");
   ASSERT_EQ(coordination().list()->size(), 1U);
   EXPECT_EQ(coordination().list()->front().creator, ClientIdentity::CXClientBazaarly);
 }
 
-TEST_F(CoordinatedDeviceSync, ADamagedPackageIsMarkedFailedAndLeavesNothing) {
+TEST_F(CoordinatedDeviceSync, DamagedPackageFailsAndLeavesNothing) {
   sync.run({{"com.damaged", "1.0", Package::damaged}}, {});
-  EXPECT_EQ(sync.todoWords().at("com.damaged"), "FAILED");
+  EXPECT_EQ(sync.todoOperations().at("com.damaged"), "FAILED");
   EXPECT_THAT(*coordination().list(), IsEmpty());
   EXPECT_EQ(device.record("com.damaged"), nullptr);
 }

@@ -43,7 +43,7 @@ std::vector<std::string> DeviceSync::run(const std::vector<HostApp>& apps, const
   client->assetTransferEndedWithSuccess(isWhole);
   EXPECT_TRUE(device_.services().installCoordination().waitUntilIdle(std::chrono::minutes(2)));
   client->syncEndedWithSuccess(isWhole);
-  EXPECT_EQ(client.use_count(), 1) << "the client would outlive the sync, and perhaps the device";
+  EXPECT_EQ(client.use_count(), 1) << "the client outlives the sync";
 
   std::vector<std::string> asked;
   for (const auto& asset : assets)
@@ -77,7 +77,7 @@ void DeviceSync::transfer(AppsClient& client, const std::shared_ptr<ZTAsset>& as
   client.assetTransferSucceeded(asset, true, std::nullopt);
 }
 
-std::map<std::string, std::string> DeviceSync::todoWords() {
+std::map<std::string, std::string> DeviceSync::todoOperations() {
   std::map<std::string, std::string> words;
   const std::string document = readHostFile(device_.host(kTodoListPath));
   const Result<plist::Value> list = plist::read(bytesOf(document));

@@ -1,4 +1,4 @@
-// A host and a daemon that sync an embedded device, with as many installs at once as there may be.
+// A host and a daemon that sync an embedded device with the maximum number of concurrent installs.
 #pragma once
 
 #include <cstddef>
@@ -15,9 +15,9 @@
 
 namespace appsync::test {
 
-/// One app that the host wants on the device.
+/// An app that the host wants on the device.
 struct HostApp {
-  /// Of a stalled one the first part comes, and then nothing, until the host gives all transfers up.
+  /// A stalled package stops after its first part, until the host cancels all transfers.
   enum class Package { good, damaged, lost, stalled };
 
   std::string identifier;
@@ -25,22 +25,22 @@ struct HostApp {
   Package package = Package::good;
 };
 
-/// Drives `AppsClient` itself through whole syncs, as the daemon would.
+/// Drives `AppsClient` through syncs as the daemon does.
 class DeviceSync {
  public:
-  /// The device stays the caller's.
+  /// The caller owns the device.
   explicit DeviceSync(TestDevice& device) : device_(device) {}
 
-  /// Stages instructions, makes the fixed sequence of calls and returns when all is done. Transfers are reported on
-  /// `threads` threads at once. Returns the identifiers of the assets that were asked for.
+  /// Stages the host's files and runs a complete sync. Reports transfers on `threads` threads concurrently. Returns the
+  /// identifiers of the requested assets.
   std::vector<std::string> run(const std::vector<HostApp>& apps, const std::vector<std::string>& toRemove,
                                std::size_t threads = 1);
 
-  /// Called when every transfer was reported, and the end of them all was not.
+  /// Called after every transfer was reported, before the end of all transfers is.
   std::function<void()> beforeTransfersEnd = [] {};
 
-  /// What the todo list says now, by identifier.
-  [[nodiscard]] std::map<std::string, std::string> todoWords();
+  /// The operations in the todo list, by identifier.
+  [[nodiscard]] std::map<std::string, std::string> todoOperations();
 
  private:
   void stage(const std::vector<HostApp>& apps, const std::vector<std::string>& toRemove);

@@ -1,4 +1,4 @@
-// Whole syncs on an embedded device: the plug-in, the registry, the installer and the files that are really there.
+// Syncs of an embedded device, with real registry, installer and files.
 #include <filesystem>
 #include <map>
 #include <string>
@@ -14,7 +14,7 @@ namespace {
 using Package = HostApp::Package;
 using Strings = std::vector<std::string>;
 
-/// What a person would see of an app.
+/// An app as the user sees it.
 struct Seen {
   std::string version;
   bool isInstalled = false;
@@ -42,7 +42,7 @@ class DeviceSyncTest : public testing::TestWithParam<device::InstallMode> {
     return apps;
   }
 
-  /// Nothing of a sync may be left but what it was for.
+  /// Checks that the sync left no temporary files.
   void expectTidy(std::size_t installed) {
     EXPECT_TRUE(device.isTidy());
     EXPECT_EQ(device.containers(), static_cast<std::ptrdiff_t>(installed));
@@ -62,7 +62,7 @@ INSTANTIATE_TEST_SUITE_P(Modes, DeviceSyncTest,
                            return mode.param == device::InstallMode::direct ? "direct" : "coordinated";
                          });
 
-TEST_P(DeviceSyncTest, ThirtyPackagesAnUpdateARemovalAndTwoBadOnesEndInTheExpectedState) {
+TEST_P(DeviceSyncTest, SyncInstallsUpdatesRemovesAndFailsAsExpected) {
   for (const char* identifier : {"com.gone", "com.keep", "com.app0", "com.app1"})
     device.install(identifier, "1.0");
   std::filesystem::remove(device.host("/var/mobile/Media/PublicStaging/package.zip"));
@@ -81,7 +81,7 @@ TEST_P(DeviceSyncTest, ThirtyPackagesAnUpdateARemovalAndTwoBadOnesEndInTheExpect
 
   EXPECT_EQ(sync.run(apps, {"com.gone"}).size(), 30U);
   EXPECT_EQ(appsOnDevice(), expected);
-  EXPECT_EQ(sync.todoWords(), words);
+  EXPECT_EQ(sync.todoOperations(), words);
   expectTidy(29);
 
   device.reopen();
@@ -89,7 +89,7 @@ TEST_P(DeviceSyncTest, ThirtyPackagesAnUpdateARemovalAndTwoBadOnesEndInTheExpect
   expectTidy(29);
 }
 
-TEST_P(DeviceSyncTest, TheNextSyncBringsWhatTheLastOneCouldNot) {
+TEST_P(DeviceSyncTest, NextSyncRetriesFailedApps) {
   sync.run({{"com.damaged", "2.0", Package::damaged}, {"com.lost", "2.0", Package::lost}, {"com.a", "2.0"}}, {});
   EXPECT_EQ(appsOnDevice(), (std::map<std::string, Seen>{{"com.a", {"2.0", true, false}}}));
   device.reopen();
@@ -99,7 +99,7 @@ TEST_P(DeviceSyncTest, TheNextSyncBringsWhatTheLastOneCouldNot) {
   expectTidy(2);
 }
 
-TEST_P(DeviceSyncTest, TenInstallsAtOnceOfTwoHundredPackagesLoseNoUpdateOfTheTodoList) {
+TEST_P(DeviceSyncTest, ConcurrentInstallsLoseNoTodoListUpdate) {
   std::vector<HostApp> apps;
   std::map<std::string, std::string> words;
   for (std::size_t number = 0; number < 200; ++number) {
@@ -108,7 +108,7 @@ TEST_P(DeviceSyncTest, TenInstallsAtOnceOfTwoHundredPackagesLoseNoUpdateOfTheTod
     words[name(number)] = isDamaged ? "FAILED" : "INSTALLED";
   }
   EXPECT_EQ(sync.run(apps, {}, 4).size(), 200U);
-  EXPECT_EQ(sync.todoWords(), words);
+  EXPECT_EQ(sync.todoOperations(), words);
   EXPECT_EQ(appsOnDevice().size(), 190U);
   expectTidy(190);
 }

@@ -12,7 +12,7 @@ using Lines = std::vector<std::string>;
 
 const Error kFailure{"Test", 1, "injected", nullptr};
 
-TEST(CallJournal, KeepsCallsAndNotesInOneOrder) {
+TEST(CallJournal, RecordsCallsAndNotesInOneOrder) {
   CallJournal journal;
   EXPECT_FALSE(journal.beforeCall("a.first", "x y"));
   journal.note("a.note z");
@@ -21,7 +21,7 @@ TEST(CallJournal, KeepsCallsAndNotesInOneOrder) {
   EXPECT_EQ(journal.callCount(), 2U);
 }
 
-TEST(CallJournal, ChoosesLinesByTheirBeginnings) {
+TEST(CallJournal, FiltersLinesByPrefix) {
   CallJournal journal;
   for (const char* operation : {"a.first", "b.first", "a.second", "c.first"}) {
     EXPECT_FALSE(journal.beforeCall(operation));
@@ -32,7 +32,7 @@ TEST(CallJournal, ChoosesLinesByTheirBeginnings) {
   EXPECT_FALSE(journal.contains("b."));
 }
 
-TEST(CallJournal, ForgetsLinesButNotTheNumberOfCalls) {
+TEST(CallJournal, ClearKeepsTheNumberOfCalls) {
   CallJournal journal;
   EXPECT_FALSE(journal.beforeCall("a.first"));
   journal.clear();
@@ -40,7 +40,7 @@ TEST(CallJournal, ForgetsLinesButNotTheNumberOfCalls) {
   EXPECT_EQ(journal.callCount(), 1U);
 }
 
-TEST(CallJournal, TheHookHearsOfACallThatIsNotedAlready) {
+TEST(CallJournal, HookRunsAfterTheCallIsRecorded) {
   CallJournal journal;
   journal.setHook([&](std::string_view operation, std::string_view arguments) -> std::optional<Error> {
     EXPECT_EQ(operation, "a.first");
@@ -51,7 +51,7 @@ TEST(CallJournal, TheHookHearsOfACallThatIsNotedAlready) {
   EXPECT_EQ(journal.beforeCall("a.first", "x"), kFailure);
 }
 
-TEST(CallJournal, OneChosenCallFailsAndNoOther) {
+TEST(CallJournal, FailCallFailsOneCall) {
   CallJournal journal;
   EXPECT_FALSE(journal.beforeCall("before"));
   journal.failCall(2, kFailure);
@@ -60,7 +60,7 @@ TEST(CallJournal, OneChosenCallFailsAndNoOther) {
   EXPECT_FALSE(journal.beforeCall("third"));
 }
 
-TEST(CallJournal, OneOfManyThreadsMeetsTheChosenCall) {
+TEST(CallJournal, FailCallFailsOnOneThread) {
   CallJournal journal;
   journal.failCall(50, kFailure);
   std::atomic<int> failures = 0;

@@ -11,12 +11,12 @@ Error numbered(long code) {
   return {"Test", code, "injected", nullptr};
 }
 
-TEST(FailurePlan, NothingFailsAtFirst) {
+TEST(FailurePlan, InitiallyNothingFails) {
   FailurePlan<Operation> plan;
   EXPECT_EQ(plan.take(Operation::read, "/a"), std::nullopt);
 }
 
-TEST(FailurePlan, TheNextCallFailsOnce) {
+TEST(FailurePlan, FailNextFailsOneCall) {
   FailurePlan<Operation> plan;
   plan.failNext(Operation::read, "/a", numbered(1));
   plan.failNext(Operation::read, "/a", numbered(2));
@@ -34,7 +34,7 @@ TEST(FailurePlan, OtherOperationsAndSubjectsDoNotFail) {
   EXPECT_EQ(plan.take(Operation::read, "/a"), numbered(1));
 }
 
-TEST(FailurePlan, TheNextCallsFailureComesBeforeTheUsualOne) {
+TEST(FailurePlan, FailNextPrecedesFailAlways) {
   FailurePlan<Operation> plan;
   plan.failAlways(Operation::read, "/a", numbered(1));
   plan.failNext(Operation::read, "/a", numbered(2));
@@ -42,14 +42,14 @@ TEST(FailurePlan, TheNextCallsFailureComesBeforeTheUsualOne) {
   EXPECT_EQ(plan.take(Operation::read, "/a"), numbered(1));
 }
 
-TEST(FailurePlan, AnythingStandsForEverySubject) {
+TEST(FailurePlan, AnythingMatchesEverySubject) {
   FailurePlan<Operation> plan;
   plan.failNext(Operation::write, kAnything, numbered(1));
   EXPECT_EQ(plan.take(Operation::write, "/whatever"), numbered(1));
   EXPECT_EQ(plan.take(Operation::write, "/whatever"), std::nullopt);
 }
 
-TEST(FailurePlan, FailingEnds) {
+TEST(FailurePlan, FailingCanBeStopped) {
   FailurePlan<Operation> plan;
   plan.failAlways(Operation::read, "/a", numbered(1));
   plan.stopFailing();

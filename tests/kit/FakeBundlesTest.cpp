@@ -6,7 +6,7 @@
 namespace appsync::test {
 namespace {
 
-TEST(FakeBundles, AFolderMayBeMadeImpossibleToOpen) {
+TEST(FakeBundles, OpeningADirectoryCanFail) {
   FakePlatform platform;
   putAppFolder(platform.files, "/a.app", "com.a", "A");
   putAppFolder(platform.files, "/b.app", "com.b", "B");

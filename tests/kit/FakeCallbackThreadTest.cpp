@@ -9,7 +9,7 @@
 namespace appsync::test {
 namespace {
 
-TEST(FakeCallbackThread, CallsBackOnAThreadOfItsOwn) {
+TEST(FakeCallbackThread, RunsCallbacksOnItsOwnThread) {
   FakeCallbackThread thread;
   std::thread::id called;
   thread.post(thread.subscribe(), [&] { called = std::this_thread::get_id(); });
@@ -18,7 +18,7 @@ TEST(FakeCallbackThread, CallsBackOnAThreadOfItsOwn) {
   EXPECT_NE(called, std::this_thread::get_id());
 }
 
-TEST(FakeCallbackThread, DropsWhatIsPostedToAnEndedSubscription) {
+TEST(FakeCallbackThread, DropsCallbacksOfAnEndedSubscription) {
   FakeCallbackThread thread;
   const FakeCallbackThread::Subscription subscription = thread.subscribe();
   Gate gate;
@@ -34,7 +34,7 @@ TEST(FakeCallbackThread, DropsWhatIsPostedToAnEndedSubscription) {
   EXPECT_EQ(thread.subscriptions(), 1U);
 }
 
-TEST(FakeCallbackThread, EndingASubscriptionWaitsForItsRunningCallback) {
+TEST(FakeCallbackThread, UnsubscribingWaitsForTheRunningCallback) {
   FakeCallbackThread thread;
   const FakeCallbackThread::Subscription subscription = thread.subscribe();
   Gate gate;
@@ -52,7 +52,7 @@ TEST(FakeCallbackThread, EndingASubscriptionWaitsForItsRunningCallback) {
   gate.open();
 }
 
-TEST(FakeCallbackThread, ACallbackMayEndItsOwnSubscription) {
+TEST(FakeCallbackThread, CallbackCanEndItsSubscription) {
   FakeCallbackThread thread;
   const FakeCallbackThread::Subscription subscription = thread.subscribe();
   std::atomic<int> calls = 0;

@@ -30,7 +30,7 @@ class FakeDeviceServiceTest : public testing::Test {
 
 }  // namespace
 
-TEST_F(FakeDeviceServiceTest, EachOperationCanBeSwitchedOff) {
+TEST_F(FakeDeviceServiceTest, OperationsCanBeDisabled) {
   EXPECT_TRUE(service.supports(Operation::prioritizeAsset));
   EXPECT_TRUE(service.supports(Operation::cancelAssetTransferForFailedAsset));
   service.stopSupporting(Operation::prioritizeAsset);
@@ -39,7 +39,7 @@ TEST_F(FakeDeviceServiceTest, EachOperationCanBeSwitchedOff) {
   EXPECT_NONFATAL_FAILURE(prioritize(), "prioritizeAsset is not supported");
 }
 
-TEST_F(FakeDeviceServiceTest, PrioritizingCompletesBeforeItReturnsOrWhenTold) {
+TEST_F(FakeDeviceServiceTest, PrioritizingCompletesAtOnceOrOnRequest) {
   prioritize();
   EXPECT_EQ(completions, 1);
   service.holdCompletions();
@@ -52,7 +52,7 @@ TEST_F(FakeDeviceServiceTest, PrioritizingCompletesBeforeItReturnsOrWhenTold) {
   EXPECT_EQ(outcome->code, 7);
 }
 
-TEST_F(FakeDeviceServiceTest, CallsAreJournaledAndFailAsTheJournalSays) {
+TEST_F(FakeDeviceServiceTest, JournalsCallsAndFailsByTheHook) {
   service.cancelAssetTransferForFailedAsset(asset);
   journal.failCall(1, Error{"ZTError", 9, {}, nullptr});
   prioritize();

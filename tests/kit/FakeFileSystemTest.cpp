@@ -20,7 +20,7 @@ class FakeFileSystemTest : public testing::Test {
   FakeFileSystem files{journal};
 };
 
-TEST_F(FakeFileSystemTest, PreparingIsNotJournaled) {
+TEST_F(FakeFileSystemTest, DoesNotJournalPreparations) {
   files.put("/a/b", "text");
   files.putFolder("/c");
   files.putLink("/link", "a/b");
@@ -31,7 +31,7 @@ TEST_F(FakeFileSystemTest, PreparingIsNotJournaled) {
   EXPECT_EQ(journal.lines(), Lines());
 }
 
-TEST_F(FakeFileSystemTest, CallsAreJournaledWithTheirPaths) {
+TEST_F(FakeFileSystemTest, JournalsCallsWithTheirPaths) {
   static_cast<void>(files.readFile("/a"));
   static_cast<void>(files.moveItem("/a", "/b"));
   static_cast<void>(files.createDirectory("/c", IntermediateDirectories::create, {}));
@@ -39,7 +39,7 @@ TEST_F(FakeFileSystemTest, CallsAreJournaledWithTheirPaths) {
             (Lines{"fileSystem.readFile /a", "fileSystem.moveItem /a /b", "fileSystem.createDirectory /c"}));
 }
 
-TEST_F(FakeFileSystemTest, ThePathsOfAFolderAreListedInOrder) {
+TEST_F(FakeFileSystemTest, ListsPathsInOrder) {
   files.put("/a/z", "1");
   files.put("/a/folder/y", "2");
   EXPECT_EQ(files.paths("/a"), (Lines{"/a/folder/", "/a/folder/y", "/a/z"}));
@@ -47,7 +47,7 @@ TEST_F(FakeFileSystemTest, ThePathsOfAFolderAreListedInOrder) {
   EXPECT_EQ(files.paths("/missing"), Lines());
 }
 
-TEST_F(FakeFileSystemTest, AnInjectedFailureChangesNothing) {
+TEST_F(FakeFileSystemTest, InjectedFailureChangesNothing) {
   files.put("/a", "old");
   files.failures.failNext(FileOperation::writeFileAtomically, "/a", kFailure);
   EXPECT_EQ(files.writeFileAtomically("/a", bytesOf("new")).failure(), kFailure);
@@ -58,7 +58,7 @@ TEST_F(FakeFileSystemTest, AnInjectedFailureChangesNothing) {
   EXPECT_EQ(files.writes("/a"), 1U);
 }
 
-TEST_F(FakeFileSystemTest, AMoveFailsByEitherPath) {
+TEST_F(FakeFileSystemTest, MoveFailsByEitherPath) {
   files.put("/from", "text");
   files.failures.failNext(FileOperation::moveItem, "/from", kFailure);
   EXPECT_FALSE(files.moveItem("/from", "/to").ok());
@@ -68,7 +68,7 @@ TEST_F(FakeFileSystemTest, AMoveFailsByEitherPath) {
   EXPECT_TRUE(files.moveItem("/from", "/to").ok());
 }
 
-TEST_F(FakeFileSystemTest, EveryOperationFailsWhenTheJournalSaysSo) {
+TEST_F(FakeFileSystemTest, JournalHookFailsEveryOperation) {
   files.put("/a", "text");
   journal.setHook([](std::string_view, std::string_view) -> std::optional<Error> { return kFailure; });
   EXPECT_FALSE(files.fileExists("/a"));
@@ -85,7 +85,7 @@ TEST_F(FakeFileSystemTest, EveryOperationFailsWhenTheJournalSaysSo) {
   EXPECT_EQ(files.text("/a"), "text");
 }
 
-TEST_F(FakeFileSystemTest, OwnersAreThoseGivenAtCreation) {
+TEST_F(FakeFileSystemTest, ReturnsOwnersGivenAtCreation) {
   const OwnerAttributes owners{"mobile", "mobile"};
   EXPECT_TRUE(files.createDirectory("/a/b", IntermediateDirectories::create, owners).ok());
   EXPECT_EQ(files.owners("/a/b"), owners);
@@ -94,7 +94,7 @@ TEST_F(FakeFileSystemTest, OwnersAreThoseGivenAtCreation) {
   EXPECT_EQ(files.owners("/missing"), std::nullopt);
 }
 
-TEST_F(FakeFileSystemTest, TouchesAreCounted) {
+TEST_F(FakeFileSystemTest, CountsTouches) {
   files.put("/a", "x");
   EXPECT_TRUE(files.touch("/a").ok());
   EXPECT_TRUE(files.touch("/a").ok());
@@ -102,7 +102,7 @@ TEST_F(FakeFileSystemTest, TouchesAreCounted) {
   EXPECT_EQ(files.touches("/missing"), 0U);
 }
 
-TEST_F(FakeFileSystemTest, PreparingWhatCannotBeFailsTheTest) {
+TEST_F(FakeFileSystemTest, ImpossiblePreparationFailsTheTest) {
   files.put("/a", "x");
   EXPECT_NONFATAL_FAILURE(files.putFolder("/a/b"), "no folder can be put at /a/b");
   EXPECT_NONFATAL_FAILURE(files.put("/tmp", "x"), "no file can be put at /tmp");

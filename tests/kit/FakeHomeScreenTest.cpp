@@ -12,7 +12,7 @@ using platform::TerminationAssertionOutcome;
 
 class FakeHomeScreenTest : public testing::Test {
  protected:
-  /// The code of the next answer, and whether there was an assertion: "1 none", "0 made".
+  /// Returns the outcome of the next request and whether it created an assertion: "1 none", "0 made".
   std::string ask(std::string_view identifier) {
     TerminationAssertionOutcome outcome{};
     const auto assertion = screen.terminationAssertionCreate(identifier, 0, outcome);
@@ -23,11 +23,11 @@ class FakeHomeScreenTest : public testing::Test {
   FakeHomeScreen screen{journal};
 };
 
-TEST_F(FakeHomeScreenTest, GrantsUnlessToldOtherwise) {
+TEST_F(FakeHomeScreenTest, GrantsByDefault) {
   EXPECT_EQ(ask("com.a"), "0 made");
 }
 
-TEST_F(FakeHomeScreenTest, AnswersAsScriptedAndThenAsUsual) {
+TEST_F(FakeHomeScreenTest, GivesScriptedAnswersThenTheDefault) {
   screen.answerAlways("com.a", AssertionAnswer::notFound());
   screen.answerNext("com.a", {AssertionAnswer::denied(),
                               AssertionAnswer::without(3),
@@ -41,7 +41,7 @@ TEST_F(FakeHomeScreenTest, AnswersAsScriptedAndThenAsUsual) {
   EXPECT_EQ(ask("com.a"), "2 none");
 }
 
-TEST_F(FakeHomeScreenTest, NotesWhenAnAssertionGoes) {
+TEST_F(FakeHomeScreenTest, JournalsTheReleaseOfAnAssertion) {
   TerminationAssertionOutcome outcome{};
   auto assertion = screen.terminationAssertionCreate("com.a", 0, outcome);
   EXPECT_EQ(screen.held(), std::multiset<std::string>{"com.a"});
@@ -50,17 +50,17 @@ TEST_F(FakeHomeScreenTest, NotesWhenAnAssertionGoes) {
   EXPECT_EQ(journal.lines(), (Lines{"homeScreen.terminationAssertionCreate com.a", "homeScreen.release com.a"}));
 }
 
-TEST_F(FakeHomeScreenTest, KeepsTheLayoutsThatItWasGiven) {
+TEST_F(FakeHomeScreenTest, RecordsLayouts) {
   screen.setIconState(screen.blockableServerPort(), bytesOf("first"));
   screen.setIconState(screen.blockableServerPort(), bytesOf("second"));
   EXPECT_EQ(screen.iconStates(), (Lines{"first", "second"}));
 }
 
-TEST_F(FakeHomeScreenTest, HasNoOrderUntilItIsGivenOne) {
+TEST_F(FakeHomeScreenTest, HasNoOrderByDefault) {
   EXPECT_EQ(screen.getFlattenedIconState(screen.blockableServerPort(), 1), std::nullopt);
 }
 
-TEST_F(FakeHomeScreenTest, AnswersAFailedCallWithAnUnknownCode) {
+TEST_F(FakeHomeScreenTest, FailedCallReturnsAnUnknownCode) {
   journal.failCall(1, Error{});
   EXPECT_EQ(ask("com.a"), "255 none");
 }

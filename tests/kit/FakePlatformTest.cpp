@@ -11,7 +11,7 @@ namespace {
 
 using Lines = std::vector<std::string>;
 
-TEST(FakePlatform, AServiceMayBeReplaced) {
+TEST(FakePlatform, ServicesCanBeReplaced) {
   CallJournal otherJournal;
   FakeHomeScreen other(otherJournal);
   FakePlatform platform;
@@ -21,7 +21,7 @@ TEST(FakePlatform, AServiceMayBeReplaced) {
   EXPECT_EQ(&platform.defaultRegistry(), &platform.registry);
 }
 
-TEST(FakePlatform, ConnectionsMayBeReplaced) {
+TEST(FakePlatform, ConnectionsCanBeReplaced) {
   CallJournal otherJournal;
   FakeBackups other(otherJournal);
   FakePlatform platform;
@@ -37,7 +37,7 @@ TEST(FakePlatform, ConnectionsMayBeReplaced) {
   EXPECT_EQ(platform.store.connections(), 0U);
 }
 
-TEST(FakePlatform, CallsOfAllServicesAreInOneOrder) {
+TEST(FakePlatform, JournalsCallsOfAllServicesInOneOrder) {
   FakePlatform platform;
   static_cast<void>(platform.homeScreen().blockableServerPort());
   static_cast<void>(platform.fileSystem().fileExists("/a"));
@@ -46,7 +46,7 @@ TEST(FakePlatform, CallsOfAllServicesAreInOneOrder) {
             (Lines{"homeScreen.blockableServerPort", "fileSystem.fileExists /a", "bundles.mainBundleIdentifier"}));
 }
 
-TEST(FakePlatform, AnyCallMayFailByItsNumber) {
+TEST(FakePlatform, AnyCallCanFailByItsNumber) {
   FakePlatform platform;
   platform.uninstalledList.add("com.a");
   platform.journal.failCall(2, Error{});
@@ -55,7 +55,7 @@ TEST(FakePlatform, AnyCallMayFailByItsNumber) {
   EXPECT_EQ(platform.uninstalledApps().clearUninstalled({"com.a"}), 0);
 }
 
-TEST(FakePlatform, AScheduledTaskGoesWhileTheServicesAreThere) {
+TEST(FakePlatform, DestroysScheduledTasksBeforeTheServices) {
   struct Client {
     explicit Client(FakePlatform& p) : platform(p) { platform.registry.addObserver(observer); }
     ~Client() { platform.registry.removeObserver(observer); }
@@ -68,14 +68,14 @@ TEST(FakePlatform, AScheduledTaskGoesWhileTheServicesAreThere) {
   platform.scheduler().after(std::chrono::seconds(30), [client = std::make_shared<Client>(platform)] {});
 }
 
-TEST(FakePlatform, AnEntryBeforeTheTransactionLogHasALogFailsTheTest) {
+TEST(FakePlatform, EntryBeforeInitializeWithLogFailsTheTest) {
   FakePlatform platform;
   EXPECT_NONFATAL_FAILURE(platform.transactions.logScenario("Harvo Sync", 0, true, "com.a", "text"),
                           "before the transaction log has a log");
   EXPECT_NONFATAL_FAILURE(platform.transactions.initializeWithLog(nullptr), "is given no log");
 }
 
-TEST(FakePlatform, TheTransactionLogsHandleTellsWhoMadeIt) {
+TEST(FakePlatform, LogHandleHasSubsystemAndCategory) {
   FakePlatform platform;
   platform.transactions.initializeWithLog(platform.systemLogs.createHandle("subsystem", "category"));
   ASSERT_NE(platform.transactions.log(), nullptr);
@@ -83,7 +83,7 @@ TEST(FakePlatform, TheTransactionLogsHandleTellsWhoMadeIt) {
   EXPECT_EQ(platform.transactions.log()->category, "category");
 }
 
-TEST(FakeStore, ARefreshMayBeCompletedByTheTest) {
+TEST(FakeStore, TestsCanCompleteARefresh) {
   FakePlatform platform;
   platform.store.completeRefreshes(RefreshCompletion::whenTold, Error{"Store", 1, "no connection", nullptr});
   const auto library = platform.makeSoftwareLibrary();
@@ -96,7 +96,7 @@ TEST(FakeStore, ARefreshMayBeCompletedByTheTest) {
   EXPECT_EQ(failure->text, "no connection");
 }
 
-TEST(FakeStore, ALibraryThatGoesBeforeItsCompletionFailsTheTest) {
+TEST(FakeStore, DestroyingALibraryTooEarlyFailsTheTest) {
   FakePlatform platform;
   platform.store.completeRefreshes(RefreshCompletion::whenTold);
   auto library = platform.makeSoftwareLibrary();
@@ -105,7 +105,7 @@ TEST(FakeStore, ALibraryThatGoesBeforeItsCompletionFailsTheTest) {
   platform.store.complete();
 }
 
-TEST(FakeInstallCoordination, ConnectionsAreKeptWithTheirArguments) {
+TEST(FakeInstallCoordination, RecordsConnectionsWithTheirArguments) {
   FakePlatform platform;
   platform::InstallObserverDelegate delegate;
   auto connection =
@@ -121,7 +121,7 @@ TEST(FakeInstallCoordination, ConnectionsAreKeptWithTheirArguments) {
   EXPECT_TRUE(platform.coordination.coordinationIsEnabled());
 }
 
-TEST(FakeSystemNotify, PostsAreKeptWithTheirStates) {
+TEST(FakeSystemNotify, RecordsPostsWithTheirStates) {
   FakePlatform platform;
   const auto registration = platform.notify.registerCheck("name");
   platform.notify.setState(registration.token, 1);
@@ -131,14 +131,14 @@ TEST(FakeSystemNotify, PostsAreKeptWithTheirStates) {
   EXPECT_EQ(platform.notify.posts(), (std::vector<Post>{{"name", 1}, {"name", 0}}));
 }
 
-TEST(FakeSystemNotify, RegistrationsMayFail) {
+TEST(FakeSystemNotify, RegistrationsCanFail) {
   FakePlatform platform;
   platform.notify.failRegistrationsWith(9);
   EXPECT_EQ(platform.notify.registerCheck("name").status, 9U);
   EXPECT_NONFATAL_FAILURE(platform.notify.setState(0, 1), "without a token");
 }
 
-TEST(FakeSystemNotify, DeliveryReachesObserversBeforeItReturns) {
+TEST(FakeSystemNotify, DeliverCallsObserversBeforeItReturns) {
   FakePlatform platform;
   int calls = 0;
   const auto count = [](void* context, std::string_view, const void*) { ++*static_cast<int*>(context); };
@@ -150,7 +150,7 @@ TEST(FakeSystemNotify, DeliveryReachesObserversBeforeItReturns) {
   platform.notify.removeObserver(&calls, "name");
 }
 
-TEST(FakeSyncFramework, ErrorsAreJudgedAsTold) {
+TEST(FakeSyncFramework, RecoverabilityCanBeSet) {
   FakePlatform platform;
   EXPECT_FALSE(platform.framework.ZTIsRecoverableError(Error{"POSIX", 4, "", nullptr}));
   platform.framework.judgeErrorsBy([](const Error& error) { return error.domain == "POSIX"; });
@@ -158,14 +158,14 @@ TEST(FakeSyncFramework, ErrorsAreJudgedAsTold) {
   EXPECT_FALSE(platform.framework.ZTIsRecoverableError(Error{"Other", 4, "", nullptr}));
 }
 
-TEST(FakeSyncFramework, AReclassifiedAssetAnswersInTurn) {
+TEST(FakeSyncFramework, ReclassifiedAssetReturnsValuesInOrder) {
   const ReclassifiedAsset asset("com.a", {true, false});
   EXPECT_TRUE(asset.isRestore());
   EXPECT_FALSE(asset.isRestore());
   EXPECT_FALSE(asset.isRestore());
 }
 
-TEST(TodoList, TheFirstEntryOfAnAppTellsItsOperation) {
+TEST(SyncFileBuilder, ReturnsTheOperationOfTheFirstEntry) {
   FakePlatform platform;
   EXPECT_EQ(operationWord(platform.files, "com.a"), std::nullopt);
   platform.files.put(kTodoListPath,
@@ -175,7 +175,7 @@ TEST(TodoList, TheFirstEntryOfAnAppTellsItsOperation) {
   EXPECT_EQ(operationWord(platform.files, "com.c"), std::nullopt);
 }
 
-TEST(TodoList, AnAppFolderHasAnIconThatIsRendered) {
+TEST(SyncFileBuilder, AppDirectoryHasARenderableIcon) {
   FakePlatform platform;
   putAppFolder(platform.files, "/A.app", "com.a", "A");
   const auto bundle = platform.bundles().openBundle({"/A.app", true});

@@ -8,7 +8,7 @@ namespace {
 
 using Lines = std::vector<std::string>;
 
-TEST(RecordingLog, KeepsLinesOfAllCategoriesInOneOrder) {
+TEST(RecordingLog, RecordsAllCategoriesInOneOrder) {
   RecordingLog log;
   log.category(8).write(LogLevel::standard, "com.corvel.qor.Zephtra.AppSync|first");
   log.category(14).write(LogLevel::standard, "com.corvel.qor.Zephtra.AppSync|second");
@@ -21,13 +21,13 @@ TEST(RecordingLog, KeepsLinesOfAllCategoriesInOneOrder) {
   EXPECT_FALSE(log.contains(loggedError("first")));
 }
 
-TEST(RecordingLog, ALineWithoutTheIdentifierIsNotTakenForOneWithIt) {
+TEST(RecordingLog, DistinguishesLinesWithoutTheIdentifier) {
   RecordingLog log;
   log.category(8).write(LogLevel::standard, "first");
   EXPECT_FALSE(log.contains(logged("first")));
 }
 
-TEST(RecordingLog, EverythingIsEnabledUntilItIsDisabled) {
+TEST(RecordingLog, EnablesAllCategoriesByDefault) {
   RecordingLog log;
   LogCategory& category = log.category(8);
   EXPECT_TRUE(category.isEnabled(LogLevel::standard));
@@ -39,14 +39,14 @@ TEST(RecordingLog, EverythingIsEnabledUntilItIsDisabled) {
   EXPECT_TRUE(category.isEnabled(LogLevel::standard));
 }
 
-TEST(RecordingLog, ForgetsItsLines) {
+TEST(RecordingLog, ClearsItsLines) {
   RecordingLog log;
   log.category(8).write(LogLevel::standard, "first");
   log.clear();
   EXPECT_EQ(log.lines(), LogLines());
 }
 
-TEST(RecordingLog, ComparedLinesShowWhatDiffers) {
+TEST(RecordingLog, ComparisonShowsDifferences) {
   EXPECT_TRUE(sameLines(LogLines{logged("a")}, LogLines{logged("a")}));
   const testing::AssertionResult result = sameLines(LogLines{logged("a"), loggedError("b")}, LogLines{logged("a")});
   EXPECT_FALSE(result);
@@ -56,13 +56,13 @@ TEST(RecordingLog, ComparedLinesShowWhatDiffers) {
                "- [8 error] com.corvel.qor.Zephtra.AppSync|b\n");
 }
 
-TEST(SameLines, ShowsMissingAndSuperfluousLinesInTheirPlaces) {
+TEST(SameLines, ShowsMissingAndUnexpectedLinesInOrder) {
   const testing::AssertionResult result = sameLines(Lines{"a", "b", "c", "d"}, Lines{"a", "x", "c", "y", "d"});
   EXPECT_FALSE(result);
   EXPECT_STREQ(result.message(), "- expected, + actual\n  a\n- b\n+ x\n  c\n+ y\n  d\n");
 }
 
-TEST(SameLines, EqualListsAreTheSame) {
+TEST(SameLines, SucceedsForEqualLists) {
   EXPECT_TRUE(sameLines(Lines{}, Lines{}));
   EXPECT_TRUE(sameLines(Lines{"a", "a"}, Lines{"a", "a"}));
   EXPECT_FALSE(sameLines(Lines{"a", "a"}, Lines{"a"}));

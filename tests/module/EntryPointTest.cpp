@@ -1,4 +1,4 @@
-// What the module's entry point does for daemons of its own version and of others.
+// The module's entry point, called by daemons of the same and of other versions.
 #include <stdexcept>
 
 #include <gtest/gtest.h>
@@ -25,7 +25,7 @@ class EntryPoint : public testing::Test {
   const platform::ModuleEntryPoint makeClient_ = loadModule();
 };
 
-TEST_F(EntryPoint, MakesAClientForADaemonOfItsVersion) {
+TEST_F(EntryPoint, CreatesAClientForItsVersion) {
   ask(kModuleInterfaceVersion, &platform);
   EXPECT_EQ(answer.interfaceVersion, kModuleInterfaceVersion);
   EXPECT_STREQ(answer.refusal, "");
@@ -33,7 +33,7 @@ TEST_F(EntryPoint, MakesAClientForADaemonOfItsVersion) {
   EXPECT_EQ(client->currentSyncAnchor(), "NO_APP_SYNC_ANCHOR");
 }
 
-TEST_F(EntryPoint, MakesANewClientEachTime) {
+TEST_F(EntryPoint, CreatesANewClientPerCall) {
   ask(kModuleInterfaceVersion, &platform);
   const Client first = std::exchange(client, nullptr);
   ask(kModuleInterfaceVersion, &platform);
@@ -41,7 +41,7 @@ TEST_F(EntryPoint, MakesANewClientEachTime) {
   EXPECT_NE(client, first);
 }
 
-TEST_F(EntryPoint, RefusesADaemonOfAnotherVersionAndLooksAtNothingOfIts) {
+TEST_F(EntryPoint, RefusesAnotherVersionWithoutReadingArguments) {
   for (const std::uint32_t version : {0U, kModuleInterfaceVersion + 1}) {
     ask(version, nullptr);
     EXPECT_EQ(answer.interfaceVersion, kModuleInterfaceVersion);
@@ -51,7 +51,7 @@ TEST_F(EntryPoint, RefusesADaemonOfAnotherVersionAndLooksAtNothingOfIts) {
   }
 }
 
-/// A platform that breaks its promise to throw nothing.
+/// A platform that throws in violation of its contract.
 template <class Thrown>
 class ThrowingBundles final : public platform::Bundles {
  public:
@@ -63,7 +63,7 @@ class ThrowingBundles final : public platform::Bundles {
   const Thrown thrown_;
 };
 
-TEST_F(EntryPoint, LetsNoExceptionOut) {
+TEST_F(EntryPoint, CatchesExceptions) {
   ThrowingBundles bundles(std::runtime_error("no bundles here"));
   platform.use(bundles);
   ask(kModuleInterfaceVersion, &platform);
@@ -72,7 +72,7 @@ TEST_F(EntryPoint, LetsNoExceptionOut) {
   EXPECT_EQ(client, nullptr);
 }
 
-TEST_F(EntryPoint, LetsNothingElseOutThatIsThrown) {
+TEST_F(EntryPoint, CatchesOtherThrownValues) {
   ThrowingBundles bundles(7);
   platform.use(bundles);
   ask(kModuleInterfaceVersion, &platform);
@@ -80,7 +80,7 @@ TEST_F(EntryPoint, LetsNothingElseOutThatIsThrown) {
   EXPECT_EQ(client, nullptr);
 }
 
-TEST_F(EntryPoint, CutsALongReasonAndEndsIt) {
+TEST_F(EntryPoint, TruncatesAndTerminatesALongReason) {
   ThrowingBundles bundles(std::runtime_error(std::string(1000, 'x')));
   platform.use(bundles);
   ask(kModuleInterfaceVersion, &platform);

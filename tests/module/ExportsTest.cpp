@@ -1,4 +1,4 @@
-// What a daemon that loads the module gets to see of it.
+// The symbols that the module exports.
 #include <array>
 #include <cstdio>
 #include <string>
@@ -23,7 +23,7 @@ std::string outputOf(const std::string& command) {
   return output;
 }
 
-TEST(Exports, TheEntryPointIsTheModulesOnlySymbol) {
+TEST(Exports, EntryPointIsTheOnlySymbol) {
   const std::string lines = outputOf("nm --dynamic --defined-only --portability '" + std::string(kModule) + "'");
   EXPECT_EQ(lines.substr(0, lines.find(' ')), platform::kModuleEntryPointName);
   EXPECT_EQ(lines.find('\n') + 1, lines.size()) << lines;

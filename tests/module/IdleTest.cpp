@@ -1,4 +1,4 @@
-// What a plug-in costs that has nothing to do.
+// Resources of an idle plug-in.
 #include <algorithm>
 #include <filesystem>
 #include <string_view>
@@ -17,7 +17,7 @@ namespace {
 
 constexpr std::size_t kMostOfItsOwn = 2 * 1024 * 1024;
 
-/// What the loaded module's variables take: the parts of its file that are its own in each process.
+/// Bytes of the loaded module's variables: the writable segments of its file.
 std::size_t writableBytes() {
   std::size_t bytes = 0;
   ::dl_iterate_phdr(
@@ -44,22 +44,22 @@ std::ptrdiff_t threads() {
 class Idle : public testing::Test {
  protected:
   FakePlatform platform;
-  /// The fakes keep memory and threads of their own from their first client on; what another takes is the plug-in's.
+  /// The fakes allocate memory and threads for their first client; a second client measures the plug-in alone.
   const std::shared_ptr<platform::ZTClient> first = makeModuleClient(platform);
 };
 
-TEST_F(Idle, AClientHoldsLittleMemory) {
+TEST_F(Idle, ClientHoldsLittleMemory) {
   const std::ptrdiff_t before = memory::held;
   const auto client = makeModuleClient(platform);
   const auto held = static_cast<std::size_t>(memory::held - before);
-  EXPECT_GT(held, sizeof(platform::ZTClient)) << "the module's memory is not counted";
+  EXPECT_GT(held, sizeof(platform::ZTClient)) << "the module's memory is not measured";
   EXPECT_GT(writableBytes(), 0);
-  // What instrumentation counts and remembers is not the plug-in's.
+  // Instrumentation needs memory of its own.
   const std::size_t variables = isInstrumented() ? 0 : writableBytes();
   EXPECT_LT(held + variables, kMostOfItsOwn);
 }
 
-TEST_F(Idle, AClientStartsNoThread) {
+TEST_F(Idle, ClientStartsNoThread) {
   const std::ptrdiff_t before = threads();
   const auto client = makeModuleClient(platform);
   EXPECT_EQ(threads(), before);

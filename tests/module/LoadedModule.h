@@ -1,4 +1,4 @@
-// The plug-in as a daemon loads it, without the tool.
+// Loads the plug-in as a daemon does.
 #pragma once
 
 #include <memory>
@@ -7,10 +7,10 @@
 
 namespace appsync::test {
 
-/// Throws when the module cannot be loaded.
+/// Loads the module. Throws if it cannot be loaded.
 [[nodiscard]] platform::ModuleEntryPoint loadModule();
 
-/// A client of the module; throws when it makes none.
+/// Creates a client of the module. Throws if the module refuses.
 [[nodiscard]] std::shared_ptr<platform::ZTClient> makeModuleClient(platform::Platform& platform);
 
 }  // namespace appsync::test

@@ -17,14 +17,14 @@ ZTMutableAccountInfo account(std::string identifier) {
   return info;
 }
 
-TEST(ZTMutableAccountInfo, IsMadeEmpty) {
+TEST(ZTMutableAccountInfo, IsInitiallyEmpty) {
   const ZTMutableAccountInfo info;
   EXPECT_EQ(info.DSID(), std::nullopt);
   EXPECT_EQ(info.corvelID(), "");
   EXPECT_EQ(info.altDSID(), std::nullopt);
 }
 
-TEST(ZTMutableAccountInfo, KeepsWhatItIsGiven) {
+TEST(ZTMutableAccountInfo, StoresItsValues) {
   ZTMutableAccountInfo info = account("a@example.org");
   info.setDSID(plist::Value(7));
   info.setAltDSID("000-7");
@@ -33,7 +33,7 @@ TEST(ZTMutableAccountInfo, KeepsWhatItIsGiven) {
   EXPECT_EQ(info.altDSID(), "000-7");
 }
 
-TEST(ZTMutableAccountInfo, PrintsWhatItKnows) {
+TEST(ZTMutableAccountInfo, DescribesItsValues) {
   ZTMutableAccountInfo info = account("a@example.org");
   EXPECT_EQ(description(info), "<ZTMutableAccountInfo corvelID a@example.org DSID (null) altDSID (null)>");
   info.setDSID(plist::Value(7));
@@ -41,7 +41,7 @@ TEST(ZTMutableAccountInfo, PrintsWhatItKnows) {
   EXPECT_EQ(description(info), "<ZTMutableAccountInfo corvelID a@example.org DSID 7 altDSID 000-7>");
 }
 
-TEST(ZTMutableAccountInfo, EqualsOnlyWhatIsTheSameInEveryField) {
+TEST(ZTMutableAccountInfo, EqualityComparesEveryField) {
   ZTMutableAccountInfo info = account("a");
   EXPECT_EQ(info, account("a"));
   EXPECT_NE(info, account("A"));
@@ -52,7 +52,7 @@ TEST(ZTMutableAccountInfo, EqualsOnlyWhatIsTheSameInEveryField) {
   EXPECT_NE(info, account("a"));
 }
 
-TEST(ZTAccountInfos, AreInTheOrderOfTheirIdentifiersBytes) {
+TEST(ZTAccountInfos, AreOrderedByTheBytesOfTheIdentifier) {
   const ZTAccountInfos accounts{account("b"), account(""), account("\xc3\xa9"), account("B")};
   std::string order;
   for (const ZTMutableAccountInfo& info : accounts)
@@ -60,7 +60,7 @@ TEST(ZTAccountInfos, AreInTheOrderOfTheirIdentifiersBytes) {
   EXPECT_EQ(order, ",B,b,\xc3\xa9,");
 }
 
-TEST(ZTAccountInfos, HoldOneOfEachIdentifierAndTheFirstStays) {
+TEST(ZTAccountInfos, KeepTheFirstOfEqualIdentifiers) {
   ZTMutableAccountInfo second = account("a");
   second.setDSID(plist::Value(2));
   ZTAccountInfos accounts{account("a")};
@@ -68,7 +68,7 @@ TEST(ZTAccountInfos, HoldOneOfEachIdentifierAndTheFirstStays) {
   EXPECT_EQ(accounts, ZTAccountInfos{account("a")});
 }
 
-TEST(ZTAccountInfos, AreFoundByTheirIdentifier) {
+TEST(ZTAccountInfos, AreFoundByIdentifier) {
   const ZTAccountInfos accounts{account("a")};
   EXPECT_TRUE(accounts.contains(std::string_view("a")));
   EXPECT_FALSE(accounts.contains(std::string_view("A")));
