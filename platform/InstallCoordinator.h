@@ -44,8 +44,8 @@ class InstallCoordinator {
   /// Returns the app's bundle identifier, or nullopt if the service no longer has it.
   [[nodiscard]] virtual std::optional<std::string> bundleID() const = 0;
   [[nodiscard]] virtual CoordinatorKind kind() const = 0;
-  /// The client that created the coordinator. Other clients must not change it, except where an operation takes a
-  /// client.
+  /// The client that created the coordinator. Only this client may change it, except that the responsible client sets
+  /// the app-asset promise and any client may cancel.
   [[nodiscard]] virtual ClientIdentity creatorIdentifier() const = 0;
   /// Returns the reason for the cancellation or the installer's error, or nullopt if neither occurred.
   [[nodiscard]] virtual std::optional<Error> coordinatorError() const = 0;

@@ -47,20 +47,29 @@ class ZTClient {
   virtual ~ZTClient() = default;
 
   [[nodiscard]] virtual std::vector<std::string> supportedDataclasses() = 0;
+  /// Returns the client's state of synchronization, for the host to compare. A client may return a constant.
   [[nodiscard]] virtual std::string currentSyncAnchor() = 0;
+  /// Begins a sync. Returns false and sets `error` if the client refuses it. A client need not report progress.
   virtual bool prepareForSyncWithHostAnchor(std::string_view hostAnchor, const ProgressCallback& progressCallback,
                                             ErrorSlot error) = 0;
   /// Returns the installed assets and the deleted ones, for the host; `AppsClient` documents the keys.
   [[nodiscard]] virtual plist::Dictionary installedAssets() = 0;
+  /// Applies the host's instructions from its staging directory. Returns false and sets `error` if the sync cannot go
+  /// on. A client need not report progress.
   virtual bool reconcileSync(const Assets& assets, std::string_view newAnchor, const ProgressCallback& progressCallback,
                              ErrorSlot error) = 0;
   /// Returns the packages that the host is to send, in the requested order.
   [[nodiscard]] virtual Assets outstandingAssetTransfers() = 0;
+  /// Reports the received fraction of the package, from 0 to 1.
   virtual void assetTransferUpdatedProgress(const std::shared_ptr<ZTAsset>& asset, double fraction) = 0;
+  /// Reports the end of one transfer. After a success the client owns the package at the asset's path and may install
+  /// it asynchronously.
   virtual void assetTransferSucceeded(const std::shared_ptr<ZTAsset>& asset, bool succeeded,
                                       const std::optional<Error>& error) = 0;
+  /// Reports the end of all transfers. Blocks until all installs have ended.
   virtual void assetTransferEndedWithSuccess(bool success) = 0;
   virtual void syncEndedWithSuccess(bool success) = 0;
+  /// Resets the client: deletes its sync state and removes all placeholders.
   virtual void clearSyncData() = 0;
 
   /// Processes the host's restore file on a restored device. Returns false and sets `error` on failure.
