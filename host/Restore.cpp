@@ -81,7 +81,7 @@ std::optional<std::string> Restore::unfinishedBackup() const {
   const Result<Bytes> bytes = device::readHostFile(markerPath());
   if (!bytes) return std::nullopt;
   const Result<plist::Value> root = plist::read(*bytes);
-  return root ? ownedStringIn(root->find(kBackupKey)) : std::nullopt;
+  return root ? plist::ownedStringIn(root->find(kBackupKey)) : std::nullopt;
 }
 
 Status Restore::saveMarker() {

@@ -59,8 +59,8 @@ void AppRegistry::enumerateBundlesOfType(
   std::vector<AppRow> rows;
   {
     Database::Session session(database_);
-    Result<std::vector<AppRow>> found = kind == BundleKind::All ? app_table::all(session)
-                                        : kind == BundleKind::User
+    Result<std::vector<AppRow>> found = kind == BundleKind::all ? app_table::all(session)
+                                        : kind == BundleKind::user
                                             ? app_table::ofType(session, platform::kApplicationTypeUser)
                                             : app_table::ofType(session, platform::kApplicationTypeSystem);
     if (!found) return;
