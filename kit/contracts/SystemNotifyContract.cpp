@@ -35,9 +35,9 @@ class Listener {
 
   void stop() { notify_.removeObserver(this, name_); }
 
-  [[nodiscard]] std::string heard() {
+  [[nodiscard]] std::string lastName() {
     const std::scoped_lock lock(mutex_);
-    return heard_;
+    return lastName_;
   }
 
   EventCounter calls;
@@ -51,7 +51,7 @@ class Listener {
     EXPECT_EQ(++self.inside_, 1) << "callbacks to one observer must not overlap";
     {
       const std::scoped_lock lock(self.mutex_);
-      self.heard_ = name;
+      self.lastName_ = name;
       self.thread = std::this_thread::get_id();
     }
     if (self.inCall) self.inCall();
@@ -63,7 +63,7 @@ class Listener {
   const std::string name_;
   std::atomic<int> inside_ = 0;
   std::mutex mutex_;
-  std::string heard_;
+  std::string lastName_;
 };
 
 }  // namespace
@@ -72,7 +72,7 @@ TEST_P(SystemNotifyContract, PostReachesItsObserver) {
   Listener listener(subject().notify());
   subject().notify().post(kName);
   ASSERT_TRUE(listener.calls.waitFor(1));
-  EXPECT_EQ(listener.heard(), kName);
+  EXPECT_EQ(listener.lastName(), kName);
 }
 
 TEST_P(SystemNotifyContract, CallsObserversOnAnotherThread) {

@@ -44,7 +44,7 @@ TEST_P(TimeContract, WaitWithoutDeadlineEndsWhenNotified) {
   std::mutex mutex;
   std::condition_variable condition;
   bool isReady = false;
-  std::jthread teller([&] {
+  std::jthread notifier([&] {
     const std::scoped_lock lock(mutex);
     isReady = true;
     condition.notify_all();

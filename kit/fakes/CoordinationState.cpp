@@ -133,7 +133,7 @@ void CoordinationState::showPlaceholder(const Coordinator& coordinator, std::opt
     coordinator->placeholder->isShown = true;
     registry_.showPlaceholder(coordinator->identifier, coordinator->placeholder->installType);
   }
-  tell(coordinator, &InstallObserverDelegate::coordinatorDidInstallPlaceholder);
+  notify(coordinator, &InstallObserverDelegate::coordinatorDidInstallPlaceholder);
 }
 
 void CoordinationState::install(const Coordinator& coordinator) {
@@ -143,12 +143,12 @@ void CoordinationState::install(const Coordinator& coordinator) {
   removePackage(now);
   update([&] {
     end(coordinator, status.failure());
-    tell(coordinator, &InstallObserverDelegate::coordinatorDidCompleteSuccessfully);
+    notify(coordinator, &InstallObserverDelegate::coordinatorDidCompleteSuccessfully);
   });
 }
 
 Status CoordinationState::installPackage(const FakeCoordinator& coordinator) {
-  if (!coordinator.appAsset->transferPath) return coordinationError("the package's place was never told");
+  if (!coordinator.appAsset->transferPath) return coordinationError("the app-asset promise has no transfer path");
   return registry_.install(*coordinator.appAsset->transferPath, installerOptions(coordinator));
 }
 
@@ -181,26 +181,26 @@ Status CoordinationState::cancel(const Coordinator& coordinator, FakeCancellatio
   coordinator->cancellation = cancellation;
   end(coordinator, cancellation.reason);
   if (cancellation.client == coordinator->creator) return {};
-  tell(coordinator, [cancellation](InstallObserverDelegate& delegate, InstallCoordinator& handle) {
+  notify(coordinator, [cancellation](InstallObserverDelegate& delegate, InstallCoordinator& handle) {
     delegate.coordinatorCanceledWithReason(handle, cancellation.reason, cancellation.client);
   });
   return {};
 }
 
-void CoordinationState::tell(const Coordinator& coordinator, const Report& report) {
-  const auto told = std::make_shared<std::set<InstallObserverDelegate*>>();
-  const auto tellOnce = [this, coordinator, report, told](InstallObserverDelegate& delegate) {
-    if (!told->insert(&delegate).second) return;
+void CoordinationState::notify(const Coordinator& coordinator, const Report& report) {
+  const auto notified = std::make_shared<std::set<InstallObserverDelegate*>>();
+  const auto notifyOnce = [this, coordinator, report, notified](InstallObserverDelegate& delegate) {
+    if (!notified->insert(&delegate).second) return;
     FakeInstallCoordinator handle(shared_from_this(), coordinator, coordinator->creator);
     report(delegate, handle);
   };
   for (const Connection& connection : connections) {
     if (!connection.isOpen || !connection.clients.contains(coordinator->creator)) continue;
     deliveries_.push_back(
-        {connection.subscription, [tellOnce, delegate = connection.delegate] { tellOnce(*delegate); }});
+        {connection.subscription, [notifyOnce, delegate = connection.delegate] { notifyOnce(*delegate); }});
   }
-  deliveries_.push_back({own_, [tellOnce, observer = coordinator->observer] {
-                           if (const auto delegate = observer.lock()) tellOnce(*delegate);
+  deliveries_.push_back({own_, [notifyOnce, observer = coordinator->observer] {
+                           if (const auto delegate = observer.lock()) notifyOnce(*delegate);
                          }});
 }
 

@@ -75,7 +75,7 @@ class CoordinationState : public std::enable_shared_from_this<CoordinationState>
   void end(const Coordinator& coordinator, std::optional<Error> error);
   Status cancel(const Coordinator& coordinator, FakeCancellation cancellation);
   void showPlaceholder(const Coordinator& coordinator, std::optional<Error> error);
-  void tell(const Coordinator& coordinator, const Report& report);
+  void notify(const Coordinator& coordinator, const Report& report);
 
   /// Runs `work` on the service's thread.
   void post(std::function<void()> work);

@@ -113,9 +113,9 @@ class FakeInstallCoordination final : public platform::InstallCoordination {
   explicit FakeInstallCoordination(std::shared_ptr<CoordinationState> state);
   /// Applies `event` to the app's first coordinator. Fails the test if there is none.
   template <class Event>
-  void happen(std::string_view identifier, CallbackOn where, const Event& event);
-  void tell(std::string_view identifier, CallbackOn where,
-            void (platform::InstallObserverDelegate::*callback)(platform::InstallCoordinator&));
+  void apply(std::string_view identifier, CallbackOn where, const Event& event);
+  void notify(std::string_view identifier, CallbackOn where,
+              void (platform::InstallObserverDelegate::*callback)(platform::InstallCoordinator&));
   Status uninstall(const std::string& identifier);
 
   const std::shared_ptr<CoordinationState> state_;

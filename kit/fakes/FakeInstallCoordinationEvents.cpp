@@ -121,7 +121,7 @@ std::vector<FakeInstallCoordination::Connection> FakeInstallCoordination::connec
 // Events.
 
 template <class Event>
-void FakeInstallCoordination::happen(std::string_view identifier, CallbackOn where, const Event& event) {
+void FakeInstallCoordination::apply(std::string_view identifier, CallbackOn where, const Event& event) {
   const Status status = state_->change(
       [&]() -> Status {
         const auto found = std::ranges::find(state_->living, identifier, &FakeCoordinator::identifier);
@@ -135,24 +135,24 @@ void FakeInstallCoordination::happen(std::string_view identifier, CallbackOn whe
 
 void FakeInstallCoordination::didInstallPlaceholder(std::string_view identifier, std::optional<Error> error,
                                                     CallbackOn where) {
-  happen(identifier, where, [&](const auto& coordinator) {
+  apply(identifier, where, [&](const auto& coordinator) {
     state_->showPlaceholder(coordinator, std::move(error));
     return Status();
   });
 }
 
 void FakeInstallCoordination::complete(std::string_view identifier, std::optional<Error> error, CallbackOn where) {
-  happen(identifier, where, [&](const auto& coordinator) {
+  apply(identifier, where, [&](const auto& coordinator) {
     state_->end(coordinator, std::move(error));
-    state_->tell(coordinator, &InstallObserverDelegate::coordinatorDidCompleteSuccessfully);
+    state_->notify(coordinator, &InstallObserverDelegate::coordinatorDidCompleteSuccessfully);
     return Status();
   });
 }
 
-void FakeInstallCoordination::tell(std::string_view identifier, CallbackOn where,
-                                   void (InstallObserverDelegate::*callback)(platform::InstallCoordinator&)) {
-  happen(identifier, where, [&](const auto& coordinator) {
-    state_->tell(coordinator, [callback](InstallObserverDelegate& delegate, platform::InstallCoordinator& handle) {
+void FakeInstallCoordination::notify(std::string_view identifier, CallbackOn where,
+                                     void (InstallObserverDelegate::*callback)(platform::InstallCoordinator&)) {
+  apply(identifier, where, [&](const auto& coordinator) {
+    state_->notify(coordinator, [callback](InstallObserverDelegate& delegate, platform::InstallCoordinator& handle) {
       (delegate.*callback)(handle);
     });
     return Status();
@@ -160,28 +160,28 @@ void FakeInstallCoordination::tell(std::string_view identifier, CallbackOn where
 }
 
 void FakeInstallCoordination::prioritize(std::string_view identifier, CallbackOn where) {
-  tell(identifier, where, &InstallObserverDelegate::coordinatorShouldPrioritize);
+  notify(identifier, where, &InstallObserverDelegate::coordinatorShouldPrioritize);
 }
 
 void FakeInstallCoordination::pause(std::string_view identifier, CallbackOn where) {
-  tell(identifier, where, &InstallObserverDelegate::coordinatorShouldPause);
+  notify(identifier, where, &InstallObserverDelegate::coordinatorShouldPause);
 }
 
 void FakeInstallCoordination::resume(std::string_view identifier, CallbackOn where) {
-  tell(identifier, where, &InstallObserverDelegate::coordinatorShouldResume);
+  notify(identifier, where, &InstallObserverDelegate::coordinatorShouldResume);
 }
 
 void FakeInstallCoordination::beginRestoringUserData(std::string_view identifier, CallbackOn where) {
-  tell(identifier, where, &InstallObserverDelegate::coordinatorShouldBeginRestoringUserData);
+  notify(identifier, where, &InstallObserverDelegate::coordinatorShouldBeginRestoringUserData);
 }
 
 void FakeInstallCoordination::cancelByUser(std::string_view identifier, CallbackOn where) {
-  cancel(identifier, {coordinationError("somebody deleted it"), ClientIdentity::CXClientUser}, where);
+  cancel(identifier, {coordinationError("the user deleted the app"), ClientIdentity::CXClientUser}, where);
 }
 
 void FakeInstallCoordination::cancel(std::string_view identifier, FakeCancellation cancellation, CallbackOn where) {
-  happen(identifier, where,
-         [&](const auto& coordinator) { return state_->cancel(coordinator, std::move(cancellation)); });
+  apply(identifier, where,
+        [&](const auto& coordinator) { return state_->cancel(coordinator, std::move(cancellation)); });
 }
 
 }  // namespace appsync::test

@@ -16,12 +16,12 @@ namespace appsync::test {
 [[nodiscard]] Status attach(std::shared_ptr<FakePromise>& place, platform::InstallPromise* promise);
 
 /// Counts as one held object of the service during its lifetime.
-class HeldThing {
+class HeldObject {
  public:
-  explicit HeldThing(std::shared_ptr<CoordinationState> state) : state_(std::move(state)) { ++state_->held; }
-  ~HeldThing() { --state_->held; }
-  HeldThing(const HeldThing&) = delete;
-  HeldThing& operator=(const HeldThing&) = delete;
+  explicit HeldObject(std::shared_ptr<CoordinationState> state) : state_(std::move(state)) { ++state_->held; }
+  ~HeldObject() { --state_->held; }
+  HeldObject(const HeldObject&) = delete;
+  HeldObject& operator=(const HeldObject&) = delete;
 
   CoordinationState* operator->() const { return state_.get(); }
   [[nodiscard]] const std::shared_ptr<CoordinationState>& shared() const { return state_; }
@@ -54,7 +54,7 @@ class FakeInstallPromise : public Interface {
   template <class Change>
   void change(const Change& change);
 
-  const HeldThing state_;
+  const HeldObject state_;
   const std::shared_ptr<FakePromise> promise_;
 };
 
@@ -95,7 +95,7 @@ class FakeAppPlaceholder final : public platform::Placeholder {
   template <class Change>
   Status configure(std::string_view operation, std::string_view arguments, const Change& change);
 
-  const HeldThing state_;
+  const HeldObject state_;
   const std::shared_ptr<FakePlaceholder> placeholder_;
 };
 
@@ -140,7 +140,7 @@ class FakeInstallCoordinator final : public platform::InstallCoordinator {
   /// Fails the test if the handle's client may not call `operation`.
   void checkDriver(std::string_view operation) const;
 
-  const HeldThing state_;
+  const HeldObject state_;
   const std::shared_ptr<FakeCoordinator> coordinator_;
   const platform::ClientIdentity client_;
 };

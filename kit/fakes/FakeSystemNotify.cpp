@@ -48,11 +48,11 @@ std::size_t FakeSystemNotify::observerCount(std::string_view name) const {
 }
 
 void FakeSystemNotify::deliver(std::string_view name, const void* sender) {
-  tellObservers(name, sender);
+  notifyObservers(name, sender);
   thread_.waitUntilIdle();
 }
 
-void FakeSystemNotify::tellObservers(std::string_view name, const void* sender) {
+void FakeSystemNotify::notifyObservers(std::string_view name, const void* sender) {
   const std::scoped_lock lock(mutex_);
   for (const Observation& observation : observations_) {
     if (observation.name != name || (observation.object != nullptr && observation.object != sender)) continue;
@@ -110,7 +110,7 @@ void FakeSystemNotify::post(std::string_view name) {
     const std::scoped_lock lock(mutex_);
     posts_.push_back({std::string(name), stateIn(states_, name)});
   }
-  tellObservers(name, nullptr);
+  notifyObservers(name, nullptr);
 }
 
 }  // namespace appsync::test

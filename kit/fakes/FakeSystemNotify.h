@@ -61,7 +61,7 @@ class FakeSystemNotify final : public platform::SystemNotify {
     FakeCallbackThread::Subscription subscription;
   };
 
-  void tellObservers(std::string_view name, const void* sender);
+  void notifyObservers(std::string_view name, const void* sender);
 
   CallJournal& journal_;
   mutable std::mutex mutex_;

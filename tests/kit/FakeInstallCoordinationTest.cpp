@@ -35,13 +35,13 @@ class Listener final : public platform::InstallObserverDelegate {
          coordinator);
   }
 
-  std::vector<std::string> heard;
+  std::vector<std::string> events;
   std::thread::id thread;
 
  private:
   void note(const std::string& what, InstallCoordinator& coordinator) {
     const std::optional<Error> error = coordinator.coordinatorError();
-    heard.push_back(what + " " + coordinator.bundleID().value_or("(none)") + (error ? " with error" : ""));
+    events.push_back(what + " " + coordinator.bundleID().value_or("(none)") + (error ? " with error" : ""));
     thread = std::this_thread::get_id();
   }
 };
@@ -120,7 +120,7 @@ TEST_F(FakeInstallCoordinationTest, AutomaticModeInstallsThePackage) {
   EXPECT_EQ(platform.registry.app("com.a")->version, "2.0");
   EXPECT_FALSE(platform.files.has(kPath));
   EXPECT_TRUE(service.coordinators().empty());
-  EXPECT_EQ(listener.heard, (std::vector<std::string>{"placeholder com.a", "complete com.a"}));
+  EXPECT_EQ(listener.events, (std::vector<std::string>{"placeholder com.a", "complete com.a"}));
   EXPECT_NE(listener.thread, std::this_thread::get_id());
   EXPECT_EQ(platform.journal.count("registry."), 0U);
 }
@@ -137,7 +137,7 @@ TEST_F(FakeInstallCoordinationTest, FailedInstallHasTheInstallersError) {
   EXPECT_FALSE(platform.files.has(kPath));
   ASSERT_EQ(service.endedCoordinators().size(), 1U);
   EXPECT_EQ(service.endedCoordinators()[0].error, installerError("no room"));
-  EXPECT_EQ(listener.heard, (std::vector<std::string>{"placeholder com.a", "complete com.a with error"}));
+  EXPECT_EQ(listener.events, (std::vector<std::string>{"placeholder com.a", "complete com.a with error"}));
 }
 
 TEST_F(FakeInstallCoordinationTest, ShowingAPlaceholderCanFail) {
@@ -148,7 +148,7 @@ TEST_F(FakeInstallCoordinationTest, ShowingAPlaceholderCanFail) {
   const auto coordinator = make();
   const auto asset = prepare(*coordinator);
   service.waitUntilIdle();
-  EXPECT_EQ(listener.heard, std::vector<std::string>{"placeholder com.a with error"});
+  EXPECT_EQ(listener.events, std::vector<std::string>{"placeholder com.a with error"});
   EXPECT_TRUE(platform.registry.identifiers().empty());
 }
 
@@ -190,8 +190,8 @@ TEST_F(FakeInstallCoordinationTest, TestsTriggerEvents) {
   service.waitUntilIdle();
   service.complete("com.a", kReason);
   service.waitUntilIdle();
-  EXPECT_EQ(listener.heard, (std::vector<std::string>{"placeholder com.a", "prioritize com.a", "pause com.a",
-                                                      "resume com.a", "data com.a", "complete com.a with error"}));
+  EXPECT_EQ(listener.events, (std::vector<std::string>{"placeholder com.a", "prioritize com.a", "pause com.a",
+                                                       "resume com.a", "data com.a", "complete com.a with error"}));
   EXPECT_TRUE(service.coordinators().empty());
 }
 
@@ -200,7 +200,7 @@ TEST_F(FakeInstallCoordinationTest, CallbacksCanRunOnTheCallingThread) {
   const auto connection = service.initWithMachServiceName("name", {kSync}, listener);
   service.add(FakeCoordinator::of("com.a").withoutIdentifier());
   service.cancelByUser("com.a", CallbackOn::callingThread);
-  EXPECT_EQ(listener.heard, std::vector<std::string>{"cancelled by 2 for 2 (none) with error"});
+  EXPECT_EQ(listener.events, std::vector<std::string>{"cancelled by 2 for 2 (none) with error"});
   EXPECT_EQ(listener.thread, std::this_thread::get_id());
 }
 
