@@ -1,51 +1,29 @@
-// A set of bundle identifiers that several threads share.
+// Bundle identifiers: sets of them, and the check of those that a host gives.
 #pragma once
 
-#include <cstddef>
 #include <functional>
-#include <mutex>
 #include <set>
 #include <string>
 #include <string_view>
-#include <utility>
+
+#include "plist/Value.h"
 
 namespace appsync {
 
-using Identifiers = std::set<std::string, std::less<>>;
+using IdentifierSet = std::set<std::string, std::less<>>;
 
-/// For sets that reports from different threads change and that no queue guards: each operation is whole in itself.
-class SharedIdentifierSet {
- public:
-  void insert(std::string_view identifier) {
-    const std::lock_guard lock(mutex_);
-    if (!identifiers_.contains(identifier)) identifiers_.emplace(identifier);
-  }
+/// Returns the keys of a map whose keys are bundle identifiers.
+template <class Map>
+[[nodiscard]] IdentifierSet identifiersOf(const Map& map) {
+  IdentifierSet identifiers;
+  for (const auto& [identifier, value] : map)
+    identifiers.insert(identifiers.end(), identifier);
+  return identifiers;
+}
 
-  void erase(std::string_view identifier) {
-    const std::lock_guard lock(mutex_);
-    const auto found = identifiers_.find(identifier);
-    if (found != identifiers_.end()) identifiers_.erase(found);
-  }
-
-  void clear() {
-    const std::lock_guard lock(mutex_);
-    identifiers_.clear();
-  }
-
-  [[nodiscard]] std::size_t size() const {
-    const std::lock_guard lock(mutex_);
-    return identifiers_.size();
-  }
-
-  /// A copy of what is in it now.
-  [[nodiscard]] Identifiers identifiers() const {
-    const std::lock_guard lock(mutex_);
-    return identifiers_;
-  }
-
- private:
-  mutable std::mutex mutex_;
-  Identifiers identifiers_;
-};
+/// Whether `value`, which may be null, is a string without "/..". Required of every identifier and path from the host;
+/// a device may accept fewer characters in the identifiers of its apps.
+[[nodiscard]] bool isValidBundleIdentifier(const plist::Value* value);
+[[nodiscard]] bool isValidBundleIdentifier(std::string_view text);
 
 }  // namespace appsync

@@ -1,43 +1,79 @@
 #include "common/TodoList.h"
 
 #include <algorithm>
+#include <utility>
 
 #include "platform/SyncFiles.h"
 #include "plist/Access.h"
 
-namespace appsync {
+namespace appsync::todo {
 
 namespace {
 
-template <class Array>
-auto* firstEntryOf(Array& list, std::string_view identifier) {
-  const auto found = std::find_if(list.begin(), list.end(), [identifier](const plist::Value& entry) {
-    return entryHas(entry, todo::kIdentifier, identifier);
-  });
-  return found == list.end() ? nullptr : &*found;
+auto hasIdentifier(std::string_view identifier) {
+  return [identifier](const plist::Value& entry) { return entryHas(entry, kIdentifier, identifier); };
+}
+
+/// The ASCII format is not accepted: almost any text would parse.
+Result<plist::Value> readBinaryOrXML(ByteView document) {
+  return textOf(document).starts_with("bplist") ? plist::readBinary(document) : plist::readXML(document);
 }
 
 }  // namespace
 
-const plist::Value* firstEntry(const plist::Array& list, std::string_view identifier) {
-  return firstEntryOf(list, identifier);
+std::optional<plist::Array> load(platform::FileSystem& files, std::string_view path, const PlugInLog& log,
+                                 ErrorSlot error) {
+  const auto bytes = files.readFile(path);
+  if (!bytes) {
+    setError(error, bytes.error());
+    return std::nullopt;
+  }
+  if (bytes->empty()) return std::nullopt;
+
+  auto list = readBinaryOrXML(*bytes);
+  if (!list) {
+    setError(error, list.error());
+    log.error("%s|couldn't parse todo list");
+    return std::nullopt;
+  }
+  plist::Array* entries = list->array();
+  if (entries == nullptr) {
+    log.error("%s|todo list is not an array");
+    return std::nullopt;
+  }
+  return std::move(*entries);
 }
 
-plist::Value* firstEntry(plist::Array& list, std::string_view identifier) {
-  return firstEntryOf(list, identifier);
+const plist::Value* find(const plist::Array& list, std::string_view identifier) {
+  const auto found = std::find_if(list.begin(), list.end(), hasIdentifier(identifier));
+  return found == list.end() ? nullptr : &*found;
 }
 
-TodoIndex::TodoIndex(const std::optional<plist::Array>& list) {
+bool setOperation(plist::Array& list, std::string_view identifier, std::string_view operation, const PlugInLog& log) {
+  const auto entry = std::find_if(list.begin(), list.end(), hasIdentifier(identifier));
+  if (entry == list.end()) return false;
+  log.message("%s|Changing %{public}@ from %{public}@ to %{public}@", identifier,
+              std::as_const(*entry).find(kOperation), operation);
+  entry->dictionary()->set(kOperation, operation);
+  return true;
+}
+
+Status save(platform::FileSystem& files, std::string_view path, plist::Array list) {
+  const auto bytes = plist::writeBinary(std::move(list));
+  return bytes ? files.writeFileAtomically(path, *bytes) : Status(bytes.error());
+}
+
+Index::Index(const std::optional<plist::Array>& list) {
   if (!list) return;
   first_.reserve(list->size());
   for (const plist::Value& entry : *list) {
-    if (const auto identifier = stringIn(entry.find(todo::kIdentifier))) first_.emplace(*identifier, &entry);
+    if (const auto identifier = stringIn(entry.find(kIdentifier))) first_.emplace(*identifier, &entry);
   }
 }
 
-const plist::Value* TodoIndex::firstEntry(std::string_view identifier) const {
+const plist::Value* Index::find(std::string_view identifier) const {
   const auto found = first_.find(identifier);
   return found == first_.end() ? nullptr : found->second;
 }
 
-}  // namespace appsync
+}  // namespace appsync::todo

@@ -1,4 +1,4 @@
-// Passing on to a coordinator how its app's package comes, or that it does not.
+// Reports to a coordinator on the transfer of its app's package.
 #include "common/SyncError.h"
 #include "core/AppsClient.h"
 #include "platform/InstallPromise.h"
@@ -16,11 +16,36 @@ bool isComplete(const std::shared_ptr<platform::PromisedTransferToPath>& promise
   return promise && promise->isComplete();
 }
 
+/// Returns the coordinator of a package that is being transferred, or null if none can still receive it.
+std::shared_ptr<InstallCoordinator> usableCoordinator(AppsClient& client, std::string_view identifier,
+                                                      bool existingApp) {
+  auto coordinator =
+      client._initiatingOrUpdatingAppInstallCoordinatorForBundleIdentifier(identifier, existingApp, false, nullptr);
+  return coordinator && !coordinator->coordinatorError() ? coordinator : nullptr;
+}
+
+void satisfyAppAssetPromise(AppsClient& client, const ZTAsset& asset,
+                            const std::shared_ptr<InstallCoordinator>& coordinator, const PlugInLog& log) {
+  const std::string& identifier = asset.identifier();
+  auto promise = coordinator->appAssetPromise();
+  if (isComplete(promise)) {
+    log.message("%s|Asset promise is already satisfied for %{public}@", identifier);
+    return;
+  }
+  if (!promise) {
+    promise = client._createAppAssetPromiseForBundleIdentifier(identifier, asset.path(), coordinator);
+  } else if (const auto location = FileLocation::file(asset.path().value_or(""))) {
+    promise->setTransferPath(*location);
+  }
+  log.message("%s|Satisfying asset promise for %{public}@", identifier);
+  if (promise) fulfil(*promise);
+}
+
 }  // namespace
 
 bool AppsClient::updateTransferProgressForApp(const ZTAsset& asset, bool existingApp) {
   const std::string& identifier = asset.identifier();
-  const auto coordinator = _usableCoordinator(identifier, existingApp);
+  const auto coordinator = usableCoordinator(*this, identifier, existingApp);
   if (!coordinator) return false;
   auto promise = coordinator->appAssetPromise();
   if (isComplete(promise)) {
@@ -35,34 +60,18 @@ bool AppsClient::updateTransferProgressForApp(const ZTAsset& asset, bool existin
 }
 
 void AppsClient::transferCompleteForApp(const ZTAsset& asset, const std::optional<Error>& error, bool isExistingApp) {
-  const auto coordinator = _usableCoordinator(asset.identifier(), isExistingApp);
+  const auto coordinator = usableCoordinator(*this, asset.identifier(), isExistingApp);
   if (!coordinator) return;
   if (error) {
     constexpr long kTransferFailed = 1;
     const Error reason = _platform.installCoordination().createUserPresentableError(kTransferFailed, {}, *error);
     coordinator->cancelForReason(reason, ClientIdentity::CXClientSync).ignore();
   } else {
-    _satisfyAppAssetPromise(asset, coordinator);
+    satisfyAppAssetPromise(*this, asset, coordinator, _log);
   }
 }
 
-void AppsClient::_satisfyAppAssetPromise(const ZTAsset& asset, const std::shared_ptr<InstallCoordinator>& coordinator) {
-  const std::string& identifier = asset.identifier();
-  auto promise = coordinator->appAssetPromise();
-  if (isComplete(promise)) {
-    _log.message("%s|Asset promise is already satisfied for %{public}@", identifier);
-    return;
-  }
-  if (!promise) {
-    promise = _createAppAssetPromiseForBundleIdentifier(identifier, asset.path(), coordinator);
-  } else if (const auto location = FileLocation::file(asset.path().value_or(""))) {
-    promise->setTransferPath(*location);
-  }
-  _log.message("%s|Satisfying asset promise for %{public}@", identifier);
-  if (promise) fulfil(*promise);
-}
-
-void AppsClient::assetSyncFinishedWithStatus(bool success, const Identifiers& outstandingItems) {
+void AppsClient::assetSyncFinishedWithStatus(bool success, const IdentifierSet& outstandingItems) {
   for (const std::string& identifier : outstandingItems) {
     const auto coordinator = _platform.installCoordination().coordinatorForApp(
         platform::CoordinatorKind::any, identifier, ClientIdentity::CXClientSync, platform::IfMissing::findNothing,
@@ -72,13 +81,6 @@ void AppsClient::assetSyncFinishedWithStatus(bool success, const Identifiers& ou
     _log.message("%s|Cancelling coordinator with error %{public}@ for %{public}@", error, identifier);
     coordinator->cancelForReason(error, ClientIdentity::CXClientSync).ignore();
   }
-}
-
-/// The coordinator of a package that is on its way; null when there is none that could still take it.
-std::shared_ptr<InstallCoordinator> AppsClient::_usableCoordinator(std::string_view identifier, bool existingApp) {
-  auto coordinator =
-      _initiatingOrUpdatingAppInstallCoordinatorForBundleIdentifier(identifier, existingApp, false, nullptr);
-  return coordinator && !coordinator->coordinatorError() ? coordinator : nullptr;
 }
 
 }  // namespace appsync

@@ -1,4 +1,4 @@
-// One app's preparation for a coordinated install or restore, as its steps hand it on.
+// The state that the steps of a coordinated install or restore share.
 #pragma once
 
 #include <memory>
@@ -7,13 +7,15 @@
 
 #include "base/Error.h"
 #include "common/PlugInLog.h"
+#include "core/AppsClient.h"
 #include "platform/Platform.h"
 
 namespace appsync {
 
-class AppsClient;
+/// Whether an icon belongs to an install or to a restore, which fail with different errors.
+enum class IconOwner { install, restore };
 
-/// What every preparation works on, and what it holds so far.
+/// The app of one preparation, and what has been made for it.
 struct CoordinatedPreparation {
   AppsClient& client;
   platform::Platform& platform;
@@ -21,10 +23,10 @@ struct CoordinatedPreparation {
   const std::string identifier;
 
   std::shared_ptr<platform::InstallCoordinator> coordinator = nullptr;
-  std::shared_ptr<platform::Placeholder> placeholder = nullptr;  ///< as long as it is not the coordinator's
+  std::shared_ptr<platform::Placeholder> placeholder = nullptr;  ///< null once it is the coordinator's
   std::optional<Error> error = {};                               ///< the last one
 
-  /// Notes how a step went, and says it. Returns whether it went well.
+  /// Logs the outcome of a step, and keeps its error. Returns whether the step succeeded.
   bool report(const Status& outcome, PlugInLog::Format<std::string> done,
               PlugInLog::Format<Error, std::string> failed) {
     if (outcome) {
@@ -36,7 +38,13 @@ struct CoordinatedPreparation {
     return outcome.ok();
   }
 
-  // Each gives up what is held of that, if anything.
+  /// Attaches the icon file to the placeholder. Returns true also if there is no icon, that is, if `size` is 0.
+  [[nodiscard]] bool attachIcon(const std::string& path, std::uint64_t size, IconOwner owner) const {
+    return size == 0 || client._createIconPromiseForBundleIdentifier(identifier, path, size, placeholder,
+                                                                     owner == IconOwner::install) != nullptr;
+  }
+
+  // Do nothing if there is none.
   void cancelPlaceholder(const Error& reason) const {
     if (!placeholder) return;
     log.message("%s|Cancelling placeholder for appBundleIdentifier:%{public}@", identifier);

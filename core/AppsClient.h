@@ -2,11 +2,11 @@
 #pragma once
 
 #include <atomic>
-#include <cstddef>
 #include <cstdint>
 #include <functional>
 #include <map>
 #include <memory>
+#include <mutex>
 #include <optional>
 #include <set>
 #include <string>
@@ -24,30 +24,19 @@
 #include "platform/ZTClient.h"
 #include "plist/PropertyList.h"
 
-namespace appsync::plist {
-class DictionaryStream;
-}
-
 namespace appsync {
 
-class WantedEntry;
-struct PlaceholderInfo;
-
-/// What was known of an app when its transfer ended.
-struct TransferMarks {
-  bool isExistingApp = false;
-  bool isUserCancelled = false;
-};
+struct EndedTransfer;
 
 /// One object, made once by the daemon and kept for the life of the process. Installs, removes and prepares apps as the
-/// host's todo list asks, and writes into that list how far each has come.
+/// host's todo list asks, and writes the state of each app back into that list.
 ///
 /// Threads: as `platform::ZTClient` says. Nothing is thrown; failures go to the log, and to error slots where the
-/// daemon gives one. Queued installs, scheduled retries and a coordinator's callbacks that are under way own a share of
-/// the object, so its destructor may run on any thread; callbacks of the services that it observes are waited for.
+/// daemon gives one. Queued installs, scheduled retries and running callbacks of a coordinator share the ownership of
+/// the object, so its destructor may run on any thread; it waits for callbacks of the services that it observes.
 ///
-/// Class operations need no object and take the platform instead. Operations and fields that begin with an underscore
-/// are the plug-in's own; of the operations those are public that tests and the other rooms' files use as they stand.
+/// Class operations need no object and take the platform instead. An operation or field whose name begins with an
+/// underscore is internal to the plug-in; such an operation is public if a test or another component calls it.
 class AppsClient final : public platform::ZTClient,
                          public platform::AppRegistryObserver,
                          public platform::InstallObserverDelegate,
@@ -57,131 +46,118 @@ class AppsClient final : public platform::ZTClient,
 
  public:
   // ---- core: lifecycle
-
-  /// The object, registered with the platform's services, which must outlive it. Never null.
+  /// Returns the object, registered with the platform's services, which must outlive it. Never null.
   [[nodiscard]] static std::shared_ptr<AppsClient> create(platform::Platform& platform);
 
   AppsClient(Token, platform::Platform& platform);
   ~AppsClient() override;
-  AppsClient(const AppsClient&) = delete;
-  AppsClient& operator=(const AppsClient&) = delete;
-
-  /// For logs.
   [[nodiscard]] std::string description() const { return "<AppsClient>"; }
 
-  // ---- core: what the daemon asks, in the order of a sync
-
-  /// supportedDataclasses
+  // ---- core: the daemon's calls, in the order of a sync
   [[nodiscard]] std::vector<std::string> supportedDataclasses() override;
-  /// currentSyncAnchor: a constant; the plug-in keeps no anchor.
+  /// currentSyncAnchor: returns a constant; the plug-in keeps no anchor.
   [[nodiscard]] std::string currentSyncAnchor() override;
-  /// prepareForSyncWithHostAnchor:progressCallback:error: always succeeds.
   bool prepareForSyncWithHostAnchor(std::string_view hostAnchor, const platform::ProgressCallback& progressCallback,
                                     ErrorSlot error) override;
-  /// installedAssets: { "_Deleted": apps that are gone since the host last knew them }.
+  /// installedAssets: returns { "_Deleted": apps known to the host that are no longer on the device }.
   [[nodiscard]] plist::Dictionary installedAssets() override;
-  /// reconcileSync:withNewAnchor:progressCallback:error: takes the staging folder over and removes apps. False only
-  /// when the work area cannot be made or filled.
+  /// reconcileSync:withNewAnchor:progressCallback:error: returns false only if the work area cannot be made or filled.
   bool reconcileSync(const platform::Assets& assets, std::string_view newAnchor,
                      const platform::ProgressCallback& progressCallback, ErrorSlot error) override;
-  /// assetTransferEndedWithSuccess: blocks until every install of this sync is done.
   void assetTransferEndedWithSuccess(bool success) override;
-  /// syncEndedWithSuccess:
   void syncEndedWithSuccess(bool success) override;
-  /// clearSyncData: forgets everything about syncing and removes all placeholders.
+  /// clearSyncData: deletes all sync files and removes all placeholders.
   void clearSyncData() override;
 
-  // ---- core: used by the other rooms
-
-  /// _appInstallationAllowed, _appRemovalAllowed: true unless a restriction says no.
+  // ---- core: called by the other components
+  /// _appInstallationAllowed, _appRemovalAllowed: return false only if a restriction forbids it.
   [[nodiscard]] bool _appInstallationAllowed();
   [[nodiscard]] bool _appRemovalAllowed();
-  /// _getAndResetNumAppInstallsAttempted
   [[nodiscard]] std::int32_t _getAndResetNumAppInstallsAttempted();
 
-  /// _loadPlist:withError: (class operation) the array in that file; none, with a message unless the file is absent or
-  /// empty, when there is no such thing.
+  /// _loadPlist:withError: (class operation) returns the array in that file, or nullopt.
   [[nodiscard]] static std::optional<plist::Array> _loadPlist(platform::Platform& platform, std::string_view path,
                                                               ErrorSlot error);
-  /// _notifySolvary: (class operation) tells the home screen that a sync is starting, or done.
+  /// _notifySolvary: (class operation) notifies the home screen that a sync is starting, or done.
   static void _notifySolvary(platform::Platform& platform, bool starting);
-  /// _orderTheItems: (class operation) the items in on-screen order of their icons, then the others. `items` keeps the
-  /// others only.
+  /// _orderTheItems: (class operation) returns the items in on-screen order of their icons, then the others. Removes
+  /// the former from `items`.
   template <class Item>
   [[nodiscard]] static std::vector<Item> _orderTheItems(platform::Platform& platform,
-                                                        std::map<std::string, Item, std::less<>>& items);
+                                                        std::map<std::string, Item, std::less<>>& items) {
+    std::vector<Item> ordered;
+    for (const std::string& identifier : _prioritized(platform, identifiersOf(items)))
+      ordered.push_back(std::move(items.extract(identifier).mapped()));
+    for (const auto& [identifier, item] : items)
+      ordered.push_back(item);
+    return ordered;
+  }
 
   // ---- transfer
-
-  /// outstandingAssetTransfers: the packages that the host must still send, each with its placeholder made.
+  /// outstandingAssetTransfers: returns the packages that the host must still send, each with its placeholder made.
   [[nodiscard]] platform::Assets outstandingAssetTransfers() override;
-  /// assetTransfer:updatedProgress:
+  /// assetTransfer:updatedProgress:, assetTransfer:succeeded:withError:
   void assetTransferUpdatedProgress(const std::shared_ptr<platform::ZTAsset>& asset, double fraction) override;
-  /// assetTransfer:succeeded:withError:
   void assetTransferSucceeded(const std::shared_ptr<platform::ZTAsset>& asset, bool succeeded,
                               const std::optional<Error>& error) override;
-  /// _progressForAssetIdentifier: null when there is none.
+  /// _progressForAssetIdentifier: returns null if the app has no progress, or installs are coordinated.
   [[nodiscard]] std::shared_ptr<platform::InstallProgress> _progressForAssetIdentifier(std::string_view identifier);
 
-  /// _enqueueAssetInstall: queues one install and returns.
+  /// _enqueueAssetInstall: queues one install and returns; _performAssetInstall: runs one on the calling thread.
   void _enqueueAssetInstall(const std::shared_ptr<platform::ZTAsset>& asset);
-  /// _performAssetInstall: runs one install on the calling thread.
   void _performAssetInstall(const std::shared_ptr<platform::ZTAsset>& asset);
-  /// assetInstallSucceeded:
+  /// assetInstallSucceeded:, assetInstallFailed:withError:
   void assetInstallSucceeded(const platform::ZTAsset& asset);
-  /// assetInstallFailed:withError:
   void assetInstallFailed(const platform::ZTAsset& asset, const Error& error);
-  /// _isRecoverableError:
   [[nodiscard]] bool _isRecoverableError(const std::optional<Error>& error);
 
-  /// placeholderAppPathForBundleIdentifier: where that app's placeholder bundle is built.
+  /// placeholderAppPathForBundleIdentifier: returns the path at which that app's placeholder bundle is built.
   [[nodiscard]] std::string placeholderAppPathForBundleIdentifier(std::string_view bundleIdentifier);
   /// createPlaceHolderPath:forBundleIdentifier:withAttributes:
   bool createPlaceHolderPath(std::string_view path, std::string_view bundleIdentifier,
                              const platform::OwnerAttributes& attributes);
-  /// writeIconData:atPath:returningFileSize:forBundleIdentifier:withAttributes: `icon` may be absent; `fileSize` may be
-  /// null and is set only when the size is known.
+  /// writeIconData:atPath:returningFileSize:forBundleIdentifier:withAttributes: returns false without an icon.
+  /// `fileSize` may be null and is set only if the size is known.
   bool writeIconData(const std::optional<ByteView>& icon, std::string_view path, std::uint64_t* fileSize,
                      std::string_view bundleIdentifier, const platform::OwnerAttributes& attributes);
   /// _makeIconFromBundlePath:saveTo: (class operation)
   static bool _makeIconFromBundlePath(platform::Platform& platform, const std::optional<std::string>& bundlePath,
                                       std::string_view destination);
-  /// _createPlaceHolderApplication: builds and installs a placeholder; what goes wrong is only logged.
+  /// _createPlaceHolderApplication: builds and installs a placeholder; failures are only logged.
   void _createPlaceHolderApplication(const platform::ZTAsset& asset);
 
   // ---- coordination
-
   bool prepareAppForInstallUsingCoordination(const platform::ZTAsset& asset, bool existingApp) override;
-  /// updateTransferProgressForApp:existingApp: false when no coordinator waits for the package.
+  /// updateTransferProgressForApp:existingApp: returns false if no coordinator waits for the package.
   bool updateTransferProgressForApp(const platform::ZTAsset& asset, bool existingApp);
-  /// transferCompleteForApp:withError:isExistingApp: the service installs the package, or hears why it never comes.
+  /// transferCompleteForApp:withError:isExistingApp: hands the package, or the reason of its failure, to the service.
   void transferCompleteForApp(const platform::ZTAsset& asset, const std::optional<Error>& error, bool isExistingApp);
-  /// assetSyncFinishedWithStatus:outstandingItems: after a failed sync nobody waits for these any more.
-  void assetSyncFinishedWithStatus(bool success, const Identifiers& outstandingItems);
+  /// assetSyncFinishedWithStatus:outstandingItems: cancels the coordinators of these after a failed sync.
+  void assetSyncFinishedWithStatus(bool success, const IdentifierSet& outstandingItems);
   void uninstallAppUsingCoordination(std::string_view bundleIdentifier) override;
 
-  /// _initiatingOrUpdatingAppInstallCoordinatorForBundleIdentifier:existingApp:createIfNotExisting:error: null when
-  /// there is none that the plug-in may drive; `error` is what the service said, also when it said nothing.
+  /// _initiatingOrUpdatingAppInstallCoordinatorForBundleIdentifier:existingApp:createIfNotExisting:error: returns null
+  /// if there is none that the plug-in may change. Sets `error` to the service's error, or nullopt.
   [[nodiscard]] std::shared_ptr<platform::InstallCoordinator>
   _initiatingOrUpdatingAppInstallCoordinatorForBundleIdentifier(std::string_view bundleIdentifier, bool existingApp,
                                                                 bool createIfNotExisting, ErrorSlot error);
-  /// _placeHolderForBundleIdentifier:name:installType: the caller's; null when it cannot be made.
+  /// _placeHolderForBundleIdentifier:name:installType: returns null if it cannot be made.
   [[nodiscard]] std::shared_ptr<platform::Placeholder> _placeHolderForBundleIdentifier(
       std::string_view bundleIdentifier, std::string_view name, platform::TSInstallType installType);
-  /// _createAppAssetPromiseForBundleIdentifier:atPath:andAddToCoordinatinator: null when it cannot be made or attached.
+  /// _createAppAssetPromiseForBundleIdentifier:atPath:andAddToCoordinatinator: null if it cannot be made or attached.
   std::shared_ptr<platform::PromisedTransferToPath> _createAppAssetPromiseForBundleIdentifier(
       std::string_view bundleIdentifier, const std::optional<std::string>& path,
       const std::shared_ptr<platform::InstallCoordinator>& coordinator);
-  /// _createIconPromiseForBundleIdentifier:transferPath:diskSpaceNeeded:andAddToPlaceHolder:forAppInstall: the same.
+  /// _createIconPromiseForBundleIdentifier:transferPath:diskSpaceNeeded:andAddToPlaceHolder:forAppInstall: returns a
+  /// fulfilled promise, or null if it cannot be made or attached.
   std::shared_ptr<platform::PromisedTransferToPath> _createIconPromiseForBundleIdentifier(
       std::string_view bundleIdentifier, std::string_view transferPath, std::uint64_t diskSpaceNeeded,
       const std::shared_ptr<platform::Placeholder>& placeHolder, bool forAppInstall);
-  /// _userDataPromiseForBundleIdentifier: kept already: there is no data to wait for. Attached to nothing.
+  /// _userDataPromiseForBundleIdentifier: returns a fulfilled promise, attached to nothing, or null.
   [[nodiscard]] std::shared_ptr<platform::PromisedOutOfBandTransfer> _userDataPromiseForBundleIdentifier(
       std::string_view bundleIdentifier);
 
-  // ---- coordination: what the services report, on their threads
-
+  // ---- coordination: callbacks of the services, on their threads
   /// setupInstallCoordinatorObserver: opens the observer connection unless it is open.
   void setupInstallCoordinatorObserver();
   void coordinatorDidInstallPlaceholder(platform::InstallCoordinator& coordinator) override;
@@ -190,52 +166,44 @@ class AppsClient final : public platform::ZTClient,
   void coordinatorCanceledWithReason(platform::InstallCoordinator& coordinator, const Error& reason,
                                      platform::ClientIdentity client) override;
   void promiseDidBeginFulfillmentWithIdentifier(std::uint64_t identifier) override;
-  /// applicationInstallsDidCancel: matters only where installs are not coordinated.
   void applicationInstallsDidCancel(const platform::AppRecords& records) override;
 
-  // ---- restore: state and todo words
+  // ---- restore: restore state and todo list
+  // Not thread-safe: each reads and rewrites a whole file. Callers must run them on `_accessQueue`.
 
-  // These read, change and rewrite whole files without a lock: who is not on a queue submits them to `_accessQueue`.
-
-  /// _restoreStatePropertyForKey:identifier:version: none at a missing level, and for a version that is no string.
+  /// _restoreStatePropertyForKey:identifier:version: returns nullopt for a missing level or a non-string version.
   [[nodiscard]] std::optional<plist::Value> _restoreStatePropertyForKey(std::string_view key,
                                                                         std::string_view identifier,
                                                                         const plist::Value* version);
-  /// _setRestoreStatePropertyValue:forKey:identifier:version: does nothing for a version that is no string.
+  /// _setRestoreStatePropertyValue:forKey:identifier:version: does nothing for a non-string version.
   void _setRestoreStatePropertyValue(const plist::Value& value, std::string_view key, std::string_view identifier,
                                      const plist::Value* version);
-  /// cleanRestoreStateForIdentifier: every version of it.
+  /// cleanRestoreStateForIdentifier: deletes every version of it.
   void cleanRestoreStateForIdentifier(std::string_view identifier);
-  /// changeAssetID:toDo: the one writer of the todo list.
+  /// changeAssetID:toDo:, _operationStateForIdentifier: set and return the operation of the identifier's first entry.
   void changeAssetID(std::string_view identifier, std::string_view toDo);
-  /// _operationStateForIdentifier:
   [[nodiscard]] std::optional<plist::Value> _operationStateForIdentifier(std::string_view identifier);
 
   // ---- restore: placeholders
-
   using PlaceholderVisitor = std::function<void(const platform::AppRecord& record, bool& stop)>;
 
-  /// _placeholderExistsForApplication:
-  /// Walks the registry, unless who asks about many apps brings what a walk has found.
-  [[nodiscard]] bool _placeholderExistsForApplication(std::string_view bundleIdentifier,
-                                                      const Identifiers* userBundles = nullptr);
-  /// _enumeratePlaceholdersWithBlock: on the calling thread, before it returns.
+  /// _placeholderExistsForApplication: returns false if installs are coordinated.
+  [[nodiscard]] bool _placeholderExistsForApplication(std::string_view bundleIdentifier);
+  /// _enumeratePlaceholdersWithBlock: calls `visit` on the calling thread, before it returns.
   void _enumeratePlaceholdersWithBlock(const PlaceholderVisitor& visit);
-  /// _getSystemAppPlaceholders
-  [[nodiscard]] Identifiers _getSystemAppPlaceholders();
+  [[nodiscard]] IdentifierSet _getSystemAppPlaceholders();
 
-  // ---- restore: what a host has left on a restored device
-
+  // ---- restore: the host's restore file
   /// reconcileRestoreOfType:withError: never fails. Blocks for at most five seconds per placeholder.
   bool reconcileRestoreOfType(std::int32_t restoreType, ErrorSlot error) override;
-  /// _processHarvoRestoreInfo: what came of the last app that there was something to do for; true without a file.
+  /// _processHarvoRestoreInfo: returns the result for the last app that needed a placeholder, false if none did, and
+  /// true without a restore file.
   bool _processHarvoRestoreInfo();
-  /// _processHarvoRestoreInfoForApp:harvoMetaData:sinfData:iconData: builds a placeholder and has it installed. True,
-  /// too, for metadata that cannot be read.
+  /// _processHarvoRestoreInfoForApp:harvoMetaData:sinfData:iconData: builds a placeholder and has it installed. Returns
+  /// true also for metadata that cannot be parsed.
   bool _processHarvoRestoreInfoForApp(std::string_view bundleIdentifier, ByteView harvoMetaData,
                                       const std::optional<ByteView>& sinfData, const std::optional<ByteView>& iconData);
-  /// _loadDemotedAppsPlist:withError: (class operation) the dictionary in that file; none, with a message unless the
-  /// file is absent or empty, when there is no such thing. Only a failed read sets `error`.
+  /// _loadDemotedAppsPlist:withError: (class operation) returns the dictionary in that file, or nullopt.
   [[nodiscard]] static std::optional<plist::Dictionary> _loadDemotedAppsPlist(platform::Platform& platform,
                                                                               std::string_view path, ErrorSlot error);
 
@@ -251,80 +219,42 @@ class AppsClient final : public platform::ZTClient,
   bool _prepareDemotedAppForRestoreWithBundleId(std::string_view bundleIdentifier, ByteView harvoMetadata,
                                                 const std::optional<ByteView>& sinfData,
                                                 const std::optional<ByteView>& iconData, DemotionStatus demotionStatus);
-  /// _placeHolderForBundleIdentifier:withHarvoMetadata:sinfData:iconData:demotionStatus: configured, the caller's; null
-  /// when it cannot be made.
+  /// _placeHolderForBundleIdentifier:withHarvoMetadata:sinfData:iconData:demotionStatus: returns a configured
+  /// placeholder, or null if it cannot be made.
   [[nodiscard]] std::shared_ptr<platform::Placeholder> _placeHolderForBundleIdentifierWithHarvoMetadata(
       std::string_view bundleIdentifier, const plist::Dictionary& harvoMetadata,
       const std::optional<ByteView>& sinfData, const std::optional<ByteView>& iconData, DemotionStatus demotionStatus);
 
-  /// dataMigratorSetPlaceHolderPromiseForRestoreAppBundle: that app's placeholder is awaited from now on.
+  /// dataMigratorSetPlaceHolderPromiseForRestoreAppBundle: starts to await that app's placeholder.
   void dataMigratorSetPlaceHolderPromiseForRestoreAppBundle(std::string_view bundleIdentifier);
-  /// The same once `setPromise` has succeeded; no report of the placeholder is taken up between the two. Returns what
-  /// `setPromise` does.
-  [[nodiscard]] Status dataMigratorSetPlaceHolderPromiseForRestoreAppBundle(std::string_view bundleIdentifier,
-                                                                            const std::function<Status()>& setPromise);
-  /// dataMigratorCancelledCoordinatorForRestoreAppBundle: it is not awaited any more.
+  /// Calls `setPromise` and, if it succeeds, starts to await that app's placeholder, before any report of it is
+  /// processed. Returns the status of `setPromise`.
+  [[nodiscard]] Status _awaitPlaceholderAfter(const std::function<Status()>& setPromise,
+                                              std::string_view bundleIdentifier);
+  /// dataMigratorCancelledCoordinatorForRestoreAppBundle: stops awaiting it.
   void dataMigratorCancelledCoordinatorForRestoreAppBundle(std::string_view bundleIdentifier);
-  /// cnDidInstallPlaceHolderForAppBundle: it has come. One without an identifier is ignored, with an error in the log.
+  /// cnDidInstallPlaceHolderForAppBundle: records that it is installed; without an identifier only logs an error.
   void cnDidInstallPlaceHolderForAppBundle(std::optional<std::string_view> bundleIdentifier);
 
   // ---- reporting
-
-  /// installedAssetMetrics: how many user apps there are, and how many bytes they take.
   [[nodiscard]] plist::Dictionary installedAssetMetrics() override;
-  /// corvelIDsForAssets: both identifiers of an app whose store metadata names two.
   [[nodiscard]] std::set<std::string> corvelIDsForAssets() override;
-  /// accountsForAssets: of each account what the first of its apps says.
   [[nodiscard]] platform::ZTAccountInfos accountsForAssets() override;
-  /// prepareForBackup: brings the store metadata of installed apps up to date.
   void prepareForBackup() override;
-  /// disabledAssetTypes: "Application" where apps may be neither installed nor removed.
   [[nodiscard]] std::optional<std::set<std::string>> disabledAssetTypes() override;
 
  private:
-  /// The registrations of a new object.
   void init();
+  /// Logs `identifiers` in on-screen order of their icons, then the others; returns the former in that order.
+  [[nodiscard]] static std::vector<std::string> _prioritized(platform::Platform& platform, IdentifierSet identifiers);
 
-  // Steps of the operations above.
-  void _removeApps(const plist::Array& todoList, bool removalAllowed);
-  void _closeOutstandingTransfers(const Identifiers& outstanding, bool success);
-  [[nodiscard]] bool _preparePlaceholder(const platform::ZTAsset& asset, bool hasPlaceholder);
+  // Steps of the operations above that need the object's fields.
   [[nodiscard]] bool _prepareCoordinatedInstall(const platform::ZTAsset& asset);
-  [[nodiscard]] std::shared_ptr<platform::InstallCoordinator> _usableCoordinator(std::string_view identifier,
-                                                                                 bool existingApp);
-  void _satisfyAppAssetPromise(const platform::ZTAsset& asset,
-                               const std::shared_ptr<platform::InstallCoordinator>& coordinator);
-  [[nodiscard]] bool _restoreApps(plist::DictionaryStream& info);
-  void _waitForRestorePlaceholders();
-  /// The identifiers of installed apps and placeholders.
-  [[nodiscard]] Identifiers _userBundles();
-  [[nodiscard]] bool _buildRestorePlaceholder(const std::string& folder, const PlaceholderInfo& placeholder,
-                                              const std::optional<ByteView>& icon);
-  void _awaitPlaceholder(std::string_view bundleIdentifier);
-  [[nodiscard]] bool _stopAwaitingPlaceholder(std::string_view bundleIdentifier);
-  [[nodiscard]] std::shared_ptr<platform::ZTAsset> _makeAsset(const WantedEntry& entry,
-                                                              const std::optional<std::string>& displayName,
-                                                              const plist::Value* restoreState);
-  void _handleReceivedAsset(const std::shared_ptr<platform::ZTAsset>& asset, TransferMarks marks,
-                            platform::InstallProgress* progress);
-  void _handleReceivedRestoreAsset(const std::shared_ptr<platform::ZTAsset>& asset,
-                                   platform::InstallProgress* progress);
-  void _handleFailedTransfer(const platform::ZTAsset& asset, const std::optional<Error>& error, TransferMarks marks,
-                             platform::InstallProgress* progress);
-  void _cancelRestoreOfFailedTransfer(const std::string& identifier);
-  [[nodiscard]] std::optional<plist::Value> _receivedPath(const platform::ZTAsset& asset);
-  void _installPackage(const platform::ZTAsset& asset);
+  void _handleReceivedAsset(const EndedTransfer& transfer);
+  void _handleReceivedRestoreAsset(const EndedTransfer& transfer);
+  void _handleFailedTransfer(const EndedTransfer& transfer);
   void _scheduleInstallRetry(const std::shared_ptr<platform::ZTAsset>& asset);
-  void _cancelRestoreOfFailedInstall(const std::string& identifier);
-  void _removeFailedInstall(const platform::ZTAsset& asset);
-  bool _installPlaceholder(const std::string& folder, const PlaceholderInfo& placeholder, std::string_view scenario,
-                           const plist::Dictionary& options);
-
-  /// The root of the restore state store: none when there is no file, null when it does not parse.
-  [[nodiscard]] std::optional<plist::Value> _loadRestoreState();
-
-  /// The home screen's icon order, saved beside; empty when it has none to give.
-  [[nodiscard]] static plist::Array _savedIconOrder(platform::Platform& platform);
+  void _waitForRestorePlaceholders();
 
   // Set once, by construction.
   platform::Platform& _platform;
@@ -336,59 +266,35 @@ class AppsClient final : public platform::ZTClient,
 
   // Changed only by the daemon's calls.
   std::optional<std::vector<std::string>> _uninstalledApps;
-  Identifiers _klpAppsToIgnore;
+  IdentifierSet _klpAppsToIgnore;
 
-  // Changed by the daemon's calls, which may report on several assets at once.
-  SharedIdentifierSet _outstandingDCXTransfers;
-
-  // Under `_accessQueue`, as are the todo list and the restore state store.
-  Identifiers _updatingApps;
-  Identifiers _userCancelledApps;
+  // Under `_accessQueue`, as are the todo list and the restore state.
+  IdentifierSet _updatingApps;
+  IdentifierSet _userCancelledApps;
 
   // Changed under `_restoreQueue`; the wait reads the count without it.
   std::atomic<std::int64_t> _restoringPlaceholderCount = 0;
-  Identifiers _placeholdersForRestoringApps;
+  IdentifierSet _placeholdersForRestoringApps;
   bool _finishedWaitingForPlaceHolderInstalls = false;
 
-  // Counted by concurrent installs.
+  // Changed by concurrent installs, and by concurrent reports on transfers.
   std::atomic<std::uint32_t> _numAppInstallsAttempted = 0;
+  std::mutex _outstandingMutex;
+  IdentifierSet _outstandingDCXTransfers;  ///< under `_outstandingMutex`
 
   // Synchronisation.
-  const std::shared_ptr<Group> _installGroup;  ///< installs queued, running or waiting to be tried again; left after
-                                               ///< their shares of the object and of the asset are given up
+  const std::shared_ptr<Group> _installGroup;  ///< pending installs; left after they release the object and the asset
   Group _restorePlaceHoldersWaitGroup;         ///< restore placeholders still awaited
   SerialQueue _accessQueue{"com.corvel.qor.Zephtra.AppSync"};
   SerialQueue _restoreQueue{"com.corvel.qor.Zephtra.AppRestore"};
   OperationQueue _installOperationQueue;  ///< its operations use all of the above
 
-  /// Set by the daemon's start-up notification. Last: it goes first, and its callbacks use all of the above.
+  /// Set by the daemon's start-up notification. Declared last so that it is destroyed first: its callbacks use every
+  /// member above.
   std::unique_ptr<platform::InstallObserver> _appInstallObserver;
 };
 
-/// The daemon's start-up notification: `context` is the AppsClient, or null, and then nothing happens.
+/// The daemon's start-up notification. Does nothing if `context`, the AppsClient, is null.
 void _handleZEPHStartupCompletedNotification(void* context, std::string_view name, const void* object);
-
-// ----------------------------------------------------------------------------------------------------------------------
-
-template <class Item>
-std::vector<Item> AppsClient::_orderTheItems(platform::Platform& platform,
-                                             std::map<std::string, Item, std::less<>>& items) {
-  const PlugInLog log(platform.syncFramework());
-  std::vector<Item> ordered;
-  ordered.reserve(items.size());
-  for (const plist::Value& identifier : _savedIconOrder(platform)) {
-    const auto text = identifier.string();
-    const auto found = text ? items.find(*text) : items.end();
-    if (found == items.end()) continue;
-    log.message("%s|prioritize %{public}@", identifier);
-    ordered.push_back(std::move(found->second));
-    items.erase(found);
-  }
-  for (const auto& [identifier, item] : items) {
-    log.message("%s|lastly %{public}@", identifier);
-    ordered.push_back(item);
-  }
-  return ordered;
-}
 
 }  // namespace appsync

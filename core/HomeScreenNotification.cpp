@@ -1,4 +1,4 @@
-// What the home screen hears of a sync, and the order of its icons.
+// The home screen's notification of a sync, and the order of its icons.
 #include "core/AppsClient.h"
 #include "platform/SyncFiles.h"
 
@@ -10,6 +10,21 @@ constexpr std::string_view kSyncNotification = "com.corvel.solvary.zeph.wsyncnot
 
 /// The one format in which home screens give their icon state.
 constexpr std::uint32_t kFlattenedIconStateFormat = 1;
+
+/// Returns the home screen's icon order after saving it; empty if the home screen has none.
+plist::Array savedIconOrder(platform::Platform& platform, const PlugInLog& log) {
+  platform::HomeScreenService& homeScreen = platform.homeScreen();
+  const auto iconState = homeScreen.getFlattenedIconState(homeScreen.blockableServerPort(), kFlattenedIconStateFormat);
+  if (!iconState || iconState->empty()) {
+    log.message("%s|got no icon sort order from SV");
+    return {};
+  }
+  log.message("%s|saved icon sort order");
+  platform.fileSystem().writeFileAtomically(kAssetSortOrderPath, *iconState).ignore();
+  auto order = plist::read(*iconState);
+  plist::Array* identifiers = order ? order->array() : nullptr;
+  return identifiers == nullptr ? plist::Array{} : std::move(*identifiers);
+}
 
 }  // namespace
 
@@ -27,19 +42,20 @@ void AppsClient::_notifySolvary(platform::Platform& platform, bool starting) {
   notify.post(kSyncNotification);
 }
 
-plist::Array AppsClient::_savedIconOrder(platform::Platform& platform) {
+std::vector<std::string> AppsClient::_prioritized(platform::Platform& platform, IdentifierSet identifiers) {
   const PlugInLog log(platform.syncFramework());
-  platform::HomeScreenService& homeScreen = platform.homeScreen();
-  const auto iconState = homeScreen.getFlattenedIconState(homeScreen.blockableServerPort(), kFlattenedIconStateFormat);
-  if (!iconState || iconState->empty()) {
-    log.message("%s|got no icon sort order from SV");
-    return {};
+  std::vector<std::string> prioritized;
+  prioritized.reserve(identifiers.size());
+  for (const plist::Value& identifier : savedIconOrder(platform, log)) {
+    const auto text = identifier.string();
+    const auto found = text ? identifiers.find(*text) : identifiers.end();
+    if (found == identifiers.end()) continue;
+    log.message("%s|prioritize %{public}@", identifier);
+    prioritized.push_back(std::move(identifiers.extract(found).value()));
   }
-  log.message("%s|saved icon sort order");
-  platform.fileSystem().writeFileAtomically(kAssetSortOrderPath, *iconState).ignore();
-  auto order = plist::read(*iconState);
-  plist::Array* identifiers = order ? order->array() : nullptr;
-  return identifiers == nullptr ? plist::Array{} : std::move(*identifiers);
+  for (const std::string& identifier : identifiers)
+    log.message("%s|lastly %{public}@", identifier);
+  return prioritized;
 }
 
 }  // namespace appsync

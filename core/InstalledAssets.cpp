@@ -10,46 +10,21 @@ namespace appsync {
 
 namespace {
 
-constexpr std::string_view kDeletedKey = "_Deleted";
-
-/// Identifiers in the order in which they first came; each once. Refers to what it was filled from.
-class CandidateSet {
- public:
-  void insert(std::string_view identifier) {
-    if (seen_.insert(identifier).second) inOrder_.push_back(identifier);
-  }
-
-  [[nodiscard]] auto begin() const { return inOrder_.begin(); }
-  [[nodiscard]] auto end() const { return inOrder_.end(); }
-
- private:
-  std::unordered_set<std::string_view, SeededHash> seen_;
-  std::vector<std::string_view> inOrder_;
-};
-
-void addIdentifiersNoLongerInstalled(const plist::Array& lastSyncState, platform::AppRegistry& registry,
-                                     CandidateSet& candidates) {
-  for (const plist::Value& value : lastSyncState) {
-    const auto identifier = value.string();
-    if (identifier && !registry.applicationIsInstalled(*identifier)) candidates.insert(*identifier);
-  }
-}
-
-/// What the host's todo list says of an app that is not on the device.
+/// The todo list's entry of an app that is not on the device.
 struct TodoState {
   bool found = false;
   bool failed = false;
   bool installed = false;
 
-  TodoState(const TodoIndex& todoList, std::string_view identifier) {
-    const plist::Value* entry = todoList.firstEntry(identifier);
+  TodoState(const todo::Index& todoList, std::string_view identifier) {
+    const plist::Value* entry = todoList.find(identifier);
     if (entry == nullptr) return;
     found = true;
     failed = entryHas(*entry, todo::kOperation, todo::kFailed);
     installed = entryHas(*entry, todo::kOperation, todo::kInstalled);
   }
 
-  /// The host still has work of its own to do on the app.
+  /// The host's request is neither done nor failed.
   [[nodiscard]] bool isPending() const { return found && !failed && !installed; }
 };
 
@@ -60,17 +35,27 @@ plist::Dictionary AppsClient::installedAssets() {
   const auto todoList = _loadPlist(_platform, kTodoListPath, nullptr);
   const auto lastSyncState = _loadPlist(_platform, kLastSyncStatePath, nullptr);
 
-  CandidateSet candidates;
+  // Each identifier once, in order. Refer to the two lists.
+  std::vector<std::string_view> candidates;
+  std::unordered_set<std::string_view, SecretHash> seen;
+  const auto addCandidate = [&](std::string_view identifier) {
+    if (seen.insert(identifier).second) candidates.push_back(identifier);
+  };
   if (const auto uninstalled = _platform.uninstalledApps().lookupUninstalled()) {
     _uninstalledApps = keysOf(*uninstalled);
     for (const std::string& identifier : *_uninstalledApps)
-      candidates.insert(identifier);
+      addCandidate(identifier);
   } else {
     _log.error("%s|InstavorLookupUninstalled returned NULL");
   }
-  if (lastSyncState) addIdentifiersNoLongerInstalled(*lastSyncState, _platform.defaultRegistry(), candidates);
+  if (lastSyncState) {
+    for (const plist::Value& value : *lastSyncState) {
+      const auto identifier = value.string();
+      if (identifier && !_platform.defaultRegistry().applicationIsInstalled(*identifier)) addCandidate(*identifier);
+    }
+  }
 
-  const TodoIndex index(todoList);
+  const todo::Index index(todoList);
   plist::Array deleted;
   for (const std::string_view candidate : candidates) {
     const TodoState state(index, candidate);

@@ -1,4 +1,4 @@
-// Making and ending the object, and its fixed answers to the daemon.
+// Construction and destruction, and the constant answers to the daemon.
 #include "core/AppsClient.h"
 #include "platform/SyncFiles.h"
 
@@ -43,17 +43,18 @@ void AppsClient::init() {
 }
 
 AppsClient::~AppsClient() {
-  if (const std::size_t outstanding = _outstandingDCXTransfers.size(); outstanding > 0) {
-    _log.error("%s|%{public}@ getting dealloc'd with %lu outstanding DCX transfers!", *this, outstanding);
+  // Callbacks may run until the observers below are removed.
+  if (const std::lock_guard lock(_outstandingMutex); !_outstandingDCXTransfers.empty()) {
+    _log.error("%s|%{public}@ getting dealloc'd with %lu outstanding DCX transfers!", *this,
+               _outstandingDCXTransfers.size());
   }
-  // Callbacks may still come until the registrations below have ended.
-  const Identifiers awaited = _restoreQueue.sync([this] { return _placeholdersForRestoringApps; });
+  const IdentifierSet awaited = _restoreQueue.sync([this] { return _placeholdersForRestoringApps; });
   if (!awaited.empty()) {
     _log.error("%s|%{public}@ getting dealloc'd with %{public}@pending placeholder install complete notifications",
                *this, awaited);
   }
   _platform.defaultRegistry().removeObserver(*this);
-  if (_runsInsideDaemon) {  // As it was at the start: what was registered then must go, whatever the answer is now.
+  if (_runsInsideDaemon) {  // As read at start-up, even if the main bundle's identifier has changed.
     _platform.systemNotify().removeObserver(this, platform::kZTStartupCompleteNotification);
     _appInstallObserver.reset();
   }

@@ -43,9 +43,13 @@ Takeover takeOverStagingFolder(platform::FileSystem& files, const PlugInLog& log
   return Takeover::taken;
 }
 
-/// Refer to the list.
-std::vector<std::string_view> identifiersToRemove(const plist::Array& todoList, const PlugInLog& log) {
+/// Returns the identifiers of the apps to remove, which refer to the list; empty if a restriction forbids removals.
+std::vector<std::string_view> appsToRemove(const plist::Array& todoList, bool removalAllowed, const PlugInLog& log) {
   std::vector<std::string_view> identifiers;
+  if (!removalAllowed) {
+    log.message("%s|Not processing deletes because app removal is restricted");
+    return identifiers;
+  }
   identifiers.reserve(8);
   for (const plist::Value& entry : todoList) {
     const plist::Value* identifier = entry.find(todo::kIdentifier);
@@ -53,6 +57,7 @@ std::vector<std::string_view> identifiersToRemove(const plist::Array& todoList, 
     log.message("%s|%{public}@ targeted for termination", *identifier);
     identifiers.emplace_back(*identifier->string());
   }
+  if (!identifiers.empty()) log.message("%s|performing %llu deletions", identifiers.size());
   return identifiers;
 }
 
@@ -72,52 +77,35 @@ void sendIconLayout(platform::Platform& platform, const PlugInLog& log) {
   homeScreen.setIconState(homeScreen.blockableServerPort(), *layout);
 }
 
-/// Kept for whoever has to find out what the host asked for.
-void writeDebugCopy(platform::FileSystem& files, plist::Array todoList) {
-  const auto bytes = plist::writeBinary(std::move(todoList));
-  if (bytes) files.writeFileAtomically(kTodoListDebugPath, *bytes).ignore();
-}
-
 }  // namespace
 
 bool AppsClient::reconcileSync(const platform::Assets&, std::string_view newAnchor, const platform::ProgressCallback&,
                                ErrorSlot error) {
   _log.message("%s|starting to reconcile sync with new anchor %{public}@", newAnchor);
-  // Between changes of the todo list: one that an install of the sync before still has to make would write the old list
-  // over the new one.
+  // On the queue: an install of the previous sync that is rewriting the old list must not overwrite the new one.
   const Takeover takeover =
       _accessQueue.sync([&] { return takeOverStagingFolder(_platform.fileSystem(), _log, error); });
   if (takeover == Takeover::taken) {
     const bool removalAllowed = _appRemovalAllowed();
     auto todoList = _loadPlist(_platform, kTodoListPath, error);
     if (todoList) {
-      _removeApps(*todoList, removalAllowed);
+      for (const std::string_view identifier : appsToRemove(*todoList, removalAllowed, _log)) {
+        if (_useInstallCoordinator) {
+          uninstallAppUsingCoordination(identifier);
+        } else {
+          uninstall(_platform, identifier, _log);
+        }
+      }
     } else {
       _log.message("%s|Nothing to do from Harvo");
     }
     _notifySolvary(_platform, true);
     sendIconLayout(_platform, _log);
-    if (todoList) writeDebugCopy(_platform.fileSystem(), std::move(*todoList));
+    // A copy for debugging: the host's requests as they were.
+    if (todoList) todo::save(_platform.fileSystem(), kTodoListDebugPath, std::move(*todoList)).ignore();
   }
   _log.message("%s|finished reconcile sync");
   return takeover != Takeover::failed;
-}
-
-void AppsClient::_removeApps(const plist::Array& todoList, bool removalAllowed) {
-  if (!removalAllowed) {
-    _log.message("%s|Not processing deletes because app removal is restricted");
-    return;
-  }
-  const auto identifiers = identifiersToRemove(todoList, _log);
-  if (identifiers.empty()) return;
-  _log.message("%s|performing %llu deletions", identifiers.size());
-  for (const std::string_view identifier : identifiers) {
-    if (_useInstallCoordinator) {
-      uninstallAppUsingCoordination(identifier);
-    } else {
-      uninstall(_platform, identifier, _log);
-    }
-  }
 }
 
 }  // namespace appsync

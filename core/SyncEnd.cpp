@@ -1,4 +1,4 @@
-// The ends: of the transfers, of the sync, and of syncing altogether.
+// The end of the transfers, the end of the sync, and the removal of all sync data.
 #include "base/Semaphore.h"
 #include "common/InstallNames.h"
 #include "core/AppsClient.h"
@@ -11,7 +11,7 @@ namespace {
 
 using platform::TSInstallState;
 
-/// Blocks until the store has answered.
+/// Blocks until the store has replied.
 void refreshReceipts(platform::Platform& platform, const PlugInLog& log) {
   const auto library = platform.makeSoftwareLibrary();
   Semaphore answered(platform.clock(), 0);
@@ -26,6 +26,20 @@ void refreshReceipts(platform::Platform& platform, const PlugInLog& log) {
   answered.wait();
 }
 
+/// Ends the loading phase of transfers that were never completed.
+void closeTransfers(AppsClient& client, platform::AppRegistry& registry, const PlugInLog& log,
+                    const IdentifierSet& identifiers, bool success) {
+  const TSInstallState state = success ? TSInstallState::Finished : TSInstallState::Failed;
+  for (const std::string& identifier : identifiers) {
+    log.message("%s|Setting state for outstanding DCX loading phase of asset %{public}@ to %{public}@", identifier,
+                state);
+    const auto progress = client._progressForAssetIdentifier(identifier);
+    if (!progress) continue;
+    progress->setInstallState(state);
+    registry.installPhaseFinishedForProgress(*progress);
+  }
+}
+
 }  // namespace
 
 void AppsClient::assetTransferEndedWithSuccess(bool success) {
@@ -34,33 +48,25 @@ void AppsClient::assetTransferEndedWithSuccess(bool success) {
   _notifySolvary(_platform, false);
   if (_getAndResetNumAppInstallsAttempted() >= 1) refreshReceipts(_platform, _log);
 
-  const Identifiers outstanding = _outstandingDCXTransfers.identifiers();
+  std::unique_lock lock(_outstandingMutex);
+  const IdentifierSet outstanding = _outstandingDCXTransfers;
+  lock.unlock();
   if (outstanding.empty()) return;
   if (_useInstallCoordinator) {
     assetSyncFinishedWithStatus(success, outstanding);
   } else {
-    _closeOutstandingTransfers(outstanding, success);
+    closeTransfers(*this, _platform.defaultRegistry(), _log, outstanding, success);
   }
   if (success) {
     _log.error("%s|Called with success == YES but with %lu outstanding DCX transfers!", outstanding.size());
   }
+  lock.lock();
   _outstandingDCXTransfers.clear();
+  lock.unlock();
   _accessQueue.sync([this] {
     _updatingApps.clear();
     _userCancelledApps.clear();
   });
-}
-
-void AppsClient::_closeOutstandingTransfers(const Identifiers& outstanding, bool success) {
-  const TSInstallState state = success ? TSInstallState::Finished : TSInstallState::Failed;
-  for (const std::string& identifier : outstanding) {
-    _log.message("%s|Setting state for outstanding DCX loading phase of asset %{public}@ to %{public}@", identifier,
-                 state);
-    const auto progress = _progressForAssetIdentifier(identifier);
-    if (!progress) continue;
-    progress->setInstallState(state);
-    _platform.defaultRegistry().installPhaseFinishedForProgress(*progress);
-  }
 }
 
 void AppsClient::syncEndedWithSuccess(bool success) {
@@ -84,7 +90,7 @@ void AppsClient::syncEndedWithSuccess(bool success) {
 
 void AppsClient::clearSyncData() {
   _log.message("%s|blasting work area");
-  // Between changes of the files in it: one that a coordinated install still has to make would leave the folder behind.
+  // On the queue: a coordinated install that writes one of the files would recreate the folder.
   _accessQueue.sync([this] { _platform.fileSystem().removeItem(kSyncFolder).ignore(); });
 
   _log.message("%s|Uninstalling all placeholder apps");

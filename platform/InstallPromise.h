@@ -56,7 +56,7 @@ class PromisedTransferToPath : public InstallPromise {
 /// A promise that is fulfilled outside the service, which only learns that it is complete.
 class PromisedOutOfBandTransfer : public InstallPromise {};
 
-/// Marks `promise` as delivered in full: fraction 1, then complete.
+/// Marks the promise as fulfilled, and its progress as complete.
 inline void fulfil(InstallPromise& promise) {
   promise.setPercentComplete(1.0);
   promise.setComplete(true);

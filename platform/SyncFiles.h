@@ -4,8 +4,6 @@
 #include <cstdint>
 #include <string_view>
 
-#include "plist/PropertyList.h"
-
 namespace appsync {
 
 /// The only dataclass that the plug-in syncs.
@@ -28,6 +26,16 @@ inline constexpr std::string_view kIconLayoutPath =
 inline constexpr std::string_view kLastSyncStatePath = "/var/mobile/Library/ApplicationSync/LastSyncAppState.plist";
 inline constexpr std::string_view kAssetSortOrderPath = "/var/mobile/Library/ApplicationSync/AssetSortOrder.plist";
 inline constexpr std::string_view kIconScratchFolder = "/var/mobile/Library/ApplicationSync/Icons";
+
+/// What the host left on a restored device: a dictionary of bundle identifiers.
+inline constexpr std::string_view kRestoreApplicationsPath = "/var/mobile/Media/HarvoRestore/RestoreApplications.plist";
+
+/// The backup service's list of demoted apps: a dictionary of two arrays of bundle identifiers.
+inline constexpr std::string_view kDemotedAppsPath =
+    "/var/mobile/Library/Preferences/com.corvel.Vaultory.DemotedApps.plist";
+
+/// Key of the installed-assets report: an array of { `platform::BundleIdentifierKey`: identifier }.
+inline constexpr std::string_view kDeletedKey = "_Deleted";
 
 /// Names of files next to an app's bundle, or among the files that the host staged for it.
 inline constexpr std::string_view kInfoPlistName = "Info.plist";
@@ -55,9 +63,17 @@ inline constexpr std::string_view kInstalled = "INSTALLED";
 inline constexpr std::string_view kFailed = "FAILED";
 }  // namespace todo
 
-/// Returns true if `value`, untrusted input that may be null, is acceptable as an identifier or path: a string that
-/// does not contain "/..".
-[[nodiscard]] bool isValidBundleIdentifier(const plist::Value* value);
-[[nodiscard]] bool isValidBundleIdentifier(std::string_view text);
+/// Keys of an app's entry in the restore file, each with data.
+namespace restore_file {
+inline constexpr std::string_view kMetadataKey = "HarvoMetadata";
+inline constexpr std::string_view kLicenceKey = "ApplicationSINF";
+inline constexpr std::string_view kIconKey = "PlaceholderIcon";
+}  // namespace restore_file
+
+/// Keys of the demoted-apps file.
+namespace demoted_apps {
+inline constexpr std::string_view kAutomaticKey = "AutomaticDowngrades";
+inline constexpr std::string_view kIntentionalKey = "IntentionalDowngrades";
+}  // namespace demoted_apps
 
 }  // namespace appsync

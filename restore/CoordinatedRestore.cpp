@@ -17,7 +17,7 @@ using platform::TransactionStep;
 /// Whether an app's package is asked for: a demoted app stays without one.
 enum class Package { fromStore, none };
 
-/// In what the restores of demoted apps and of others differ.
+/// The differences between restoring a demoted app and any other app.
 struct RestoreFlow {
   CoordinatorKind kind;
   Package package;
@@ -35,7 +35,7 @@ constexpr RestoreFlow kDemoted{
     "%s|processing app restore for demoted bundle '%{public}@' with install coordination",
     "%s|processing app restore for demoted app %{public}@ finished with status %d error %{public}@"};
 
-/// What came from the backup, and what is held so far.
+/// The app's data from the backup, and the parsed metadata.
 struct RestorePreparation : CoordinatedPreparation {
   const RestoreFlow& flow;
   DemotionStatus status;
@@ -69,8 +69,8 @@ bool takeCoordinator(RestorePreparation& preparation) {
   return preparation.coordinator != nullptr || failWithoutCoordinator(preparation);
 }
 
-/// Then an earlier run, or the store itself, has seen to everything.
-bool isInTheStoresHands(const RestorePreparation& preparation) {
+/// Returns true if the store is already responsible for the package; nothing is left to do.
+bool storeIsResponsible(const RestorePreparation& preparation) {
   if (preparation.flow.package == Package::none) return false;
   const ClientIdentity responsible = preparation.coordinator->appAssetPromiseResponsibleClient(nullptr);
   if (responsible != ClientIdentity::CXClientBazaarly) return false;
@@ -79,7 +79,7 @@ bool isInTheStoresHands(const RestorePreparation& preparation) {
   return true;
 }
 
-/// Fails for another client's coordinator, which is never driven and is dropped as if there were none.
+/// Coordinators created by other clients must not be changed; treats one as missing.
 bool observeCoordinator(RestorePreparation& preparation) {
   const ClientIdentity creator = preparation.coordinator->creatorIdentifier();
   if (creator != ClientIdentity::CXClientSync) {
@@ -118,9 +118,9 @@ bool providePlaceholder(RestorePreparation& preparation) {
   preparation.placeholder = preparation.client._placeHolderForBundleIdentifierWithHarvoMetadata(
       preparation.identifier, preparation.metadata, preparation.sinf, preparation.icon, preparation.status);
   if (!preparation.placeholder) return false;
-  // In one: the service may report the placeholder before this call returns, and then it must be awaited already.
-  const Status set = preparation.client.dataMigratorSetPlaceHolderPromiseForRestoreAppBundle(
-      preparation.identifier, [&] { return preparation.coordinator->setPlaceholderPromise(preparation.placeholder); });
+  // In one step: the service may report the placeholder before this call returns.
+  const Status set = preparation.client._awaitPlaceholderAfter(
+      [&] { return preparation.coordinator->setPlaceholderPromise(preparation.placeholder); }, preparation.identifier);
   if (!preparation.report(set, "%s|added placeholder promise for %{public}@",
                           "%s|Error %{public}@ setting placeholder promise for '%{public}@'")) {
     return false;
@@ -152,7 +152,7 @@ bool prepare(RestorePreparation preparation) {
   beginStep(transactions, TransactionStep::restoreApp, preparation.identifier, flow.step);
 
   const bool hasCoordinator = readMetadata(preparation) && takeCoordinator(preparation);
-  if (hasCoordinator && isInTheStoresHands(preparation)) {
+  if (hasCoordinator && storeIsResponsible(preparation)) {
     endStep(transactions, TransactionStep::restoreApp, true, preparation.identifier, flow.step);
     return true;
   }

@@ -1,6 +1,5 @@
-// The placeholder of a restored app as the install-coordination service wants it.
+// The placeholder of a restored app for the install-coordination service.
 #include "common/PlaceholderBundle.h"
-#include "common/PlaceholderIcon.h"
 #include "common/SyncError.h"
 #include "coordination/Preparation.h"
 #include "core/AppsClient.h"
@@ -46,7 +45,7 @@ bool setStoreMetadata(CoordinatedPreparation& preparation, const plist::Dictiona
                             "%s|Error %{public}@ setting store metadata for '%{public}@'");
 }
 
-/// True without one too.
+/// Returns true also without a licence.
 bool setLicence(CoordinatedPreparation& preparation, const std::optional<ByteView>& sinf) {
   return !sinf || preparation.report(preparation.placeholder->setSinfData(*sinf),
                                      "%s|set SINF data on placeholder for %{public}@",
@@ -77,10 +76,9 @@ std::shared_ptr<Placeholder> AppsClient::_placeHolderForBundleIdentifierWithHarv
   preparation.placeholder = _placeHolderForBundleIdentifier(identifier, metadata.displayName().value_or(identifier),
                                                             installTypeFor(demotionStatus));
   if (!preparation.placeholder) return nullptr;
-  const bool hasItsIcon = iconSize == 0 || _createIconPromiseForBundleIdentifier(
-                                               identifier, icon, iconSize, preparation.placeholder, false) != nullptr;
-  if (hasItsIcon && setAttributes(preparation, metadata) && setStoreMetadata(preparation, harvoMetadata) &&
-      setLicence(preparation, sinfData) && completeConfiguration(preparation)) {
+  if (preparation.attachIcon(icon, iconSize, IconOwner::restore) && setAttributes(preparation, metadata) &&
+      setStoreMetadata(preparation, harvoMetadata) && setLicence(preparation, sinfData) &&
+      completeConfiguration(preparation)) {
     return preparation.placeholder;
   }
   preparation.placeholder

@@ -3,14 +3,15 @@
 #include <utility>
 
 #include "core/AppsClient.h"
+#include "platform/SyncFiles.h"
 #include "plist/Access.h"
 
 namespace appsync {
 
 DemotedApps::DemotedApps(std::optional<plist::Dictionary> lists)
     : lists_(std::move(lists)),
-      automatically_(identifiersUnder("AutomaticDowngrades")),
-      intentionally_(identifiersUnder("IntentionalDowngrades")) {}
+      automatically_(identifiersUnder(demoted_apps::kAutomaticKey)),
+      intentionally_(identifiersUnder(demoted_apps::kIntentionalKey)) {}
 
 DemotedApps::IdentifierViews DemotedApps::identifiersUnder(std::string_view key) const {
   const plist::Value* list = lists_ ? lists_->find(key) : nullptr;

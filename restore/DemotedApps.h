@@ -11,14 +11,10 @@
 
 namespace appsync {
 
-/// Kept by the device's backup service: a dictionary of two arrays of bundle identifiers.
-inline constexpr std::string_view kDemotedAppsPath =
-    "/var/mobile/Library/Preferences/com.corvel.Vaultory.DemotedApps.plist";
-
-/// Answers for many apps after one walk of the lists.
+/// The lists of the demoted-apps file, indexed once for many look-ups.
 class DemotedApps {
  public:
-  /// Without a dictionary, or for a list that is none, nothing is demoted.
+  /// If `lists` is nullopt, or an entry is not an array, no app counts as demoted.
   explicit DemotedApps(std::optional<plist::Dictionary> lists);
   DemotedApps(const DemotedApps&) = delete;
   DemotedApps& operator=(const DemotedApps&) = delete;
@@ -34,7 +30,7 @@ class DemotedApps {
   [[nodiscard]] IdentifierViews identifiersUnder(std::string_view key) const;
 
   const std::optional<plist::Dictionary> lists_;
-  // Refer to the lists.
+  // Refer to `lists_`.
   const IdentifierViews automatically_;
   const IdentifierViews intentionally_;
 };

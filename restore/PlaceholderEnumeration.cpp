@@ -1,4 +1,5 @@
-// Which apps on the device are placeholders.
+#include "restore/PlaceholderEnumeration.h"
+
 #include "core/AppsClient.h"
 
 namespace appsync {
@@ -9,7 +10,7 @@ using platform::AppRecord;
 using platform::BundleKind;
 using platform::BundleRecord;
 
-/// `bundle` as a placeholder app's record; null when it is anything else.
+/// Returns the bundle's record, or null if it is not a placeholder app.
 const AppRecord* asPlaceholder(const BundleRecord& bundle) {
   const AppRecord* record = bundle.asAppRecord();
   return record != nullptr && record->isPlaceholder() ? record : nullptr;
@@ -17,24 +18,22 @@ const AppRecord* asPlaceholder(const BundleRecord& bundle) {
 
 }  // namespace
 
-bool AppsClient::_placeholderExistsForApplication(std::string_view bundleIdentifier, const Identifiers* userBundles) {
-  if (_useInstallCoordinator) return false;  // Coordinators own the placeholders then.
-  bool found = userBundles != nullptr && userBundles->contains(bundleIdentifier);
-  if (userBundles == nullptr) {
-    _platform.defaultRegistry().enumerateBundlesOfType(BundleKind::user, [&](const BundleRecord& bundle, bool& stop) {
-      found = bundle.applicationIdentifier() == bundleIdentifier;
-      stop = found;
-    });
-  }
-  if (found) _log.message("%s|Found placeholder for bundle %{public}@", bundleIdentifier);
-  return found;
-}
-
-Identifiers AppsClient::_userBundles() {
-  Identifiers identifiers;
-  _platform.defaultRegistry().enumerateBundlesOfType(
+IdentifierSet userBundles(platform::AppRegistry& registry) {
+  IdentifierSet identifiers;
+  registry.enumerateBundlesOfType(
       BundleKind::user, [&](const BundleRecord& bundle, bool&) { identifiers.insert(bundle.applicationIdentifier()); });
   return identifiers;
+}
+
+bool AppsClient::_placeholderExistsForApplication(std::string_view bundleIdentifier) {
+  if (_useInstallCoordinator) return false;  // Placeholders belong to coordinators.
+  bool found = false;
+  _platform.defaultRegistry().enumerateBundlesOfType(BundleKind::user, [&](const BundleRecord& bundle, bool& stop) {
+    found = found || bundle.applicationIdentifier() == bundleIdentifier;
+    stop = found;
+  });
+  if (found) _log.message(kFoundPlaceholder, bundleIdentifier);
+  return found;
 }
 
 void AppsClient::_enumeratePlaceholdersWithBlock(const PlaceholderVisitor& visit) {
@@ -43,8 +42,8 @@ void AppsClient::_enumeratePlaceholdersWithBlock(const PlaceholderVisitor& visit
   });
 }
 
-Identifiers AppsClient::_getSystemAppPlaceholders() {
-  Identifiers identifiers;
+IdentifierSet AppsClient::_getSystemAppPlaceholders() {
+  IdentifierSet identifiers;
   _platform.defaultRegistry().enumerateBundlesOfType(BundleKind::system, [&](const BundleRecord& bundle, bool&) {
     if (const AppRecord* record = asPlaceholder(bundle)) identifiers.insert(record->applicationIdentifier());
   });

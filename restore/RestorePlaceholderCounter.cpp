@@ -1,24 +1,54 @@
-// Restore placeholders that are still awaited: each is in the set, in the count and in the group, or in none of them.
+// Restore placeholders that are still awaited. Each is in the set, in the count and in the group, or in none of them;
+// the three change together, on `_restoreQueue`.
 #include "core/AppsClient.h"
 
 namespace appsync {
 
-void AppsClient::dataMigratorSetPlaceHolderPromiseForRestoreAppBundle(std::string_view bundleIdentifier) {
-  _restoreQueue.sync([&] { _awaitPlaceholder(bundleIdentifier); });
+namespace {
+
+/// Does nothing for a placeholder that is awaited already.
+void awaitPlaceholder(std::string_view identifier, IdentifierSet& awaited, std::atomic<std::int64_t>& count,
+                      Group& group, const PlugInLog& log) {
+  if (!awaited.emplace(identifier).second) return;
+  group.enter();
+  ++count;
+  log.message("%s|DataMigrator will wait for CN to install placeholder for %{public}@, _restoringPlaceholderCount %lld",
+              identifier, count.load());
 }
 
-Status AppsClient::dataMigratorSetPlaceHolderPromiseForRestoreAppBundle(std::string_view bundleIdentifier,
-                                                                        const std::function<Status()>& setPromise) {
+/// Returns false for a placeholder that is not awaited.
+bool stopAwaiting(std::string_view identifier, IdentifierSet& awaited, std::atomic<std::int64_t>& count, Group& group) {
+  const auto found = awaited.find(identifier);
+  if (found == awaited.end()) return false;
+  group.leave();
+  --count;
+  awaited.erase(found);
+  return true;
+}
+
+}  // namespace
+
+void AppsClient::dataMigratorSetPlaceHolderPromiseForRestoreAppBundle(std::string_view bundleIdentifier) {
+  _awaitPlaceholderAfter([] { return Status(); }, bundleIdentifier).ignore();
+}
+
+Status AppsClient::_awaitPlaceholderAfter(const std::function<Status()>& setPromise,
+                                          std::string_view bundleIdentifier) {
   return _restoreQueue.sync([&] {
     Status set = setPromise();
-    if (set) _awaitPlaceholder(bundleIdentifier);
+    if (set) {
+      awaitPlaceholder(bundleIdentifier, _placeholdersForRestoringApps, _restoringPlaceholderCount,
+                       _restorePlaceHoldersWaitGroup, _log);
+    }
     return set;
   });
 }
 
 void AppsClient::dataMigratorCancelledCoordinatorForRestoreAppBundle(std::string_view bundleIdentifier) {
   _restoreQueue.sync([&] {
-    if (!_stopAwaitingPlaceholder(bundleIdentifier)) return;
+    const bool wasAwaited = stopAwaiting(bundleIdentifier, _placeholdersForRestoringApps, _restoringPlaceholderCount,
+                                         _restorePlaceHoldersWaitGroup);
+    if (!wasAwaited) return;
     _log.message(
         "%s|DataMigrator cancelled coordinator for restoring app bundle %{public}@ _restoringPlaceholderCount %lld",
         bundleIdentifier, _restoringPlaceholderCount.load());
@@ -28,33 +58,14 @@ void AppsClient::dataMigratorCancelledCoordinatorForRestoreAppBundle(std::string
 void AppsClient::cnDidInstallPlaceHolderForAppBundle(std::optional<std::string_view> bundleIdentifier) {
   _restoreQueue.sync([&] {
     if (_finishedWaitingForPlaceHolderInstalls) return;
-    if (bundleIdentifier && _stopAwaitingPlaceholder(*bundleIdentifier)) {
+    if (bundleIdentifier && stopAwaiting(*bundleIdentifier, _placeholdersForRestoringApps, _restoringPlaceholderCount,
+                                         _restorePlaceHoldersWaitGroup)) {
       _log.message("%s|CN finished installing placeholder for %{public}@, _restoringPlaceholderCount %lld",
                    *bundleIdentifier, _restoringPlaceholderCount.load());
     } else {
       _log.error("%s|Ignoring notification from CN about installing placeholder for %{public}@", bundleIdentifier);
     }
   });
-}
-
-/// On `_restoreQueue`. Once for each app.
-void AppsClient::_awaitPlaceholder(std::string_view bundleIdentifier) {
-  if (!_placeholdersForRestoringApps.emplace(bundleIdentifier).second) return;
-  _restorePlaceHoldersWaitGroup.enter();
-  ++_restoringPlaceholderCount;
-  _log.message(
-      "%s|DataMigrator will wait for CN to install placeholder for %{public}@, _restoringPlaceholderCount %lld",
-      bundleIdentifier, _restoringPlaceholderCount.load());
-}
-
-/// On `_restoreQueue`. False when it was not awaited.
-bool AppsClient::_stopAwaitingPlaceholder(std::string_view bundleIdentifier) {
-  const auto awaited = _placeholdersForRestoringApps.find(bundleIdentifier);
-  if (awaited == _placeholdersForRestoringApps.end()) return false;
-  _restorePlaceHoldersWaitGroup.leave();
-  --_restoringPlaceholderCount;
-  _placeholdersForRestoringApps.erase(awaited);
-  return true;
 }
 
 }  // namespace appsync

@@ -1,4 +1,4 @@
-// What the host left on the device after a restore: each app in it gets a placeholder.
+// The host's restore file: each app in it gets a placeholder.
 #include <chrono>
 #include <utility>
 
@@ -7,18 +7,18 @@
 #include "plist/Access.h"
 #include "plist/DictionaryStream.h"
 #include "restore/DemotedApps.h"
+#include "restore/PlaceholderEnumeration.h"
 
 namespace appsync {
 
 namespace {
 
-constexpr std::string_view kRestoreInfoPath = "/var/mobile/Media/HarvoRestore/RestoreApplications.plist";
-/// Where it ends, for whoever has to find out what was restored.
+/// The restore file is moved here, for debugging.
 constexpr std::string_view kFiledRestoreInfoPath = "/var/mobile/Library/Logs/MediaServices/RestoreApplications.plist";
 
-/// A host's file may hold thousands of apps with their icons: only one is in memory beside it at a time.
+/// The file may contain thousands of apps with their icons: it is read as a stream, one app at a time.
 std::optional<plist::DictionaryStream> readRestoreInfo(platform::FileSystem& files, const PlugInLog& log) {
-  auto bytes = files.readFile(kRestoreInfoPath);
+  auto bytes = files.readFile(kRestoreApplicationsPath);
   if (!bytes) {
     log.message("%s|failed to read harvo app restore info. err=%{public}@", bytes.error());
     return std::nullopt;
@@ -34,19 +34,51 @@ std::optional<plist::DictionaryStream> readRestoreInfo(platform::FileSystem& fil
 
 void fileRestoreInfoAway(platform::FileSystem& files, const PlugInLog& log) {
   files.removeItem(kFiledRestoreInfoPath).ignore();
-  const Status moved = files.moveItem(kRestoreInfoPath, kFiledRestoreInfoPath);
+  const Status moved = files.moveItem(kRestoreApplicationsPath, kFiledRestoreInfoPath);
   if (!moved) log.message("%s|failed to copy harvo metadata. err=%{public}@", moved.error());
 }
 
-/// The app's store metadata, if there is something to be done for it.
+/// Returns the app's store metadata, or nullopt if the app needs no placeholder.
 std::optional<ByteView> usableMetadata(const plist::Value& entry, std::string_view identifier, const PlugInLog& log) {
   if (entry.dictionary() == nullptr) {
     log.message("%s|no harvo restore info for '%{public}@' - skipping", identifier);
     return std::nullopt;
   }
-  const auto metadata = dataIn(entry.find("HarvoMetadata"));
+  const auto metadata = dataIn(entry.find(restore_file::kMetadataKey));
   if (!metadata) log.message("%s|no HarvoMetadata for '%{public}@' - ignoring", identifier);
   return metadata;
+}
+
+/// Returns the result for the last app that needed a placeholder, or false if none did.
+bool restoreApps(AppsClient& client, platform::Platform& platform, plist::DictionaryStream& info,
+                 bool useInstallCoordinator, const PlugInLog& log) {
+  const DemotedApps demotedApps(AppsClient::_loadDemotedAppsPlist(platform, kDemotedAppsPath, nullptr));
+  log.summary("%s|Demoted Apps: %{public}@", demotedApps.lists());
+  // Enumerate once instead of once per app. Apps installed during the restore are not seen.
+  const IdentifierSet existing = useInstallCoordinator ? IdentifierSet{} : userBundles(platform.defaultRegistry());
+  bool result = false;
+  info.visit([&](std::string_view identifier, const plist::Value& entry) {
+    if (!isValidBundleIdentifier(identifier)) {
+      log.message("%s|Ignoring invalid path: %{public}@", identifier);
+      return;
+    }
+    const DemotionStatus status = demotedApps.statusOf(identifier);
+    log.message("%s|processing harvo restore info for '%{public}@' demotionStatus :%lu", identifier,
+                static_cast<std::uint64_t>(status));
+    if (existing.contains(identifier)) {
+      log.message(kFoundPlaceholder, identifier);
+      log.message("%s|placeholder already exists for '%{public}@' - skiping'", identifier);
+      return;
+    }
+    const auto metadata = usableMetadata(entry, identifier, log);
+    if (!metadata) return;
+    const auto sinf = dataIn(entry.find(restore_file::kLicenceKey));
+    const auto icon = dataIn(entry.find(restore_file::kIconKey));
+    result = useInstallCoordinator
+                 ? client.prepareAppForRestoreUsingCoordination(identifier, *metadata, sinf, icon, status)
+                 : client._processHarvoRestoreInfoForApp(identifier, *metadata, sinf, icon);
+  });
+  return result;
 }
 
 }  // namespace
@@ -62,13 +94,13 @@ bool AppsClient::reconcileRestoreOfType(std::int32_t restoreType, ErrorSlot erro
 
 bool AppsClient::_processHarvoRestoreInfo() {
   platform::FileSystem& files = _platform.fileSystem();
-  if (!files.fileExists(kRestoreInfoPath)) {
+  if (!files.fileExists(kRestoreApplicationsPath)) {
     _log.message("%s|no harvo restore plist found - skipping processing of harvo restored apps");
     return true;
   }
   bool result = false;
   if (auto info = readRestoreInfo(files, _log)) {
-    result = _restoreApps(*info);
+    result = restoreApps(*this, _platform, *info, _useInstallCoordinator, _log);
     info.reset();
     _waitForRestorePlaceholders();
   }
@@ -76,37 +108,7 @@ bool AppsClient::_processHarvoRestoreInfo() {
   return result;
 }
 
-/// What came of the last app that there was something to do for.
-bool AppsClient::_restoreApps(plist::DictionaryStream& info) {
-  const DemotedApps demotedApps(_loadDemotedAppsPlist(_platform, kDemotedAppsPath, nullptr));
-  _log.summary("%s|Demoted Apps: %{public}@", demotedApps.lists());
-  // Asked for each app, a walk would cost as many walks as there are apps. What comes to the device while a restore
-  // runs is not seen.
-  const Identifiers userBundles = _useInstallCoordinator ? Identifiers{} : _userBundles();
-  bool result = false;
-  info.visit([&](std::string_view identifier, const plist::Value& entry) {
-    if (!isValidBundleIdentifier(identifier)) {
-      _log.message("%s|Ignoring invalid path: %{public}@", identifier);
-      return;
-    }
-    const DemotionStatus status = demotedApps.statusOf(identifier);
-    _log.message("%s|processing harvo restore info for '%{public}@' demotionStatus :%lu", identifier,
-                 static_cast<std::uint64_t>(status));
-    if (_placeholderExistsForApplication(identifier, &userBundles)) {
-      _log.message("%s|placeholder already exists for '%{public}@' - skiping'", identifier);
-      return;
-    }
-    const auto metadata = usableMetadata(entry, identifier, _log);
-    if (!metadata) return;
-    const auto sinf = dataIn(entry.find("ApplicationSINF"));
-    const auto icon = dataIn(entry.find("PlaceholderIcon"));
-    result = _useInstallCoordinator ? prepareAppForRestoreUsingCoordination(identifier, *metadata, sinf, icon, status)
-                                    : _processHarvoRestoreInfoForApp(identifier, *metadata, sinf, icon);
-  });
-  return result;
-}
-
-/// Bounded: a placeholder that never comes does not hold the daemon up for ever.
+/// Bounded: a placeholder that is never installed must not block the daemon.
 void AppsClient::_waitForRestorePlaceholders() {
   constexpr std::int64_t kSecondsEach = 5;
   const std::int64_t awaited = _restoringPlaceholderCount;

@@ -1,4 +1,4 @@
-// How far each app of the host's todo list has come, written back into it.
+// The state of each app, written back into the host's todo list.
 #include <utility>
 
 #include "common/TodoList.h"
@@ -9,20 +9,14 @@
 namespace appsync {
 
 void AppsClient::changeAssetID(std::string_view identifier, std::string_view toDo) {
-  auto todoList = _loadPlist(_platform, kTodoListPath, nullptr);
-  plist::Value* entry = todoList ? firstEntry(*todoList, identifier) : nullptr;
-  if (entry == nullptr) return;
-
-  _log.message("%s|Changing %{public}@ from %{public}@ to %{public}@", identifier,
-               std::as_const(*entry).find(todo::kOperation), toDo);
-  entry->dictionary()->set(todo::kOperation, toDo);
-  const auto bytes = plist::writeBinary(std::move(*todoList));
-  if (bytes) _platform.fileSystem().writeFileAtomically(kTodoListPath, *bytes).ignore();
+  auto list = _loadPlist(_platform, kTodoListPath, nullptr);
+  if (!list || !todo::setOperation(*list, identifier, toDo, _log)) return;
+  todo::save(_platform.fileSystem(), kTodoListPath, std::move(*list)).ignore();
 }
 
 std::optional<plist::Value> AppsClient::_operationStateForIdentifier(std::string_view identifier) {
-  const auto todoList = _loadPlist(_platform, kTodoListPath, nullptr);
-  const plist::Value* entry = todoList ? firstEntry(*todoList, identifier) : nullptr;
+  const auto list = _loadPlist(_platform, kTodoListPath, nullptr);
+  const plist::Value* entry = list ? todo::find(*list, identifier) : nullptr;
   const plist::Value* operation = plist::find(entry, todo::kOperation);
   return operation == nullptr ? std::nullopt : std::optional(*operation);
 }

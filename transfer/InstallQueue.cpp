@@ -21,8 +21,8 @@ constexpr std::chrono::seconds kRetryDelay{30};
 /// Remains if the home screen sets no outcome: an unknown failure.
 constexpr TerminationAssertionOutcome kNoOutcome{0xFF};
 
-/// What an install holds while it is queued, runs or waits to be tried again. The group is left last: whoever waits for
-/// it may then end the client, the assets and the platform.
+/// What an install owns while it is queued, runs or waits for a retry. The group is left last: its waiter may then
+/// destroy the client, the assets and the platform.
 struct PendingInstall {
   std::shared_ptr<const GroupEntry> groupEntry;
   std::shared_ptr<ZTAsset> asset;
@@ -47,12 +47,45 @@ void removePackage(platform::FileSystem& files, const ZTAsset& asset) {
   if (!path.empty()) files.removeItem(path).ignore();
 }
 
-/// Ends an install for which the system has no thread like any failed install. Nothing is thrown to the daemon, nor out
-/// of an operation or a task.
+/// Reports an install for which the system has no thread as a failed install; nothing is thrown to the daemon.
 void failInstall(AppsClient& client, platform::FileSystem& files, const ZTAsset& asset,
                  const std::system_error& noThread) {
   client.assetInstallFailed(asset, {std::string(domains::kPOSIX), noThread.code().value(), noThread.what(), {}});
   removePackage(files, asset);
+}
+
+Status installPackage(platform::AppRegistry& registry, const ZTAsset& asset) {
+  const platform::FileLocation package{asset.path().value_or("")};
+  return registry.installApplication(package, {{platform::PackageTypeKey, platform::kPackageTypeCustomer},
+                                               {platform::BundleIdentifierKey, asset.identifier()}});
+}
+
+/// Does nothing but log if installs are coordinated.
+void cancelRestore(platform::BackupManager& backups, const std::string& identifier, bool useInstallCoordinator,
+                   const PlugInLog& log) {
+  if (useInstallCoordinator) {
+    log.message("%s|not asking backup manager to cancel app restore for %{public}@ as install coordination is enabled",
+                identifier);
+  } else {
+    backups.cancelApplicationRestore(identifier, nullptr);
+  }
+}
+
+void removeFailedInstall(AppsClient& client, platform::Platform& platform, const ZTAsset& asset,
+                         bool useInstallCoordinator, const PlugInLog& log) {
+  const std::string& identifier = asset.identifier();
+  if (useInstallCoordinator && asset.isRestore()) {
+    log.message("%s|not uninstalling restore asset %{public}@ as install coordination is enabled", identifier);
+    return;
+  }
+  if (useInstallCoordinator) {
+    client.uninstallAppUsingCoordination(identifier);
+    return;
+  }
+  const Status removed = platform.defaultRegistry().uninstallApplication(identifier);
+  if (!removed) log.error("%s|Uninstall of %{public}@ failed.", identifier);
+  platform.transactionLog().logScenario(kRestoreScenario, 0, removed.ok(), identifier,
+                                        removed ? "placeholder removed" : "failed to remove placeholder");
 }
 
 }  // namespace
@@ -83,7 +116,15 @@ void AppsClient::_performAssetInstall(const std::shared_ptr<ZTAsset>& asset) {
   logAssertion(_log, outcome, identifier);
   const AssertionRule rule = assertionRule(outcome);
   _platform.transactionLog().logScenario(kInstallScenario, 0, rule.isSuccess, identifier, rule.description);
-  if (rule.action == AssertionAction::install) _installPackage(*asset);
+  if (rule.action == AssertionAction::install) {
+    const Status installed = installPackage(_platform.defaultRegistry(), *asset);
+    if (installed) {
+      assetInstallSucceeded(*asset);
+    } else {
+      assetInstallFailed(*asset, installed.error());
+    }
+    _numAppInstallsAttempted.fetch_add(1, std::memory_order_relaxed);
+  }
   if (rule.action == AssertionAction::fail) assetInstallFailed(*asset, {std::string(domains::kPOSIX), EINVAL, {}, {}});
 
   assertion.reset();
@@ -92,19 +133,6 @@ void AppsClient::_performAssetInstall(const std::shared_ptr<ZTAsset>& asset) {
   } else {
     removePackage(_platform.fileSystem(), *asset);
   }
-}
-
-void AppsClient::_installPackage(const ZTAsset& asset) {
-  const platform::FileLocation package{asset.path().value_or("")};
-  const plist::Dictionary options{{platform::PackageTypeKey, platform::kPackageTypeCustomer},
-                                  {platform::BundleIdentifierKey, asset.identifier()}};
-  const Status installed = _platform.defaultRegistry().installApplication(package, options);
-  if (installed) {
-    assetInstallSucceeded(asset);
-  } else {
-    assetInstallFailed(asset, installed.error());
-  }
-  _numAppInstallsAttempted.fetch_add(1, std::memory_order_relaxed);
 }
 
 void AppsClient::_scheduleInstallRetry(const std::shared_ptr<ZTAsset>& asset) {
@@ -141,35 +169,10 @@ void AppsClient::assetInstallFailed(const ZTAsset& asset, const Error& error) {
     _log.message("%s|%{public}@ install failed unrecoverably: %{public}@", identifier, error);
     _accessQueue.sync([&] { changeAssetID(identifier, todo::kFailed); });
     // Asked again: the daemon may have made it a restore since.
-    if (asset.isRestore()) _cancelRestoreOfFailedInstall(identifier);
-    _removeFailedInstall(asset);
+    if (asset.isRestore()) cancelRestore(*_backupManager, identifier, _useInstallCoordinator, _log);
+    removeFailedInstall(*this, _platform, asset, _useInstallCoordinator, _log);
   }
   _accessQueue.sync([&] { cleanRestoreStateForIdentifier(identifier); });
-}
-
-void AppsClient::_cancelRestoreOfFailedInstall(const std::string& identifier) {
-  if (_useInstallCoordinator) {
-    _log.message("%s|not asking backup manager to cancel app restore for %{public}@ as install coordination is enabled",
-                 identifier);
-  } else {
-    _backupManager->cancelApplicationRestore(identifier, nullptr);
-  }
-}
-
-void AppsClient::_removeFailedInstall(const ZTAsset& asset) {
-  const std::string& identifier = asset.identifier();
-  if (_useInstallCoordinator && asset.isRestore()) {
-    _log.message("%s|not uninstalling restore asset %{public}@ as install coordination is enabled", identifier);
-    return;
-  }
-  if (_useInstallCoordinator) {
-    uninstallAppUsingCoordination(identifier);
-    return;
-  }
-  const Status removed = _platform.defaultRegistry().uninstallApplication(identifier);
-  if (!removed) _log.error("%s|Uninstall of %{public}@ failed.", identifier);
-  _platform.transactionLog().logScenario(kRestoreScenario, 0, removed.ok(), identifier,
-                                         removed ? "placeholder removed" : "failed to remove placeholder");
 }
 
 bool AppsClient::_isRecoverableError(const std::optional<Error>& error) {

@@ -22,9 +22,9 @@ WantedEntries entriesOfPlaceholders(AppsClient& client) {
   return entries;
 }
 
-/// Adds what the host asks for to `wanted`; returns the identifiers that it asked for.
-Identifiers addTodoEntries(const plist::Array& todoList, WantedEntries& wanted, const PlugInLog& log) {
-  Identifiers requested;
+/// Adds the host's install requests to `wanted`; returns their identifiers.
+IdentifierSet addTodoEntries(const plist::Array& todoList, WantedEntries& wanted, const PlugInLog& log) {
+  IdentifierSet requested;
   for (const plist::Value& entry : todoList) {
     if (!entryHas(entry, todo::kOperation, todo::kInstall)) continue;
     const plist::Value* value = entry.find(todo::kIdentifier);
@@ -54,7 +54,7 @@ void removeThoseInProgress(platform::Platform& platform, WantedEntries& wanted, 
   } else {
     log.error("%s|Failed to get list of assets already in progress!");
   }
-  // Those being restored stay: their packages may still have to come from the host.
+  // Apps being restored stay: the host may still have to send their packages.
   if (restoring) {
     log.message("%s|Assets currently restoring: %{public}@", *restoring);
   } else {
@@ -78,7 +78,7 @@ std::optional<std::string> inFolder(const std::optional<std::string>& folder, st
   return folder ? std::optional(*folder + "/" + std::string(name)) : std::nullopt;
 }
 
-/// The app's rendered icon; where none can be made, the artwork that came with it.
+/// Returns the app's rendered icon or, if it cannot be rendered, the artwork from its container.
 std::optional<FileLocation> iconFor(platform::Platform& platform, const WantedEntry& entry) {
   const std::string rendered = std::string(kIconScratchFolder) + "/" + entry.identifier() + ".png";
   if (AppsClient::_makeIconFromBundlePath(platform, entry.path(), rendered)) return FileLocation::file(rendered);
@@ -86,13 +86,10 @@ std::optional<FileLocation> iconFor(platform::Platform& platform, const WantedEn
   return artwork ? FileLocation::file(*artwork) : std::nullopt;
 }
 
-/// Whether the package of a restored app lies on the device already, and only its data is to come.
-bool packageIsOnDevice(platform::FileSystem& files, const WantedEntry& entry, const plist::Value* restoreState,
+/// Whether the package of a restored app is on the device already, so that the host sends only its data.
+bool packageIsOnDevice(platform::FileSystem& files, const WantedEntry& entry, const RestoreState& restoreState,
                        const PlugInLog& log) {
-  const plist::Value* property = restoreState == nullptr ? nullptr
-                                                         : restoreStateProperty(*restoreState, kRestoreStatePathKey,
-                                                                                entry.identifier(), entry.version());
-  const auto path = stringIn(property);
+  const auto path = stringIn(restoreState.property(kRestoreStatePathKey, entry.identifier(), entry.version()));
   if (!path) return false;
   const bool exists = files.fileExists(*path);
   if (exists) {
@@ -109,6 +106,42 @@ std::uint32_t partsToSend(bool isRestore, bool packageIsHere) {
   return packageIsHere ? platform::kZTAssetPartApplicationData : platform::kZTAssetPartsAll;
 }
 
+std::shared_ptr<ZTAsset> makeAsset(platform::Platform& platform, const WantedEntry& entry,
+                                   const std::optional<std::string>& displayName, const RestoreState& restoreState,
+                                   const PlugInLog& log) {
+  const std::string identifier = entry.identifier();
+  const std::string prettyName = displayName ? *displayName : entry.nameFromHost().value_or(identifier);
+  const auto icon = iconFor(platform, entry);
+  auto asset = platform.syncFramework().downloadAssetWithIdentifier(identifier, kApplicationDataclass, prettyName);
+  asset->setIcon(icon);
+  asset->setIsRestore(entry.isRestore());
+
+  const bool packageIsHere = packageIsOnDevice(platform.fileSystem(), entry, restoreState, log);
+  plist::Dictionary options{{platform::kAssetPartsKey, partsToSend(entry.isRestore(), packageIsHere)}};
+  const plist::Value* version = entry.version();
+  if (version != nullptr) options.set(platform::kAssetVersionKey, *version);
+  asset->setVariantOptions(std::move(options));
+
+  asset->setStorePlist(inFolder(entry.container(), kStoreMetadataName));
+  asset->setInfoPlist(inFolder(entry.container(), kInfoPlistName));
+  log.message(
+      "%s|Asset %{public}@ (pretty=%{public}@, version=%{public}@) prepped with icon %{public}@, at %{public}@, meta at %{public}@, info at %{public}@, storePid=%lld, isRestore=%c",
+      identifier, prettyName, version, icon, entry.path(), asset->storePlist(), asset->infoPlist(), asset->storePID(),
+      asset->isRestore());
+  return asset;
+}
+
+/// Returns whether the host must send the package.
+bool preparePlaceholder(AppsClient& client, const ZTAsset& asset, bool hasPlaceholder, const PlugInLog& log) {
+  if (hasPlaceholder) {
+    log.message("%s|Not creating a placeholder app for %{public}@ because we already have one", asset.identifier());
+    // Only a restore's placeholder waits for the host; another client provides the package of any other.
+    return asset.isRestore();
+  }
+  client._createPlaceHolderApplication(asset);
+  return true;
+}
+
 }  // namespace
 
 platform::Assets AppsClient::outstandingAssetTransfers() {
@@ -118,16 +151,16 @@ platform::Assets AppsClient::outstandingAssetTransfers() {
   const auto todoList = _loadPlist(_platform, kTodoListPath, nullptr);
   _log.summary("%s|outstandingAssetTransfers starting with todoList %{public}@", todoList);
 
-  const Identifiers systemAppPlaceholders = _getSystemAppPlaceholders();
+  const IdentifierSet systemAppPlaceholders = _getSystemAppPlaceholders();
   const WantedEntries preExisting = entriesOfPlaceholders(*this);
   WantedEntries wanted = preExisting;
   _log.summary("%s|outstandingAssetTransfers preExistingPlaceHolders %{public}@, idsWeWant %{public}@",
                DescribedEntries{preExisting}, DescribedEntries{wanted});
-  const Identifiers requested = todoList ? addTodoEntries(*todoList, wanted, _log) : Identifiers{};
+  const IdentifierSet requested = todoList ? addTodoEntries(*todoList, wanted, _log) : IdentifierSet{};
   removeThoseInProgress(_platform, wanted, _log);
   const auto ordered = _orderTheItems(_platform, wanted);
   emptyIconScratchFolder(_platform.fileSystem(), _log);
-  const auto restoreState = _accessQueue.sync([this] { return _loadRestoreState(); });
+  const RestoreState restoreState = _accessQueue.sync([this] { return RestoreState(_platform.fileSystem()); });
 
   for (const WantedEntry& entry : ordered) {
     const std::string identifier = entry.identifier();
@@ -145,22 +178,13 @@ platform::Assets AppsClient::outstandingAssetTransfers() {
         .isRequestedByHost = requested.contains(identifier),
     };
     if (isSkipped(candidate, _log)) continue;
-    auto asset = _makeAsset(entry, displayName, restoreState ? &*restoreState : nullptr);
-    const bool isPrepared = _useInstallCoordinator ? _prepareCoordinatedInstall(*asset)
-                                                   : _preparePlaceholder(*asset, preExisting.contains(identifier));
+    auto asset = makeAsset(_platform, entry, displayName, restoreState, _log);
+    const bool isPrepared = _useInstallCoordinator
+                                ? _prepareCoordinatedInstall(*asset)
+                                : preparePlaceholder(*this, *asset, preExisting.contains(identifier), _log);
     if (isPrepared) outstanding.push_back(std::move(asset));
   }
   return outstanding;
-}
-
-bool AppsClient::_preparePlaceholder(const ZTAsset& asset, bool hasPlaceholder) {
-  if (hasPlaceholder) {
-    _log.message("%s|Not creating a placeholder app for %{public}@ because we already have one", asset.identifier());
-    // Only a restore's placeholder waits for the host; any other's package is somebody else's to bring.
-    return asset.isRestore();
-  }
-  _createPlaceHolderApplication(asset);
-  return true;
 }
 
 bool AppsClient::_prepareCoordinatedInstall(const ZTAsset& asset) {
@@ -175,30 +199,6 @@ bool AppsClient::_prepareCoordinatedInstall(const ZTAsset& asset) {
   }
   if (isUpdate) _accessQueue.sync([&] { _updatingApps.insert(identifier); });
   return true;
-}
-
-std::shared_ptr<ZTAsset> AppsClient::_makeAsset(const WantedEntry& entry, const std::optional<std::string>& displayName,
-                                                const plist::Value* restoreState) {
-  const std::string identifier = entry.identifier();
-  const std::string prettyName = displayName ? *displayName : entry.nameFromHost().value_or(identifier);
-  const auto icon = iconFor(_platform, entry);
-  auto asset = _platform.syncFramework().downloadAssetWithIdentifier(identifier, kApplicationDataclass, prettyName);
-  asset->setIcon(icon);
-  asset->setIsRestore(entry.isRestore());
-
-  const bool packageIsHere = packageIsOnDevice(_platform.fileSystem(), entry, restoreState, _log);
-  plist::Dictionary options{{platform::kAssetPartsKey, partsToSend(entry.isRestore(), packageIsHere)}};
-  const plist::Value* version = entry.version();
-  if (version != nullptr) options.set(platform::kAssetVersionKey, *version);
-  asset->setVariantOptions(std::move(options));
-
-  asset->setStorePlist(inFolder(entry.container(), kStoreMetadataName));
-  asset->setInfoPlist(inFolder(entry.container(), kInfoPlistName));
-  _log.message(
-      "%s|Asset %{public}@ (pretty=%{public}@, version=%{public}@) prepped with icon %{public}@, at %{public}@, meta at %{public}@, info at %{public}@, storePid=%lld, isRestore=%c",
-      identifier, prettyName, version, icon, entry.path(), asset->storePlist(), asset->infoPlist(), asset->storePID(),
-      asset->isRestore());
-  return asset;
 }
 
 }  // namespace appsync

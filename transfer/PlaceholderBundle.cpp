@@ -3,19 +3,14 @@
 
 #include <cerrno>
 
-#include "common/PlaceholderIcon.h"
 #include "common/PropertyListFile.h"
 #include "core/AppsClient.h"
-#include "platform/SyncFiles.h"
 #include "plist/Access.h"
 #include "transfer/ScratchPath.h"
 
 namespace appsync {
 
 namespace {
-
-using platform::FileLocation;
-using platform::TSInstallType;
 
 PlaceholderInfo describePlaceholder(const platform::ZTAsset& asset, const plist::Value& hostInfo) {
   const plist::Value* isPeriodical = hostInfo.find(kPeriodicalKey);
@@ -39,7 +34,7 @@ bool AppsClient::createPlaceHolderPath(std::string_view path, std::string_view b
                                                : _platform.fileSystem().createDirectory(
                                                      path, platform::IntermediateDirectories::create, attributes);
   if (!created) {
-    // The scenario names a restore whoever asks: readers of the log look for it there.
+    // The scenario names a restore also for an install: readers of the log search for it.
     _platform.transactionLog().logScenario("Harvo App Restore", 0, false, bundleIdentifier,
                                            "Failed to create app directory");
   }
@@ -86,27 +81,10 @@ void AppsClient::_createPlaceHolderApplication(const platform::ZTAsset& asset) {
     }
   }
   const plist::Value info = placeholder.dictionary();
-  if (!writePropertyList(files, folder + "/" + std::string(kInfoPlistName), info)) return;
+  if (!writePropertyList(files, placeholderInfoPath(folder), info)) return;
   _log.message(kCreatingPlaceholder, identifier, info);
-  _installPlaceholder(folder, placeholder, "Install placeholder", placeholder.installOptions(TSInstallType::Sync));
-}
-
-bool AppsClient::_installPlaceholder(const std::string& folder, const PlaceholderInfo& placeholder,
-                                     std::string_view scenario, const plist::Dictionary& options) {
-  const std::string& identifier = placeholder.bundleIdentifier;
-  const Status installed = _platform.defaultRegistry().installApplication(FileLocation{folder, true}, options);
-  if (installed) {
-    _log.message(
-        "%s|Installed Placeholder app from path %{public}@: %{public}@ [%{public}@ %{public}@] [isPeriodix: %{public}@]",
-        folder, placeholder.displayName, identifier, placeholder.version, placeholder.isPeriodical);
-  } else {
-    _log.error(
-        "%s|Placeholder app install failed from path %{public}@: %{public}@ [%{public}@ %{public}@] [isPeriodix: %{public}@]",
-        folder, placeholder.displayName, identifier, placeholder.version, placeholder.isPeriodical);
-  }
-  _platform.transactionLog().logScenario(scenario, 0, installed.ok(), identifier,
-                                         installed ? "Installed placeholder" : "Failed to install placeholder");
-  return installed.ok();
+  installPlaceholder(_platform, folder, placeholder, "Install placeholder",
+                     placeholder.installOptions(platform::TSInstallType::Sync), _log);
 }
 
 }  // namespace appsync

@@ -1,4 +1,4 @@
-// What becomes of a package while the host sends it and once it has come, or failed to.
+// The progress and the end of a package's transfer from the host.
 #include <algorithm>
 #include <cmath>
 #include <filesystem>
@@ -13,6 +13,15 @@
 
 namespace appsync {
 
+/// A transfer that has ended, and the state of its app.
+struct EndedTransfer {
+  const std::shared_ptr<platform::ZTAsset>& asset;
+  const std::optional<Error>& error;
+  bool isExistingApp = false;
+  bool isUserCancelled = false;
+  std::shared_ptr<platform::InstallProgress> progress = nullptr;
+};
+
 namespace {
 
 using platform::InstallProgress;
@@ -23,14 +32,14 @@ using platform::ZTAsset;
 /// A transfer's progress is always shown out of this many units.
 constexpr std::int64_t kTransferUnits = 1000;
 
-/// Whatever a daemon calls a fraction: a number that no integer holds must not reach the cast.
+/// Clamps: a fraction from the daemon may be NaN or out of the range of integers.
 std::int64_t completedUnits(double fraction) {
   const double units = fraction * static_cast<double>(kTransferUnits);
   const auto largest = static_cast<double>(std::numeric_limits<std::int32_t>::max());
   return std::isnan(units) ? 0 : static_cast<std::int64_t>(std::clamp(units, -largest, largest));
 }
 
-/// The staging folder is no package: the end of an install would remove it with all packages in it.
+/// Whether `path` is the staging folder itself: as a package, it would be removed with all packages in it.
 bool isStagingFolder(std::string_view path) {
   using Path = std::filesystem::path;
   return (Path(path) / "").lexically_normal() == Path(kPublicStaging) / "";
@@ -40,6 +49,24 @@ void showTransfer(InstallProgress& progress, double fraction) {
   progress.setInstallState(TSInstallState::Active);
   if (progress.totalUnitCount() != kTransferUnits) progress.setTotalUnitCount(kTransferUnits);
   progress.setCompletedUnitCount(completedUnits(fraction));
+}
+
+/// Returns the absolute path of the asset's package, or nullopt if the asset has no path.
+std::optional<plist::Value> absolutePath(const ZTAsset& asset) {
+  const std::string path = asset.path().value_or("");
+  if (path.empty()) return std::nullopt;
+  return path.starts_with('/') ? path : std::string(kPublicStaging) + "/" + path;
+}
+
+/// Does nothing but log if installs are coordinated.
+void cancelRestore(platform::BackupManager& backups, const std::string& identifier, bool useInstallCoordinator,
+                   const PlugInLog& log) {
+  if (useInstallCoordinator) {
+    log.message("%s|Install coordination is enabled - not calling cancelApplicationRestoreWithBundleID for %{public}@",
+                identifier);
+  } else {
+    backups.cancelApplicationRestore(identifier, nullptr);
+  }
 }
 
 }  // namespace
@@ -66,38 +93,44 @@ void AppsClient::assetTransferUpdatedProgress(const std::shared_ptr<ZTAsset>& as
   } else if (const auto progress = _progressForAssetIdentifier(identifier)) {
     showTransfer(*progress, fraction);
   }
+  const std::lock_guard lock(_outstandingMutex);
   _outstandingDCXTransfers.insert(identifier);
 }
 
 void AppsClient::assetTransferSucceeded(const std::shared_ptr<ZTAsset>& asset, bool succeeded,
                                         const std::optional<Error>& error) {
   const std::string& identifier = asset->identifier();
-  const TransferMarks marks = _accessQueue.sync([&] {
-    return TransferMarks{.isExistingApp = _updatingApps.erase(identifier) > 0,
-                         .isUserCancelled = _userCancelledApps.erase(identifier) > 0};
+  EndedTransfer transfer{asset, error};
+  _accessQueue.sync([&] {
+    transfer.isExistingApp = _updatingApps.erase(identifier) > 0;
+    transfer.isUserCancelled = _userCancelledApps.erase(identifier) > 0;
   });
-  _outstandingDCXTransfers.erase(identifier);
+  if (const std::lock_guard lock(_outstandingMutex); true) _outstandingDCXTransfers.erase(identifier);
   _log.message("%s|transfer for asset %{public}@ ended with success %c error %{public}@ existingApp:%d", identifier,
-               succeeded, error, marks.isExistingApp);
-  const auto progress = _progressForAssetIdentifier(identifier);
+               succeeded, error, transfer.isExistingApp);
+  transfer.progress = _progressForAssetIdentifier(identifier);
   if (succeeded) {
-    _handleReceivedAsset(asset, marks, progress.get());
+    _handleReceivedAsset(transfer);
   } else {
-    _handleFailedTransfer(*asset, error, marks, progress.get());
+    _handleFailedTransfer(transfer);
   }
 }
 
-void AppsClient::_handleReceivedAsset(const std::shared_ptr<ZTAsset>& asset, TransferMarks marks,
-                                      InstallProgress* progress) {
+void AppsClient::_handleReceivedAsset(const EndedTransfer& transfer) {
+  const auto& asset = transfer.asset;
   const std::string& identifier = asset->identifier();
   _log.message("%s|asset transfer succeeded for %{public}@", asset->shortDescription());
-  if (progress != nullptr && _useInstallCoordinator) {
+  if (transfer.progress && _useInstallCoordinator) {
     _log.message("%s|not setting install phase finished for %{public}@ as coordination is enabled", identifier);
-  } else if (progress != nullptr) {
-    _platform.defaultRegistry().installPhaseFinishedForProgress(*progress);
+  } else if (transfer.progress) {
+    _platform.defaultRegistry().installPhaseFinishedForProgress(*transfer.progress);
   }
 
-  const auto received = _receivedPath(*asset);
+  auto received = absolutePath(*asset);
+  if (!received) {  // The package may be on the device since an earlier transfer.
+    received = _accessQueue.sync(
+        [&] { return _restoreStatePropertyForKey(kRestoreStatePathKey, identifier, asset->version()); });
+  }
   const plist::Value* path = received ? &*received : nullptr;
   if (auto text = ownedStringIn(path)) asset->setPath(std::move(text));
   if (!isValidBundleIdentifier(path) || isStagingFolder(*path->string())) {
@@ -111,32 +144,23 @@ void AppsClient::_handleReceivedAsset(const std::shared_ptr<ZTAsset>& asset, Tra
   _log.message("%s|Received file at %{public}@", asset->path());
   _accessQueue.sync([&] { changeAssetID(identifier, todo::kDownloaded); });
   if (asset->isRestore()) {
-    _handleReceivedRestoreAsset(asset, progress);
+    _handleReceivedRestoreAsset(transfer);
   } else {
     _log.message("%s|Installing synced asset %{public}@", identifier);
     if (_useInstallCoordinator) {
-      transferCompleteForApp(*asset, std::nullopt, marks.isExistingApp);
+      transferCompleteForApp(*asset, std::nullopt, transfer.isExistingApp);
     } else {
       _enqueueAssetInstall(asset);
     }
   }
 }
 
-/// Where the package lies: the asset's own path made absolute, or the one that an earlier transfer of it left.
-std::optional<plist::Value> AppsClient::_receivedPath(const ZTAsset& asset) {
-  if (asset.path().value_or("").empty()) {
-    return _accessQueue.sync(
-        [&] { return _restoreStatePropertyForKey(kRestoreStatePathKey, asset.identifier(), asset.version()); });
-  }
-  if (asset.path()->starts_with('/')) return *asset.path();
-  return std::string(kPublicStaging) + "/" + *asset.path();
-}
-
-void AppsClient::_handleReceivedRestoreAsset(const std::shared_ptr<ZTAsset>& asset, InstallProgress* progress) {
+void AppsClient::_handleReceivedRestoreAsset(const EndedTransfer& transfer) {
+  const auto& asset = transfer.asset;
   const std::string& identifier = asset->identifier();
-  const bool hasOnlyItsData = asset->completedAssetParts() == platform::kZTAssetPartApplicationData;
+  const bool hasDataOnly = asset->completedAssetParts() == platform::kZTAssetPartApplicationData;
   if (_useInstallCoordinator) {
-    if (hasOnlyItsData) {
+    if (hasDataOnly) {
       _log.message(
           "%s|Not processing kZTAssetPartApplicationData for restore asset %{public}@ as coordination is enabled",
           identifier);
@@ -145,7 +169,7 @@ void AppsClient::_handleReceivedRestoreAsset(const std::shared_ptr<ZTAsset>& ass
     }
     return;
   }
-  if (hasOnlyItsData) {
+  if (hasDataOnly) {
     _enqueueAssetInstall(asset);  // The package has waited for its data; it lies where the restore state says.
     return;
   }
@@ -155,45 +179,38 @@ void AppsClient::_handleReceivedRestoreAsset(const std::shared_ptr<ZTAsset>& ass
     return;
   }
   _log.message("%s|Restore data exists for %{public}@", identifier);
-  if (progress != nullptr) progress->setInstallPhase(TSInstallPhase::RestoringData);
+  if (transfer.progress) transfer.progress->setInstallPhase(TSInstallPhase::RestoringData);
   _accessQueue.sync(
       [&] { _setRestoreStatePropertyValue(*asset->path(), kRestoreStatePathKey, identifier, asset->version()); });
 }
 
-void AppsClient::_handleFailedTransfer(const ZTAsset& asset, const std::optional<Error>& error, TransferMarks marks,
-                                       InstallProgress* progress) {
+void AppsClient::_handleFailedTransfer(const EndedTransfer& transfer) {
+  const ZTAsset& asset = *transfer.asset;
+  const auto& error = transfer.error;
+  const auto& progress = transfer.progress;
   const std::string& identifier = asset.identifier();
   const bool isRecoverable = _isRecoverableError(error);
   _log.message("%s|failed to transfer asset %{public}@. err=%{public}@, recoverable=%d", asset.shortDescription(),
                error, isRecoverable);
   if (isRecoverable) {
-    if (progress != nullptr) progress->setInstallState(TSInstallState::Failed);
+    if (progress) progress->setInstallState(TSInstallState::Failed);
     return;
   }
   platform::AppRegistry& registry = _platform.defaultRegistry();
   if (!registry.applicationIsInstalled(identifier) || asset.isRestore()) return;
 
-  if (progress != nullptr && progress->installState() < TSInstallState::Canceled) progress->cancel();
+  if (progress && progress->installState() < TSInstallState::Canceled) progress->cancel();
   _log.message("%s|Uninstalling placeholder %{public}@", identifier);
   // Asked again: the daemon may have made it a restore since.
-  if (asset.isRestore()) _cancelRestoreOfFailedTransfer(identifier);
+  if (asset.isRestore()) cancelRestore(*_backupManager, identifier, _useInstallCoordinator, _log);
   if (_useInstallCoordinator) {
     // A coordinator that the user has cancelled is gone.
-    if (!marks.isUserCancelled) transferCompleteForApp(asset, error, marks.isExistingApp);
+    if (!transfer.isUserCancelled) transferCompleteForApp(asset, error, transfer.isExistingApp);
     return;
   }
   const Status uninstalled =
       registry.uninstallApplication(identifier, {{platform::kUninstallPlaceholdersOnlyKey, true}});
   _log.message("%s|Uninstalling app using TS %{public}@ %s", identifier, uninstalled ? "secceeded" : "failed");
-}
-
-void AppsClient::_cancelRestoreOfFailedTransfer(const std::string& identifier) {
-  if (_useInstallCoordinator) {
-    _log.message("%s|Install coordination is enabled - not calling cancelApplicationRestoreWithBundleID for %{public}@",
-                 identifier);
-  } else {
-    _backupManager->cancelApplicationRestore(identifier, nullptr);
-  }
 }
 
 }  // namespace appsync

@@ -1,52 +1,54 @@
-// A set of bundle identifiers that several threads share.
+// Sets of bundle identifiers, and the check of those from a host.
+#include <map>
 #include <string>
 
 #include <gtest/gtest.h>
 
 #include "common/Identifiers.h"
-#include "kit/fakes/Threads.h"
+#include "kit/fakes/SyncFileBuilder.h"
 
 namespace appsync::test {
 
-TEST(SharedIdentifierSet, HoldsEachIdentifierOnce) {
-  SharedIdentifierSet set;
-  set.insert("com.b");
-  set.insert("com.a");
-  set.insert("com.b");
-  EXPECT_EQ(set.size(), 2U);
-  EXPECT_EQ(set.identifiers(), (Identifiers{"com.a", "com.b"}));
+namespace {
+
+bool isValid(const plist::Value& value) {
+  return isValidBundleIdentifier(&value);
 }
 
-TEST(SharedIdentifierSet, ForgetsWhatIsErased) {
-  SharedIdentifierSet set;
-  set.insert("com.a");
-  set.insert("com.b");
-  set.erase("com.a");
-  set.erase("com.unknown");
-  EXPECT_EQ(set.identifiers(), Identifiers{"com.b"});
-  set.clear();
-  EXPECT_EQ(set.size(), 0U);
+}  // namespace
+
+TEST(IdentifiersOf, ReturnsTheKeysOfAMap) {
+  const std::map<std::string, int, std::less<>> map{{"com.b", 1}, {"com.a", 2}};
+  EXPECT_EQ(identifiersOf(map), (IdentifierSet{"com.a", "com.b"}));
+  EXPECT_EQ(identifiersOf(std::map<std::string, int>{}), IdentifierSet{});
 }
 
-TEST(SharedIdentifierSet, ACopyOfItsIdentifiersStaysAsItWas) {
-  SharedIdentifierSet set;
-  set.insert("com.a");
-  const Identifiers before = set.identifiers();
-  set.clear();
-  EXPECT_EQ(before, Identifiers{"com.a"});
+TEST(IsValidBundleIdentifier, RefusesNull) {
+  EXPECT_FALSE(isValidBundleIdentifier(nullptr));
 }
 
-TEST(SharedIdentifierSet, ThreadsLoseNothing) {
-  SharedIdentifierSet set;
-  runOnThreads(8, [&](std::size_t thread) {
-    for (int number = 0; number < 100; ++number) {
-      const std::string identifier = std::to_string(thread) + "." + std::to_string(number);
-      set.insert(identifier);
-      if (number % 2 == 0) set.erase(identifier);
-      EXPECT_GE(set.identifiers().size(), static_cast<std::size_t>(number / 2));
-    }
-  });
-  EXPECT_EQ(set.size(), 400U);
+TEST(IsValidBundleIdentifier, RefusesNonStrings) {
+  EXPECT_FALSE(isValid(plist::Value()));
+  EXPECT_FALSE(isValid(7));
+  EXPECT_FALSE(isValid(true));
+  EXPECT_FALSE(isValid(plist::Value::data(bytesOf("com.a"))));
+  EXPECT_FALSE(isValid(plist::Array{"com.a"}));
+  EXPECT_FALSE(isValid(plist::Dictionary{{"com.a", "com.a"}}));
+}
+
+TEST(IsValidBundleIdentifier, RefusesSlashFollowedByTwoDots) {
+  for (const char* text : {"/..", "/../etc", "com.a/..", "com.a/../com.b", "com.a/..b", "//..", "/..."})
+    EXPECT_FALSE(isValid(text)) << text;
+}
+
+TEST(IsValidBundleIdentifier, AcceptsDotDotWithoutLeadingSlash) {
+  for (const char* text : {"..", "com..a", "../com.a", "com.a..", ".. /"})
+    EXPECT_TRUE(isValid(text)) << text;
+}
+
+TEST(IsValidBundleIdentifier, AcceptsSlashesDotsAndEmptyText) {
+  for (const char* text : {"", "/", "/com.a", "com/a", "/.", "/./.", "com.a"})
+    EXPECT_TRUE(isValid(text)) << text;
 }
 
 }  // namespace appsync::test

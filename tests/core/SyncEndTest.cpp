@@ -15,6 +15,7 @@
 
 #include "kit/fakes/SyncFileBuilder.h"
 #include "kit/fakes/TextDiff.h"
+#include "kit/fakes/Threads.h"
 #include "tests/core/SyncEndFixture.h"
 
 namespace appsync::test {
@@ -225,6 +226,21 @@ TEST_F(TransferEnd, ATransferThatEndedIsNotOutstanding) {
   platform.log.clear();
   client.assetTransferEndedWithSuccess(true);
   EXPECT_FALSE(platform.log.contains(loggedError("Called with success == YES but with 1 outstanding DCX transfers!")));
+}
+
+TEST_F(TransferEnd, ParallelReportsLoseNoTransfer) {
+  constexpr std::size_t kThreads = 8;
+  constexpr int kReports = 100;
+  runOnThreads(kThreads, [&](std::size_t thread) {
+    for (int number = 0; number < kReports; ++number) {
+      const std::string identifier = "com." + std::to_string(thread) + "." + std::to_string(number);
+      const auto asset = std::make_shared<ZTAsset>(identifier, "Application", std::nullopt);
+      client.assetTransferUpdatedProgress(asset, 0.25);
+      if (number % 2 == 0) client.assetTransferSucceeded(asset, true, std::nullopt);
+    }
+  });
+  client.assetTransferEndedWithSuccess(true);
+  EXPECT_TRUE(platform.log.contains(loggedError("Called with success == YES but with 400 outstanding DCX transfers!")));
 }
 
 TEST_F(TransferEnd, AFailedNotificationDoesNotKeepTransfersOpen) {

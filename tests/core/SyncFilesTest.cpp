@@ -24,10 +24,6 @@ class LoadPlist : public ClientFixture {
   std::optional<Error> error;
 };
 
-bool isValid(const plist::Value& value) {
-  return isValidBundleIdentifier(&value);
-}
-
 const plist::Array& twoEntries() {
   static const plist::Array kEntries{installEntry("com.a"), removeEntry("com.b")};
   return kEntries;
@@ -152,34 +148,6 @@ TEST_F(LoadPlist, TheFileIsReadOnceAndNothingElseIsAsked) {
   platform.files.put(kPath, binaryForm(twoEntries()));
   EXPECT_TRUE(load());
   EXPECT_TRUE(sameLines({"fileSystem.readFile " + std::string(kPath)}, platform.journal.lines()));
-}
-
-TEST(IsValidBundleIdentifier, AnAbsentValueIsNot) {
-  EXPECT_FALSE(isValidBundleIdentifier(nullptr));
-}
-
-TEST(IsValidBundleIdentifier, AnythingButAStringIsNot) {
-  EXPECT_FALSE(isValid(plist::Value()));
-  EXPECT_FALSE(isValid(7));
-  EXPECT_FALSE(isValid(true));
-  EXPECT_FALSE(isValid(plist::Value::data(bytesOf("com.a"))));
-  EXPECT_FALSE(isValid(plist::Array{"com.a"}));
-  EXPECT_FALSE(isValid(plist::Dictionary{{"com.a", "com.a"}}));
-}
-
-TEST(IsValidBundleIdentifier, ASlashFollowedByTwoDotsAnywhereIsNot) {
-  for (const char* text : {"/..", "/../etc", "com.a/..", "com.a/../com.b", "com.a/..b", "//..", "/..."})
-    EXPECT_FALSE(isValid(text)) << text;
-}
-
-TEST(IsValidBundleIdentifier, TwoDotsWithoutASlashBeforeThemAre) {
-  for (const char* text : {"..", "com..a", "../com.a", "com.a..", ".. /"})
-    EXPECT_TRUE(isValid(text)) << text;
-}
-
-TEST(IsValidBundleIdentifier, SlashesDotsAndNothingAtAllAre) {
-  for (const char* text : {"", "/", "/com.a", "com/a", "/.", "/./.", "com.a"})
-    EXPECT_TRUE(isValid(text)) << text;
 }
 
 }  // namespace appsync::test

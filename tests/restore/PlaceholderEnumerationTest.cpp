@@ -155,7 +155,7 @@ TEST_F(SystemAppPlaceholders, OnlyPlaceholdersOfSystemAppsAreCollected) {
   platform.registry.add(FakeApp::placeholder("com.user"));
   platform.registry.addBundle("com.bundle", BundleKind::system);
   logCalls(platform);
-  EXPECT_EQ(client._getSystemAppPlaceholders(), (Identifiers{"com.s1", "com.s2"}));
+  EXPECT_EQ(client._getSystemAppPlaceholders(), (IdentifierSet{"com.s1", "com.s2"}));
   EXPECT_TRUE(
       sameLines(LogLines{called("registry.enumerateBundlesOfType 7"), logged("SystemAppPlaceholders (com.s1, com.s2)")},
                 platform.log.lines()));

@@ -308,17 +308,24 @@ TEST_F(RestoreStateStore, TransfersThatEndOnManyThreadsLoseNoPath) {
   }
 }
 
-TEST(RestoreStateProperty, IsFoundAtItsThreeLevels) {
-  const plist::Value root(plist::Dictionary{{"com.a", plist::Dictionary{{"1.0", pathOf("/p")}}}});
+TEST_F(RestoreStateStore, FindsPropertyAtItsThreeLevels) {
+  platform.files.put(kStore, binaryForm(plist::Dictionary{{"com.a", plist::Dictionary{{"1.0", pathOf("/p")}}}}));
+  const RestoreState state(platform.files);
   const plist::Value version("1.0");
   const plist::Value number(1);
-  ASSERT_NE(restoreStateProperty(root, "path", "com.a", &version), nullptr);
-  EXPECT_EQ(*restoreStateProperty(root, "path", "com.a", &version), plist::Value("/p"));
-  EXPECT_EQ(restoreStateProperty(root, "path", "com.a", nullptr), nullptr);
-  EXPECT_EQ(restoreStateProperty(root, "path", "com.a", &number), nullptr);
-  EXPECT_EQ(restoreStateProperty(root, "path", "com.b", &version), nullptr);
-  EXPECT_EQ(restoreStateProperty(root, "size", "com.a", &version), nullptr);
-  EXPECT_EQ(restoreStateProperty(plist::Value(), "path", "com.a", &version), nullptr);
+  ASSERT_NE(state.property("path", "com.a", &version), nullptr);
+  EXPECT_EQ(*state.property("path", "com.a", &version), plist::Value("/p"));
+  EXPECT_EQ(state.property("path", "com.a", nullptr), nullptr);
+  EXPECT_EQ(state.property("path", "com.a", &number), nullptr);
+  EXPECT_EQ(state.property("path", "com.b", &version), nullptr);
+  EXPECT_EQ(state.property("size", "com.a", &version), nullptr);
+}
+
+TEST_F(RestoreStateStore, FindsNothingInMissingOrCorruptFile) {
+  const plist::Value version("1.0");
+  EXPECT_EQ(RestoreState(platform.files).property("path", "com.a", &version), nullptr);
+  platform.files.put(kStore, "corrupt <");
+  EXPECT_EQ(RestoreState(platform.files).property("path", "com.a", &version), nullptr);
 }
 
 }  // namespace appsync::test

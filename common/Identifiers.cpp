@@ -1,0 +1,16 @@
+#include "common/Identifiers.h"
+
+#include "plist/PropertyList.h"
+
+namespace appsync {
+
+bool isValidBundleIdentifier(const plist::Value* value) {
+  const auto text = stringIn(value);
+  return text && isValidBundleIdentifier(*text);
+}
+
+bool isValidBundleIdentifier(std::string_view text) {
+  return text.find("/..") == std::string_view::npos;
+}
+
+}  // namespace appsync
