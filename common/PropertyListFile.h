@@ -1,4 +1,4 @@
-// Property lists of which the plug-in knows the form.
+// Property-list files of the plug-in.
 #pragma once
 
 #include <optional>
@@ -10,13 +10,13 @@
 
 namespace appsync {
 
-/// The dictionary that was read; an error, too, when it is something else.
+/// Returns the dictionary that was read, or an error, also if the root is not a dictionary.
 [[nodiscard]] Result<plist::Dictionary> dictionaryOf(Result<plist::Value> read);
 
-/// The dictionary in that file, in whichever form; null when there is no path, no file or no dictionary in it.
+/// Returns the dictionary in that file, in any format, or null if there is no path, no file or no dictionary.
 [[nodiscard]] plist::Value readDictionary(platform::FileSystem& files, const std::optional<std::string>& path);
 
-/// Replaces that file, atomically, by the XML form.
+/// Replaces that file, atomically, by `root` in the XML format.
 [[nodiscard]] Status writePropertyList(platform::FileSystem& files, std::string_view path, const plist::Value& root);
 
 }  // namespace appsync

@@ -1,4 +1,4 @@
-// Which installs are running on the device at this moment.
+// The installs that are running on the device.
 #pragma once
 
 #include <memory>
@@ -34,24 +34,24 @@ enum class InstallActivity { inProgress, restoring, neither };
   return InstallActivity::neither;
 }
 
-/// Asks the registry, not the plug-in's own files, so that the answer covers installs that other clients started.
-/// One query lives for one question.
+/// Queries the registry, not the plug-in's files, so that the result includes installs started by other clients. One
+/// object serves one query.
 class InProgressAssetQuery final : public platform::AppRegistryObserver {
  public:
   using IdentifierList = std::vector<std::string>;
 
-  /// currentInProgressAssetIDs:restoringAssetIDs: (class operation) blocks until the registry has reported. Both lists
-  /// stay absent when it did not.
+  /// currentInProgressAssetIDs:restoringAssetIDs: (class operation) blocks until the registry has reported. Resets
+  /// both lists to nullopt if it did not.
   static void currentInProgressAssetIDs(platform::Platform& platform, std::optional<IdentifierList>& inProgressAssetIDs,
                                         std::optional<IdentifierList>& restoringAssetIDs);
 
   explicit InProgressAssetQuery(platform::Platform& platform);
 
-  /// Waits for the first observation; false if the wait ended without one.
+  /// Waits for the first observation. Returns false if the wait ended without one.
   [[nodiscard]] bool _fetchResults();
 
-  /// _inProgressAssetIDs, _restoringAssetIDs: null until the first observation; then they never change, and stay valid
-  /// without the query.
+  /// _inProgressAssetIDs, _restoringAssetIDs: null until the first observation; then constant, and valid longer than
+  /// the query.
   [[nodiscard]] std::shared_ptr<const IdentifierList> inProgressAssetIDs() const { return _inProgressAssetIDs; }
   [[nodiscard]] std::shared_ptr<const IdentifierList> restoringAssetIDs() const { return _restoringAssetIDs; }
 

@@ -1,4 +1,4 @@
-// What a restored app's store metadata says of its placeholder.
+// The store metadata of a restored app, as far as its placeholder needs it.
 #pragma once
 
 #include <optional>
@@ -9,19 +9,19 @@
 
 namespace appsync {
 
-/// Said, at the level that suits, of store metadata that holds no dictionary.
+/// Logged, as a message or an error, if the store metadata is not a dictionary.
 inline constexpr PlugInLog::Format<std::string_view, Error> kRestoreMetadataUnreadable =
     "%s|failed to parse harvo metadata for '%{public}@'. err=%{public}@";
 
-/// Typed questions to a dictionary that may hold anything: a text of another type reads as absent, a flag that gives no
-/// boolean as false. Refers to the dictionary, which must stay as it is.
+/// Typed accessors of an untrusted dictionary: a text of another type reads as absent, a flag that is not a boolean as
+/// false. Refers to the dictionary, which must not change.
 class RestoreMetadata {
  public:
   explicit RestoreMetadata(const plist::Dictionary& metadata) : metadata_(metadata) {}
   explicit RestoreMetadata(plist::Dictionary&&) = delete;
 
   [[nodiscard]] std::optional<std::string> displayName() const;
-  /// A string, or null.
+  /// Returns a string, or null.
   [[nodiscard]] const plist::Value* bundleVersion() const;
   [[nodiscard]] bool isPeriodical() const;
   [[nodiscard]] bool isLaunchProhibited() const;

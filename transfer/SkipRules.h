@@ -1,4 +1,4 @@
-// Which wanted apps the host need not send after all, and why.
+// The rules by which the host need not send a wanted app.
 #pragma once
 
 #include <string>
@@ -8,7 +8,7 @@
 
 namespace appsync {
 
-/// Everything that the decision on one app rests on.
+/// The input of the rules for one app.
 struct TransferCandidate {
   std::string identifier;
   bool isRestore = false;
@@ -26,7 +26,7 @@ struct TransferCandidate {
   }
 };
 
-/// Whether a rule says that the host need not send the app; the log says which. The first rule that applies decides.
+/// Whether a rule applies to the app, so that the host need not send it. Logs the first rule that applies.
 [[nodiscard]] bool isSkipped(const TransferCandidate& candidate, const PlugInLog& log);
 
 }  // namespace appsync

@@ -105,7 +105,10 @@ void AppsClient::assetTransferSucceeded(const std::shared_ptr<ZTAsset>& asset, b
     transfer.isExistingApp = _updatingApps.erase(identifier) > 0;
     transfer.isUserCancelled = _userCancelledApps.erase(identifier) > 0;
   });
-  if (const std::lock_guard lock(_outstandingMutex); true) _outstandingDCXTransfers.erase(identifier);
+  {
+    const std::lock_guard lock(_outstandingMutex);
+    _outstandingDCXTransfers.erase(identifier);
+  }
   _log.message("%s|transfer for asset %{public}@ ended with success %c error %{public}@ existingApp:%d", identifier,
                succeeded, error, transfer.isExistingApp);
   transfer.progress = _progressForAssetIdentifier(identifier);

@@ -1,4 +1,4 @@
-// One app that the device is to get, as the host or an existing placeholder asks for it.
+// One app that the device is to receive, as requested by the host or by an existing placeholder.
 #pragma once
 
 #include <functional>
@@ -13,22 +13,22 @@
 
 namespace appsync {
 
-/// A dictionary with typed questions. What it was made from may hold anything: a value of the wrong type reads as
-/// absent, a flag that gives no boolean as false.
+/// A dictionary with typed accessors. Its values are untrusted: one of the wrong type reads as absent, a flag that is
+/// not a boolean as false.
 class WantedEntry {
  public:
-  /// For a placeholder that is on the device already.
+  /// Makes the entry of a placeholder on the device.
   [[nodiscard]] static WantedEntry fromPlaceholder(const platform::AppRecord& record);
-  /// For an entry of the host's todo list whose identifier is `identifier`.
+  /// Makes the entry of a todo-list entry whose identifier is `identifier`.
   [[nodiscard]] static WantedEntry fromTodoEntry(const plist::Value& entry, std::string_view identifier);
 
-  /// Empty when a placeholder's record has none.
+  /// Returns empty text if a placeholder's record has no identifier.
   [[nodiscard]] std::string identifier() const;
-  /// As the host or the registry gave it; null when there is none.
+  /// Returns the value from the host or the registry, or null.
   [[nodiscard]] const plist::Value* version() const;
-  /// The app's bundle, or the folder that the host staged for it.
+  /// Returns the app's bundle, or the folder that the host staged for it.
   [[nodiscard]] std::optional<std::string> path() const;
-  /// The folder in which artwork, info and store metadata lie.
+  /// Returns the folder that contains artwork, info and store metadata.
   [[nodiscard]] std::optional<std::string> container() const;
   [[nodiscard]] std::optional<std::string> nameFromHost() const;
   [[nodiscard]] bool isRestore() const;
@@ -36,7 +36,7 @@ class WantedEntry {
   [[nodiscard]] bool isAutomaticallyDemoted() const;
   [[nodiscard]] bool isSystemApp() const;
 
-  /// The dictionary itself, for logs.
+  /// Returns the dictionary, for logs.
   [[nodiscard]] const plist::Value& values() const { return values_; }
 
  private:
