@@ -11,12 +11,7 @@ namespace appsync::todo {
 namespace {
 
 auto hasIdentifier(std::string_view identifier) {
-  return [identifier](const plist::Value& entry) { return entryHas(entry, kIdentifier, identifier); };
-}
-
-/// The ASCII format is not accepted: almost any text would parse.
-Result<plist::Value> readBinaryOrXML(ByteView document) {
-  return textOf(document).starts_with("bplist") ? plist::readBinary(document) : plist::readXML(document);
+  return [identifier](const plist::Value& entry) { return plist::entryHas(entry, kIdentifier, identifier); };
 }
 
 }  // namespace
@@ -30,7 +25,7 @@ std::optional<plist::Array> load(platform::FileSystem& files, std::string_view p
   }
   if (bytes->empty()) return std::nullopt;
 
-  auto list = readBinaryOrXML(*bytes);
+  auto list = plist::readBinaryOrXML(*bytes);
   if (!list) {
     setError(error, list.error());
     log.error("%s|couldn't parse todo list");
