@@ -22,7 +22,7 @@ namespace {
 
 /// Marks the database file as a device's: "ASDV".
 constexpr std::int64_t kApplicationId = 0x41534456;
-/// Of the tables and of what lies in the root. Grows with each change that an older program could not cope with.
+/// The version of the tables and of the files in the root. Incremented with each incompatible change.
 constexpr std::int64_t kLayoutVersion = 1;
 
 Result<std::int64_t> readNumber(Database& database, std::string_view question) {
@@ -32,7 +32,7 @@ Result<std::int64_t> readNumber(Database& database, std::string_view question) {
   return query.status() ? std::int64_t{0} : Result<std::int64_t>(query.status().error());
 }
 
-/// Makes what is missing: devices of earlier versions of this layout lack the tables that came later.
+/// Creates missing tables. Devices of earlier releases with this layout lack the newer ones.
 void makeTables(Database::Transaction& transaction) {
   for (const char* schema : Services::kSchemas)
     transaction.runScript(schema).ignore();
@@ -44,7 +44,7 @@ Status makeMissingTables(Database& database) {
   return transaction.commit();
 }
 
-/// Removes those files of a new database that are there.
+/// Removes the existing files of an incomplete database.
 Status removeNewDatabase(int folder, std::initializer_list<std::string_view> endings) {
   for (const std::string_view ending : endings) {
     const int error = sys::removeFile(folder, (kNewDatabaseFile + std::string(ending)).c_str());
@@ -53,7 +53,7 @@ Status removeNewDatabase(int folder, std::initializer_list<std::string_view> end
   return {};
 }
 
-/// Makes the database under its working name, in one file, so that there is one thing to rename.
+/// Creates the database under its temporary name, without a separate log, so that one rename publishes it.
 Status fillNewDatabase(const std::string& path, InstallMode mode) {
   const Result<std::unique_ptr<Database>> database = Database::open(path + '/' + kNewDatabaseFile, Access::exclusive);
   if (!database) return database.error();
@@ -71,20 +71,20 @@ Status fillNewDatabase(const std::string& path, InstallMode mode) {
   return session.runScript("pragma journal_mode = delete");
 }
 
-/// When the database has its name the folder is a device.
+/// Creates the database. Its rename makes the directory a device.
 Status makeDatabase(const std::string& path, int folder, InstallMode mode) {
   RETURN_IF_ERROR(removeNewDatabase(folder, {"", "-journal", "-wal", "-shm"}));
   RETURN_IF_ERROR(fillNewDatabase(path, mode));
-  // A log stays when its database is closed, also one that is not in use any more.
+  // Closing the database keeps its log, although the journal mode has changed.
   RETURN_IF_ERROR(removeNewDatabase(folder, {"-wal", "-shm"}));
-  // Folders that a loss of power took back would be missed.
+  // A device whose directories are lost in a power failure would be damaged.
   int error = sys::syncFileSystem(folder);
   if (error == 0) error = sys::rename(folder, kNewDatabaseFile, folder, kDatabaseFile, sys::Replace::no);
   if (error != 0) return Error::fromErrno(error, kDatabaseFile);
   return {};
 }
 
-/// The register is as old as the layout: its tables, made anew, would be those of a device without apps.
+/// Checks that the tables of apps exist. Every version of this layout has them; creating them would lose all apps.
 Status checkRegister(Database& database) {
   Database::Session session(database);
   const auto found = app_table::find(session, {});
@@ -96,7 +96,7 @@ Status checkDatabase(const std::string& path, Database& database) {
   if (!application) return application.error();
   if (*application != kApplicationId) {
     return deviceError(DeviceFailure::notADevice,
-                       path + " is not a device: its device.db is something else's; name a device's folder");
+                       path + " is not a device: its device.db belongs to another program; name a device's folder");
   }
   const Result<std::int64_t> version = readNumber(database, "pragma user_version");
   if (!version) return version.error();
@@ -134,7 +134,7 @@ Result<FileDescriptor> makeDevice(const std::string& path, InstallMode mode) {
   const int made = sys::makeFolder(AT_FDCWD, path.c_str());
   if (made == ENOENT) {
     return deviceError(DeviceFailure::missing,
-                       path + " cannot be made: the folder around it is missing; make that first");
+                       path + " cannot be created: its parent folder is missing; create that first");
   }
   if (made != 0 && made != EEXIST) return Error::fromErrno(made, path);
   const Result<FileDescriptor> folder = openFolder(path);

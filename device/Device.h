@@ -1,4 +1,4 @@
-// The embedded device: a directory that is a whole device.
+// The embedded device, stored in a directory.
 #pragma once
 
 #include <memory>
@@ -15,41 +15,40 @@
 
 namespace appsync::device {
 
-/// How a device installs what a sync brings: through coordinators, or the sync client does it itself.
+/// How a device installs the packages of a sync: through install coordination, or directly by the sync client.
 enum class InstallMode { coordinated, direct };
 
-/// DEVICE/root is the device's file-system root, DEVICE/device.db holds everything else, DEVICE/lock names the process
-/// that holds the device, and DEVICE/work is for what is half done; the device is whole without what is in it.
+/// DEVICE/root is the device's file-system root, DEVICE/device.db the database of everything else, DEVICE/lock names
+/// the process with exclusive access, and DEVICE/work contains incomplete files, which may be deleted.
 ///
-/// Threads: any, but for destruction, when no other call may be under way.
+/// Thread-safe, except that no call may be running during destruction.
 class Device {
  public:
-  /// Makes a device of a missing or empty folder, whose parent must exist. A failure, or a kill, leaves nothing or a
-  /// folder that `create` takes again. The mode becomes the setting "coordination", which can be changed.
+  /// Creates a device in a missing or empty directory, whose parent must exist. A failure or crash leaves nothing, or a
+  /// directory that `create` accepts again. `mode` sets the initial value of the setting "coordination".
   [[nodiscard]] static Result<std::unique_ptr<Device>> create(const std::string& path,
                                                               InstallMode mode = InstallMode::direct);
 
-  /// Opens a device. `exclusive` takes hold of it until the object's end, and puts in order what a crash left half
-  /// done: it may be interrupted and tried again at will. `readOnly` sees the device as it is, beside a process that
-  /// holds it too.
+  /// Opens a device. `exclusive` locks it until destruction and recovers from crashes; it may be interrupted and
+  /// repeated. `readOnly` reads the device as it is, also while another process has exclusive access.
   [[nodiscard]] static Result<std::unique_ptr<Device>> open(const std::string& path, Access access);
 
   Device(const Device&) = delete;
   Device& operator=(const Device&) = delete;
 
-  /// Every service of this device. Lives as long as the device.
+  /// The services of this device, valid until the device is destroyed.
   [[nodiscard]] platform::Platform& platform() noexcept { return services_; }
-  /// The same services as what they are here, with what only tools need.
+  /// The same services with their concrete types, including the operations for tools.
   [[nodiscard]] Services& services() noexcept { return services_; }
 
-  /// The host path it was opened with.
+  /// The host path passed to `create` or `open`.
   [[nodiscard]] const std::string& path() const noexcept { return path_; }
 
  private:
   Device(std::string path, FileDescriptor lock, std::unique_ptr<Database> database, DeviceFileSystem files,
          Access access);
 
-  /// Opens a device that this process holds, or only reads.
+  /// Opens a device for which `lock` was acquired, or without a lock for `readOnly`.
   [[nodiscard]] static Result<std::unique_ptr<Device>> open(const std::string& path, Access access,
                                                             FileDescriptor lock);
 

@@ -1,4 +1,4 @@
-// Why a device cannot be made or opened.
+// Errors of creating and opening devices.
 #pragma once
 
 #include <string>
@@ -11,22 +11,23 @@ namespace appsync::device {
 /// Error domain of `Device::create` and `Device::open`.
 inline constexpr std::string_view kDeviceDomain = "Device";
 
-/// The codes of errors in kDeviceDomain. Each text says what is wrong and what to do.
+/// The codes of errors in kDeviceDomain. Each text names the problem and a remedy.
 enum class DeviceFailure : long {
-  missing = 1,    ///< there is no such folder
-  notADevice,     ///< a folder or file that is something else
-  exists,         ///< `create` where a device, or something else, is already
-  damaged,        ///< the database, or part of the folder, cannot be read
-  otherVersion,   ///< made by another version of this program
+  missing = 1,    ///< the directory does not exist
+  notADevice,     ///< a directory or file that is not a device
+  exists,         ///< `create` in a directory that is not empty
+  damaged,        ///< the database or part of the directory cannot be read
+  otherVersion,   ///< created by an incompatible version of this program
   noSpace,        ///< the disk is full
-  readOnly,       ///< the folder or its file system may not be written
-  held,           ///< another process holds the device
-  notAccessible,  ///< the system refuses it for another reason
+  readOnly,       ///< the directory or its file system is not writable
+  held,           ///< another process has exclusive access
+  notAccessible,  ///< any other failure of the system
 };
 
 [[nodiscard]] Error deviceError(DeviceFailure failure, std::string text);
 
-/// What a failure of the system or of the database means for somebody who wants `access` to the device at `path`.
+/// Returns the error of kDeviceDomain for a system or database error during an attempt to get `access` to the device at
+/// `path`. Returns errors of kDeviceDomain unchanged.
 [[nodiscard]] Error deviceError(const std::string& path, Access access, const Error& cause);
 
 }  // namespace appsync::device

@@ -20,17 +20,17 @@ namespace appsync::device {
 
 namespace {
 
-/// What there is before the database has its name.
+/// The files of a device whose creation was interrupted.
 constexpr std::array<std::string_view, 7> kIncompleteDeviceFiles = {
     kLockFile,           kRootDirectory,      kWorkDirectory,         kNewDatabaseFile,
     "device.db.new-wal", "device.db.new-shm", "device.db.new-journal"};
 
-/// Folders that other components of a device expect, and that it is whole without.
+/// Optional directories, created when the device is opened.
 constexpr std::array<std::string_view, 4> kDeviceDirectories = {
     DeviceFileSystem::kTemporaryDirectory, "/var/mobile/Library/Logs/MediaServices", "/var/mobile/Library/Preferences",
     "/var/mobile/Media/PublicStaging"};
 
-/// The process that says in the lock file that it holds the device; empty when it says nothing.
+/// Returns the process id in the lock file, or an empty string.
 std::string holder(int lock) {
   char text[32];
   const ssize_t length = pread(lock, text, sizeof text, 0);
@@ -51,14 +51,14 @@ Status makeIfMissing(int folder, const char* name) {
   return {};
 }
 
-/// Making it anew would be losing what lay in it: it may be elsewhere for a while only.
+/// Not recreated: the directory may be a mount point whose file system is not mounted.
 Error missingDirectory(const std::string& path, const std::string& name) {
   return deviceError(DeviceFailure::damaged, path + ": the device is damaged (it has no folder \"" + name +
                                                  "\"); mount what belongs there, or put a copy of the device in its "
                                                  "place");
 }
 
-/// Whatever lies in the root.
+/// Opens the file system without checking the content of the root.
 Result<DeviceFileSystem> filesIn(const std::string& path, int folder, Access access) {
   Result<RootDirectory> root = RootDirectory::open(path + '/' + kRootDirectory);
   if (!root && root.error().code == ENOENT) return missingDirectory(path, kRootDirectory);
@@ -77,7 +77,7 @@ Result<DeviceFileSystem> filesIn(const std::string& path, int folder, Access acc
 Status checkDirectoryIsFree(const std::string& path, int folder) {
   struct stat status {};
   if (fstatat(folder, kDatabaseFile, &status, AT_SYMLINK_NOFOLLOW) == 0) {
-    return deviceError(DeviceFailure::exists, path + " is a device already; use it as it is, or choose another folder");
+    return deviceError(DeviceFailure::exists, path + " is already a device; use it, or choose another folder");
   }
   bool isEmpty = true;
   bool wasBegun = false;

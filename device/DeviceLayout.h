@@ -11,23 +11,25 @@
 namespace appsync::device {
 
 inline constexpr const char* kDatabaseFile = "device.db";
-/// A database under this name is still being made.
+/// The name of an incomplete database.
 inline constexpr const char* kNewDatabaseFile = "device.db.new";
 inline constexpr const char* kRootDirectory = "root";
 inline constexpr const char* kWorkDirectory = "work";
 inline constexpr const char* kLockFile = "lock";
 
-/// Whether a folder can become a device: it is empty, or holds what an interrupted attempt left. Else an error of
-/// kDeviceDomain.
+/// Checks that a directory is empty or contains only the files of an interrupted attempt to create a device. Fails with
+/// an error of kDeviceDomain otherwise.
 [[nodiscard]] Status checkDirectoryIsFree(const std::string& path, int folder);
 
-/// Takes hold of a device until the descriptor is closed; an error that names the holder when another process has it.
+/// Locks a device until the descriptor is closed. Fails with an error that names the holder if another process has the
+/// lock.
 [[nodiscard]] Result<FileDescriptor> lockDevice(const std::string& path, int folder);
 
-/// Makes the folders without which a device is damaged, where an interrupted attempt has not made them.
+/// Creates the mandatory directories, unless an interrupted attempt has created them.
 [[nodiscard]] Status makeDeviceDirectories(const std::string& path, int folder);
 
-/// Makes what may be missing, if `access` allows it; a device without its root or containers is damaged.
+/// Opens the file system and, with exclusive access, creates missing optional directories. Fails with
+/// `DeviceFailure::damaged` if the root or the containers are missing.
 [[nodiscard]] Result<DeviceFileSystem> openFileSystem(const std::string& path, int folder, Access access);
 
 }  // namespace appsync::device

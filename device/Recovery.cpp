@@ -29,15 +29,15 @@ namespace {
 
 using Identifiers = std::unordered_set<std::string>;
 
-/// Whose placeholders are a coordinator's, and whose were until now.
+/// The apps whose placeholders belong to a coordinator, or did until `reconcileCoordinators`.
 struct CoordinatedPlaceholders {
   Identifiers owned;
   Identifiers orphaned;
-  /// Where the coordinators' packages are to be.
+  /// The paths of the coordinators' packages.
   std::unordered_set<std::string> packages;
 };
 
-/// Ends the coordinators that may not stay, and tells what is left.
+/// Removes the coordinators of a sync if coordination is off.
 Result<CoordinatedPlaceholders> reconcileCoordinators(Database::Session& session, bool coordinationIsOn) {
   const auto coordinators = coordinator_table::all(session);
   if (!coordinators) return coordinators.error();
@@ -61,27 +61,26 @@ bool containerExists(int containers, const StoredBundle& bundle) {
   return fstatat(containers, bundle.container.c_str(), &status, AT_SYMLINK_NOFOLLOW) == 0 && S_ISDIR(status.st_mode);
 }
 
-/// A loss of power may leave an empty file of one that was not waited for.
+/// A power failure can leave an empty file if the write was not durable.
 bool hasInfo(int containers, const StoredBundle& bundle) {
   const std::string path = bundle.container + '/' + bundle.folder + '/' + std::string(kInfoPlistName);
   struct stat status {};
   return fstatat(containers, path.c_str(), &status, AT_SYMLINK_NOFOLLOW) == 0 && status.st_size > 0;
 }
 
-/// Whether a record may keep its bundle. A coordinator's placeholder that may not is made anew from what is known of
-/// it.
+/// Returns whether a bundle's record is kept. Coordinators recreate the placeholders that they lose.
 bool stays(int containers, const AppRow& app, BundleRole role, const CoordinatedPlaceholders& coordinated) {
   const StoredBundle& bundle = *app.bundle(role);
   if (!containerExists(containers, bundle)) return false;
   if (role == BundleRole::installed) return true;
   if (coordinated.owned.contains(app.identifier)) return hasInfo(containers, bundle);
   if (bundle.installType == TSInstallType::Sync) return false;
-  // A demoted app's placeholder is its own, whoever was about to bring its package.
+  // A demoted app keeps its placeholder when its coordinator is removed.
   return isDemotion(bundle.installType) || !coordinated.orphaned.contains(app.identifier);
 }
 
-/// An install that nobody drives any more waits, but for a demoted app's, which has ended; what was being unpacked must
-/// come again, what was parked has not moved.
+/// Returns the progress from which an interrupted install resumes, or nullopt if none does: an active install waits,
+/// the package is loaded again, a paused install stays paused. The interrupted install of a demoted app has ended.
 std::optional<ProgressValues> resumed(const AppRow& app, bool hasPlaceholder, bool hasCoordinator) {
   if (!hasPlaceholder || !app.progress) return std::nullopt;
   if (isDemotion(app.placeholder->installType) && !hasCoordinator) return std::nullopt;
@@ -92,7 +91,7 @@ std::optional<ProgressValues> resumed(const AppRow& app, bool hasPlaceholder, bo
   return values;
 }
 
-/// Takes away what may not stay; `kept` receives the containers of what may, `packages` those of coordinators.
+/// Removes stale records. Adds the containers of the others to `kept` and the packages of coordinators to `packages`.
 Status reconcileRecords(Database& database, int containers, bool coordinationIsOn,
                         std::unordered_set<std::string>& kept, std::unordered_set<std::string>& packages) {
   Database::Transaction transaction(database);
@@ -133,7 +132,7 @@ int sweepContainers(int containers, const std::unordered_set<std::string>& kept,
   return entries.failure();
 }
 
-/// Removes packages that are of no use any more, but for those whose place has a new one.
+/// Removes spent packages, except those whose path a coordinator uses again.
 Status sweepPackages(Database& database, DeviceFileSystem& files, const std::unordered_set<std::string>& needed) {
   Database::Transaction transaction(database);
   const Result<std::vector<std::string>> spent = coordinator_table::spentPackages(transaction);
@@ -165,7 +164,7 @@ Status recover(Database& database, DeviceFileSystem& files, Settings& settings) 
   int error = sweepContainers(containers->get(), kept, files.work());
   if (error == 0) error = tree::empty(temporary->get(), files.work());
   if (error == 0) error = tree::empty(files.work(), files.work());
-  if (error != 0) return Error::fromErrno(error, "what a crash left behind");
+  if (error != 0) return Error::fromErrno(error, "the files that a crash left");
   return {};
 }
 

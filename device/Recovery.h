@@ -1,4 +1,4 @@
-// Puts a device in order after a process that held it was cut off.
+// Recovers a device after a crash or power failure.
 #pragma once
 
 #include "base/Error.h"
@@ -8,16 +8,15 @@
 
 namespace appsync::device {
 
-/// Nobody else may hold the device, and none of its services may run yet. Afterwards
-/// - nothing half done is left: the work folder, the temporary directory and every container without a record are gone;
-/// - no record names a container that is not there;
-/// - where install coordination is off, coordinators of a sync are gone with their placeholders and packages;
-/// - placeholders of a sync (install type 4) that no coordinator owns are gone, so that their apps are offered again;
-///   an app under one stays;
-/// - data of removed apps is gone, and what a restore was just about to keep;
-/// - packages that the coordination service was to remove are gone;
-/// - the installs of other placeholders wait to be taken up again.
-/// Doing it again changes nothing, and being cut off does not matter.
+/// Requires exclusive access to the device, with none of its services running. Removes
+/// - the content of the work and temporary directories, and every container without a record;
+/// - records of missing containers;
+/// - if install coordination is off, the coordinators of a sync with their placeholders and packages;
+/// - placeholders of a sync (install type 4) without a coordinator, so that their apps are requested again, but not the
+///   apps under them;
+/// - the data of removed apps, and data that a restore had not kept completely;
+/// - packages that the coordination service had yet to delete.
+/// The installs of other placeholders wait to be resumed. Idempotent and crash-safe.
 [[nodiscard]] Status recover(Database& database, DeviceFileSystem& files, Settings& settings);
 
 }  // namespace appsync::device

@@ -1,4 +1,4 @@
-// All services of one device.
+// The services of a device.
 #pragma once
 
 #include <memory>
@@ -26,10 +26,10 @@
 
 namespace appsync::device {
 
-/// The platform that the plug-in is given, each service as what it is here.
+/// The device's implementation of the platform, with concrete types.
 class Services final : public platform::Platform {
  public:
-  /// What makes all tables that the services keep.
+  /// The statements that create every table.
   static constexpr const char* kSchemas[] = {
       AppRegistry::kSchema,    UninstalledApps::kSchema, Settings::kSchema,
       HomeScreen::kSchema,     BackupManager::kSchema,   SoftwareLibrary::kSchema,
@@ -75,7 +75,7 @@ class Services final : public platform::Platform {
     return std::make_unique<SoftwareLibrary>(database_, registry_);
   }
 
-  // What only tools need.
+  // For tools.
 
   [[nodiscard]] Settings& settings() noexcept { return settings_; }
   [[nodiscard]] Database& database() noexcept { return database_; }
@@ -98,7 +98,7 @@ class Services final : public platform::Platform {
   DeviceService deviceService_;
   SystemClock clock_;
   ThreadScheduler scheduler_;
-  /// Has threads that use the others.
+  /// Declared last so that it is destroyed first: its threads use the other services.
   InstallCoordination installCoordination_;
 };
 

@@ -39,7 +39,7 @@ Status removeIfThere(DeviceFileSystem& files, const std::string& path) {
   return removed;
 }
 
-/// Puts a finished item of the work folder, or of another one, in the place of what is there.
+/// Replaces an item by one that is complete. The work directory receives the old one.
 int moveInto(int from, const char* name, int folder, const char* place, int work) {
   const int removed = tree::remove(folder, place, work);
   if (removed != 0 && removed != ENOENT) return removed;
@@ -75,9 +75,9 @@ Result<std::vector<std::string>> identifiersIn(Database& database, const char* q
 
 Status keep(DeviceFileSystem& files, Database& database, std::string_view identifier, const std::string& hostFolder) {
   const std::string name(identifier);
-  if (!isBundleIdentifier(name)) return Error::fromErrno(EINVAL, "\"" + name + "\" is no bundle identifier");
+  if (!isBundleIdentifier(name)) return Error::fromErrno(EINVAL, "\"" + name + "\" is not a bundle identifier");
   {
-    // What is replaced is not kept any more: a kill must not leave the new data under the old one's name.
+    // A crash must not leave the record of the old data with the new data.
     Database::Session session(database);
     RETURN_IF_ERROR(deleteRestoreRecord(session, identifier));
   }
@@ -111,7 +111,7 @@ Status commitRestoreData(DeviceFileSystem& files, Database& database, std::strin
     if (!kept) return kept.error();
     if (!*kept) return {};
   }
-  // An earlier attempt may have given it back already.
+  // Moved by an earlier attempt.
   if (!files.fileExists(keptPathOf(identifier))) return {};
   const Result<FileDescriptor> from = openFolder(files, kRestoreDataPath);
   if (!from) return from.error();

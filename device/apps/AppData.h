@@ -1,4 +1,4 @@
-// The data of apps: where it lies, how a restore keeps it for them, and how it goes.
+// The data of apps: containers, data kept by a restore, removal.
 #pragma once
 
 #include <cstdint>
@@ -11,16 +11,16 @@
 
 namespace appsync::device {
 
-/// Device path of the folder of all data containers, each named after its app. An app without data has none.
+/// Device path of the directory of data containers, each named after its app. Apps without data have no container.
 inline constexpr std::string_view kDataPath = "/var/mobile/Containers/Data";
-/// Device path of the folder in which the backup service keeps what a restore brought, by app.
+/// Device path of the directory in which the backup service keeps restored data, by app.
 inline constexpr std::string_view kRestoreDataPath = "/var/mobile/Library/Vaultory/RestoreData";
 
-/// "…/Data/com.example.notes".
+/// Returns the path of an app's data container: "…/Data/com.example.notes".
 [[nodiscard]] std::string dataContainerOf(std::string_view identifier);
 
-/// Data outlives its app's updates and demotion, and goes when the app is removed. Data that a restore keeps is the
-/// app's from the moment in which its package is in.
+/// Updates and demotion keep an app's data; removal of the app deletes it. Data kept by a restore is moved to the app's
+/// container when its package is installed.
 namespace app_data {
 
 inline constexpr const char* kSchema = R"(
@@ -28,27 +28,28 @@ create table if not exists restore_data (identifier text primary key, size integ
 create table if not exists removed_data (identifier text primary key) without rowid;
 )";
 
-/// Keeps a copy of a folder of this machine for the app, in place of what was kept. It is on the disk when this
-/// returns; a failure or a kill leaves what was there, or nothing.
+/// Keeps a copy of a host directory for the app, replacing the previous one. Durable. A failure or crash leaves the
+/// previous copy or none.
 [[nodiscard]] Status keep(DeviceFileSystem& files, Database& database, std::string_view identifier,
                           const std::string& hostFolder);
 
-/// The bytes that are kept for the app, as they were counted.
+/// Returns whether data is kept for the app and, if `size` is not null, its size in bytes.
 [[nodiscard]] Result<bool> isKept(Database::Session& session, std::string_view identifier, std::uint64_t* size);
 
-/// Drops what is kept.
+/// Deletes the data that is kept for the app.
 [[nodiscard]] Status drop(DeviceFileSystem& files, Database& database, std::string_view identifier);
 
-/// Puts what is kept, if anything is, in the data container's place. Until `deleteRestoreRecord` it counts as kept all
-/// the same, and doing it again does no harm.
+/// Replaces the app's data container by its kept data, if any. Idempotent. The data counts as kept until
+/// `deleteRestoreRecord`.
 [[nodiscard]] Status commitRestoreData(DeviceFileSystem& files, Database& database, std::string_view identifier);
 Status deleteRestoreRecord(Database::Session& session, std::string_view identifier);
 
-/// All data of a removed app is to go, that which is kept too; and goes now, or when the device is opened next.
+/// `markRemoved` records that the data of a removed app, including kept data, must be deleted. `sweepRemoved` deletes
+/// it; what it cannot delete is deleted when the device is next opened.
 Status markRemoved(Database::Session& session, std::string_view identifier);
 void sweepRemoved(DeviceFileSystem& files, Database& database, std::string_view identifier);
 
-/// After a process was cut off: what was to go goes, and what was never kept as a whole.
+/// Deletes data that an interrupted process had marked as removed or not kept completely.
 [[nodiscard]] Status recover(DeviceFileSystem& files, Database& database);
 
 }  // namespace app_data

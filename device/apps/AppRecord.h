@@ -1,4 +1,4 @@
-// The registry's answer about one app.
+// The registry's record of an app.
 #pragma once
 
 #include <cstdint>
@@ -12,11 +12,11 @@
 
 namespace appsync::device {
 
-/// Device path of the folder of all containers.
+/// Device path of the directory of bundle containers.
 inline constexpr std::string_view kContainersPath = "/var/mobile/Containers/Bundle";
 
-/// Of an app with both bundles, paths, name, version and size are the installed bundle's, which is the one that can be
-/// used; the install type is the placeholder's, which is the one being installed.
+/// For an app with both bundles, paths, name, version and size are those of the installed bundle; the install type is
+/// that of the placeholder. Immutable except for the progress.
 class AppRecord final : public platform::AppRecord {
  public:
   AppRecord(AppRow row, std::shared_ptr<platform::InstallProgress> progress)
@@ -28,7 +28,7 @@ class AppRecord final : public platform::AppRecord {
   [[nodiscard]] std::optional<std::string> bundleContainerPath() const override;
   [[nodiscard]] std::optional<std::string> bundlePath() const override;
   [[nodiscard]] std::string applicationType() const override { return row_.applicationType; }
-  /// Bytes of all files in the container.
+  /// Returns the size of all files in the container, in bytes.
   [[nodiscard]] std::uint64_t staticDiskUsage() const override;
   [[nodiscard]] platform::TSInstallType installType() const override;
   [[nodiscard]] bool isInstalled() const override { return row_.installed.has_value(); }
@@ -38,9 +38,9 @@ class AppRecord final : public platform::AppRecord {
   /// "com.example.notes 1.2 (installed, placeholder)"
   [[nodiscard]] std::string description() const override;
 
-  /// The name for people, or the identifier of an app that has no bundle yet.
+  /// Returns the name for users, or the identifier of an app without a bundle.
   [[nodiscard]] std::string name() const;
-  /// Seconds since 1970; absent for an app that has no bundle yet.
+  /// Returns seconds since 1970, or nullopt for an app without a bundle.
   [[nodiscard]] std::optional<double> installedAt() const;
 
  private:

@@ -1,4 +1,4 @@
-// The device's register of apps.
+// The device's registry of apps.
 #pragma once
 
 #include <functional>
@@ -19,17 +19,18 @@
 
 namespace appsync::device {
 
-/// Walks are in the order in which apps came to the device; an update keeps an app's place.
+/// Enumerates apps in the order of their first installation. Thread-safe.
 class AppRegistry final : public platform::AppRegistry {
  public:
   static constexpr const char* kSchema = app_table::kSchema;
 
-  /// Both must outlive the registry. With `Access::readOnly` progress is what another process stored last.
+  /// `database` and `files` must outlive the registry. With `Access::readOnly` the progress of installs is what another
+  /// process stored last.
   AppRegistry(Database& database, DeviceFileSystem& files, Access access);
 
   void addObserver(platform::AppRegistryObserver& observer) override;
   void removeObserver(platform::AppRegistryObserver& observer) override;
-  /// A registry that cannot be read knows no app.
+  /// Returns false if the registry cannot be read.
   [[nodiscard]] bool applicationIsInstalled(std::string_view bundleIdentifier) override;
   [[nodiscard]] std::shared_ptr<const platform::AppRecord> recordForIdentifier(
       std::string_view bundleIdentifier, platform::PlaceholderLookup placeholders) override;
@@ -44,56 +45,55 @@ class AppRegistry final : public platform::AppRegistry {
       const platform::AppRecord& record, platform::TSInstallPhase phase) override;
   void installPhaseFinishedForProgress(platform::InstallProgress& progress) override;
 
-  // For install coordination: the same with requests that were checked.
+  // For install coordination, with validated requests.
 
   [[nodiscard]] Status installPackage(const platform::FileLocation& location, const InstallRequest& request);
   [[nodiscard]] Status recordPlaceholder(PendingContainer& container, const InstallRequest& request,
                                          StoredBundle bundle);
-  /// Takes a placeholder's mark away; an unknown app fails.
+  /// Removes the placeholder. Fails for an unknown app.
   [[nodiscard]] Status removePlaceholder(std::string_view bundleIdentifier, const TransactionHook& transactionHook);
   [[nodiscard]] RunningInstalls& runningInstalls() noexcept { return *running_; }
-  /// Whether what is left of a demoted app is on the home screen.
+  /// Returns whether the app is demoted.
   [[nodiscard]] bool isDemoted(std::string_view bundleIdentifier) { return installer_.isDemoted(bundleIdentifier); }
-  /// Begins the install of a demoted app, whose own placeholder stands for it.
+  /// Starts the install of a demoted app, which uses the existing placeholder.
   [[nodiscard]] Status beginReturn(std::string_view bundleIdentifier, const TransactionHook& transactionHook) {
     return installer_.beginReturn(bundleIdentifier, transactionHook);
   }
 
-  /// `installApplication` for an app, or its placeholder, that is part of the system.
+  /// Installs a system app or its placeholder, as `installApplication` does.
   [[nodiscard]] Status installSystemApplication(const platform::FileLocation& location,
                                                 const plist::Dictionary& options);
 
-  /// Makes an installed app a demoted one: its package goes, a placeholder of `type` stays with its icon, name,
-  /// version, store metadata and licence, and its data stays. Fails for an app that is not installed, or is being
-  /// updated.
+  /// Demotes an installed app: replaces its bundle by a placeholder of `type` with its icon, name, version, store
+  /// metadata and licence. Keeps its data. Fails for an app that is not installed, or is being updated.
   [[nodiscard]] Status demote(std::string_view bundleIdentifier, platform::TSInstallType type) {
     return installer_.demote(bundleIdentifier, type);
   }
 
-  /// Says anew why there is a placeholder of an app that is not installed: a demoted app's install does not wait for a
-  /// package, a restored app's does.
+  /// Changes the install type of the placeholder of an app that is not installed. Starts its install, or ends it if
+  /// `type` is a demotion. Fails for other apps.
   [[nodiscard]] Status setPlaceholderType(std::string_view bundleIdentifier, platform::TSInstallType type) {
     return installer_.setPlaceholderType(bundleIdentifier, type);
   }
 
-  /// Gives the placeholder of an app that is not installed another name on the home screen.
+  /// Changes the display name of the placeholder of an app that is not installed. Fails for other apps.
   [[nodiscard]] Status renamePlaceholder(std::string_view bundleIdentifier, std::string_view name) {
     return installer_.renamePlaceholder(bundleIdentifier, name);
   }
 
-  /// A running install of the app comes before all others.
+  /// Moves the running install of the app to the front of the order.
   void prioritizeInstall(std::string_view bundleIdentifier) { running_->prioritize(bundleIdentifier); }
 
-  /// Why the app's latest install in this process failed; none when it succeeded or there was none.
+  /// Returns the error of the app's latest install by this process, or nullopt if it succeeded or there was none.
   [[nodiscard]] std::optional<Error> lastInstallFailure(std::string_view bundleIdentifier);
 
-  /// Every app, in the order of walks.
+  /// Returns every app, in the order of enumeration.
   [[nodiscard]] Result<std::vector<std::shared_ptr<const AppRecord>>> apps();
 
-  /// Gives the app, and its placeholder, licence data in place of what they had. Fails for an unknown app.
+  /// Replaces the licence data of the app and its placeholder. Fails for an unknown app.
   [[nodiscard]] Status setLicenceData(std::string_view bundleIdentifier, ByteView licence);
 
-  /// The licence data that the app, or its placeholder, was installed with.
+  /// Returns the licence data of the app or its placeholder, or nullopt if there is none.
   [[nodiscard]] Result<std::optional<Bytes>> licenceData(std::string_view bundleIdentifier);
 
  private:
@@ -107,7 +107,7 @@ class AppRegistry final : public platform::AppRegistry {
   Installer installer_;
   std::mutex failuresMutex_;
   std::map<std::string, Error, std::less<>> failures_;
-  /// Destroyed first: until then its thread asks `running_`.
+  /// Declared last so that it is destroyed first: its thread uses `running_`.
   RegistryObservers observers_;
 };
 

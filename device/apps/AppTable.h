@@ -1,4 +1,4 @@
-// The registry's rows: which apps there are and where their bundles lie.
+// The database tables of apps and their bundles.
 #pragma once
 
 #include <cstdint>
@@ -14,25 +14,25 @@
 
 namespace appsync::device {
 
-/// An app has up to two bundles: the one that is installed, and the placeholder for a package still to come.
+/// An app has up to two bundles: the installed one, and the placeholder of a package that is not installed yet.
 enum class BundleRole : std::uint8_t { installed, placeholder };
 
-/// Whether a placeholder of that type stands for a demoted app: nobody is about to bring its package.
+/// Returns whether a placeholder of that type belongs to a demoted app, for which no package is expected.
 [[nodiscard]] constexpr bool isDemotion(platform::TSInstallType type) noexcept {
   return type == platform::TSInstallType::Downgrade || type == platform::TSInstallType::IntentionalDowngrade;
 }
 
 struct StoredBundle {
-  std::string container;  ///< the container's name
-  std::string folder;     ///< the bundle's, in the container
-  std::string name;       ///< for people
+  std::string container;  ///< the name of the container
+  std::string folder;     ///< the name of the bundle in the container
+  std::string name;       ///< the display name
   std::optional<std::string> version;
   platform::TSInstallType installType = platform::TSInstallType::None;
   std::uint64_t bytes = 0;  ///< of all files of the container
   double installedAt = 0;   ///< seconds since 1970
 };
 
-/// How far a running install is.
+/// The progress of a running install.
 struct ProgressValues {
   platform::TSInstallState state = platform::TSInstallState::Waiting;
   platform::TSInstallPhase phase = platform::TSInstallPhase::Loading;
@@ -42,7 +42,7 @@ struct ProgressValues {
 };
 
 struct AppRow {
-  std::int64_t position = 0;  ///< grows with each app that is new to the device
+  std::int64_t position = 0;  ///< increases with each new app
   std::string identifier;
   std::string applicationType;
   std::optional<StoredBundle> installed;
@@ -59,7 +59,7 @@ struct AppRow {
 /// device has no identifier and accepts any; all other licences, including an empty one, are valid on any device.
 [[nodiscard]] bool isDeviceBound(ByteView licence);
 
-/// Each runs in the session, or transaction, that it is given; an identifier is looked up by index.
+/// Each function runs in the given session or transaction.
 namespace app_table {
 
 inline constexpr const char* kSchema = R"(
@@ -87,22 +87,22 @@ create table if not exists bundles (
 
 [[nodiscard]] Result<std::optional<AppRow>> find(Database::Session& session, std::string_view identifier);
 
-/// Every app, those with a running install, or those of one type, in the order in which they came to the device.
+/// Return every app, those with a running install, or those of a type, ordered by `position`.
 [[nodiscard]] Result<std::vector<AppRow>> all(Database::Session& session);
 [[nodiscard]] Result<std::vector<AppRow>> withProgress(Database::Session& session);
 [[nodiscard]] Result<std::vector<AppRow>> ofType(Database::Session& session, std::string_view applicationType);
 
-/// Puts a bundle in its role, in place of what was there. A new app gets `applicationType`, a known one keeps its own,
-/// and its licence unless there is a new one.
+/// Inserts or replaces the app's bundle in a role. An existing app keeps its application type and, if `licence` is
+/// nullopt, its licence.
 Status put(Database::Session& session, std::string_view identifier, std::string_view applicationType, BundleRole role,
            const StoredBundle& bundle, const std::optional<Bytes>& licence);
 
-/// Takes a bundle, if `app` has it, and an app that then has none, away.
+/// Deletes the bundle in a role, if any, and the app if it has no bundle left.
 Status remove(Database::Session& session, const AppRow& app, BundleRole role);
 
 [[nodiscard]] Result<std::optional<Bytes>> licenceOf(Database::Session& session, std::string_view identifier);
 
-/// Of an unknown app nothing is stored.
+/// Does nothing for an unknown app.
 Status storeProgress(Database::Session& session, std::string_view identifier,
                      const std::optional<ProgressValues>& progress);
 

@@ -1,4 +1,4 @@
-// Connections to the backup service.
+// The backup service, which keeps restored data.
 #pragma once
 
 #include <cstdint>
@@ -11,22 +11,22 @@
 
 namespace appsync::device {
 
-/// Keeps the data that a restore brought until its apps are there. All connections to one device see the same; it
-/// outlives the process. Threads: any.
+/// Keeps restored data until its apps are installed. All connections to a device share the data, which is stored in the
+/// device. Thread-safe.
 class BackupManager final : public platform::BackupManager {
  public:
   static constexpr const char* kSchema = app_data::kSchema;
 
-  /// Both must outlive the connection.
+  /// `database` and `files` must outlive the connection.
   BackupManager(Database& database, DeviceFileSystem& files) : database_(database), files_(files) {}
 
-  /// From now on a restore holds a copy of that folder of this machine for the app; see `app_data::keep`.
+  /// Keeps a copy of a host directory for the app; see `app_data::keep`.
   [[nodiscard]] Status keepRestoreData(std::string_view bundleIdentifier, const std::string& hostFolder);
 
-  /// Gives the data to an app whose package does not come, because it is demoted.
+  /// Moves the kept data to the container of a demoted app, for which no package is expected.
   [[nodiscard]] Status restoreDataNow(std::string_view bundleIdentifier);
 
-  /// A device whose database cannot be read has no data for anyone.
+  /// Returns false if the database cannot be read.
   [[nodiscard]] bool restoreDataExists(std::string_view bundleIdentifier, std::uint64_t* size) override;
   bool cancelApplicationRestore(std::string_view bundleIdentifier, ErrorSlot error) override;
 

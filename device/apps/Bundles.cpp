@@ -23,7 +23,7 @@ class FolderBundle final : public platform::Bundle {
   const plist::Value info_;
 };
 
-/// Null when the file is missing or unusable.
+/// Returns a null value if the file is missing or unusable.
 plist::Value readInfo(platform::FileSystem& fileSystem, const std::string& path) {
   const auto attributes = fileSystem.attributesOfItem(path);
   if (!attributes || attributes->size > kMaximumMetadataBytes) return {};

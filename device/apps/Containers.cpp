@@ -33,7 +33,7 @@ Result<PendingContainer> PendingContainer::make(DeviceFileSystem& files) {
   const int parentFolder = container.parent_.get();
   const char* name = container.nameNow_.c_str();
   if (const int error = sys::makeFolder(parentFolder, name); error != 0) {
-    container.released_ = true;  // There is nothing to remove.
+    container.released_ = true;  // Nothing to remove.
     return Error::fromErrno(error, "a container for the app");
   }
   container.folder_ = FileDescriptor(openat(parentFolder, name, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));

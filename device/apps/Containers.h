@@ -1,4 +1,4 @@
-// The folders that bundles are installed in.
+// The containers of bundles.
 #pragma once
 
 #include <string>
@@ -12,7 +12,7 @@
 
 namespace appsync::device {
 
-/// A container that is being filled, under a name that says so. Unless it is settled and kept, its end removes it.
+/// A new container under a temporary name. The destructor removes it unless `release` was called.
 class PendingContainer {
  public:
   [[nodiscard]] static Result<PendingContainer> make(DeviceFileSystem& files);
@@ -20,16 +20,16 @@ class PendingContainer {
   PendingContainer& operator=(PendingContainer&&) = delete;
   ~PendingContainer();
 
-  /// The container's open folder.
+  /// The container's open directory.
   [[nodiscard]] int folder() const noexcept { return folder_.get(); }
-  /// The name it has once it is settled.
+  /// The name after `commit`.
   [[nodiscard]] const std::string& name() const noexcept { return name_; }
 
-  /// Makes a file of it, in place of one that is there.
+  /// Creates or replaces a file of the container.
   [[nodiscard]] Status writeFile(std::string_view name, ByteView bytes);
-  /// Gives it its name; with `Durability::power` the name and all in it are on the disk then.
+  /// Renames the container to its final name and makes it durable as requested.
   [[nodiscard]] Status commit(Durability durability);
-  /// It belongs to a record now.
+  /// Keeps the container, which a record now owns.
   void release() noexcept { released_ = true; }
 
  private:
@@ -43,7 +43,7 @@ class PendingContainer {
   bool released_ = false;
 };
 
-/// Removes a container that no record has any more. What cannot be removed is left to the next opening of the device.
+/// Removes a container without a record. After a failure the next opening of the device removes it.
 void removeContainer(DeviceFileSystem& files, const std::string& name);
 
 }  // namespace appsync::device

@@ -34,7 +34,7 @@ std::optional<Bytes> readIfThere(DeviceFileSystem& files, const std::string& pat
   return bytes;
 }
 
-/// The placeholder that a demoted app is replaced by.
+/// Returns the content of the placeholder that replaces a demoted app.
 PlaceholderContents demotedPlaceholder(DeviceFileSystem& files, const AppRow& app, TSInstallType type) {
   const StoredBundle& bundle = *app.installed;
   const std::string appPath = containerOf(bundle) + '/' + bundle.folder;
@@ -69,7 +69,7 @@ Status Installer::demote(std::string_view bundleIdentifier, TSInstallType type) 
   if (!app.installed) return unknownApp(bundleIdentifier, "demote");
   if (app.placeholder || running_.find(bundleIdentifier) != nullptr) {
     return installerError(InstallerFailure::badOptions,
-                          "\"" + app.identifier + "\" is being updated; wait until that has ended and try again");
+                          "\"" + app.identifier + "\" is being updated; wait until the update has ended and try again");
   }
   Result<PlaceholderContainer> remains = makePlaceholder(files_, demotedPlaceholder(files_, app, type));
   if (!remains) return remains.error();
@@ -124,7 +124,7 @@ Status Installer::renamePlaceholder(std::string_view bundleIdentifier, std::stri
   Result<BundleInfo> info = readBundleInfo(*document);
   if (!info) return info.error();
   info->dictionary.set(platform::kBundleDisplayNameKey, name);
-  document = plist::writeBinary(info->dictionary);  // which, unlike XML, has a form for every name
+  document = plist::writeBinary(info->dictionary);  // XML cannot represent every name.
   if (!document) return document.error();
   RETURN_IF_ERROR(files_.writeFileAtomically(path, *document));
   Database::Session session(database_);

@@ -1,4 +1,4 @@
-// Apps of which a device has kept the icon and the data only.
+// Demoted apps, of which a device keeps only the icon and the data.
 #pragma once
 
 #include "base/Error.h"
@@ -14,13 +14,13 @@ inline constexpr std::string_view kDemotedAppsPath =
 inline constexpr std::string_view kAutomaticDowngradesKey = "AutomaticDowngrades";
 inline constexpr std::string_view kIntentionalDowngradesKey = "IntentionalDowngrades";
 
-/// What the list has to say, from the placeholders of demoted apps that the registry has.
+/// Returns the content of the list, from the placeholders of demoted apps in the registry.
 [[nodiscard]] Result<plist::Dictionary> demotedApps(AppRegistry& registry);
 
-/// Brings the list in step with the registry.
+/// Writes the list from the registry.
 [[nodiscard]] Status recordDemotedApps(AppRegistry& registry, DeviceFileSystem& files);
 
-/// `AppRegistry::demote`, and the list.
+/// Demotes an app as `AppRegistry::demote` does and updates the list.
 [[nodiscard]] Status demote(AppRegistry& registry, DeviceFileSystem& files, std::string_view bundleIdentifier,
                             platform::TSInstallType type);
 

@@ -1,4 +1,4 @@
-// Live progress of one app's install.
+// The live progress of an install.
 #pragma once
 
 #include <cstdint>
@@ -11,17 +11,17 @@
 
 namespace appsync::device {
 
-/// Setters take effect until the install has ended, one way or another.
+/// Setters have no effect after the end of the install. Thread-safe.
 class InstallProgress final : public platform::InstallProgress {
  public:
   enum class Change : std::uint8_t { units, course, cancelled };
-  /// Called after each change, on the changing thread and without a lock.
+  /// Called after each change, on the calling thread of the setter and without a lock.
   using Listener = std::function<void(InstallProgress& progress, Change change)>;
 
   InstallProgress(std::string identifier, ProgressValues values, Listener listener)
       : identifier_(std::move(identifier)), listener_(std::move(listener)), values_(values) {}
 
-  /// One that has ended: what a reader of the device shows.
+  /// Creates the progress of an ended install, for readers of the device.
   InstallProgress(std::string identifier, ProgressValues values)
       : identifier_(std::move(identifier)), values_(values), ended_(true) {}
 
@@ -42,13 +42,13 @@ class InstallProgress final : public platform::InstallProgress {
   [[nodiscard]] ProgressValues values() const;
   [[nodiscard]] bool ended() const;
 
-  /// Sets everything at once.
+  /// Sets all values at once.
   void set(const ProgressValues& values);
-  /// The install is over, in this state; the listener is not called.
+  /// Ends the install in this state without calling the listener.
   void end(platform::TSInstallState state);
 
  private:
-  /// Changes one value, if that is still to have an effect and makes a difference.
+  /// Changes a value and calls the listener, unless the install has ended or the value is the same.
   template <class T>
   void change(T ProgressValues::*field, T value, Change kind);
 

@@ -36,7 +36,7 @@ Result<InstallRequest> readInstallOptions(const plist::Dictionary& options) {
   if (!isBundleIdentifier(*identifier)) {
     return installerError(InstallerFailure::badIdentifier,
                           "\"" + std::string(*identifier) +
-                              "\" is no bundle identifier: it may have only letters, "
+                              "\" is not a bundle identifier: it may have only letters, "
                               "digits, '-', '.' and '_', at most 200 and no dot first");
   }
   request.identifier = *identifier;

@@ -1,4 +1,4 @@
-// What an install was asked to do.
+// The validated options of an install.
 #pragma once
 
 #include <functional>
@@ -12,23 +12,23 @@
 
 namespace appsync::device {
 
-/// Runs in the transaction that records what an install or removal did; a statement of it that fails makes that fail.
+/// Additional statements for the install's or removal's transaction. If one fails, the transaction is rolled back.
 using TransactionHook = std::function<void(Database::Session& session)>;
 
-/// The install options, each checked, and what other services of the device add.
+/// The install options and the additions of other services of the device.
 struct InstallRequest {
   BundleRole role = BundleRole::installed;
   std::string identifier;
   std::optional<platform::TSInstallType> installType;
   std::optional<Bytes> storeMetadata;
   std::optional<Bytes> licenceData;
-  /// Store metadata for a package that has none of its own.
+  /// Store metadata for a package without it.
   std::optional<Bytes> defaultStoreMetadata;
   /// May be empty.
   TransactionHook transactionHook;
 };
 
-/// Keys that installing does not know are passed over. Errors: platform::kInstallerErrorDomain.
+/// Validates install options, ignoring unknown keys. Errors: platform::kInstallerErrorDomain.
 [[nodiscard]] Result<InstallRequest> readInstallOptions(const plist::Dictionary& options);
 
 }  // namespace appsync::device

@@ -23,7 +23,7 @@ using platform::TSInstallType;
 
 namespace {
 
-/// An install's progress is counted in thousandths.
+/// The total units of an install's progress.
 constexpr std::int64_t kProgressUnits = 1000;
 
 double secondsSince1970() {
@@ -58,7 +58,7 @@ Result<BundleInfo> readInfoOf(int container, const std::string& appFolder) {
   return readBundleInfo(document);
 }
 
-/// Puts the store metadata that was asked for beside the app folder.
+/// Writes the requested store metadata next to the app folder.
 Status keepStoreMetadata(PendingContainer& container, const InstallRequest& request) {
   if (request.storeMetadata) return container.writeFile(kStoreMetadataName, *request.storeMetadata);
   const std::string name(kStoreMetadataName);
@@ -67,7 +67,7 @@ Status keepStoreMetadata(PendingContainer& container, const InstallRequest& requ
   return container.writeFile(name, *request.defaultStoreMetadata);
 }
 
-/// What a new bundle takes the place of: a package that of both earlier ones, a placeholder that of a placeholder.
+/// Returns the bundles that a new one replaces: an installed bundle replaces both, a placeholder only a placeholder.
 std::vector<const StoredBundle*> replacedBy(BundleRole role, const AppRow& app) {
   std::vector<const StoredBundle*> replaced;
   if (role == BundleRole::installed && app.installed) replaced.push_back(&*app.installed);
@@ -86,8 +86,8 @@ BundleRole removedRole(BundleRole requested, const AppRow& app) {
   return app.installed && app.placeholder ? BundleRole::placeholder : requested;
 }
 
-/// A container may go once nothing can bring the record of it back. Placeholders of a sync do not survive a restart
-/// anyway, and where there was nothing, nothing that was there is lost.
+/// The replaced container is deleted right after this transaction. If it held an app or a lasting placeholder, the
+/// transaction must first be durable: after a power failure the old record must not reappear without its files.
 Durability durabilityFor(BundleRole role, const AppRow& app) {
   const bool replacesApp = role == BundleRole::installed && app.installed;
   const bool replacesLastingPlaceholder = app.placeholder && app.placeholder->installType != TSInstallType::Sync;
@@ -172,7 +172,7 @@ Status Installer::installPlaceholder(const platform::FileLocation& location, con
   if (!info) return info.error();
   RETURN_IF_ERROR(checkIdentifier(*info, request));
   RETURN_IF_ERROR(keepStoreMetadata(*container, request));
-  // A sync's placeholder does not survive a restart: there is no point in waiting until it is on the disk.
+  // Recovery removes a sync's placeholder, so it need not survive a power failure.
   const bool lasts = request.installType != TSInstallType::Sync;
   RETURN_IF_ERROR(container->commit(lasts ? Durability::power : Durability::process));
   return recordPlaceholder(*container, request, applicationType, describe(*info, folder, bytes));

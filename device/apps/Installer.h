@@ -15,33 +15,33 @@
 
 namespace appsync::device {
 
-/// Threads: any number of installs and removals at once, also of one app: the last one to be recorded counts.
+/// Thread-safe. Of concurrent installs and removals of one app the last one to be recorded takes effect.
 class Installer {
  public:
-  /// All must outlive the installer.
+  /// All arguments must outlive the installer.
   Installer(Database& database, DeviceFileSystem& files, RunningInstalls& running)
       : database_(database), files_(files), running_(running) {}
 
-  /// As `platform::AppRegistry::installApplication`; an app that is new to the device becomes one of `applicationType`.
+  /// Implements `platform::AppRegistry::installApplication`. A new app gets `applicationType`.
   [[nodiscard]] Status install(const platform::FileLocation& location, const plist::Dictionary& options,
                                std::string_view applicationType);
 
-  /// The same for a package and a request that was checked.
+  /// Installs a package with a validated request.
   [[nodiscard]] Status installPackage(const platform::FileLocation& location, const InstallRequest& request,
                                       std::string_view applicationType);
 
-  /// Makes a settled container the app's placeholder, whose install waits from now on unless the app is demoted.
+  /// Records a committed container as the app's placeholder and starts its install, unless the app is demoted.
   [[nodiscard]] Status recordPlaceholder(PendingContainer& container, const InstallRequest& request,
                                          std::string_view applicationType, StoredBundle bundle);
 
-  // Of demoted apps, as in `AppRegistry`.
+  // Demoted apps: see `AppRegistry`.
   [[nodiscard]] Status demote(std::string_view bundleIdentifier, platform::TSInstallType type);
   [[nodiscard]] Status setPlaceholderType(std::string_view bundleIdentifier, platform::TSInstallType type);
   [[nodiscard]] Status renamePlaceholder(std::string_view bundleIdentifier, std::string_view name);
   [[nodiscard]] bool isDemoted(std::string_view bundleIdentifier);
   [[nodiscard]] Status beginReturn(std::string_view bundleIdentifier, const TransactionHook& transactionHook);
 
-  /// As `platform::AppRegistry::uninstallApplication`.
+  /// Implements `platform::AppRegistry::uninstallApplication`.
   [[nodiscard]] Status uninstall(std::string_view bundleIdentifier, const plist::Dictionary& options,
                                  const TransactionHook& transactionHook = {});
 
@@ -50,10 +50,10 @@ class Installer {
                                           std::string_view applicationType);
   [[nodiscard]] Status unpackAndRecord(const platform::FileLocation& location, const InstallRequest& request,
                                        std::string_view applicationType, InstallProgress& progress);
-  /// Makes a settled container the app's bundle in its role, and removes those that it takes the place of.
+  /// Records a committed container as the app's bundle in its role and removes the bundles that it replaces.
   [[nodiscard]] Status record(PendingContainer& container, const InstallRequest& request,
                               std::string_view applicationType, StoredBundle bundle);
-  /// The app's row, or one of an app that is new.
+  /// Returns the app's row, or a row without bundles for an unknown app.
   [[nodiscard]] Result<AppRow> known(std::string_view identifier);
 
   Database& database_;

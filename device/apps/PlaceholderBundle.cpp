@@ -39,7 +39,7 @@ std::optional<std::string> versionOf(const PlaceholderContents& placeholder) {
   return ownedStringIn(placeholder.attributes.infoDictionary().find(platform::kBundleVersionKey));
 }
 
-/// The app's own info dictionary, with what the placeholder says of it.
+/// Returns the app's info dictionary with the placeholder's values.
 Result<Bytes> infoDocument(const PlaceholderContents& placeholder, const StoredBundle& bundle, bool hasIcon) {
   plist::Dictionary info = placeholder.attributes.infoDictionary();
   info.set(platform::BundleIdentifierKey, placeholder.identifier);

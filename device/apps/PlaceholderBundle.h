@@ -1,4 +1,4 @@
-// The bundle that the home screen shows for an app whose package has not been installed yet.
+// Placeholder bundles, which the home screen shows for apps that are not installed yet.
 #pragma once
 
 #include <optional>
@@ -14,13 +14,13 @@
 
 namespace appsync::device {
 
-/// What a placeholder bundle is made of.
+/// The content of a placeholder bundle.
 struct PlaceholderContents {
   std::string identifier;
-  std::string bundleName;  ///< the identifier is shown if this is empty
+  std::string bundleName;  ///< if empty, the identifier is shown
   platform::TSInstallType installType = platform::TSInstallType::None;
   platform::PlaceholderAttributes attributes;
-  std::optional<Bytes> storeMetadata;   ///< a property list, written as it is
+  std::optional<Bytes> storeMetadata;   ///< a property list, written unchanged
   std::optional<std::string> iconPath;  ///< a device path
 };
 
@@ -29,8 +29,8 @@ struct PlaceholderContainer {
   StoredBundle bundle;
 };
 
-/// Fills a new container with "Info.plist" and the icon in a folder named after the app, and the store metadata next to
-/// that folder. An icon that cannot be read is left out: the home screen then draws one.
+/// Creates a container with "Info.plist" and the icon in an app folder, and the store metadata next to that folder.
+/// Omits an icon that cannot be read. The caller commits the container.
 [[nodiscard]] Result<PlaceholderContainer> makePlaceholder(DeviceFileSystem& files,
                                                            const PlaceholderContents& contents);
 

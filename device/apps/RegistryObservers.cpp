@@ -6,7 +6,7 @@ namespace appsync::device {
 
 namespace {
 
-/// Whose callback this thread is in.
+/// The object whose callback this thread is running, or null.
 thread_local const RegistryObservers* callingBack = nullptr;
 
 }  // namespace
@@ -26,7 +26,7 @@ void RegistryObservers::remove(platform::AppRegistryObserver& observer) {
     const std::scoped_lock lock(mutex_);
     if (observers_.erase(&observer) == 0) return;
     thread = callbacks_.get();
-    // A callback must not hold its own thread, lest it be the one to end it.
+    // A callback must not own its thread: it would join itself.
     if (callingBack != this) callbacks = observers_.empty() ? std::move(callbacks_) : callbacks_;
   }
   thread->forget(&observer);
@@ -45,7 +45,7 @@ void RegistryObservers::postReport(platform::AppRegistryObserver& observer, Stat
     {
       const std::scoped_lock lock(mutex_);
       const auto found = observers_.find(&observer);
-      if (found == observers_.end()) return;  // It is being removed.
+      if (found == observers_.end()) return;  // The observer is being removed.
       found->second.reportQueued = false;
     }
     const InstallOrder order = order_();

@@ -1,4 +1,4 @@
-// Who hears of running installs.
+// The observers of running installs.
 #pragma once
 
 #include <functional>
@@ -11,24 +11,24 @@
 
 namespace appsync::device {
 
-/// Which installs run first, and which are paused.
+/// The running and the paused installs, in their order.
 struct InstallOrder {
   platform::AppRecords prioritized;
   platform::AppRecords paused;
 };
 
-/// Calls observers back on a thread that there is only while there are observers. A report says how things stand when
-/// it is made: a slow observer hears of several changes at once and never falls behind.
+/// Calls observers on a thread that exists only while there are observers. A report contains the order at the time of
+/// the call: a slow observer receives one report for several changes.
 ///
-/// Threads: any, from callbacks too. Must not be destroyed on a callback's thread.
+/// Thread-safe, also in callbacks. Must not be destroyed on a callback's thread.
 class RegistryObservers {
  public:
-  /// `order` answers how things stand, on the callbacks' thread.
+  /// `order` returns the current order; it is called on the callbacks' thread.
   explicit RegistryObservers(std::function<InstallOrder()> order) : order_(std::move(order)) {}
 
-  /// Nothing happens when it was added before; else it hears of the order soon.
+  /// Adds an observer and reports the order to it. Does nothing if it was already added.
   void add(platform::AppRegistryObserver& observer);
-  /// When this returns no callback to it runs on another thread, and none will begin.
+  /// Removes an observer and blocks until its running callback, unless this is that callback, has returned.
   void remove(platform::AppRegistryObserver& observer);
 
   void orderChanged();
@@ -44,7 +44,7 @@ class RegistryObservers {
   const std::function<InstallOrder()> order_;
   std::mutex mutex_;
   std::map<platform::AppRegistryObserver*, State> observers_;
-  /// Null while there are no observers, unless the last one left on this very thread.
+  /// Null while there are no observers, unless the last one was removed in a callback.
   std::shared_ptr<CallbackThread> callbacks_;
 };
 

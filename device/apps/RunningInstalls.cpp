@@ -13,13 +13,13 @@ using platform::TSInstallState;
 
 namespace {
 
-/// Often enough for somebody who watches, and no work to speak of.
+/// Limits the database writes while users see regular progress.
 constexpr std::chrono::milliseconds kBetweenStoredUnits{250};
 
 }  // namespace
 
 InstallProgress::Listener RunningInstalls::listener() {
-  // A progress may outlive the registry.
+  // A progress can outlive the registry.
   return [self = weak_from_this()](InstallProgress& progress, InstallProgress::Change change) {
     if (const auto installs = self.lock()) installs->changed(progress, change);
   };
@@ -141,7 +141,7 @@ void RunningInstalls::changed(InstallProgress& progress, InstallProgress::Change
 
 void RunningInstalls::store(const InstallProgress& progress) {
   Database::Session session(database_);
-  // Read in turn: of two changes at once the later value is stored last.
+  // Read after the session was opened: of two concurrent changes the later value is stored last.
   const auto values = progress.ended() ? std::nullopt : std::optional(progress.values());
   app_table::storeProgress(session, progress.identifier(), values).ignore();
 }

@@ -1,4 +1,4 @@
-// The installs that are under way.
+// The running installs.
 #pragma once
 
 #include <chrono>
@@ -15,32 +15,33 @@
 
 namespace appsync::device {
 
-/// One install per app at most: from its placeholder, or its package's installation, to the end of the latter. Changes
-/// of its course are stored at once, of units now and then, for other processes to see. Threads: any.
+/// At most one install per app, from its placeholder or the start of its package's installation to the end of the
+/// latter. Changes of state and phase are stored at once for other processes, changes of units at intervals.
+/// Thread-safe.
 class RunningInstalls : public std::enable_shared_from_this<RunningInstalls> {
  public:
-  /// Both must outlive every use.
+  /// Both arguments must outlive this object.
   RunningInstalls(Database& database, RegistryObservers& observers) : database_(database), observers_(observers) {}
 
-  /// Takes up the installs that an earlier process stored.
+  /// Resumes the installs that an earlier process stored.
   void resume();
 
-  /// Starts an install, or takes the running one to `values`. Observers are told of it with a record of `app`.
+  /// Starts an install, or sets the running one to `values`. Observers receive a record of `app`.
   std::shared_ptr<InstallProgress> begin(AppRow app, const ProgressValues& values);
 
-  /// The app's running install, or null.
+  /// Returns the app's running install, or null.
   [[nodiscard]] std::shared_ptr<InstallProgress> find(std::string_view identifier) const;
 
-  /// Ends it, if one runs.
+  /// Ends the app's running install, if any.
   void end(std::string_view identifier, platform::TSInstallState lastState);
 
-  /// The install's phase is over: a failed or finished install ends, any other goes on to be installed.
+  /// Ends the current phase: a failed, finished or cancelled install ends, any other enters the phase Installing.
   void phaseFinished(const platform::InstallProgress& progress);
 
-  /// Runs before all others from now on.
+  /// Moves the app's install to the front of the order.
   void prioritize(std::string_view identifier);
 
-  /// By rank; what has failed, finished or been cancelled is in neither list.
+  /// Returns the installs by rank, without those that have failed, finished or been cancelled.
   [[nodiscard]] InstallOrder order() const;
 
  private:

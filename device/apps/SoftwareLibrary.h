@@ -1,4 +1,4 @@
-// Connections to the store's library.
+// The store's library of receipts.
 #pragma once
 
 #include <functional>
@@ -14,26 +14,26 @@ namespace appsync::device {
 
 class Database;
 
-/// What the library knows of one installed app.
+/// The receipt of an installed app.
 struct Receipt {
   std::string bundleIdentifier;
   std::optional<std::string> version;
   bool operator==(const Receipt&) const = default;
 };
 
-/// Keeps a receipt for every user app that is installed. Threads: any.
+/// Stores a receipt for each installed user app. Thread-safe.
 class SoftwareLibrary final : public platform::SoftwareLibrary {
  public:
   static constexpr const char* kSchema =
       "create table if not exists receipts (identifier text primary key, version text) without rowid;";
 
-  /// Both must outlive the connection.
+  /// Both arguments must outlive the connection.
   SoftwareLibrary(Database& database, platform::AppRegistry& registry) : database_(database), registry_(registry) {}
 
-  /// Replaces all receipts, or none if it fails. `completion` runs on the calling thread before this returns.
+  /// Replaces all receipts, or none if it fails. Calls `completion` on the calling thread before it returns.
   void refreshReceipts(std::function<void(const std::optional<Error>& error)> completion) override;
 
-  /// The receipts of the last refresh, by identifier.
+  /// Returns the receipts of the last refresh, ordered by identifier.
   [[nodiscard]] Result<std::vector<Receipt>> receipts();
 
  private:

@@ -8,7 +8,7 @@ namespace appsync::device {
 
 namespace {
 
-/// Seconds from the property lists' epoch, 2001-01-01, to now.
+/// Returns the seconds since the epoch of property lists, 2001-01-01.
 double secondsNow() {
   using namespace std::chrono;
   constexpr sys_days kEpoch = year(2001) / January / 1;

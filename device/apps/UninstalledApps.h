@@ -11,7 +11,7 @@
 
 namespace appsync::device {
 
-/// Kept in the device's database. The values are the dates of removal.
+/// Stored in the device's database. The values are the dates of removal.
 class UninstalledApps final : public platform::UninstalledAppsList {
  public:
   static constexpr const char* kSchema =
@@ -24,7 +24,7 @@ class UninstalledApps final : public platform::UninstalledAppsList {
   [[nodiscard]] std::optional<plist::Dictionary> lookupUninstalled() override;
   [[nodiscard]] int clearUninstalled(const std::vector<std::string>& bundleIdentifiers) override;
 
-  // For the installer, as part of what it changes.
+  // For the installer's transactions.
   static Status add(Database::Session& session, std::string_view bundleIdentifier);
   static Status remove(Database::Session& session, std::string_view bundleIdentifier);
 

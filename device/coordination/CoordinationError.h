@@ -1,4 +1,4 @@
-// What install coordination refuses, and why.
+// Errors of install coordination.
 #pragma once
 
 #include <string>
@@ -9,18 +9,18 @@
 
 namespace appsync::device {
 
-/// The codes of errors in platform::kInstallCoordinationErrorDomain but for 1, a user-presentable error's.
+/// The codes of errors in platform::kInstallCoordinationErrorDomain, except 1, the code of user-presentable errors.
 enum class CoordinationFailure : long {
-  off = 2,          ///< this device installs directly
+  off = 2,          ///< coordination is off on this device
   closed,           ///< the service has ended
-  badIdentifier,    ///< an identifier that no app can have
-  noCoordinator,    ///< there is none to do it to
-  ended,            ///< the coordinator, placeholder or promise is over
-  installing,       ///< too late: the app is being installed
-  setBefore,        ///< it can be set once only
-  notUsable,        ///< a promise or placeholder that is somebody else's, for another app, or null
-  foreignClient,    ///< only the client that made it may do that
-  noPackage,        ///< the app-asset promise is complete and has no path
+  badIdentifier,    ///< not a valid bundle identifier
+  noCoordinator,    ///< the app has no coordinator
+  ended,            ///< the coordinator, placeholder or promise has ended
+  installing,       ///< the app is being installed
+  setBefore,        ///< the value can be set only once
+  notUsable,        ///< a promise or placeholder that is null, in use, for another app or of another service
+  foreignClient,    ///< the operation is reserved for another client
+  noPackage,        ///< the app-asset promise was completed without a path
   cancelledByUser,  ///< the reason of `InstallCoordination::cancelByUser`
   appRemoved,       ///< the reason when an app is uninstalled
 };

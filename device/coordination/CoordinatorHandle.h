@@ -1,4 +1,4 @@
-// A coordinator, as clients hold it.
+// The clients' handle of a coordinator.
 #pragma once
 
 #include <memory>
@@ -15,7 +15,7 @@ namespace appsync::device {
 
 class CoordinatorHandle final : public ServiceHandle<platform::InstallCoordinator, CoordinatorState> {
  public:
-  /// `client` is who holds it, and drives the coordinator if it is its creator.
+  /// `client` is the owner of the handle, which may change the coordinator if it is its creator.
   CoordinatorHandle(std::shared_ptr<Coordinators> coordinators, std::shared_ptr<CoordinatorState> state,
                     platform::ClientIdentity client)
       : ServiceHandle(std::move(coordinators), std::move(state)), client_(client) {}
@@ -47,7 +47,7 @@ class CoordinatorHandle final : public ServiceHandle<platform::InstallCoordinato
   const platform::ClientIdentity client_;
 };
 
-/// "initiating", "updating", "restoring", "restoring demoted", "any".
+/// Returns "initiating", "updating", "restoring", "restoring demoted" or "any".
 [[nodiscard]] std::string_view nameOf(platform::CoordinatorKind kind);
 
 }  // namespace appsync::device

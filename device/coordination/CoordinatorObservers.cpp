@@ -42,16 +42,16 @@ void CoordinatorObservers::disconnect(const Connection& connection) {
   callbacks_.forget(&connection);
 }
 
-void CoordinatorObservers::tell(ClientIdentity creator, const Observer& observer, const Report& report) {
+void CoordinatorObservers::notify(ClientIdentity creator, const Observer& observer, const Report& report) {
   const std::lock_guard lock(mutex_);
-  std::vector<const void*> told;
+  std::vector<const void*> notified;
   for (const Connection* connection : connections_) {
     InstallObserverDelegate* delegate = &connection->delegate();
-    if (!connection->wants(creator) || std::ranges::find(told, delegate) != told.end()) continue;
-    told.push_back(delegate);
+    if (!connection->wants(creator) || std::ranges::find(notified, delegate) != notified.end()) continue;
+    notified.push_back(delegate);
     post(connection, [report, delegate] { report(*delegate); });
   }
-  if (observer.address == nullptr || std::ranges::find(told, observer.address) != told.end()) return;
+  if (observer.address == nullptr || std::ranges::find(notified, observer.address) != notified.end()) return;
   post(this, [report, weak = observer.delegate] {
     if (const auto delegate = weak.lock()) report(*delegate);
   });
@@ -62,18 +62,18 @@ void CoordinatorObservers::post(const void* receiver, std::function<void()> call
     const std::lock_guard lock(pendingMutex_);
     ++pending_;
   }
-  // Goes when the callback has run or was dropped.
+  // Destroyed when the callback has run or was dropped.
   const std::shared_ptr<void> pending(this, [](void* observers) {
     auto* self = static_cast<CoordinatorObservers*>(observers);
     const std::lock_guard lock(self->pendingMutex_);
-    if (--self->pending_ == 0) self->told_.notify_all();
+    if (--self->pending_ == 0) self->delivered_.notify_all();
   });
   callbacks_.post(receiver, [callback = std::move(callback), pending] { callback(); });
 }
 
-bool CoordinatorObservers::waitUntilTold(std::chrono::steady_clock::time_point deadline) {
+bool CoordinatorObservers::waitUntilDelivered(std::chrono::steady_clock::time_point deadline) {
   std::unique_lock lock(pendingMutex_);
-  return told_.wait_until(lock, deadline, [this] { return pending_ == 0; });
+  return delivered_.wait_until(lock, deadline, [this] { return pending_ == 0; });
 }
 
 }  // namespace appsync::device

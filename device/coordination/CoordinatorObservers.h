@@ -1,4 +1,4 @@
-// Who hears of coordinators.
+// The observers of coordinators.
 #pragma once
 
 #include <chrono>
@@ -15,28 +15,28 @@
 
 namespace appsync::device {
 
-/// Calls delegates back on one thread, one after the other. Threads: any, from callbacks too, unless said otherwise.
+/// Calls delegates on one thread, one at a time. Thread-safe; callable from callbacks unless documented otherwise.
 class CoordinatorObservers : public std::enable_shared_from_this<CoordinatorObservers> {
  public:
-  /// What a delegate is told.
+  /// Calls the matching operation of a delegate.
   using Report = std::function<void(platform::InstallObserverDelegate& delegate)>;
-  /// A delegate of one coordinator's. `address` is compared only.
+  /// The delegate of a single coordinator. `address` identifies it and is never dereferenced.
   struct Observer {
     std::weak_ptr<platform::InstallObserverDelegate> delegate;
     const void* address = nullptr;
   };
 
-  /// A connection, which may outlive the service.
+  /// Connects a delegate to the coordinators of `clients`. The connection may outlive the service.
   [[nodiscard]] std::unique_ptr<platform::InstallObserver> connect(const std::set<platform::ClientIdentity>& clients,
                                                                    platform::InstallObserverDelegate& delegate);
 
-  /// Tells all connections that want to hear of `creator`'s coordinators, and `observer`, each delegate once.
-  void tell(platform::ClientIdentity creator, const Observer& observer, const Report& report);
+  /// Reports to `observer` and to every connection for coordinators of `creator`, once to each delegate.
+  void notify(platform::ClientIdentity creator, const Observer& observer, const Report& report);
 
-  /// False when not everybody has been told everything by then. Not on the callbacks' thread.
-  [[nodiscard]] bool waitUntilTold(std::chrono::steady_clock::time_point deadline);
+  /// Blocks until all callbacks have returned. Returns false on time-out. Must not be called from a callback.
+  [[nodiscard]] bool waitUntilDelivered(std::chrono::steady_clock::time_point deadline);
 
-  /// Nobody is told anything any more. Not on the callbacks' thread.
+  /// Stops all callbacks. Must not be called from a callback.
   void end() { callbacks_.stop(); }
 
  private:
@@ -48,8 +48,8 @@ class CoordinatorObservers : public std::enable_shared_from_this<CoordinatorObse
   std::mutex mutex_;
   std::vector<const Connection*> connections_;
   std::mutex pendingMutex_;
-  std::condition_variable told_;
-  /// Callbacks that are queued or running.
+  std::condition_variable delivered_;
+  /// The number of queued and running callbacks.
   std::size_t pending_ = 0;
   CallbackThread callbacks_;
 };

@@ -1,4 +1,4 @@
-// The coordinators' rows: what a restart takes up again.
+// The database tables of coordinators, from which a restart resumes.
 #pragma once
 
 #include <memory>
@@ -49,25 +49,25 @@ create table if not exists coordinator_placeholders (
 create table if not exists spent_packages (path text primary key) strict, without rowid;
 )";
 
-/// Every coordinator, in the order in which they were made; none where the tables are still missing.
+/// Returns every coordinator, the oldest first, or none if the tables do not exist yet.
 [[nodiscard]] Result<std::vector<std::shared_ptr<CoordinatorState>>> all(Database::Session& session);
 
-/// Makes a row, in place of one that could not be taken away when its coordinator ended, and gives `state` its number.
+/// Inserts a coordinator, replacing the row of an ended one that could not be deleted, and sets `state.number`.
 Status insert(Database::Session& session, CoordinatorState& state);
 
-// Of a coordinator whose row has gone nothing is stored, or the statement fails.
+// For a coordinator without a row the following functions store nothing or fail.
 
 Status storeChoices(Database::Session& session, std::int64_t coordinator, const CoordinatorChoices& choices);
-/// The coordinator's promise in that role, which is not one for initial ODR assets.
+/// Stores the coordinator's promise in a role other than `initialODRAsset`.
 Status storePromise(Database::Session& session, std::int64_t coordinator, PromiseRole role,
                     const PromiseState& promise);
-/// The placeholder with its icon's promise.
+/// Stores the placeholder and the promise of its icon.
 Status storePlaceholder(Database::Session& session, std::int64_t coordinator, const PlaceholderState& placeholder);
 
-/// Takes a coordinator away with all that is its. A package that is the service's by then is spent from now on.
+/// Deletes a coordinator with its promises and placeholder. Records its package, if the service owns it, as spent.
 Status remove(Database::Session& session, const CoordinatorState& state);
 
-/// Packages that are to be removed and may still be there.
+/// Returns the paths of packages to delete, which may be deleted already.
 [[nodiscard]] Result<std::vector<std::string>> spentPackages(Database::Session& session);
 Status forgetSpentPackage(Database::Session& session, std::string_view path);
 

@@ -19,13 +19,12 @@ namespace {
 
 Status checkPromise(const std::shared_ptr<PromiseState>& promise) {
   if (promise == nullptr) {
-    return coordinationError(CoordinationFailure::notUsable, "this is no promise of the service");
+    return coordinationError(CoordinationFailure::notUsable, "this is not a promise of the service");
   }
   if (promise->stage == PromiseStage::withdrawn) {
     return coordinationError(CoordinationFailure::ended, "the promise was withdrawn");
   }
-  if (promise->role)
-    return coordinationError(CoordinationFailure::notUsable, "the promise is something else's already");
+  if (promise->role) return coordinationError(CoordinationFailure::notUsable, "the promise is already in use");
   return {};
 }
 
@@ -103,14 +102,14 @@ Status Coordinators::mayChange(const CoordinatorState& coordinator, ClientIdenti
     return coordinationError(CoordinationFailure::ended, "the coordinator has ended");
   }
   if (client != coordinator.creator) {
-    return coordinationError(CoordinationFailure::foreignClient, "only the client that made the coordinator drives it");
+    return coordinationError(CoordinationFailure::foreignClient, "only the creator of the coordinator may change it");
   }
-  if (wasSet) return coordinationError(CoordinationFailure::setBefore, "the coordinator has that already");
+  if (wasSet) return coordinationError(CoordinationFailure::setBefore, "this was set before");
   return {};
 }
 
-Status Coordinators::store(const CoordinatorState& coordinator, const Store& store) {
-  // While the app is installed its coordinator's rows go, with the app's record.
+Status Coordinators::store(const CoordinatorState& coordinator, const TransactionHook& store) {
+  // While the app is being installed, the transaction that records it deletes the rows.
   if (coordinator.stage != CoordinatorStage::waiting) return {};
   Database::Transaction transaction(database_);
   store(transaction);
@@ -179,7 +178,8 @@ Status Coordinators::setPromise(const Coordinator& coordinator, ClientIdentity c
   RETURN_IF_ERROR(mayChange(*coordinator, mayDrive ? coordinator->creator : client, place != nullptr));
   RETURN_IF_ERROR(checkPromise(promise));
   if (isAppAsset && promise->client != responsible) {
-    return coordinationError(CoordinationFailure::foreignClient, "another client is to make the app-asset promise");
+    return coordinationError(CoordinationFailure::foreignClient,
+                             "another client is responsible for the app-asset promise");
   }
   const auto store = [&](Database::Session& session) {
     coordinator_table::storePromise(session, coordinator->number, role, *promise).ignore();
@@ -198,7 +198,7 @@ Status Coordinators::setPlaceholder(const Coordinator& coordinator, ClientIdenti
   const std::lock_guard lock(mutex_);
   RETURN_IF_ERROR(mayChange(*coordinator, client, coordinator->placeholder != nullptr));
   if (placeholder == nullptr || placeholder->isAttached || placeholder->identifier != coordinator->identifier) {
-    return coordinationError(CoordinationFailure::notUsable, "this is no placeholder for the coordinator");
+    return coordinationError(CoordinationFailure::notUsable, "this is not a placeholder for the coordinator");
   }
   RETURN_IF_ERROR(checkOpen(*placeholder));
   const auto store = [&](Database::Session& session) {
@@ -209,7 +209,7 @@ Status Coordinators::setPlaceholder(const Coordinator& coordinator, ClientIdenti
   placeholder->isAttached = true;
   placeholder->coordinator = coordinator;
   if (placeholder->icon) placeholder->icon->coordinator = coordinator;
-  if (placeholder->isConfigured) tell(coordinator, &InstallObserverDelegate::coordinatorDidInstallPlaceholder);
+  if (placeholder->isConfigured) notify(coordinator, &InstallObserverDelegate::coordinatorDidInstallPlaceholder);
   followPromise(*coordinator);
   advance(coordinator);
   endIfDemoted(coordinator);
@@ -224,7 +224,7 @@ void Coordinators::endIfDemoted(const Coordinator& coordinator) {
   if (icon && icon->isOpen() && !icon->isComplete) return;
   Database::Transaction transaction(database_);
   coordinator_table::remove(transaction, *coordinator).ignore();
-  // What cannot be stored now ends when the device is opened next.
+  // After a failure the coordinator ends when the device is next opened.
   if (transaction.commit()) close(coordinator, std::nullopt);
 }
 
@@ -232,7 +232,7 @@ bool Coordinators::reinstallsDemotedApp(const PlaceholderState& placeholder) con
   return !isDemotion(placeholder.installType) && registry_.isDemoted(placeholder.identifier);
 }
 
-Status Coordinators::show(const PlaceholderState& placeholder, const Store& store) {
+Status Coordinators::show(const PlaceholderState& placeholder, const TransactionHook& store) {
   if (reinstallsDemotedApp(placeholder)) return registry_.beginReturn(placeholder.identifier, store);
   Result<PlaceholderContainer> made = makePlaceholder(files_, contentsOf(placeholder));
   if (!made) return made.error();
@@ -258,11 +258,12 @@ Status Coordinators::cancelAll(std::string_view identifier, const Error& reason,
   const CoordinatorList coordinators = ofApp(identifier);
   if (coordinators.empty()) {
     return coordinationError(CoordinationFailure::noCoordinator,
-                             "no install of \"" + std::string(identifier) + "\" is under way");
+                             "\"" + std::string(identifier) + "\" is not being installed");
   }
   if (isInstalling(identifier)) {
-    return coordinationError(CoordinationFailure::installing,
-                             "\"" + std::string(identifier) + "\" is just being installed; wait until that has ended");
+    return coordinationError(
+        CoordinationFailure::installing,
+        "\"" + std::string(identifier) + "\" is being installed; wait until the install has ended");
   }
   for (const Coordinator& coordinator : coordinators) {
     RETURN_IF_ERROR(cancelNow(coordinator, reason, client));
@@ -275,13 +276,13 @@ Status Coordinators::cancelNow(const Coordinator& coordinator, const Error& reas
     return coordinationError(CoordinationFailure::ended, "the coordinator has ended");
   }
   if (coordinator->stage == CoordinatorStage::installing) {
-    return coordinationError(CoordinationFailure::installing, "the app is just being installed");
+    return coordinationError(CoordinationFailure::installing, "the app is being installed");
   }
   RETURN_IF_ERROR(erase(*coordinator));
   removePackage(*coordinator);
   close(coordinator, reason);
   if (client == coordinator->creator) return {};
-  tell(coordinator, [reason, client](InstallObserverDelegate& delegate, InstallCoordinator& handle) {
+  notify(coordinator, [reason, client](InstallObserverDelegate& delegate, InstallCoordinator& handle) {
     delegate.coordinatorCanceledWithReason(handle, reason, client);
   });
   return {};
@@ -324,9 +325,9 @@ void Coordinators::close(const Coordinator& coordinator, std::optional<Error> er
   if (ofApp->second.empty()) coordinators_.erase(ofApp);
 }
 
-void Coordinators::tell(const Coordinator& coordinator, Report report) {
+void Coordinators::notify(const Coordinator& coordinator, Report report) {
   const auto handle = std::make_shared<CoordinatorHandle>(shared_from_this(), coordinator, coordinator->creator);
-  observers_->tell(
+  observers_->notify(
       coordinator->creator, coordinator->observer,
       [handle, report = std::move(report)](InstallObserverDelegate& delegate) { report(delegate, *handle); });
 }

@@ -1,4 +1,4 @@
-// Every coordinator of a device, and what becomes of it.
+// The coordinators of a device and the operations on them.
 #pragma once
 
 #include <chrono>
@@ -24,13 +24,14 @@
 
 namespace appsync::device {
 
-/// What is known of coordinators is in memory and written through: it is in the database before a change returns, but
-/// for how far a promise is and the path of one that is not complete, which are written when it completes or the
-/// service ends. Nothing here waits for the disk: what a loss of power takes back is offered again.
+/// States are kept in memory and written through to the database; CoordinatorState.h shows the stages and what each
+/// operation stores. Nothing waits for the disk: after a power failure the last changes are lost and clients request
+/// the packages again.
 ///
-/// One lock guards all states. With it held the database, the registry and the disk are used, never a client.
+/// One lock guards all states. It is held during use of the database, the registry and the disk, never during
+/// callbacks.
 ///
-/// Handles share it and may outlive the service; all that would change something fails then. Threads: any.
+/// Handles share this object and may outlive the service; changes then fail. Thread-safe.
 class Coordinators : public std::enable_shared_from_this<Coordinators> {
  public:
   static constexpr std::size_t kInstallsAtOnce = 10;
@@ -40,17 +41,17 @@ class Coordinators : public std::enable_shared_from_this<Coordinators> {
   using Configuration = std::function<Status(PlaceholderState& copy)>;
   using Completion = platform::InstallCoordination::UninstallCompletion;
 
-  /// All must live until `end` has returned.
+  /// All arguments must outlive `end`.
   Coordinators(Database& database, DeviceFileSystem& files, AppRegistry& registry)
       : database_(database), files_(files), registry_(registry) {}
 
-  /// Takes up the coordinators that an earlier process left: shows their placeholders, installs what is ready.
+  /// Resumes the coordinators of an earlier process: shows their placeholders and installs the apps that are ready.
   void begin();
-  /// Ends the service: what is being installed is finished, what is not yet waits for the next `begin`; removals are
-  /// made. When it returns nothing of the service runs. Not on a thread of the service's.
+  /// Ends the service: finishes running installs and all removals; other installs wait for the next `begin`. Blocks
+  /// until all threads of the service have ended. Must not be called on one of them.
   void end();
 
-  /// Looks at states.
+  /// Runs `read` with the lock held.
   template <class Read>
   [[nodiscard]] auto read(const Read& read) const {
     const std::lock_guard lock(mutex_);
@@ -61,10 +62,10 @@ class Coordinators : public std::enable_shared_from_this<Coordinators> {
                                  platform::ClientIdentity client) const;
   [[nodiscard]] Result<Coordinator> findOrMake(platform::CoordinatorKind kind, std::string_view identifier,
                                                platform::ClientIdentity client, bool& isNew);
-  /// The oldest first.
+  /// Returns every coordinator, the oldest first.
   [[nodiscard]] CoordinatorList all() const;
 
-  // Changes of a coordinator by `client`, each all or nothing.
+  // Changes of a coordinator by `client`. A failure changes nothing.
 
   void setObserver(const Coordinator& coordinator, CoordinatorObservers::Observer observer);
   Status setOptions(const Coordinator& coordinator, platform::ClientIdentity client, CoordinatorOptions options);
@@ -72,7 +73,7 @@ class Coordinators : public std::enable_shared_from_this<Coordinators> {
                              std::vector<std::shared_ptr<PromiseState>> promises);
   Status setResponsibleClient(const Coordinator& coordinator, platform::ClientIdentity client,
                               platform::ClientIdentity responsible);
-  /// The app asset, which the responsible client may give too, or the user data.
+  /// Sets the app asset, which the responsible client may set too, or the user data.
   Status setPromise(const Coordinator& coordinator, platform::ClientIdentity client, PromiseRole role,
                     std::shared_ptr<PromiseState> promise);
   Status setPlaceholder(const Coordinator& coordinator, platform::ClientIdentity client,
@@ -89,59 +90,59 @@ class Coordinators : public std::enable_shared_from_this<Coordinators> {
 
   // Changes of placeholders.
 
-  /// Makes a change to one that can still be configured. A failing change changes nothing.
+  /// Changes a placeholder whose configuration is not complete. A failure changes nothing.
   Status configure(const std::shared_ptr<PlaceholderState>& placeholder, const Configuration& change);
   Status withdraw(const std::shared_ptr<PlaceholderState>& placeholder, platform::ClientIdentity client);
 
-  /// Cancels all coordinators of an app; fails when there are none, or one that installs.
+  /// Cancels all coordinators of an app. Fails if there are none or one is installing.
   Status cancelAll(std::string_view identifier, const Error& reason, platform::ClientIdentity client);
   bool prioritize(std::string_view identifier);
-  /// Removes an app on a thread of the service's.
+  /// Removes an app on a thread of the service, which calls `completion`.
   void uninstall(std::string identifier, Completion completion);
 
-  /// False when, by then, something was still being installed, removed or told.
+  /// Blocks until all installs, removals and callbacks have ended. Returns false on time-out.
   [[nodiscard]] bool waitUntilIdle(std::chrono::steady_clock::time_point deadline);
 
   [[nodiscard]] CoordinatorObservers& observers() noexcept { return *observers_; }
 
  private:
-  using Store = TransactionHook;
   using Report = std::function<void(platform::InstallObserverDelegate&, platform::InstallCoordinator&)>;
 
   // With the lock held.
 
   [[nodiscard]] Status checkOpen() const;
   [[nodiscard]] static Status checkOpen(const PlaceholderState& placeholder);
-  /// Whether `client` may set something of a coordinator, that was set before or not.
+  /// Checks that `client` may set a value of a coordinator that, if `wasSet`, was set before.
   [[nodiscard]] Status mayChange(const CoordinatorState& coordinator, platform::ClientIdentity client,
                                  bool wasSet) const;
-  [[nodiscard]] Status store(const CoordinatorState& coordinator, const Store& store);
+  [[nodiscard]] Status store(const CoordinatorState& coordinator, const TransactionHook& store);
   [[nodiscard]] Status choose(const Coordinator& coordinator, CoordinatorChoices choices);
-  [[nodiscard]] Status show(const PlaceholderState& placeholder, const Store& store);
-  /// Whether it is a demoted app's, whose own placeholder stays: it is what is left if the install comes to nothing.
+  [[nodiscard]] Status show(const PlaceholderState& placeholder, const TransactionHook& store);
+  /// Returns whether the placeholder is for a demoted app, which keeps its own placeholder if the install fails.
   [[nodiscard]] bool reinstallsDemotedApp(const PlaceholderState& placeholder) const;
+  /// Updates the progress of the placeholder's install from the app asset.
   void followPromise(const CoordinatorState& coordinator);
   /// Installs the app if all conditions are met.
   void advance(const Coordinator& coordinator);
   Status cancelNow(const Coordinator& coordinator, const Error& reason, platform::ClientIdentity client);
-  /// Takes the rows and the placeholder away.
+  /// Deletes the rows and removes the placeholder.
   [[nodiscard]] Status erase(const CoordinatorState& coordinator);
-  /// Ends a coordinator whose rows have gone.
+  /// Ends a coordinator whose rows were deleted.
   void close(const Coordinator& coordinator, std::optional<Error> error);
   [[nodiscard]] CoordinatorList ofApp(std::string_view identifier) const;
   [[nodiscard]] bool isInstalling(std::string_view identifier) const;
-  /// Ends one that restores a demoted app, once its placeholder is shown: nobody brings a package.
+  /// Ends a coordinator that restores a demoted app once its placeholder is shown: no package is expected.
   void endIfDemoted(const Coordinator& coordinator);
-  /// Shows the placeholder again if nothing does.
+  /// Shows the placeholder again if the registry has none.
   void ensurePlaceholderShown(const CoordinatorState& coordinator);
-  void tell(const Coordinator& coordinator, Report report);
+  void notify(const Coordinator& coordinator, Report report);
 
-  // With it or without.
+  // With or without the lock held.
 
-  /// Removes the package that is the service's, if there is one.
+  /// Deletes the package that the service owns, if any.
   void removePackage(const CoordinatorState& coordinator);
 
-  // Without it.
+  // Without the lock held.
 
   void install(const Coordinator& coordinator);
   [[nodiscard]] std::optional<Error> uninstallNow(const std::string& identifier);
@@ -161,7 +162,7 @@ class Coordinators : public std::enable_shared_from_this<Coordinators> {
   std::size_t removals_ = 0;
   bool isEnding_ = false;
   std::unique_ptr<OperationQueue> installs_ = std::make_unique<OperationQueue>(kInstallsAtOnce);
-  /// Apart from installs, for which a removal may have to wait.
+  /// Separate from installs, because a removal may wait for one.
   std::unique_ptr<OperationQueue> removalQueue_ = std::make_unique<OperationQueue>(1);
 };
 

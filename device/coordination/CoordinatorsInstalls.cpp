@@ -1,4 +1,4 @@
-// What the service does of itself: installs, removals, what an earlier process left.
+// Installs and removals on the service's threads, and the resumption of an earlier process's coordinators.
 #include <algorithm>
 
 #include <unistd.h>
@@ -15,7 +15,7 @@ using platform::TSInstallState;
 
 namespace {
 
-/// What the installer is asked; the placeholder says what the options do not.
+/// Returns the request of a coordinator. The placeholder's values are the defaults.
 InstallRequest requestOf(const CoordinatorState& coordinator) {
   InstallRequest request;
   request.identifier = coordinator.identifier;
@@ -42,7 +42,7 @@ void Coordinators::begin() {
     coordinators_[coordinator->identifier].push_back(coordinator);
   for (const Coordinator& coordinator : *left) {
     ensurePlaceholderShown(*coordinator);
-    // Nobody sends its package just now.
+    // No process is loading its package.
     const auto progress = registry_.runningInstalls().find(coordinator->identifier);
     if (progress != nullptr) progress->setInstallState(TSInstallState::Waiting);
     advance(coordinator);
@@ -54,7 +54,7 @@ void Coordinators::ensurePlaceholderShown(const CoordinatorState& coordinator) {
   if (!coordinator.showsPlaceholder() || coordinator.stage != CoordinatorStage::waiting) return;
   const auto app = registry_.recordForIdentifier(coordinator.identifier, platform::PlaceholderLookup::on);
   const bool isShown = app != nullptr && app->isPlaceholder() && app->installProgress() != nullptr;
-  // A home screen without it does not keep the app from being installed.
+  // The app can be installed without a placeholder.
   if (!isShown) show(*coordinator.placeholder, [](Database::Session&) {}).ignore();
   followPromise(coordinator);
 }
@@ -64,7 +64,7 @@ void Coordinators::end() {
     const std::lock_guard lock(mutex_);
     isEnding_ = true;
   }
-  // First the removals, which may wait for an install.
+  // Removals first: they may wait for an install.
   removalQueue_.reset();
   installs_.reset();
   observers_->end();
@@ -107,26 +107,26 @@ void Coordinators::install(const Coordinator& coordinator) {
     }
     request = requestOf(*coordinator);
   }
-  // Nobody changes the package's promise from here on.
+  // In the stage `installing` the app asset cannot change.
   request.transactionHook = [&](Database::Session& session) {
     coordinator_table::remove(session, *coordinator).ignore();
   };
   const auto& path = coordinator->appAsset->transferPath;
-  const Status installed = path ? registry_.installPackage(*path, request)
-                                : coordinationError(CoordinationFailure::noPackage,
-                                                    "the app-asset promise is complete and names no package");
+  const Status installed =
+      path ? registry_.installPackage(*path, request)
+           : coordinationError(CoordinationFailure::noPackage, "the app-asset promise was completed without a package");
   if (installed) removePackage(*coordinator);
   const std::lock_guard lock(mutex_);
   if (!installed) {
     registry_.runningInstalls().end(coordinator->identifier, TSInstallState::Failed);
-    // What cannot be taken away now is tried again when the device is opened next.
+    // After a failure the app is installed again when the device is next opened.
     if (erase(*coordinator)) removePackage(*coordinator);
   }
   close(coordinator, installed.failure());
-  // The end of one coordinator's install is the end of the app's placeholder.
+  // The end of the install has removed the app's placeholder, which other coordinators need.
   for (const Coordinator& other : ofApp(coordinator->identifier))
     ensurePlaceholderShown(*other);
-  tell(coordinator, &InstallObserverDelegate::coordinatorDidCompleteSuccessfully);
+  notify(coordinator, &InstallObserverDelegate::coordinatorDidCompleteSuccessfully);
   --installing_;
   changed_.notify_all();
 }
@@ -135,7 +135,7 @@ void Coordinators::removePackage(const CoordinatorState& coordinator) {
   const auto path = coordinator.ownPackage();
   if (!path) return;
   const Result<RootDirectory::Place> place = files_.root().place(*path);
-  // A folder in a package's place is not the service's to remove.
+  // Fails for a directory, which is not a package.
   if (place) static_cast<void>(sys::removeFile(place->folder.get(), place->name.c_str()));
   Database::Session session(database_);
   coordinator_table::forgetSpentPackage(session, *path).ignore();
@@ -153,7 +153,7 @@ bool Coordinators::prioritize(std::string_view identifier) {
   if (coordinators.empty() || isEnding_) return false;
   registry_.prioritizeInstall(identifier);
   for (const Coordinator& coordinator : coordinators)
-    tell(coordinator, &InstallObserverDelegate::coordinatorShouldPrioritize);
+    notify(coordinator, &InstallObserverDelegate::coordinatorShouldPrioritize);
   return true;
 }
 
@@ -197,8 +197,8 @@ bool Coordinators::waitUntilIdle(std::chrono::steady_clock::time_point deadline)
       std::unique_lock lock(mutex_);
       if (!changed_.wait_until(lock, deadline, isIdle)) return false;
     }
-    if (!observers_->waitUntilTold(deadline)) return false;
-    // Who was told may have set something off.
+    if (!observers_->waitUntilDelivered(deadline)) return false;
+    // A callback may have started an install or removal.
     const std::lock_guard lock(mutex_);
     if (isIdle()) return true;
   }

@@ -14,12 +14,12 @@ using platform::TSInstallState;
 
 namespace {
 
-/// An install's progress is counted in thousandths.
+/// The total units of an install's progress.
 constexpr double kProgressUnits = 1000;
 
 Error foreign(std::string_view what) {
   return coordinationError(CoordinationFailure::foreignClient,
-                           "only the client that made the " + std::string(what) + " withdraws it");
+                           "only the creator of the " + std::string(what) + " may withdraw it");
 }
 
 }  // namespace
@@ -44,8 +44,8 @@ void Coordinators::followPromise(const CoordinatorState& coordinator) {
 
 void Coordinators::setTransferPath(const std::shared_ptr<PromiseState>& promise, const platform::FileLocation& path) {
   const std::lock_guard lock(mutex_);
-  const bool isTheServices = promise->isComplete && promise->role;
-  if (isEnding_ || !promise->isOpen() || isTheServices) return;
+  const bool isOwnedByService = promise->isComplete && promise->role;
+  if (isEnding_ || !promise->isOpen() || isOwnedByService) return;
   promise->transferPath = path;
   promise->hasUnsavedChanges = true;
 }
@@ -65,7 +65,7 @@ void Coordinators::fulfil(const std::shared_ptr<PromiseState>& promise) {
     endIfDemoted(coordinator);
     return;
   }
-  // What cannot be stored is complete all the same, for as long as the service lives.
+  // After a failure the promise is complete until the process ends.
   this->store(*coordinator, store).ignore();
   advance(coordinator);
 }
@@ -77,7 +77,7 @@ Status Coordinators::withdraw(const std::shared_ptr<PromiseState>& promise, Clie
   const Coordinator coordinator = promise->coordinator.lock();
   if (promise->role && client != promise->client) return foreign("promise");
   if (coordinator && promise->role == PromiseRole::appAsset && coordinator->stage == CoordinatorStage::installing) {
-    return coordinationError(CoordinationFailure::installing, "the app is just being installed");
+    return coordinationError(CoordinationFailure::installing, "the app is being installed");
   }
   if (coordinator && promise->role != PromiseRole::initialODRAsset) {
     PromiseState copy = *promise;
@@ -123,7 +123,7 @@ Status Coordinators::configure(const std::shared_ptr<PlaceholderState>& placehol
   }
   static_cast<PlaceholderConfiguration&>(*placeholder) = std::move(copy);
   if (!isToShow) return {};
-  tell(coordinator, &InstallObserverDelegate::coordinatorDidInstallPlaceholder);
+  notify(coordinator, &InstallObserverDelegate::coordinatorDidInstallPlaceholder);
   followPromise(*coordinator);
   endIfDemoted(coordinator);
   return {};

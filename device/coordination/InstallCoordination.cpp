@@ -19,7 +19,7 @@ Error noBundleIdentifier(std::string_view text) {
   constexpr std::size_t kShown = 80;
   return coordinationError(CoordinationFailure::badIdentifier,
                            "\"" + std::string(text.substr(0, kShown)) + (text.size() > kShown ? "…" : "") +
-                               "\" is no bundle identifier: it may have only letters, digits, '-', '.' and '_', at "
+                               "\" is not a bundle identifier: it may have only letters, digits, '-', '.' and '_', at "
                                "most 200 and no dot first");
 }
 
@@ -154,8 +154,8 @@ Result<std::vector<CoordinatorSummary>> InstallCoordination::list() {
   return summaries;
 }
 
-bool InstallCoordination::waitUntilIdle(std::chrono::milliseconds patience) {
-  return coordinators_->waitUntilIdle(std::chrono::steady_clock::now() + patience);
+bool InstallCoordination::waitUntilIdle(std::chrono::milliseconds timeout) {
+  return coordinators_->waitUntilIdle(std::chrono::steady_clock::now() + timeout);
 }
 
 }  // namespace appsync::device

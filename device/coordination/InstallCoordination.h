@@ -17,41 +17,40 @@
 
 namespace appsync::device {
 
-/// How far a coordinator is.
+/// The phase of a coordinator, for users.
 enum class CoordinatorPhase : std::uint8_t {
-  preparing,   ///< nobody has promised its package yet
-  loading,     ///< its package is on its way
-  waiting,     ///< its package is there, something else is missing
-  installing,  ///< its app is being installed, or about to be
+  preparing,   ///< without a promise of its package
+  loading,     ///< its package is being loaded
+  waiting,     ///< its package is complete, another condition is not met
+  installing,  ///< its app is being installed or queued
 };
 
-/// A coordinator, for people to see.
+/// The description of a coordinator for users.
 struct CoordinatorSummary {
   std::string identifier;
-  /// The placeholder's, or the identifier.
+  /// The placeholder's name, or the identifier.
   std::string name;
   platform::CoordinatorKind kind = platform::CoordinatorKind::initiating;
   platform::ClientIdentity creator = platform::ClientIdentity::CXClientSync;
   CoordinatorPhase phase = CoordinatorPhase::preparing;
-  /// Of the package, from 0 to 1.
+  /// The loaded fraction of the package, from 0 to 1.
   double fraction = 0;
 };
 
-/// Installs several apps at once, on threads of its own. Coordinators outlive the process: the next one that holds the
-/// device takes them up where they were, and installs at once what only lacked that.
+/// Installs several apps at once on its own threads. Coordinators are stored in the device's database: the next process
+/// with exclusive access resumes them and installs the apps that are ready. Thread-safe.
 ///
-/// Where coordination is off there are no coordinators, placeholders or promises to be had; apps can be removed.
+/// If coordination is off, coordinators, placeholders and promises are not available; apps can be removed.
 ///
-/// Identifiers are bundle identifiers of this device, see `isBundleIdentifier`; no other gets a coordinator or
-/// placeholder.
+/// Rejects invalid bundle identifiers; see `isBundleIdentifier`.
 class InstallCoordination final : public platform::InstallCoordination {
  public:
   static constexpr const char* kSchema = coordinator_table::kSchema;
 
-  /// All must outlive the service. Coordination is on or off for the service's whole life.
+  /// All references must outlive the service, which reads the setting "coordination" only here.
   InstallCoordination(Database& database, DeviceFileSystem& files, AppRegistry& registry, Settings& settings,
                       Access access);
-  /// Finishes what is being installed or removed; see `Coordinators::end`.
+  /// Finishes running installs and removals; see `Coordinators::end`.
   ~InstallCoordination() override;
   InstallCoordination(const InstallCoordination&) = delete;
   InstallCoordination& operator=(const InstallCoordination&) = delete;
@@ -69,8 +68,8 @@ class InstallCoordination final : public platform::InstallCoordination {
       std::uint64_t diskSpaceNeeded) override;
   [[nodiscard]] std::shared_ptr<platform::PromisedOutOfBandTransfer> makePromisedOutOfBandTransfer(
       std::string_view name, platform::ClientIdentity client, std::uint64_t diskSpaceNeeded) override;
-  /// Nobody is asked on this device. Coordinators are cancelled in the name of the device's user. An app that is just
-  /// being installed is removed once that has ended.
+  /// Never asks for confirmation. Cancels the app's coordinators as the user. Removes an app that is being installed
+  /// after the install has ended.
   void uninstallApp(std::string_view bundleIdentifier, platform::UserConfirmation confirmation,
                     UninstallCompletion completion) override;
   [[nodiscard]] Error createUserPresentableError(long code, const plist::Dictionary& information,
@@ -79,22 +78,22 @@ class InstallCoordination final : public platform::InstallCoordination {
       std::string_view serviceName, const std::set<platform::ClientIdentity>& clients,
       platform::InstallObserverDelegate& delegate) override;
 
-  // What only tools need.
+  // For tools.
 
-  /// The user tapped an app that is on its way: it comes before the others in the registry's order, and observers hear
-  /// of it. False when there is no coordinator for it.
+  /// Moves the install of an app, which the user tapped, to the front of the registry's order and notifies observers.
+  /// Returns false if the app has no coordinator.
   bool prioritize(std::string_view bundleIdentifier);
 
-  /// The user deleted an app that is on its way: all its coordinators are cancelled with `CXClientUser` and the reason
-  /// "cancelled on the device". An app under the placeholder stays. Fails when there is none, and while one installs.
+  /// Cancels all coordinators of an app, which the user deleted, with `CXClientUser` and the reason "cancelled on the
+  /// device". Keeps an app under the placeholder. Fails if there is no coordinator or one is installing.
   Status cancelByUser(std::string_view bundleIdentifier);
 
-  /// Every coordinator, the oldest first; a reader of the device sees what its holder stored last.
+  /// Returns every coordinator, the oldest first; on a read-only device, as last stored by another process.
   [[nodiscard]] Result<std::vector<CoordinatorSummary>> list();
 
-  /// Waits until no app is being installed or removed and everybody has been told; false if that takes longer.
-  /// Coordinators that lack something are not waited for. Not in callbacks.
-  [[nodiscard]] bool waitUntilIdle(std::chrono::milliseconds patience);
+  /// Blocks until all installs, removals and callbacks have ended. Does not wait for coordinators that are not ready.
+  /// Returns false on time-out. Must not be called from a callback.
+  [[nodiscard]] bool waitUntilIdle(std::chrono::milliseconds timeout);
 
  private:
   Database& database_;

@@ -17,7 +17,7 @@ Status PlaceholderHandle::setIconPromise(std::shared_ptr<platform::PromisedTrans
   return coordinators_->configure(state_, [&](PlaceholderState& copy) -> Status {
     const bool isUsable =
         icon != nullptr && !icon->role && icon->stage != PromiseStage::withdrawn && copy.icon == nullptr;
-    if (!isUsable) return coordinationError(CoordinationFailure::notUsable, "this is no icon for the placeholder");
+    if (!isUsable) return coordinationError(CoordinationFailure::notUsable, "this is not an icon for the placeholder");
     copy.icon = icon;
     return {};
   });

@@ -1,4 +1,4 @@
-// The placeholder of an app, as the client that made it holds it.
+// The clients' handle of a placeholder.
 #pragma once
 
 #include <memory>
@@ -18,7 +18,7 @@ class PlaceholderHandle final : public ServiceHandle<platform::Placeholder, Plac
   [[nodiscard]] std::string bundleID() const override { return state_->identifier; }
   [[nodiscard]] platform::TSInstallType installType() const override { return state_->installType; }
   [[nodiscard]] platform::ClientIdentity client() const override { return state_->client; }
-  /// Can be set once. An icon that comes later than the placeholder is shown is added when its promise completes.
+  /// Can be set once. If the promise completes after the placeholder is shown, the icon is added then.
   [[nodiscard]] Status setIconPromise(std::shared_ptr<platform::PromisedTransferToPath> promise) override;
   [[nodiscard]] Status setPlaceholderAttributes(const platform::PlaceholderAttributes& attributes) override;
   [[nodiscard]] Status setMetadata(const std::optional<platform::StoreMetadata>& metadata) override;
@@ -29,7 +29,7 @@ class PlaceholderHandle final : public ServiceHandle<platform::Placeholder, Plac
   [[nodiscard]] std::string description() const override { return "<placeholder " + state_->identifier + '>'; }
 };
 
-/// The state behind a placeholder that `coordinators` made; null for every other.
+/// Returns the state of a placeholder of `coordinators`, or null for null and placeholders of other services.
 [[nodiscard]] std::shared_ptr<PlaceholderState> stateOf(const Coordinators& coordinators,
                                                         const std::shared_ptr<platform::Placeholder>& placeholder);
 

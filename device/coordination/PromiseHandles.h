@@ -1,4 +1,4 @@
-// What clients promise the install-coordination service, as they hold it.
+// The clients' handles of promises.
 #pragma once
 
 #include <memory>
@@ -56,7 +56,7 @@ class OutOfBandPromise final : public PromiseHandle<platform::PromisedOutOfBandT
   using PromiseHandle::PromiseHandle;
 };
 
-/// The state behind a promise that `coordinators` made; null for every other.
+/// Returns the state of a promise of `coordinators`, or null for null and promises of other services.
 [[nodiscard]] std::shared_ptr<PromiseState> stateOf(const Coordinators& coordinators,
                                                     const std::shared_ptr<platform::InstallPromise>& promise);
 

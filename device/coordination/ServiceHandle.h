@@ -1,4 +1,4 @@
-// What clients hold of the install-coordination service.
+// The base of the clients' handles.
 #pragma once
 
 #include <memory>
@@ -8,15 +8,15 @@ namespace appsync::device {
 
 class Coordinators;
 
-/// A handle on something of the service's. Handles on one thing see the same state; they may outlive the service, and
-/// change nothing then.
+/// A handle of a state of the service. Several handles may share a state. They may outlive the service; changes then
+/// have no effect.
 template <class Interface, class State>
 class ServiceHandle : public Interface {
  public:
   ServiceHandle(std::shared_ptr<Coordinators> coordinators, std::shared_ptr<State> state)
       : coordinators_(std::move(coordinators)), state_(std::move(state)) {}
 
-  /// What it is a handle on, if that is in `coordinators`; null for what another service made.
+  /// Returns the state, or null if it belongs to another service than `coordinators`.
   [[nodiscard]] std::shared_ptr<State> stateIn(const Coordinators& coordinators) const noexcept {
     return coordinators_.get() == &coordinators ? state_ : nullptr;
   }

@@ -19,7 +19,7 @@ using platform::PromisedTransferToPath;
 
 namespace {
 
-constexpr std::size_t kPiece = std::size_t{1} << 20;
+constexpr std::size_t kBlockSize = std::size_t{1} << 20;
 
 std::shared_ptr<platform::InstallCoordinator> coordinatorOf(InstallCoordination& service,
                                                             const CoordinatorSummary& app) {
@@ -27,7 +27,7 @@ std::shared_ptr<platform::InstallCoordinator> coordinatorOf(InstallCoordination&
                                    platform::IfMissing::findNothing, nullptr, nullptr);
 }
 
-/// Whether the store's package is what a coordinator still lacks.
+/// Returns whether a coordinator waits for a package of the store.
 bool reliesOnStore(platform::InstallCoordinator& coordinator) {
   if (coordinator.appAssetPromiseResponsibleClient(nullptr) != ClientIdentity::CXClientBazaarly) return false;
   const auto promise = coordinator.appAssetPromise();
@@ -42,7 +42,7 @@ Error stopped() {
   return {std::string(domains::kPOSIX), ECANCELED, "the store was stopped", nullptr};
 }
 
-/// The promise that an earlier store client made, or a new one.
+/// Returns the promise of an earlier store client, or a new one.
 Result<std::shared_ptr<PromisedTransferToPath>> promiseFor(InstallCoordination& service,
                                                            platform::InstallCoordinator& coordinator,
                                                            const std::string& identifier) {
@@ -54,7 +54,7 @@ Result<std::shared_ptr<PromisedTransferToPath>> promiseFor(InstallCoordination& 
   return promise;
 }
 
-/// Copies one piece behind the last; `bytes` is 0 at the end.
+/// Copies the block at `offset`. Sets `bytes` to its size, 0 at the end. Returns 0 or an errno value.
 int copyPiece(int from, int to, std::uint64_t offset, Bytes& buffer, std::size_t& bytes) {
   ssize_t count = -1;
   do {
@@ -122,7 +122,7 @@ void StoreClient::sweep(const std::vector<CoordinatorSummary>& awaited) {
 void StoreClient::deliver(const CoordinatorSummary& app) {
   StoreDelivery delivery{app.identifier, app.name, {}, 0, {}};
   const auto coordinator = coordinatorOf(service_, app);
-  if (coordinator == nullptr) return;  // somebody has cancelled it meanwhile
+  if (coordinator == nullptr) return;  // It was cancelled meanwhile.
   const Result<std::string> package = find_(app.identifier);
   const auto promise = package ? promiseFor(service_, *coordinator, app.identifier)
                                : Result<std::shared_ptr<PromisedTransferToPath>>(package.error());
@@ -132,7 +132,7 @@ void StoreClient::deliver(const CoordinatorSummary& app) {
   if (!copied) return;
   (*promise)->setTransferPath({delivery.path, false});
   (*promise)->setComplete(true);
-  // Somebody may have cancelled it just now: then nobody else removes the package.
+  // A promise that was withdrawn meanwhile does not own the package.
   if (!(*promise)->isComplete()) files_.removeItem(delivery.path).ignore();
 }
 
@@ -149,7 +149,7 @@ Status StoreClient::copy(const std::string& hostPath, StoreDelivery& delivery, P
   if (!place) return place.error();
   FileDescriptor to;
   int failed = sys::createFile(place->folder.get(), name.c_str(), sys::kFileMode, to);
-  Bytes buffer(kPiece);
+  Bytes buffer(kBlockSize);
   std::size_t bytes = 1;
   while (failed == 0 && bytes > 0) {
     promise.setPercentComplete(size == 0 ? 0 : static_cast<double>(delivery.bytes) / static_cast<double>(size));

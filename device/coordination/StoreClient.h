@@ -1,4 +1,4 @@
-// The device's app store, as the client that brings the packages of restored apps.
+// The device's app store, the client that delivers the packages of restored apps.
 #pragma once
 
 #include <atomic>
@@ -17,46 +17,46 @@
 
 namespace appsync::device {
 
-/// What became of one app that the store is to bring.
+/// The result of delivering an app's package.
 struct StoreDelivery {
   std::string identifier;
-  std::string name;                   ///< as the placeholder shows it
-  std::string path;                   ///< device path of the package, when it was delivered
-  std::uint64_t bytes = 0;            ///< of the package
-  std::optional<Error> failure = {};  ///< why it was not delivered; its coordinator waits for the next store client
+  std::string name;                   ///< the placeholder's
+  std::string path;                   ///< device path of the delivered package
+  std::uint64_t bytes = 0;            ///< size of the package
+  std::optional<Error> failure = {};  ///< the coordinator then waits for the next store client
 };
 
-/// Delivers, on a thread of its own, one package after the other to the coordinators for whose app asset
-/// `CXClientBazaarly` is responsible: copies it into the device, with progress, and fulfils the promise, at which the
-/// service installs the app. One object tries each coordinator that there is by then once.
+/// Delivers packages, one at a time on its own thread, to the coordinators for whose app asset `CXClientBazaarly` is
+/// responsible: copies the package to the device, with progress, and fulfils the promise, so that the service installs
+/// the app. Tries each coordinator that exists at construction once.
 ///
-/// Nothing is lost by ending it at any moment: what was not delivered is tried again by the next one.
+/// Crash-safe: the next store client delivers the remaining packages.
 class StoreClient {
  public:
-  /// Device path of the folder in which packages lie until they are installed.
+  /// Device path of the directory of packages to install.
   static constexpr std::string_view kPackagesPath = "/var/mobile/Library/Bazaarly";
 
-  /// The host path of the app's package, or why there is none.
+  /// Returns the host path of the app's package, or an error.
   using FindPackage = std::function<Result<std::string>(std::string_view identifier)>;
-  /// Hears of each app when it was tried, on the store's thread; of a delivered one before its promise is fulfilled.
+  /// Receives the result for each app, on the store's thread and before the promise is fulfilled.
   using Report = std::function<void(const StoreDelivery& delivery)>;
 
-  /// The services must outlive it. The functions are called on the store's thread.
+  /// The services must outlive this object. The functions are called on its thread.
   StoreClient(InstallCoordination& service, DeviceFileSystem& files, FindPackage find, Report report);
-  /// Stops after the piece that is being copied.
+  /// Stops after the block that is being copied.
   ~StoreClient();
   StoreClient(const StoreClient&) = delete;
   StoreClient& operator=(const StoreClient&) = delete;
 
-  /// Blocks until all were tried. Any one thread.
+  /// Blocks until every delivery was tried. Must not be called by several threads at once.
   void wait();
 
-  /// The apps for whose package coordinators rely on the store just now, the oldest first.
+  /// Returns the coordinators that wait for a package of the store, the oldest first.
   [[nodiscard]] static Result<std::vector<CoordinatorSummary>> awaited(InstallCoordination& service);
 
  private:
   void run();
-  /// Removes packages that an earlier store client left half done.
+  /// Removes the incomplete packages of earlier store clients.
   void sweep(const std::vector<CoordinatorSummary>& awaited);
   void deliver(const CoordinatorSummary& app);
   [[nodiscard]] Status copy(const std::string& hostPath, StoreDelivery& delivery,

@@ -1,4 +1,4 @@
-// What a bundle identifier may look like on this device.
+// The syntax of bundle identifiers on this device.
 #pragma once
 
 #include <algorithm>
@@ -6,7 +6,8 @@
 
 namespace appsync::device {
 
-/// ASCII letters, digits, '-', '.' and '_', not starting with a dot, and short enough for a file name.
+/// Returns whether `text` consists of 1 to 200 ASCII letters, digits, '-', '.' and '_' and does not start with a dot,
+/// so that it can be a file name.
 [[nodiscard]] constexpr bool isBundleIdentifier(std::string_view text) noexcept {
   constexpr std::size_t kLongest = 200;
   constexpr auto isAllowed = [](char letter) {

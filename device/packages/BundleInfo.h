@@ -1,4 +1,4 @@
-// What an app's "Info.plist" says.
+// The content of an app's "Info.plist".
 #pragma once
 
 #include <optional>
@@ -18,24 +18,24 @@ struct BundleInfo {
   plist::Dictionary dictionary;
 };
 
-/// Reads an "Info.plist" in any of its forms. The identifier is there and well formed, or it is an error of
-/// platform::kInstallerErrorDomain.
+/// Parses an untrusted "Info.plist" in any property-list format. Fails with an error of platform::kInstallerErrorDomain
+/// if it has no valid identifier.
 [[nodiscard]] Result<BundleInfo> readBundleInfo(ByteView document);
 
-/// Where the file is that an app names in its info dictionary: none when `name`, which may be null, is none of a file
-/// inside the app's folder. Whether it is there is another question.
+/// Returns the path of the file that an app's info dictionary names, or nullopt if `name`, which may be null, is not a
+/// path inside the app's folder. The file may be missing.
 [[nodiscard]] std::optional<std::string> namedFileIn(const std::string& appPath, const plist::Value* name);
 
-/// Whether an entry of a package is the app's "Info.plist".
+/// Returns whether an entry of a package is the app's "Info.plist".
 [[nodiscard]] bool isInfoFile(std::string_view path, std::string_view appFolder);
 
-/// The error of a package without one; `appFolder` may be empty: then it has no app at all.
+/// Returns the error for a package without an "Info.plist" or, if `appFolder` is empty, without an app.
 [[nodiscard]] Error missingInfo(const std::string& appFolder);
 
-/// "Name.app", whatever the name.
+/// Returns whether a name has the form "Name.app".
 [[nodiscard]] bool isAppFolder(std::string_view folder);
 
-/// The name of an app folder without ".app".
+/// Returns the name of an app folder without ".app".
 [[nodiscard]] std::string_view appFolderStem(std::string_view folder);
 
 }  // namespace appsync::device

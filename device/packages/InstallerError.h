@@ -1,4 +1,4 @@
-// What the installer refuses, and why.
+// Errors of the installer.
 #pragma once
 
 #include <string>
@@ -8,23 +8,23 @@
 
 namespace appsync::device {
 
-/// The codes of errors in platform::kInstallerErrorDomain. Each text says what is wrong and what to do.
+/// The codes of errors in platform::kInstallerErrorDomain. Each text names the problem and a remedy.
 enum class InstallerFailure : long {
   badOptions = 1,      ///< the install options lack something or contradict each other
   notAPackage,         ///< not a zip archive, or no app folder where a placeholder should be
-  damaged,             ///< cut short, or bytes that do not add up
-  encrypted,           ///<
-  unsafeEntry,         ///< a name that leads out of the package, a link, a device
+  damaged,             ///< truncated, or with a wrong checksum
+  encrypted,           ///< with a password
+  unsafeEntry,         ///< a name that leads outside the package, a link or a device
   duplicateEntry,      ///< one name twice, or a file where a folder is
-  strayEntry,          ///< something beside the app that does not belong there
+  strayEntry,          ///< an unexpected file next to the app
   noApp,               ///< no "Name.app" folder with an "Info.plist" in it
   severalApps,         ///<
-  badInfo,             ///< an "Info.plist" that cannot be read, or without a bundle identifier
-  badIdentifier,       ///< an identifier with other characters than letters, digits, '-', '.', '_'
-  identifierMismatch,  ///< another app than the one asked for
-  tooLarge,            ///< more entries or bytes than a package may have, or bytes packed tighter than any app
+  badInfo,             ///< an invalid "Info.plist", or one without a bundle identifier
+  badIdentifier,       ///< not a valid bundle identifier
+  identifierMismatch,  ///< the package contains a different app
+  tooLarge,            ///< exceeds `PackageLimits`
   unknownApp,          ///< the registry has no such app
-  cancelled,           ///< given up by `InstallProgress::cancel`
+  cancelled,           ///< cancelled by `InstallProgress::cancel`
 };
 
 [[nodiscard]] inline Error installerError(InstallerFailure failure, std::string text) {

@@ -22,7 +22,7 @@ Result<PackageReader> openPackage(const std::string& hostPath, PackageLimits lim
   return PackageReader::open(std::move(file), limits);
 }
 
-/// Walks a whole package; `wanted` answers where an entry's bytes are to go, null for nowhere.
+/// Reads a whole package. `wanted` returns the destination of an entry's content, or null to skip it.
 Status collect(PackageReader& package,
                const std::function<std::optional<Bytes>*(const PackageReader::Entry&)>& wanted) {
   PackageReader::Entry entry;

@@ -12,7 +12,7 @@
 
 namespace appsync::device {
 
-/// What a package says of its app, and what stands beside the app in it.
+/// The description of the app in a package, and the files next to the app.
 struct PackageInfo {
   std::string identifier;
   std::optional<std::string> version;
@@ -24,9 +24,8 @@ struct PackageInfo {
   std::uint64_t packageBytes = 0;  ///< of the package file
 };
 
-/// Looks at a package without unpacking it, so that it takes about the same time however large the app is. The whole
-/// list of entries is checked; bytes of the app's files are not. Errors: as `PackageReader`; the text starts with the
-/// path.
+/// Reads the description of a package in a time that hardly depends on the app's size. Checks the list of entries, but
+/// not the content of the app's files. Errors are those of `PackageReader`; their text starts with the path.
 [[nodiscard]] Result<PackageInfo> readPackageInfo(const std::string& hostPath, PackageLimits limits = {});
 
 }  // namespace appsync::device

@@ -21,7 +21,7 @@ namespace {
 constexpr std::size_t kReadSize = std::size_t{1} << 16;
 constexpr std::string_view kMakeAgain = "; make the package again";
 
-/// libarchive turns names into the calling thread's locale. This gives it one that holds every name, for a while.
+/// Sets the calling thread's locale to UTF-8 during its lifetime, because libarchive converts names to the locale.
 class NamesAreUTF8 {
  public:
   NamesAreUTF8() : before_(uselocale(utf8())) {}
@@ -32,7 +32,7 @@ class NamesAreUTF8 {
  private:
   static locale_t utf8() {
     static const locale_t locale = newlocale(LC_CTYPE_MASK, "C.UTF-8", nullptr);
-    return locale;  // Null, which changes nothing, where the system has no such locale.
+    return locale;  // Null if the system has no such locale; uselocale then does nothing.
   }
 
   locale_t before_;
@@ -44,7 +44,7 @@ bool isPlainComponent(std::string_view component) {
          component.find_first_of(kForbidden) == component.npos;
 }
 
-/// Relative, and each component a plain name.
+/// Returns whether a path is relative and has only safe components.
 bool isPlainPath(std::string_view path) {
   for (;;) {
     const std::size_t slash = path.find('/');
@@ -58,14 +58,14 @@ std::string quoted(std::string_view name) {
   return '"' + std::string(name) + '"';
 }
 
-/// Why an archive that did not open is none.
+/// Returns the error for a file that libarchive cannot open.
 Error notOpened(int file) {
   char start[4] = {};
   const ssize_t length = pread(file, start, sizeof start, 0);
   const std::string_view magic(start, length < 0 ? 0 : static_cast<std::size_t>(length));
   if (magic == "PK\5\6") return installerError(InstallerFailure::noApp, "the package is empty; pack an app folder");
   if (magic == "PK\3\4") {
-    return installerError(InstallerFailure::damaged, "the package is cut short or damaged; copy it again");
+    return installerError(InstallerFailure::damaged, "the package is truncated or damaged; copy it again");
   }
   return installerError(InstallerFailure::notAPackage,
                         "this is not a package; a package is a zip archive of an app folder");
@@ -152,7 +152,7 @@ Status PackageReader::check(const Entry& entry) {
   if (!isPlainPath(entry.path)) {
     return installerError(
         InstallerFailure::unsafeEntry,
-        "the package holds " + quoted(entry.path) + ", a name that may lead out of it" + std::string(kMakeAgain));
+        "the package holds " + quoted(entry.path) + ", a name that may lead outside it" + std::string(kMakeAgain));
   }
   RETURN_IF_ERROR(checkPlace(entry.path, entry.kind));
   if (!seen_.insert(entry.path).second) {

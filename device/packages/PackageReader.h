@@ -1,4 +1,4 @@
-// Reads a package entry by entry, and trusts nothing in it.
+// Reads untrusted packages entry by entry.
 #pragma once
 
 #include <cstdint>
@@ -15,22 +15,21 @@ struct archive;
 
 namespace appsync::device {
 
-/// What a package may not exceed.
+/// The maximum size of packages.
 struct PackageLimits {
   std::uint64_t entries = 100'000;
   std::uint64_t unpackedBytes = std::uint64_t{8} << 30;
-  /// Unpacked bytes for each byte of the package. Counts only above `freeBytes`: small files may pack as tightly as
-  /// they like.
+  /// Maximum compression ratio, not checked up to `freeBytes` of unpacked content.
   std::uint64_t ratio = 200;
   std::uint64_t freeBytes = std::uint64_t{64} << 20;
 };
 
-/// A package is a zip archive that holds one folder "Name.app" and, beside it, at most the files `kStoreMetadataName`
-/// and `kArtworkName`. Names are relative, in UTF-8, with plain components; entries are files and folders, each once;
-/// nothing is encrypted.
+/// A package is a zip archive of one folder "Name.app" and, next to it, at most the files `kStoreMetadataName` and
+/// `kArtworkName`. Names are relative, in UTF-8, without "." and ".." components; entries are files and folders, each
+/// once; nothing is encrypted.
 ///
-/// Errors: platform::kInstallerErrorDomain, each saying which entry and what to do; "POSIX" where the system failed.
-/// Threads: one at a time; any number of readers side by side.
+/// Errors: platform::kInstallerErrorDomain, with a text that names the entry and a remedy, or "POSIX". Not thread-safe,
+/// but several readers may be used at once.
 class PackageReader {
  public:
   enum class Kind : std::uint8_t { file, folder };
@@ -41,30 +40,30 @@ class PackageReader {
     bool executable = false;
   };
 
-  /// Opens a package. `size` is the file's; `file` must be at its start and seekable.
+  /// Opens a package. `file` must be seekable and positioned at its start.
   [[nodiscard]] static Result<PackageReader> open(FileDescriptor file, PackageLimits limits = {});
 
-  /// Moves to the next entry and passes over what is left of the current one; false at the end.
+  /// Skips the rest of the current entry and moves to the next. Returns false at the end.
   [[nodiscard]] Result<bool> next(Entry& entry);
 
-  /// A piece of the current entry's bytes, to be stored at `offset`.
+  /// A part of the current entry's content, which starts at `offset`.
   struct Block {
-    ByteView bytes;  ///< the reader's, until its next call
+    ByteView bytes;  ///< valid until the next call of the reader
     std::int64_t offset = 0;
   };
-  /// False at the entry's end, when its length and checksum have turned out right.
+  /// Returns false at the end of the entry, after its length and checksum were verified.
   [[nodiscard]] Result<bool> nextBlock(Block& block);
 
-  /// The rest of the current entry, which may not have more than `most` bytes.
+  /// Reads the rest of the current entry. Fails if it has more than `most` bytes.
   [[nodiscard]] Result<Bytes> readAll(std::uint64_t most);
 
-  /// The name of the app folder, once an entry of it was seen.
+  /// The name of the app folder, empty until one of its entries was read.
   [[nodiscard]] const std::string& appFolder() const noexcept { return appFolder_; }
-  /// How far into the package reading is, from 0 to 1.
+  /// Returns the fraction of the package that was read, from 0 to 1.
   [[nodiscard]] double fraction() const;
-  /// The package file's own size.
+  /// The size of the package file.
   [[nodiscard]] std::uint64_t packageBytes() const noexcept { return packageBytes_; }
-  /// All bytes unpacked so far.
+  /// The number of bytes unpacked so far.
   [[nodiscard]] std::uint64_t unpackedBytes() const noexcept { return unpackedBytes_; }
 
  private:

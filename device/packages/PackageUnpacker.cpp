@@ -16,7 +16,7 @@ namespace appsync::device {
 
 namespace {
 
-/// Makes the files and folders of one package. Entries mostly come folder by folder, so the last folder stays open.
+/// Creates the files and directories of a package. Most entries are sorted by directory, so the last one stays open.
 class Unpacking {
  public:
   Unpacking(PackageReader& package, int container) : package_(package), container_(container) {}
@@ -34,11 +34,11 @@ class Unpacking {
     return fill(file.get(), entry.path);
   }
 
-  /// "Info.plist", once it was unpacked.
+  /// The content of "Info.plist", or nullopt until it was unpacked.
   [[nodiscard]] const std::optional<Bytes>& info() const noexcept { return info_; }
 
  private:
-  /// Opens a folder of the container, made with its parents where it is not there yet, and keeps it as the current one.
+  /// Makes a directory of the container the current one. Creates it and its parents if they are missing.
   int enter(const std::string& path) {
     if (path == path_ && folder_.valid()) return 0;
     FileDescriptor opened;

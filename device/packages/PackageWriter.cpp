@@ -49,7 +49,7 @@ Error failed(const Writer& writer, const std::string& path) {
                           path + " cannot be packed" + (text ? ": " : "") + (text ? text : ""));
 }
 
-/// Adds `path` and, of a folder, everything below it.
+/// Adds `path` and, if it is a folder, everything below it.
 Status collect(const fs::path& path, const std::string& name, std::vector<Item>& items) {
   std::error_code failure;
   const fs::file_status status = fs::symlink_status(path, failure);
@@ -85,7 +85,7 @@ Status writeContent(const Writer& writer, const FileDescriptor& file, std::int64
   return {};
 }
 
-/// An entry without a time is dated to the form's earliest, whatever the time zone.
+/// Entries have no time: libarchive then writes the format's earliest, regardless of the time zone.
 Status writeItem(const Writer& writer, const Item& item) {
   const bool isFolder = item.name.back() == '/';
   const FileDescriptor file(::open(item.path.c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK));
@@ -118,7 +118,7 @@ Status writeItems(const std::vector<Item>& items, int file, const std::string& p
   return {};
 }
 
-/// What a device would refuse, for its names or its size, is better known now.
+/// Rejects a package that no device would install because of its names or size.
 Status check(int file, const std::string& package) {
   const std::string draft = "/proc/self/fd/" + std::to_string(file);
   const Result<PackageInfo> info = readPackageInfo(draft);

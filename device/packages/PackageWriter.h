@@ -1,4 +1,4 @@
-// Making a package.
+// Writes packages.
 #pragma once
 
 #include <string>
@@ -8,13 +8,13 @@
 
 namespace appsync::device {
 
-/// Writes the named items, files and folders with all that is in them, to the package at `package`; each stands in it
-/// under its last path component. All are host paths.
+/// Writes files and whole folders to the package at `package`, each under its last path component. All paths are host
+/// paths.
 ///
-/// Equal content gives equal bytes: entries are sorted, carry no times and no owners, and of permissions only whether a
-/// file may be executed. Memory does not grow with the files. Links and special files, which no device installs, and
-/// names that are no UTF-8 are refused. `package` is a place as `writeHostFile` takes it; after a failure it is as it
-/// was. Errors: "POSIX", the text says what is wrong with which file.
+/// Equal content gives equal packages: entries are sorted and have no times, owners or permissions except whether a
+/// file is executable. Memory use does not depend on the files' sizes. Links, special files and names that are not
+/// UTF-8 are rejected, as no device installs them. `package` is a path for `writeHostFile`; a failure leaves the file
+/// unchanged. Errors: "POSIX", with a text that names the file.
 [[nodiscard]] Status writePackage(const std::vector<std::string>& items, const std::string& package);
 
 }  // namespace appsync::device

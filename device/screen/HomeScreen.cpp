@@ -16,7 +16,7 @@ namespace {
 constexpr std::string_view kIconLists = "iconLists";
 constexpr std::uint32_t kIdentifierArray = 1;
 
-/// What each `AssertionAnswer` means, in their order. 3 is an outcome without a name: a failure.
+/// The outcome of each `AssertionAnswer`, in their order. 3 is an unnamed outcome, which means a failure.
 constexpr std::array<platform::TerminationAssertionOutcome, 4> kOutcomes{
     platform::TerminationAssertionOutcome::granted,
     platform::TerminationAssertionOutcome::denied,
@@ -26,7 +26,7 @@ constexpr std::array<platform::TerminationAssertionOutcome, 4> kOutcomes{
 
 class HeldApp final : public platform::TerminationAssertion {};
 
-/// Identifiers in order, each once.
+/// Unique identifiers in insertion order.
 class IconOrder {
  public:
   void append(std::string_view identifier) {
@@ -39,7 +39,7 @@ class IconOrder {
   std::unordered_set<std::string> placed_;
 };
 
-/// The icons of a layout. Recursion is bounded by the depth of property lists.
+/// Adds the icons of a layout. The maximum depth of property lists bounds the recursion.
 void appendIcons(IconOrder& icons, const plist::Value& layout) {
   if (const auto identifier = layout.string()) {
     if (isBundleIdentifier(*identifier)) icons.append(*identifier);

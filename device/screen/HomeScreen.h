@@ -1,4 +1,4 @@
-// The home screen: its icon layout and its word on which apps may be replaced.
+// The home screen: the icon layout and termination assertions.
 #pragma once
 
 #include <cstdint>
@@ -17,42 +17,41 @@ namespace appsync::device {
 
 class Database;
 
-/// Icons stand where the layout puts them; apps that it does not name follow in the registry's order, which is that of
-/// installation. The layout outlives the process.
+/// The icons of the layout come first, in its order, then the other apps in the registry's order, which is the order of
+/// installation. The layout is stored in the device's database. Thread-safe.
 ///
-/// A layout lists icons from the first place to the last, in pages or not: an array, or a dictionary with one under
-/// "iconLists". In it stand, in any nesting:
+/// A layout is an array, or a dictionary with an array under "iconLists". Arrays contain, nested in any way:
 ///
-///     a string                           one icon, by bundle identifier
-///     an array                           a page or row: what is in it, one after the other
-///     a dictionary with "iconLists"      a folder, whose icons stand in its place
+///     a string                           an icon's bundle identifier
+///     an array                           a page or row
+///     a dictionary with "iconLists"      a folder, replaced by its icons
 ///
-/// Anything else in it is passed over, as is what is no bundle identifier and every repetition. Bytes that are no
-/// property list, and layouts that name no icon, change nothing.
+/// Other values, invalid bundle identifiers and repetitions are ignored. Bytes that are not a property list, and
+/// layouts without an icon, change nothing.
 class HomeScreen final : public platform::HomeScreenService {
  public:
   static constexpr const char* kSchema =
       "create table if not exists icon_layout (position integer primary key, identifier text not null);";
 
-  /// All must outlive the home screen.
+  /// All arguments must outlive the home screen.
   HomeScreen(Database& database, platform::AppRegistry& registry, Settings& settings)
       : database_(database), registry_(registry), settings_(settings) {}
 
   [[nodiscard]] Port blockableServerPort() override { return 1; }
 
-  /// A layout that cannot be kept leaves the earlier one.
+  /// If the layout cannot be stored, the earlier one remains.
   void setIconState(Port port, ByteView layout) override;
 
-  /// Identifiers of the layout keep their place whether their apps exist or not: a host lays out the apps that it is
-  /// about to send, and asks for this order to send them by.
+  /// Includes the identifiers of apps that do not exist: a host lays out the apps that it is about to send and reads
+  /// this order to send them by.
   [[nodiscard]] std::optional<Bytes> getFlattenedIconState(Port port, std::uint32_t format) override;
 
-  /// Granted for what the registry has and not found for the rest, unless the settings answer for the app. Nothing on
-  /// this device launches apps, so a granted assertion has nothing to hold back.
+  /// Grants assertions on apps of the registry and reports others as not found, unless the setting "assertion" has an
+  /// answer for the app. A granted assertion has no effect, because this device never launches apps.
   [[nodiscard]] std::unique_ptr<platform::TerminationAssertion> terminationAssertionCreate(
       std::string_view bundleIdentifier, std::uint32_t reason, platform::TerminationAssertionOutcome& outcome) override;
 
-  /// Every identifier in on-screen order, as `getFlattenedIconState` gives them.
+  /// Returns the identifiers that `getFlattenedIconState` encodes.
   [[nodiscard]] Result<std::vector<std::string>> iconOrder();
 
  private:

@@ -9,9 +9,9 @@ namespace appsync::device {
 namespace {
 
 constexpr std::array<unsigned char, 8> kSignature{0x89, 'P', 'N', 'G', '\r', '\n', 0x1A, '\n'};
-/// Length and type stand before a chunk's content, a checksum behind it.
+/// A chunk is its length, type, content and checksum.
 constexpr std::size_t kChunkFrame = 12;
-/// The chunks that make the picture. Text and profiles, which may unfold to any size, are not for us to decode.
+/// The chunks of the image itself. Text and profiles, which can expand to any size, are not decoded.
 constexpr std::array<std::string_view, 5> kPictureChunks{"IHDR", "PLTE", "tRNS", "IDAT", "IEND"};
 
 std::uint32_t bigEndian(ByteView bytes) {
@@ -32,7 +32,7 @@ bool hasBoundedSize(ByteView header) {
   return width > 0 && height > 0 && width <= kMaximumPixels && height <= kMaximumPixels / width;
 }
 
-/// The file without the chunks that are not the picture; empty when it is none, or one of too many pixels.
+/// Returns the file with the chunks of the image only, or no bytes if it is not a PNG file or has too many pixels.
 Bytes pictureOnly(ByteView file) {
   if (!startsLikePNG(file)) return {};
   Bytes picture(file.begin(), file.begin() + kSignature.size());

@@ -1,4 +1,4 @@
-// Pictures, and how they come from PNG files that nobody vouches for and go into new ones.
+// Images, decoded from untrusted PNG files and encoded into new ones.
 #pragma once
 
 #include <cstdint>
@@ -22,7 +22,7 @@ struct ContextRelease {
 };
 using Context = std::unique_ptr<cairo_t, ContextRelease>;
 
-/// A picture of cairo's. Its pixels no longer change.
+/// An immutable cairo image surface.
 class IconImage final : public platform::Image {
  public:
   explicit IconImage(Surface surface) : surface_(std::move(surface)) {}
@@ -36,11 +36,11 @@ class IconImage final : public platform::Image {
 
 inline constexpr std::uint64_t kMaximumPixels = std::uint64_t{2048} * 2048;
 
-/// The picture in a PNG file; null for what is no whole PNG and for one of more than `kMaximumPixels`. Memory is in
-/// proportion to that bound and to the file, whatever the file claims.
+/// Decodes an untrusted PNG file. Returns null if it is not a complete PNG file or has more than `kMaximumPixels`.
+/// Memory use is bounded by `kMaximumPixels` and the file's size.
 [[nodiscard]] Surface decodePNG(ByteView bytes);
 
-/// Appends the picture as a PNG file to `out`; false, and `out` is of no use, when it cannot be encoded.
+/// Appends the image as a PNG file to `out`. On failure returns false and leaves `out` unspecified.
 [[nodiscard]] bool encodePNG(cairo_surface_t* picture, Bytes& out);
 
 }  // namespace appsync::device

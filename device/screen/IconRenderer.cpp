@@ -11,7 +11,7 @@ namespace appsync::device {
 
 namespace {
 
-/// Fills the square at the origin with the middle of `picture`.
+/// Fills the square at the origin with the centre of `picture`.
 void paintIcon(cairo_t* context, cairo_surface_t* picture, double size, double cornerRadius) {
   const double width = cairo_image_surface_get_width(picture);
   const double height = cairo_image_surface_get_height(picture);

@@ -1,4 +1,4 @@
-// Home-screen icons.
+// Renders home-screen icons.
 #pragma once
 
 #include <memory>
@@ -22,18 +22,18 @@ class IconRenderer final : public platform::IconRenderer {
   /// `fileSystem` must outlive the renderer.
   explicit IconRenderer(platform::FileSystem& fileSystem) : fileSystem_(fileSystem) {}
 
-  /// The PNG file that the bundle's info dictionary names under `kBundleIconFileKey`, a path inside the bundle. The
-  /// picture fills the square; what stands over on its longer side is cut off.
+  /// Renders the PNG file that the bundle's info dictionary names under `kBundleIconFileKey`, a path inside the bundle.
+  /// The image is scaled to fill the square and cropped. Returns null if there is no usable file.
   [[nodiscard]] std::unique_ptr<platform::Image> createHomeScreenIconImage(const platform::Bundle& bundle) override;
 
  private:
   platform::FileSystem& fileSystem_;
 };
 
-/// Where the bundle's icon is; none when it names no file inside itself.
+/// Returns the path of the bundle's icon, or nullopt if the info dictionary names no file inside the bundle.
 [[nodiscard]] std::optional<std::string> iconPathIn(const platform::Bundle& bundle);
 
-/// Adds to `context`'s path a rectangle with rounded corners, its top left one at the origin.
+/// Adds a rectangle with rounded corners and its top left corner at the origin to the path of `context`.
 void addRoundedRectangle(cairo_t* context, double width, double height, double cornerRadius);
 
 }  // namespace appsync::device

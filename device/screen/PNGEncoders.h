@@ -1,4 +1,4 @@
-// Pictures to PNG bytes.
+// PNG encoders.
 #pragma once
 
 #include <memory>
@@ -7,7 +7,8 @@
 
 namespace appsync::device {
 
-/// Encoders of one image: PNG files hold no more. They accept the images of this device's `IconRenderer`.
+/// Creates encoders of one image, the most that a PNG file can contain. They accept images of this device's
+/// `IconRenderer`.
 class PNGEncoders final : public platform::PNGEncoders {
  public:
   /// Null unless `imageCount` is 1.

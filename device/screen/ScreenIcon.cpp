@@ -17,7 +17,7 @@ constexpr double kRingRadius = 32;
 constexpr double kRingWidth = 8;
 constexpr double kNameSize = 21;
 constexpr double kNameBaseline = kSize + 30;
-/// No name that fits is longer.
+/// More than any width shows.
 constexpr std::size_t kLongestName = 256;
 
 bool continuesCharacter(char byte) {
@@ -30,7 +30,7 @@ void dropLastCharacter(std::string& text) {
   if (!text.empty()) text.pop_back();
 }
 
-/// The part of a name that can be shown at all: its start, as one line.
+/// Returns the start of a name as one line.
 std::string shownName(std::string_view name) {
   std::string shown(name.substr(0, kLongestName));
   if (shown.size() < name.size()) {
@@ -47,7 +47,7 @@ double widthOf(cairo_t* context, const std::string& text) {
   return extents.x_advance;
 }
 
-/// `name`, its end replaced by an ellipsis if it is wider than `width`.
+/// Returns `name`, its end replaced by an ellipsis if it is wider than `width`.
 std::string fittingName(cairo_t* context, std::string_view name, double width) {
   std::string shown = shownName(name);
   if (shown.size() == name.size() && widthOf(context, shown) <= width) return shown;
@@ -74,7 +74,7 @@ void drawName(cairo_t* context, std::string_view name, double width) {
   showCentered(context, text, kCenter, kNameBaseline);
 }
 
-/// One of 360 hues for an identifier, the same at all times and on all machines.
+/// Returns one of 360 hues, which depends on the identifier only.
 double hueOf(std::string_view identifier) {
   std::uint32_t hash = 2166136261U;
   for (const char letter : identifier)
@@ -107,7 +107,7 @@ void fillWithColorOf(cairo_t* context, std::string_view identifier) {
   cairo_fill(context);
 }
 
-/// The first character, a small ASCII letter as a capital.
+/// Returns the first character, in upper case if it is an ASCII letter.
 std::string initialOf(std::string_view name) {
   std::size_t length = name.empty() ? 0 : 1;
   while (length < name.size() && continuesCharacter(name[length]))

@@ -18,7 +18,7 @@ namespace appsync::device {
 
 namespace {
 
-// One page, in pixels.
+// The layout of a page in pixels.
 constexpr double kPageWidth = 750;
 constexpr double kPageHeight = 1334;
 constexpr double kPageCorner = 64;
@@ -34,7 +34,7 @@ constexpr double kGap = 60;
 constexpr std::size_t kPagesInOneRow = 5;
 constexpr double kMaximumPicturePixels = 16e6;
 
-/// Where the pages stand in the picture.
+/// The positions of the pages in the picture.
 struct Sheet {
   explicit Sheet(std::size_t icons) : pages(std::max<std::size_t>(1, (icons + kIconsPerPage - 1) / kIconsPerPage)) {
     const double squareColumns = std::ceil(std::sqrt(static_cast<double>(pages) * kPageHeight / kPageWidth));
@@ -79,7 +79,7 @@ void drawWallpaper(cairo_t* context) {
   addGlow(context, 80, 1290, 700, 0.93, 0.49, 0.36);
 }
 
-/// A dot for each page, the current one bright; too many for the width are left out.
+/// Draws a dot for each page, the current one bright. Dots that do not fit the width are omitted.
 void drawPageDots(cairo_t* context, std::size_t current, std::size_t pages) {
   constexpr double kPitch = 28;
   const double width = static_cast<double>(pages - 1) * kPitch;

@@ -1,4 +1,4 @@
-// A picture of the whole home screen.
+// Draws the whole home screen.
 #pragma once
 
 #include <string>
@@ -12,7 +12,7 @@
 
 namespace appsync::device {
 
-/// The services that know what stands on the screen. Readers of the device are enough.
+/// The services with the content of the screen. They may be those of a read-only device.
 struct ScreenServices {
   HomeScreen& homeScreen;
   platform::AppRegistry& registry;
@@ -23,10 +23,10 @@ struct ScreenServices {
 /// Error domain of drawing; codes are cairo's.
 inline constexpr std::string_view kDrawingDomain = "Drawing";
 
-/// Draws every app, placeholders with their progress, in on-screen order to a PNG file: pages of 4 by 6 icons side by
-/// side, made smaller when there are many of them. An app without an icon gets its first letter on a colour of its own.
+/// Draws every app in on-screen order, placeholders with their progress, to a PNG file: pages of 4 by 6 icons side by
+/// side, scaled down if there are many. Apps without an icon get the first letter of their name on a colour.
 ///
-/// `hostPath` is a place as `writeHostFile` takes it; after a failure it is as it was.
+/// `hostPath` is a path for `writeHostFile`. A failure leaves the file unchanged.
 [[nodiscard]] Status drawScreen(const ScreenServices& services, const std::string& hostPath);
 
 }  // namespace appsync::device

@@ -30,7 +30,7 @@ void CallbackThread::post(const void* receiver, std::function<void()> callback) 
 }
 
 void CallbackThread::forget(const void* receiver) {
-  std::deque<Callback> dropped;  // What they captured is destroyed without the lock.
+  std::deque<Callback> dropped;  // Destroys the captured objects without the lock.
   std::unique_lock lock(mutex_);
   for (Callback& callback : std::exchange(queued_, {})) {
     (callback.receiver == receiver ? dropped : queued_).push_back(std::move(callback));

@@ -1,4 +1,4 @@
-// A thread of a service's own, on which observers are called back.
+// The thread on which a service calls its observers.
 #pragma once
 
 #include <condition_variable>
@@ -9,9 +9,8 @@
 
 namespace appsync::device {
 
-/// Delivers callbacks one at a time, in the order of `post`, with no lock held. The thread starts with the first one.
-///
-/// Every operation may be called on any thread, from callbacks too, unless it says otherwise. Destruction stops it.
+/// Runs callbacks one at a time, in the order of `post`, without holding a lock. The first `post` starts the thread;
+/// the destructor stops it. Thread-safe; callable from callbacks unless documented otherwise.
 class CallbackThread {
  public:
   CallbackThread() = default;
@@ -19,15 +18,15 @@ class CallbackThread {
   CallbackThread(const CallbackThread&) = delete;
   CallbackThread& operator=(const CallbackThread&) = delete;
 
-  /// Queues a callback to `receiver`, which is compared only, never followed, and not null.
+  /// Queues a callback for `receiver`, which identifies it and is never dereferenced. Must not be null.
   void post(const void* receiver, std::function<void()> callback);
 
-  /// Drops what is queued for `receiver`. When this returns no callback to it runs on another thread and, until the
-  /// next `post` for it, none will begin; on the callback thread itself it does not wait.
+  /// Drops the queued callbacks of `receiver` and blocks until its running callback has returned, unless called on the
+  /// callback thread. Afterwards none runs until the next `post` for it.
   void forget(const void* receiver);
 
-  /// Drops what is queued, and all that is posted from now on, and returns when the running callback has. Not on the
-  /// callback thread itself, unless it has been stopped before.
+  /// Drops all queued and future callbacks and blocks until the running one has returned. Must not be called on the
+  /// callback thread unless already stopped.
   void stop();
 
  private:
@@ -41,7 +40,7 @@ class CallbackThread {
   std::mutex mutex_;
   std::condition_variable changed_;
   std::deque<Callback> queued_;
-  /// Whose callback runs now; null when none does.
+  /// The receiver of the running callback, or null.
   const void* running_ = nullptr;
   bool stopping_ = false;
   std::thread thread_;

@@ -1,4 +1,4 @@
-// The sync daemon's service, as whoever plays the daemon on this device offers it.
+// The sync daemon's service for its clients.
 #pragma once
 
 #include <memory>
@@ -8,12 +8,11 @@
 
 namespace appsync::device {
 
-/// Passes what clients ask on to the daemon of the sync that is under way; without one nothing is supported.
-/// Threads: any.
+/// Forwards requests to the daemon of the running sync; supports nothing while none runs. Thread-safe.
 class DeviceService final : public platform::ZTDeviceService {
  public:
-  /// From now on `daemon` is asked, until the next call; null ends it. When this returns no call to an earlier one runs
-  /// on another thread. `daemon` stays the caller's.
+  /// Forwards requests to `daemon`, or to none if it is null, and blocks until calls of the previous daemon have
+  /// returned. Does not take ownership.
   void connect(platform::ZTDeviceService* daemon);
 
   [[nodiscard]] bool supports(Operation operation) override;

@@ -10,13 +10,12 @@
 namespace appsync::device {
 
 Result<std::unique_ptr<FileLogSink>> FileLogSink::open(const std::string& hostPath) {
-  // A pipe would wait for its reader; once there is one it is written to like a file.
+  // Opening a pipe would wait for its reader. Once open, writes to it may block as those to a file.
   FileDescriptor file(
       ::open(hostPath.c_str(), O_WRONLY | O_APPEND | O_CREAT | O_NONBLOCK | O_NOCTTY | O_CLOEXEC, 0644));
   if (!file.valid() && errno == ENXIO) {
     return Error{std::string(domains::kPOSIX), ENXIO,
-                 "cannot open log file \"" + hostPath + "\": nobody reads from this pipe; start its reader first",
-                 nullptr};
+                 "cannot open log file \"" + hostPath + "\": the pipe has no reader; start its reader first", nullptr};
   }
   if (!file.valid() || ::fcntl(file.get(), F_SETFL, O_APPEND) != 0) {
     return Error::fromErrno(errno, "cannot open log file \"" + hostPath + "\"");

@@ -1,4 +1,4 @@
-// Where the sync framework's log goes.
+// Destinations of the sync framework's log.
 #pragma once
 
 #include <chrono>
@@ -13,26 +13,26 @@
 
 namespace appsync::device {
 
-/// Threads: any.
+/// Thread-safe.
 class LogSink {
  public:
   virtual ~LogSink() = default;
 
-  /// Takes one message, which is one line of printable text. Nothing fails towards the caller: a message that cannot be
-  /// written is lost.
+  /// Writes one message, which is one line of printable text. Messages that cannot be written are dropped.
   virtual void write(std::chrono::system_clock::time_point time, int category, LogLevel level,
                      std::string_view message) = 0;
 };
 
-/// Appends lines "time, category, level, message", parted by blanks, to a file:
+/// Appends lines "time category level message" to a file:
 ///
 ///     2026-02-03T04:05:06.789012Z 8 default com.corvel.qor.Zephtra.AppSync|getting installed assets
 ///
-/// Times are UTC, levels "default" and "error". Messages are written as they are: each is one line already, see
-/// base/Log.h. Each line is one write at the file's end: lines never mix, not even with those of another process.
+/// Times are UTC, levels "default" and "error". Messages are written unchanged: each is one line already, see
+/// base/Log.h. Each line is one atomic
+/// append: lines never interleave, even those of several processes.
 class FileLogSink final : public LogSink {
  public:
-  /// Opens the file for appending, or makes it. `hostPath` is a path of this machine. A pipe needs a reader already.
+  /// Opens or creates the file for appending. Fails for a pipe without a reader.
   [[nodiscard]] static Result<std::unique_ptr<FileLogSink>> open(const std::string& hostPath);
 
   void write(std::chrono::system_clock::time_point time, int category, LogLevel level,

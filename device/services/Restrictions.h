@@ -1,4 +1,4 @@
-// The profile service: restrictions as the device's settings say.
+// The profile service: reads restrictions from the device's settings.
 #pragma once
 
 #include "device/services/Settings.h"
@@ -8,7 +8,7 @@ namespace appsync::device {
 
 class Restrictions final : public platform::ProfileConnection {
  public:
-  /// `settings` must outlive it.
+  /// `settings` must outlive this object.
   explicit Restrictions(Settings& settings) : settings_(settings) {}
 
   [[nodiscard]] platform::RestrictionValue effectiveBoolValueForSetting(platform::RestrictionSetting setting) override {

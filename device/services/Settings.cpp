@@ -21,7 +21,7 @@ constexpr std::string_view kUnset = "unset";
 /// In the order of `AssertionAnswer`.
 constexpr std::array<std::string_view, 4> kAnswers{"granted", "denied", "unknown", "failing"};
 
-/// A row of the table: keys that hold one value have an empty item.
+/// A row of the table. Keys with one value have an empty item.
 struct Row {
   std::string item;
   std::string value;
@@ -81,8 +81,8 @@ constexpr std::array<Definition, 5> kDefinitions{{
 }};
 
 Error unknownKey(std::string_view key) {
-  std::string text = "there is no setting \"";
-  text.append(key).append("\"; there are ");
+  std::string text = "unknown setting \"";
+  text.append(key).append("\"; the settings are ");
   for (std::string_view separator; const Definition& definition : kDefinitions) {
     text.append(separator).append(definition.key);
     separator = ", ";

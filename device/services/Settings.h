@@ -1,4 +1,4 @@
-// The device's settings, which people change and services read.
+// The device's settings, changed by users and read by services.
 #pragma once
 
 #include <cstdint>
@@ -13,30 +13,30 @@ namespace appsync::device {
 
 class Database;
 
-/// Error domain of refused settings.
+/// Error domain of rejected settings.
 inline constexpr std::string_view kSettingsDomain = "Settings";
 
 /// The codes of errors in kSettingsDomain.
 enum class SettingsFailure : long {
   unknownKey = 1,
   unknownValue,
-  noAssignment,  ///< a text that is not KEY=VALUE
+  noAssignment,  ///< not of the form KEY=VALUE
 };
 
-/// What the home screen answers when it is asked to hold an app.
+/// The home screen's answer to a termination assertion.
 enum class AssertionAnswer : std::uint8_t { granted, denied, unknown, failing };
 
-/// The keys, and the values each takes:
+/// The keys and their values:
 ///
-///     app-installation   yes, no, unset      may apps be installed
-///     app-removal        yes, no, unset      may apps be removed
-///     coordination       on, off, unset      install through coordinators, from the next opening on; unset is off
-///     store              a folder, or unset  where packages of restored apps come from; kept as an absolute host path
-///     assertion          ID:ANSWER           what the home screen answers for app ID, one setting per app: granted,
-///                                            denied, unknown, failing, or unset for its own judgement
+///     app-installation   yes, no, unset      whether apps may be installed
+///     app-removal        yes, no, unset      whether apps may be removed
+///     coordination       on, off, unset      install through coordinators, from the next opening on; unset means off
+///     store              a folder, or unset  packages of restored apps; stored as an absolute host path
+///     assertion          ID:ANSWER           the home screen's answer for app ID, one setting per app: granted,
+///                                            denied, unknown, failing, or unset for the default
 ///
-/// Settings are kept with the device and outlive the process. Threads: any.
-/// Errors: `kSettingsDomain`, with a text that says what would have done; else the database's own.
+/// Settings are stored in the device's database. Thread-safe. Errors: `kSettingsDomain`, with a text that lists the
+/// accepted values, or the database's.
 class Settings {
  public:
   static constexpr const char* kSchema =
@@ -45,13 +45,13 @@ class Settings {
   /// `database` must outlive the settings.
   explicit Settings(Database& database) : database_(database) {}
 
-  /// Sets `key`. The value "unset" returns it to what it is without being set.
+  /// Sets `key`. The value "unset" restores the default.
   [[nodiscard]] Status set(std::string_view key, std::string_view value);
 
-  /// The same with "KEY=VALUE" in one text.
+  /// Sets a key from a text of the form "KEY=VALUE".
   [[nodiscard]] Status assign(std::string_view assignment);
 
-  /// Answers assertions on that app with `answer` from now on.
+  /// Sets the answer to assertions on the app.
   [[nodiscard]] Status setAssertionAnswer(std::string_view bundleIdentifier, AssertionAnswer answer);
 
   // For services. A setting that cannot be read counts as unset.
@@ -62,7 +62,7 @@ class Settings {
   [[nodiscard]] std::optional<AssertionAnswer> assertionAnswer(std::string_view bundleIdentifier);
 
  private:
-  /// Absent when it is unset or cannot be read.
+  /// Returns nullopt if the setting is unset or cannot be read.
   [[nodiscard]] std::optional<std::string> stored(std::string_view key, std::string_view item);
 
   Database& database_;

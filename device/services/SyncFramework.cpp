@@ -14,19 +14,19 @@ struct RecoverableError {
 };
 
 constexpr RecoverableError kRecoverableErrors[] = {
-    // Interrupted or put off.
+    // Interrupted or deferred.
     {domains::kPOSIX, EAGAIN},
     {domains::kPOSIX, EINTR},
     {domains::kPOSIX, EBUSY},
     {domains::kPOSIX, ETIMEDOUT},
     {domains::kPOSIX, ECANCELED},
-    // Out of something that comes back.
+    // Exhausted resources.
     {domains::kPOSIX, ENOSPC},
     {domains::kPOSIX, EDQUOT},
     {domains::kPOSIX, ENOMEM},
     {domains::kPOSIX, EMFILE},
     {domains::kPOSIX, ENFILE},
-    // The other side went away.
+    // Lost connections.
     {domains::kPOSIX, EPIPE},
     {domains::kPOSIX, ECONNRESET},
     {domains::kPOSIX, ECONNABORTED},
@@ -35,7 +35,7 @@ constexpr RecoverableError kRecoverableErrors[] = {
     {domains::kPOSIX, ENETDOWN},
     {domains::kPOSIX, ENETUNREACH},
     {domains::kPOSIX, EHOSTUNREACH},
-    // A transfer that was cut off.
+    // Interrupted transfers.
     {platform::kZTErrorDomain, static_cast<long>(TransferFailure::interrupted)},
     {platform::kZTErrorDomain, static_cast<long>(TransferFailure::hostLost)},
 };

@@ -1,4 +1,4 @@
-// What the sync framework of this device offers to its clients.
+// The device's sync framework.
 #pragma once
 
 #include <array>
@@ -16,31 +16,31 @@
 
 namespace appsync::device {
 
-/// Codes of `platform::kZTErrorDomain` that this device's daemon gives a transfer that came to nothing. All but the
-/// last are recoverable.
+/// Codes of `platform::kZTErrorDomain` for transfers that this device's daemon could not complete. All except
+/// `cancelled` are recoverable.
 enum class TransferFailure : long {
-  interrupted = 100,  ///< the sync was ended before the package was whole
-  hostLost = 101,     ///< the host went away, or could not read its package
-  cancelled = 102,    ///< somebody on the device does not want the app
+  interrupted = 100,  ///< the sync ended before the package was complete
+  hostLost = 101,     ///< the connection was lost, or the host could not read its package
+  cancelled = 102,    ///< the user cancelled the app on the device
 };
 
-/// Threads: any.
+/// Thread-safe.
 class SyncFramework final : public platform::SyncFramework {
  public:
   SyncFramework();
 
-  /// From now on messages of all categories and levels go to `sink`, and to no earlier one. Until the first call every
-  /// category is disabled. The framework keeps the sink until it is destroyed.
+  /// Sends the messages of all categories and levels to `sink` instead of the previous sink. Every category is disabled
+  /// until the first call. The framework keeps all sinks until it is destroyed.
   void logTo(std::unique_ptr<LogSink> sink);
 
-  /// Numbers that are not from 0 to 31 share one category, which logs as -1.
+  /// Numbers outside 0 to 31 share one category, which logs as -1.
   [[nodiscard]] LogCategory& ZTGetLogCategory(int number) override;
 
-  /// What passes by itself or once somebody made room: POSIX errors of interrupted calls, lost connections, time-outs
-  /// and exhausted resources, and transfers that were cut off (`TransferFailure`). See docs/files.md for the list.
+  /// Returns true for temporary failures: POSIX errors of interrupted calls, lost connections, time-outs and exhausted
+  /// resources, and interrupted transfers (`TransferFailure`). docs/files.md has the list.
   [[nodiscard]] bool ZTIsRecoverableError(const Error& error) override;
 
-  /// A download: its package comes to the device.
+  /// Creates an asset that is a download.
   [[nodiscard]] std::shared_ptr<platform::ZTAsset> downloadAssetWithIdentifier(
       std::string_view identifier, std::string_view dataclass, std::optional<std::string> prettyName) override;
 
@@ -63,7 +63,7 @@ class SyncFramework final : public platform::SyncFramework {
 
   std::atomic<LogSink*> sink_ = nullptr;
   std::mutex mutex_;
-  /// Every sink ever given: a writer may still be in one that was replaced.
+  /// Every sink of `logTo`: another thread may still write to a replaced one.
   std::vector<std::unique_ptr<LogSink>> sinks_;
   std::array<Category, kCategories + 1> categories_;
 };

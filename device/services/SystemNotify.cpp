@@ -51,7 +51,7 @@ void SystemNotify::setState(Token token, std::uint64_t state) {
 }
 
 void SystemNotify::post(std::string_view name) {
-  // Under the lock a removed observer's callback cannot be queued after its removal has looked for it.
+  // The lock keeps a removed observer's callback from being queued after `removeObserver` has dropped the others.
   const std::lock_guard lock(mutex_);
   for (const auto& observation : observations_) {
     if (observation->name != name || observation->object != nullptr) continue;

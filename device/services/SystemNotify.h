@@ -17,14 +17,13 @@ namespace appsync::device {
 
 class Database;
 
-/// Since one process at a time holds a device, posting reaches the observers of this process. States are kept in the
-/// device's database: they outlive the process, and readers of the device see them.
+/// Posts reach the observers of this process, the only one with exclusive access. States are stored in the device's
+/// database, where other processes can read them.
 ///
-/// Observers are called on one thread, one at a time, in the order of the posts. Posts that are still on their way when
-/// the service is destroyed are dropped.
+/// Observers are called on one thread, one at a time, in the order of the posts. Destruction drops pending posts.
 class SystemNotify final : public platform::SystemNotify {
  public:
-  /// The status of a registration for an empty name.
+  /// The status of registering an empty name.
   static constexpr std::uint32_t kInvalidName = 1;
 
   static constexpr const char* kSchema =
@@ -33,19 +32,18 @@ class SystemNotify final : public platform::SystemNotify {
   /// `database` must outlive the service.
   explicit SystemNotify(Database& database) : database_(database) {}
 
-  /// Adding the same observer, callback, name and filter again changes nothing. Posts have no sender: an observer that
-  /// asks for one sender's posts hears none.
+  /// Idempotent for equal arguments. Posts have no sender: an observer with a non-null `object` is never called.
   void addObserver(void* observer, Callback callback, std::string_view name, const void* object,
                    platform::SuspensionBehavior suspension) override;
   void removeObserver(void* observer, std::string_view name) override;
 
-  /// Every registration of one name gets the same token.
+  /// Returns the same token for each registration of a name.
   [[nodiscard]] Registration registerCheck(std::string_view name) override;
-  /// An unknown token changes nothing.
+  /// Ignores unknown tokens.
   void setState(Token token, std::uint64_t state) override;
   void post(std::string_view name) override;
 
-  /// The state of a name; absent when it was never set.
+  /// Returns the state of a name, or nullopt if it was never set.
   [[nodiscard]] std::optional<std::uint64_t> state(std::string_view name);
 
  private:
@@ -59,7 +57,7 @@ class SystemNotify final : public platform::SystemNotify {
 
   Database& database_;
   std::mutex mutex_;
-  /// Addresses are the receivers that `callbacks_` knows.
+  /// The addresses of the elements are the receivers for `callbacks_`.
   std::vector<std::shared_ptr<const Observation>> observations_;
   std::vector<std::string> tokens_;  ///< the name of token n is element n - 1
   std::map<std::string, Token, std::less<>> tokensByName_;

@@ -1,4 +1,4 @@
-// The transaction log and the system log's handles.
+// The transaction log and the handles of the system log.
 #pragma once
 
 #include <chrono>
@@ -17,7 +17,7 @@ namespace appsync::device {
 
 class Database;
 
-/// Marks entries with where they come from.
+/// The origin of log entries.
 class SystemLogHandle final : public platform::SystemLogHandle {
  public:
   SystemLogHandle(std::string_view subsystem, std::string_view category) : subsystem_(subsystem), category_(category) {}
@@ -36,22 +36,22 @@ class SystemLog final : public platform::SystemLog {
                                                                         std::string_view category) override;
 };
 
-/// One entry: of a step, which has a code, a party and a phase, or of a scenario, which has a name and a step number.
+/// An entry for a step, with a code, party and phase, or for a scenario, with a name and step number.
 struct TransactionEntry {
   std::chrono::sys_time<std::chrono::microseconds> time;
-  std::string subsystem;  ///< of the handle that the log had; empty before there was one
+  std::string subsystem;  ///< from the log's handle; empty before `initializeWithLog`
   std::string category;
-  std::uint32_t step = 0;                           ///< a `TransactionStep`, or the scenario's own number
-  std::optional<std::string> scenario;              ///< absent for a step
-  std::optional<platform::TransactionParty> party;  ///< absent for a scenario
-  std::optional<platform::TransactionPhase> phase;  ///< absent for a scenario
+  std::uint32_t step = 0;                           ///< a `TransactionStep`, or the scenario's step number
+  std::optional<std::string> scenario;              ///< nullopt for a step
+  std::optional<platform::TransactionParty> party;  ///< nullopt for a scenario
+  std::optional<platform::TransactionPhase> phase;  ///< nullopt for a scenario
   bool success = false;
   std::string bundleIdentifier;
   std::string description;
 };
 
-/// Keeps entries in the order of the calls, in the device's database. An entry is safe from a kill once the call has
-/// returned; a loss of power may take the last few. Threads: any.
+/// Stores entries in the device's database, in the order of the calls. An entry survives a crash once the call has
+/// returned; a power failure may lose the last few. Thread-safe.
 class TransactionLog final : public platform::TransactionLog {
  public:
   static constexpr const char* kSchema =
@@ -68,11 +68,11 @@ class TransactionLog final : public platform::TransactionLog {
   void logScenario(std::string_view scenario, std::uint32_t step, bool success, std::string_view bundleIdentifier,
                    std::string_view description) override;
 
-  /// Every entry, oldest first.
+  /// Returns every entry, the oldest first.
   [[nodiscard]] Result<std::vector<TransactionEntry>> entries();
 
  private:
-  /// A `TransactionEntry` before it is kept.
+  /// A `TransactionEntry` to store.
   struct NewEntry {
     std::uint32_t step;
     std::optional<std::string_view> scenario;
@@ -90,7 +90,7 @@ class TransactionLog final : public platform::TransactionLog {
   std::shared_ptr<platform::SystemLogHandle> handle_;
 };
 
-/// The step's name as history shows it: "install app".
+/// Returns the step's name for users, such as "install app".
 [[nodiscard]] std::string_view nameOf(platform::TransactionStep step);
 
 }  // namespace appsync::device

@@ -1,9 +1,10 @@
-// How a process opens a device.
+// Access modes of a device.
 #pragma once
 
 namespace appsync::device {
 
-/// `exclusive`: the one process that may change the device. `readOnly`: any number, also beside it; nothing is written.
+/// `exclusive`: one process, which may change the device. `readOnly`: any number of processes, also while another has
+/// exclusive access; they write nothing.
 enum class Access { exclusive, readOnly };
 
 }  // namespace appsync::device

@@ -15,12 +15,12 @@ namespace appsync::device {
 
 namespace {
 
-/// Longer than any transaction takes; only a reader that recovers the log ever makes others wait.
+/// Longer than any transaction. Only a reader that recovers the log ever blocks others.
 constexpr int kBusyMilliseconds = 10'000;
 
 Error databaseError(sqlite3* connection, int code) {
   std::string text = "database: ";
-  // The connection's text belongs to its last failure, which may be another one.
+  // sqlite3_errmsg describes the connection's last failure, which may be a different one.
   const bool own = connection != nullptr && sqlite3_extended_errcode(connection) == code;
   text += own ? sqlite3_errmsg(connection) : sqlite3_errstr(code);
   return {std::string(kSQLiteDomain), code, std::move(text), nullptr};
@@ -33,17 +33,17 @@ Status execute(sqlite3* connection, const char* sql) {
   return databaseError(connection, sqlite3_extended_errcode(connection));
 }
 
-/// What a step that a test makes fail looks like from the outside.
+/// Returns the error that a fault hook injects, or nullopt.
 std::optional<Error> injectedFailure(const char* name) {
   const int error = faultPoint(name);
   if (error == 0) return std::nullopt;
   return Error::fromErrno(error, "database");
 }
 
-// With the write-ahead log, "normal" writes a commit without waiting for the disk. What is in the file is never torn,
-// and a kill loses nothing: only a loss of power may take back the last few transactions, as a whole and in order.
-// Waiting for the disk at each of them would cost more than unpacking a package; who cannot do without asks for
-// Durability::power. The log stays when the last connection closes, so that readers find it and need not create it.
+// With the write-ahead log, "normal" commits without waiting for the disk. The file is never torn and survives crashes;
+// a power failure may roll back the last few transactions, whole and in order. Waiting for the disk at each commit
+// would cost more than unpacking a package; transactions that need it pass Durability::power. The log is kept when the
+// last connection closes, because read-only connections cannot create it.
 constexpr const char* kWriterSettings =
     "pragma journal_mode = wal; pragma synchronous = normal; pragma foreign_keys = on;";
 
@@ -67,9 +67,9 @@ long primaryCodeOf(const Error& error) {
 Result<std::unique_ptr<Database>> Database::open(const std::string& path, Access access) {
   const int mode = access == Access::readOnly ? SQLITE_OPEN_READONLY : SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE;
   sqlite3* connection = nullptr;
-  // A relative path might be taken for a URI.
+  // SQLite could parse a relative path as a URI.
   const std::string file = path.starts_with('/') ? path : "./" + path;
-  // Without SQLite's own locking: one thread at a time has its turn.
+  // `turn_` already serializes the threads.
   const int result = sqlite3_open_v2(file.c_str(), &connection, mode | SQLITE_OPEN_NOMUTEX, nullptr);
   std::unique_ptr<Database> database(new Database(connection));
   if (result != SQLITE_OK) return databaseError(connection, result);
@@ -93,7 +93,7 @@ Statement::Statement(Database& database, std::string_view sql) : connection_(dat
     check(sqlite3_prepare_v3(connection_, sql.data(), static_cast<int>(sql.size()), SQLITE_PREPARE_PERSISTENT,
                              &statement, nullptr));
   }
-  if (kept.busy) return;  // Used further up in this thread: this one is for this object alone.
+  if (kept.busy) return;  // An outer statement of this thread uses the cached one; this object owns a second one.
   kept.busy = true;
   home_ = &kept;
   statement_ = kept.statement;
@@ -111,7 +111,7 @@ Statement::~Statement() {
     return;
   }
   sqlite3_reset(statement_);
-  if (statement_ != nullptr) sqlite3_clear_bindings(statement_);  // Unlike reset it does not take a null.
+  if (statement_ != nullptr) sqlite3_clear_bindings(statement_);  // Unlike sqlite3_reset, it rejects null.
   home_->busy = false;
 }
 
@@ -154,7 +154,7 @@ std::optional<std::string> Statement::optionalText(int column) const {
   return std::string(text(column));
 }
 
-// A statement that could not be prepared is null; binding to it then fails, after the failure that counts.
+// A statement that could not be prepared is null. Binding to it fails too, but `status_` keeps the first failure.
 
 void Statement::bind(int index, std::nullptr_t) {
   check(sqlite3_bind_null(statement_, index));
@@ -167,7 +167,7 @@ void Statement::bind(int index, double value) {
 }
 
 void Statement::bind(int index, std::string_view value) {
-  const char* text = value.data() == nullptr ? "" : value.data();  // A null pointer would bind a null.
+  const char* text = value.data() == nullptr ? "" : value.data();  // A null pointer would bind a SQL null.
   check(sqlite3_bind_text64(statement_, index, text, value.size(), SQLITE_TRANSIENT, SQLITE_UTF8));
 }
 

@@ -1,4 +1,4 @@
-// The device's database: a small layer over SQLite that is safe to use from any thread.
+// The device's database: a thread-safe layer over SQLite.
 #pragma once
 
 #include <concepts>
@@ -24,7 +24,8 @@ namespace appsync::device {
 /// Error domain of the database; codes are SQLite's extended result codes.
 inline constexpr std::string_view kSQLiteDomain = "SQLite";
 
-/// One connection, which threads take in turn. Write-ahead log: readers in other processes neither wait nor make wait.
+/// One connection, used by one thread at a time. Thread-safe. The write-ahead log keeps readers in other processes from
+/// blocking and being blocked.
 ///
 ///     Database::Session session(database);
 ///     Statement query = session.prepare("select name, size from things where kind = ?", kind);
@@ -35,16 +36,16 @@ inline constexpr std::string_view kSQLiteDomain = "SQLite";
 ///     transaction.run("insert into things values (?, ?, ?)", name, kind, size).ignore();
 ///     return transaction.commit();
 ///
-/// A thread has one session (or transaction) at a time, and calls out to nothing that might open another while it has.
-/// Every service makes its own tables: a `static constexpr const char* kSchema` of "create table if not exists …"
-/// statements, listed in `Device.cpp`.
+/// A thread may have one session or transaction at a time; opening a second one is a deadlock. Every service creates
+/// its own tables: a `static constexpr const char* kSchema` of "create table if not exists …" statements, listed in
+/// `Services.h`.
 class Database {
  public:
   class Session;
   class Transaction;
 
-  /// Opens the file at a host path; `exclusive` makes it if it is missing, `readOnly` changes nothing. Whether one
-  /// process or several open it is the caller's business.
+  /// Opens the database at a host path. `exclusive` creates a missing file but does not lock it: callers ensure that
+  /// one process writes.
   [[nodiscard]] static Result<std::unique_ptr<Database>> open(const std::string& path, Access access);
   ~Database();
   Database(const Database&) = delete;
@@ -53,7 +54,7 @@ class Database {
  private:
   friend class Statement;
 
-  /// A statement that stays prepared for as long as the connection lives.
+  /// A cached prepared statement.
   struct Prepared {
     sqlite3_stmt* statement = nullptr;
     bool busy = false;
@@ -67,21 +68,21 @@ class Database {
   std::map<std::string, Prepared, std::less<>> prepared_;
 };
 
-/// A statement with its parameters bound. Lives within a session. The first failure sticks: `next` is false from then
-/// on.
+/// A statement with bound parameters. Must not outlive its session. After the first failure `next` always returns
+/// false.
 class Statement {
  public:
   Statement(Statement&& other) noexcept;
   Statement& operator=(Statement&&) = delete;
   ~Statement();
 
-  /// Steps to the next row; false at the end and on failure.
+  /// Moves to the next row. Returns false at the end and on failure.
   [[nodiscard]] bool next();
-  /// Success, or what made `next` end early.
+  /// The first failure.
   [[nodiscard]] const Status& status() const noexcept { return status_; }
 
-  // Columns of the current row, from 0. Views hold until the next step. Other types are converted as SQLite does;
-  // a null is empty or 0.
+  // Columns of the current row, from 0. Views are valid until the next call of `next`. SQLite converts other types; a
+  // null is empty or 0.
   [[nodiscard]] bool isNull(int column) const;
   [[nodiscard]] std::int64_t integer(int column) const;
   [[nodiscard]] double real(int column) const;
@@ -119,18 +120,18 @@ class Statement {
 
   sqlite3* connection_;
   sqlite3_stmt* statement_ = nullptr;
-  /// Where the statement goes back to; null when it is this object's own.
+  /// The cache entry to release, or null if this object owns the statement.
   Database::Prepared* home_ = nullptr;
   Status status_;
 };
 
-/// A thread's turn on the connection. Each statement outside a transaction is one of its own.
+/// Exclusive use of the connection. Outside a transaction each statement is committed by itself.
 class Database::Session {
  public:
   explicit Session(Database& database) : database_(database), lock_(database.turn_) {}
 
   /// Binds `arguments` (integers, enumerations, reals, texts, bytes, optionals of these, nullptr) to the "?" in order.
-  /// The arguments are copied. Failures show in the statement's status.
+  /// The arguments are copied. On failure the statement's status is an error.
   template <class... Arguments>
   [[nodiscard]] Statement prepare(std::string_view sql, const Arguments&... arguments) {
     Statement statement(database_, sql);
@@ -146,10 +147,10 @@ class Database::Session {
     return finish(statement);
   }
 
-  /// Runs several statements, separated by semicolons and without parameters, that are not worth keeping prepared.
+  /// Runs several statements without parameters, separated by semicolons, without caching them.
   Status runScript(const char* sql);
 
-  /// Rows that the last insert, update or delete touched.
+  /// Returns the number of rows that the last insert, update or delete changed.
   [[nodiscard]] std::int64_t changes() const;
 
  protected:
@@ -159,17 +160,17 @@ class Database::Session {
   std::unique_lock<std::mutex> lock_;
   /// The first statement that failed.
   Status failure_;
-  /// After a failure nothing more is run.
+  /// Whether statements after a failed one are skipped.
   bool allOrNothing_ = false;
 };
 
-/// A session whose statements take effect together, or not at all: without a `commit` its end takes them back.
+/// A transaction. The destructor rolls back unless `commit` succeeded.
 class Database::Transaction : public Database::Session {
  public:
   explicit Transaction(Database& database, Durability durability = Durability::process);
   ~Transaction();
 
-  /// Fails, and changes nothing, when any `run` of this transaction failed, with the first of their errors.
+  /// Fails with the error of the first `run` that failed, if any; the transaction is then rolled back.
   [[nodiscard]] Status commit();
 
  private:

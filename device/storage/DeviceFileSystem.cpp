@@ -25,7 +25,7 @@ Status outcome(int error, std::string_view path) {
 }
 
 void keepName(int file, const char* attribute, const std::optional<std::string>& name) {
-  // What the host's file system cannot keep is not kept.
+  // Not an error: some file systems have no extended attributes.
   if (name) static_cast<void>(fsetxattr(file, attribute, name->data(), name->size(), 0));
 }
 
@@ -41,7 +41,7 @@ std::optional<std::string> keptName(int file, const char* attribute) {
   return std::string(name, static_cast<std::size_t>(length));
 }
 
-/// An item of the work folder that goes away again unless it reaches its place.
+/// An item of the work directory, removed on destruction unless `place` succeeded.
 class Draft {
  public:
   explicit Draft(int work) : work_(work), name_(temporaryName()) {}

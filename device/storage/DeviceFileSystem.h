@@ -1,4 +1,4 @@
-// The device's file system, on a folder of this machine.
+// The device's file system, stored in a directory of the host.
 #pragma once
 
 #include <string>
@@ -11,16 +11,16 @@
 
 namespace appsync::device {
 
-/// Device path "/var/x" is "var/x" in the root folder. Files that are being written, copied or removed are in the work
-/// folder, of the same host file system, until they are whole or gone: a kill leaves nothing half done in the root.
+/// Device path "/var/x" is "var/x" in the root directory. Files are written, copied and removed in the work directory,
+/// on the same host file system, so that all changes of the root are atomic. Thread-safe.
 ///
-/// Account names are the device's, not this machine's: they are kept as extended attributes. Where the host's file
-/// system has none they are not kept, and nothing fails for that.
+/// Account names belong to the device, not to the host, and are stored as extended attributes. If the host's file
+/// system has none, they are silently dropped.
 class DeviceFileSystem final : public platform::FileSystem {
  public:
   static constexpr std::string_view kTemporaryDirectory = "/tmp";
 
-  /// `work` is the open work folder. With `Access::readOnly` everything that would write fails with EROFS.
+  /// `work` is the open work directory. With `Access::readOnly` every change fails with EROFS.
   DeviceFileSystem(RootDirectory root, FileDescriptor work, Access access)
       : root_(std::move(root)), work_(std::move(work)), access_(access) {}
 
@@ -38,15 +38,15 @@ class DeviceFileSystem final : public platform::FileSystem {
   [[nodiscard]] Status touch(std::string_view path) override;
   [[nodiscard]] std::string temporaryDirectory() override { return std::string(kTemporaryDirectory); }
 
-  /// The owners that an item was made with.
+  /// Returns the owners with which an item was created; nullopt fields if they were not stored.
   [[nodiscard]] Result<platform::OwnerAttributes> ownersOfItem(std::string_view path);
 
   [[nodiscard]] const RootDirectory& root() const noexcept { return root_; }
-  /// The open work folder.
+  /// The open work directory.
   [[nodiscard]] int work() const noexcept { return work_.get(); }
 
  private:
-  /// The place of something that is about to change.
+  /// Resolves the path of an item to change. Fails with EROFS on a read-only device.
   [[nodiscard]] Result<RootDirectory::Place> placeToChange(std::string_view path) const;
   [[nodiscard]] Status writeNew(std::string_view path, ByteView bytes, const platform::OwnerAttributes& attributes,
                                 Durability durability);

@@ -7,10 +7,10 @@ namespace appsync::device {
 
 namespace {
 
-std::atomic<long> stepsUntilKill{0};
+std::atomic<long> faultPointsUntilKill{0};
 
 int killWhenDue(const char*) {
-  if (stepsUntilKill.fetch_sub(1, std::memory_order_relaxed) == 1) {
+  if (faultPointsUntilKill.fetch_sub(1, std::memory_order_relaxed) == 1) {
     std::raise(SIGKILL);
   }
   return 0;
@@ -23,7 +23,7 @@ void installKillHookFromEnvironment() {
   if (text == nullptr || detail::faultHook.load() != nullptr) return;
   const long number = std::strtol(text, nullptr, 10);
   if (number < 1) return;
-  stepsUntilKill = number;
+  faultPointsUntilKill = number;
   setFaultHook(killWhenDue);
 }
 

@@ -1,31 +1,32 @@
-// Where a test may stop the device: in front of every step that changes its files or its database.
+// Fault injection: tests can stop or fail every operation that changes the device's files or database.
 #pragma once
 
 #include <atomic>
 
 namespace appsync::device {
 
-/// Called in front of each step with its name; answers 0 to go on, or the error number the step is to fail with. May
-/// end the process. Any thread.
+/// Called before each operation with its name, on any thread. Returns 0 to continue or the errno value with which the
+/// operation fails. May terminate the process.
 using FaultHook = int (*)(const char* name);
 
 namespace detail {
 inline std::atomic<FaultHook> faultHook{nullptr};
 }
 
-/// Puts a hook in place; null takes it out again.
+/// Installs a hook, or removes it if `hook` is null.
 inline void setFaultHook(FaultHook hook) {
   detail::faultHook.store(hook, std::memory_order_release);
 }
 
-/// To be called in front of a step. Anything but 0 is the error number that the step fails with, undone.
+/// Must be called before an operation. If the result is not 0, the operation must fail with that errno value without
+/// having any effect.
 [[nodiscard]] inline int faultPoint(const char* name) {
   const FaultHook hook = detail::faultHook.load(std::memory_order_acquire);
   return hook == nullptr ? 0 : hook(name);
 }
 
-/// When the environment says APPSYNC_KILL_AT=N, puts a hook in place that kills the process in front of its N-th step,
-/// counted from 1. Without it, or with a hook in place already, does nothing.
+/// If the environment variable APPSYNC_KILL_AT is N, installs a hook that kills the process before its N-th operation,
+/// counted from 1. Does nothing if a hook is installed already.
 void installKillHookFromEnvironment();
 
 }  // namespace appsync::device

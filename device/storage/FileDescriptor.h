@@ -1,4 +1,4 @@
-// An open file that closes itself.
+// An owned file descriptor.
 #pragma once
 
 #include <utility>
@@ -7,7 +7,7 @@
 
 namespace appsync::device {
 
-/// Owns a file descriptor, or none (-1).
+/// Owns a file descriptor, or is empty (-1).
 class FileDescriptor {
  public:
   FileDescriptor() = default;

@@ -20,7 +20,7 @@ FolderEntries::FolderEntries(int folder) {
   if (stream_ == nullptr) {
     failure_ = errno;
   } else {
-    static_cast<void>(own.release());  // The stream's now.
+    static_cast<void>(own.release());  // The stream owns it.
   }
 }
 
@@ -51,7 +51,7 @@ int copyFolder(int from, const struct stat& status, int toFolder, const char* to
     if (const int error = copy(from, name, made.get(), name, bytes, leftOut); error != 0) return error;
   }
   if (entries.failure() != 0) return entries.failure();
-  // What may not be entered or changed could not be moved or removed either.
+  // Without S_IRWXU the copy could be neither moved nor removed.
   return sys::setAttributes(made.get(), (status.st_mode & 0777) | S_IRWXU, status);
 }
 
@@ -71,13 +71,13 @@ int copyLink(int fromFolder, const char* from, int toFolder, const char* to) {
   return sys::makeLink(target, toFolder, to);
 }
 
-/// Empties a folder: its files go, its folders move to `work` and join `pending`, so that no depth needs more than one
-/// open folder.
+/// Empties a directory: removes its files, moves its subdirectories to `work` and appends them to `pending`. Needs one
+/// open directory whatever the depth of the tree.
 int flatten(int folder, int work, std::vector<std::string>& pending) {
   FolderEntries entries(folder);
   while (const char* name = entries.next()) {
     int error = sys::removeFile(folder, name);
-    if (error == EISDIR || error == EPERM) {  // What a folder answers depends on the system.
+    if (error == EISDIR || error == EPERM) {  // unlink of a directory, depending on the file system.
       std::string moved = temporaryName();
       error = sys::rename(folder, name, work, moved.c_str(), sys::Replace::yes);
       if (error == 0) pending.push_back(std::move(moved));
@@ -108,10 +108,10 @@ int copy(int fromFolder, const char* from, int toFolder, const char* to, std::ui
     return leftOut != nullptr ? 0 : EINVAL;
   };
   struct stat status {};
-  // Non-blocking: opening a pipe must not wait for somebody to write into it.
+  // Without O_NONBLOCK opening a pipe would wait for a writer.
   const FileDescriptor source(openat(fromFolder, from, O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC));
   if (!source.valid() && errno == ELOOP) return copyLink(fromFolder, from, toFolder, to);
-  if (!source.valid()) return errno == ENXIO ? leaveOut() : errno;  // The answer of sockets.
+  if (!source.valid()) return errno == ENXIO ? leaveOut() : errno;  // A socket.
   if (fstat(source.get(), &status) != 0) return errno;
   if (S_ISDIR(status.st_mode)) return copyFolder(source.get(), status, toFolder, to, bytes, leftOut);
   if (S_ISREG(status.st_mode)) return copyFile(source.get(), status, toFolder, to, bytes);
@@ -154,7 +154,7 @@ int read(int file, std::uint64_t most, Bytes& bytes) {
     const ssize_t got = ::read(file, bytes.data() + length, bytes.size() - length);
     if (got < 0 && errno == EINTR) continue;
     if (got < 0) return errno;
-    if (got == 0) break;  // It was cut meanwhile.
+    if (got == 0) break;  // The file was truncated while it was read.
     length += static_cast<std::size_t>(got);
   }
   bytes.resize(length);

@@ -1,4 +1,4 @@
-// Whole folders: copied, removed, written.
+// Operations on directory trees.
 #pragma once
 
 #include <cstdint>
@@ -13,15 +13,15 @@
 
 namespace appsync::device {
 
-/// The names in an open folder, but for "." and "..", in the disk's order.
+/// Iterates over the names in an open directory, except "." and "..", in the file system's order.
 class FolderEntries {
  public:
-  /// `folder` stays the caller's.
+  /// Does not take ownership of `folder`.
   explicit FolderEntries(int folder);
 
-  /// The next name, or null at the end. Holds until the next call.
+  /// Returns the next name, valid until the next call, or null at the end and on failure.
   [[nodiscard]] const char* next();
-  /// 0, or the error number that ended the walk early.
+  /// Returns the errno value of the failure that ended the iteration, or 0.
   [[nodiscard]] int failure() const noexcept { return failure_; }
 
  private:
@@ -32,27 +32,28 @@ class FolderEntries {
   int failure_ = 0;
 };
 
-/// Files, folders and links, relative to open folders, which stay the caller's. Each returns 0, or the error number.
+/// Paths are relative to open directories, which the caller owns. Each function returns 0 or an errno value.
 namespace tree {
 
-/// Makes `to` a copy of `from`, a file, a link or a folder with all in it, and adds the files' sizes to `bytes`.
-/// Permissions and times are kept, but for links, and every folder of the copy may be used by its owner. Anything else
-/// than these fails with EINVAL, or is left out and counted where there is a `leftOut`. Fails with EEXIST when `to` is
-/// there. A failure leaves part of it.
+/// Copies a file, link or directory tree and adds the files' sizes to `bytes`. Copies permissions and times, except
+/// those of links, and gives the owner full access to every copied directory. Special files fail with EINVAL or, if
+/// `leftOut` is not null, are skipped and counted there. Fails with EEXIST if `to` exists. A failure leaves an
+/// incomplete copy.
 [[nodiscard]] int copy(int fromFolder, const char* from, int toFolder, const char* to, std::uint64_t& bytes,
                        std::uint64_t* leftOut = nullptr);
 
-/// Makes a file with these bytes in it; a failure leaves none.
+/// Creates a file with the given content. A failure leaves no file.
 [[nodiscard]] int create(int folder, const char* name, ByteView bytes);
 
-/// Removes `name`, whatever it is. It is moved into the `work` folder first, which must be of the same file system: at
-/// any moment it is whole or gone from where it was, and `work` holds what remains.
+/// Removes a file, link or directory tree atomically: moves it into the directory `work`, which must be on the same
+/// file system, and deletes it there. An interrupted or failed removal leaves the rest in `work`.
 [[nodiscard]] int remove(int folder, const char* name, int work);
 
-/// Removes everything that is in a folder, likewise. The folder may be `work` itself.
+/// Removes every entry of a directory as `remove` does. The directory may be `work`.
 [[nodiscard]] int empty(int folder, int work);
 
-/// All that is left of a file, up to `most` bytes; EFBIG beyond them, EISDIR for a folder.
+/// Reads a regular file to its end. Returns EFBIG if it has more than `most` bytes, EISDIR for a directory and EINVAL
+/// for special files.
 [[nodiscard]] int read(int file, std::uint64_t most, Bytes& bytes);
 
 }  // namespace tree

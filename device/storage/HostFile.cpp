@@ -24,10 +24,10 @@ namespace {
 
 namespace fs = std::filesystem;
 
-/// Between a file's name and a random one, of its successor that is still being written.
+/// Separates a file's name from a random one in the name of its incomplete replacement.
 constexpr std::string_view kDraftMark = ".draft-";
 constexpr int kDraftAttempts = 8;
-/// As many as the system follows.
+/// The limit of Linux.
 constexpr int kMostLinks = 40;
 
 Error cannotWrite(const std::string& path, int error) {
@@ -48,7 +48,7 @@ Error noFile(const std::string& path) {
           nullptr};
 }
 
-/// An opened file, or a standard stream, which is not this object's to close.
+/// An opened file, closed on destruction, or a standard stream, which stays open.
 class Stream {
  public:
   Stream(const std::string& path, int standard, int flags)
@@ -74,7 +74,7 @@ int copyAll(int from, int to) {
   }
 }
 
-/// Opens standard output, a pipe or a device, and lets `write` write to it.
+/// Opens standard output, a pipe or a device and passes its descriptor to `write`, which returns 0 or an errno value.
 template <class Write>
 Status writeStream(const std::string& path, const Write& write) {
   const Stream stream(path, STDOUT_FILENO, O_WRONLY);
@@ -83,7 +83,7 @@ Status writeStream(const std::string& path, const Write& write) {
   return cannotWrite(path == kStandardStream ? "standard output" : path, failed);
 }
 
-/// The result is whole before the first byte of it leaves.
+/// Collects the whole result before it writes the first byte to the stream.
 Status fillStream(const std::string& path, const HostFileFill& fill) {
   const std::unique_ptr<std::FILE, int (*)(std::FILE*)> whole(std::tmpfile(), std::fclose);
   if (whole == nullptr) return Error::fromErrno(errno, "a temporary file cannot be made");
@@ -107,7 +107,7 @@ Status replaceFile(const std::string& path, const HostFileFill& fill) {
   const mode_t mode = isReplaced ? old.st_mode & 0777U : sys::kFileMode;
   std::string draft;
   FileDescriptor file;
-  // Until it is in place nobody may read it who must not, and this process must.
+  // Never readable for more users than the old file, and always for this process.
   int failed = createDraft(path, (mode & sys::kFileMode) | S_IRUSR | S_IWUSR, draft, file);
   if (failed != 0) return cannotWrite(path, failed);
   const Status filled = fill(file.get());
@@ -126,7 +126,7 @@ struct Place {
   bool isStream = false;
 };
 
-/// What a path for a result leads to; behind links a file need not be there yet.
+/// Resolves the links of a result's path. The file at their end need not exist.
 Result<Place> placeOf(const std::string& path) {
   if (path == kStandardStream) return Place{path, true};
   struct stat found = {};

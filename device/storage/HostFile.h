@@ -1,4 +1,4 @@
-// Files of this machine, outside any device.
+// Files of the host, outside any device.
 #pragma once
 
 #include <cstdint>
@@ -10,37 +10,37 @@
 
 namespace appsync::device {
 
-/// The name that stands for standard input, or standard output.
+/// The path that means standard input or standard output.
 inline constexpr const char* kStandardStream = "-";
 
-/// More bytes than any file has that is read whole.
+/// Default limit of files that are read whole.
 inline constexpr std::uint64_t kLargestHostFile = 1'000'000'000;
 
-/// The whole of a file of at most `most` bytes. What is no file, such as a pipe, is refused and never waited for.
-/// Errors, of all that stands here: "POSIX", the text names the path.
+/// Reads a regular file of at most `most` bytes. Fails for pipes and devices without waiting for them. The errors of
+/// all functions of this header are of domain "POSIX" and name the path.
 [[nodiscard]] Result<Bytes> readHostFile(const std::string& path, std::uint64_t most = kLargestHostFile);
 
-/// The same of whatever can be read to its end, and of standard input: waits for who writes into a pipe.
+/// Reads a file, pipe, device or standard input to its end, waiting for the writers of pipes.
 [[nodiscard]] Result<Bytes> readHostStream(const std::string& path, std::uint64_t most = kLargestHostFile);
 
-/// Makes the file at a host path hold `bytes`, in one step: after a failure, a kill or a loss of power it holds what it
-/// held, or all of `bytes`. A link is replaced itself. A file that is replaced leaves its mode to the new one.
+/// Replaces a file atomically: after a failure, crash or power failure it has its old content or `bytes`. Replaces a
+/// link, not its target. Keeps the mode of a replaced file.
 [[nodiscard]] Status replaceHostFile(const std::string& path, ByteView bytes);
 
-/// Writes all of it to an open file, pipe or device. 0, or the error number: EPIPE when nobody reads any more.
+/// Writes all bytes to an open file, pipe or device. Returns 0 or an errno value: EPIPE if a pipe has no reader.
 [[nodiscard]] int writeAll(int stream, ByteView bytes);
 
-/// Writes what people name as the place of a result: a file is replaced like that, behind links the file that they lead
-/// to; a pipe or device is written to as it is, "-" is standard output. A reader that leaves early is no failure.
+/// Writes a result to the path that a user named. Replaces files atomically, following links; writes to pipes, devices
+/// and, for "-", standard output directly. Succeeds if the reader of a pipe closes it early.
 [[nodiscard]] Status writeHostFile(const std::string& path, ByteView bytes);
 
-/// Writes all of a result to an open file, which is empty.
+/// Writes a result to an open, empty file.
 using HostFileFill = std::function<Status(int file)>;
 
-/// The same with what `fill` writes, of which nothing reaches the place when it fails.
+/// Writes the output of `fill` to `path`. If `fill` fails, nothing is written.
 [[nodiscard]] Status writeHostFile(const std::string& path, const HostFileFill& fill);
 
-/// Removes from a folder the unfinished files of writers that were killed, as far as that can be done.
+/// Removes the incomplete files that crashed writers left in a directory, ignoring failures.
 void removeHostFileDrafts(int folder);
 
 }  // namespace appsync::device

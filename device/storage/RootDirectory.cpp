@@ -17,7 +17,7 @@ namespace {
 
 constexpr int kMaximumLinks = 40;
 
-/// False once the kernel, or what guards it, has said that it does not know the call.
+/// Whether openat2 exists; false after ENOSYS.
 std::atomic<bool> kernelResolves{true};
 
 int openByKernel(int folder, const char* path, int flags, mode_t mode, FileDescriptor& file) {
@@ -31,7 +31,7 @@ int openByKernel(int folder, const char* path, int flags, mode_t mode, FileDescr
       file = FileDescriptor(static_cast<int>(descriptor));
       return 0;
     }
-    // EAGAIN: something on the way was moved meanwhile, so that ".." could not be vouched for.
+    // EAGAIN: a rename during the call made the resolution of ".." unsafe.
     if (errno != EINTR && errno != EAGAIN) return errno;
   }
 }
@@ -46,7 +46,7 @@ void pushFront(std::deque<std::string>& components, std::string_view path) {
   components.insert(components.begin(), parts.begin(), parts.end());
 }
 
-/// What a link says, or an error number: EINVAL when it is none.
+/// Reads a link. Returns 0 or an errno value: EINVAL if it is not a link.
 int readLink(int folder, const char* name, std::string& target) {
   char buffer[PATH_MAX];
   const ssize_t length = readlinkat(folder, name, buffer, sizeof buffer);
@@ -55,8 +55,8 @@ int readLink(int folder, const char* name, std::string& target) {
   return 0;
 }
 
-/// Walks down holding every folder on the way open, so that ".." is where the walk came from and not where the disk
-/// says.
+/// Resolves a path with every directory on the way open, so that ".." is the directory it came from even if the tree
+/// changes.
 class Walk {
  public:
   Walk(int folder, std::string_view path) : top_(folder) { pushFront(components_, path); }
@@ -128,7 +128,7 @@ std::string_view withoutSlashesAtEnd(std::string_view path) {
 
 Error pathError(int error, std::string_view path) {
   if (error != EXDEV) return Error::fromErrno(error, path);
-  return {std::string(domains::kPOSIX), EXDEV, std::string(path) + ": leads out of the device", nullptr};
+  return {std::string(domains::kPOSIX), EXDEV, std::string(path) + ": leads outside the device", nullptr};
 }
 
 }  // namespace

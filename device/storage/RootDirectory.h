@@ -1,4 +1,4 @@
-// Device paths to open files, without a way out of the device.
+// Opens device paths without leaving the device.
 #pragma once
 
 #include <string>
@@ -11,28 +11,27 @@
 
 namespace appsync::device {
 
-/// Who takes a path apart: the kernel in one call, where it can, or this process, one component after the other.
+/// How paths are resolved: by openat2 if the kernel has it, or one component after the other.
 enum class Resolution { kernel, componentwise };
 
-/// The folder that is a device's "/". Whatever a path or the links on its way say, and however they change meanwhile,
-/// nothing outside is opened: ".." above the root and absolute links fail.
+/// The directory that is a device's "/". Paths are untrusted: ".." above the root and absolute links fail, and
+/// concurrent changes of the tree never lead outside.
 ///
-/// Threads: any. Errors: POSIX; EXDEV for a path that leads out. The text starts with the path.
+/// Thread-safe. Errors are of domain "POSIX", EXDEV for a path that leads outside; their text starts with the path.
 class RootDirectory {
  public:
   [[nodiscard]] static Result<RootDirectory> open(const std::string& hostPath,
                                                   Resolution resolution = Resolution::kernel);
 
-  /// Opens what is at an absolute device path, as open(2) does.
+  /// Opens an absolute device path with the flags of open(2).
   [[nodiscard]] Result<FileDescriptor> open(std::string_view path, int flags) const;
 
-  /// What is to be made, moved or removed: a name in an open folder. The name is a single component, neither "." nor
-  /// "..".
+  /// A directory entry to create, move or remove. The name is a single component, neither "." nor "..".
   struct Place {
     FileDescriptor folder;
     std::string name;
   };
-  /// The place of an absolute device path; the folder must exist, what is in it by that name need not.
+  /// Resolves an absolute device path. The directory must exist, the entry need not.
   [[nodiscard]] Result<Place> place(std::string_view path) const;
 
  private:
@@ -44,7 +43,7 @@ class RootDirectory {
   Resolution resolution_;
 };
 
-/// The same below any open folder, for a relative path: 0, or the error number.
+/// Opens a relative path below any open directory in the same way. Returns 0 or an errno value.
 [[nodiscard]] int openBeneath(int folder, const std::string& path, int flags, mode_t mode, Resolution resolution,
                               FileDescriptor& file);
 

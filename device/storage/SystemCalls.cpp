@@ -10,7 +10,7 @@ namespace appsync::device::sys {
 
 namespace {
 
-/// One step: the call, unless a test wants it to fail. Calls return -1 on failure.
+/// Makes a system call, which returns -1 on failure, unless a fault is injected.
 template <class Call>
 int perform(const char* name, Call call) {
   if (const int injected = faultPoint(name); injected != 0) return injected;
@@ -20,7 +20,7 @@ int perform(const char* name, Call call) {
   }
 }
 
-/// For file systems that rename, but not without replacing.
+/// For file systems without RENAME_NOREPLACE. Not atomic.
 int renameUnlessThere(int fromFolder, const char* from, int toFolder, const char* to) {
   struct stat there {};
   if (fstatat(toFolder, to, &there, AT_SYMLINK_NOFOLLOW) == 0) return EEXIST;
@@ -76,9 +76,8 @@ int removeEmptyFolder(int folder, const char* name) {
 }
 
 int writeOut(int file) {
-  // The rename is journaled after the bytes are out, and a journal's commit makes the disk keep what came before it. So
-  // the order holds without waiting for a commit, which costs up to fifty times as much while packages are being
-  // unpacked.
+  // The rename is journaled after the content is written, and the journal's commit flushes the disk's cache first. This
+  // keeps the order without waiting for a commit, which takes up to fifty times as long while packages are unpacked.
   constexpr unsigned kAll = SYNC_FILE_RANGE_WAIT_BEFORE | SYNC_FILE_RANGE_WRITE | SYNC_FILE_RANGE_WAIT_AFTER;
   const int error = perform("write out", [&] { return sync_file_range(file, 0, 0, kAll); });
   if (error != ENOSYS && error != EINVAL && error != EOPNOTSUPP) return error;
@@ -113,7 +112,7 @@ int copyContents(int from, int to, std::uint64_t& bytes) {
       continue;
     }
     if (error != EXDEV && error != ENOSYS && error != EINVAL && error != EOPNOTSUPP) return error;
-    // Not between these two file systems: by hand, from where it stopped.
+    // copy_file_range does not support these file systems: copy the rest with read and write.
     Bytes buffer(std::size_t{1} << 17);
     const ssize_t got = read(from, buffer.data(), buffer.size());
     if (got < 0 && errno != EINTR) return errno;

@@ -51,7 +51,7 @@ TEST_F(HostileFiles, DoesNotWaitForPipeAsManifest) {
 TEST_F(HostileFiles, ReportsLogPipeWithoutReader) {
   makePipe(path("pipe"));
   expectUnusable(sync({"--log", path("pipe")}),
-                 "cannot open log file \"" + path("pipe") + "\": nobody reads from this pipe; start its reader first");
+                 "cannot open log file \"" + path("pipe") + "\": the pipe has no reader; start its reader first");
 }
 
 TEST_F(HostileFiles, KeepsUnreadableHostState) {

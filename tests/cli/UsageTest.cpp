@@ -30,7 +30,7 @@ TEST(Usage, UnknownSettingListsAllKeys) {
   EXPECT_EQ(run.status, 2);
   EXPECT_EQ(
       run.err,
-      "appsync: there is no setting \"colour\"; there are app-installation, app-removal, assertion, coordination, "
+      "appsync: unknown setting \"colour\"; the settings are app-installation, app-removal, assertion, coordination, "
       "store, demote, demote-auto, licence\n");
 }
 

@@ -10,7 +10,7 @@
 #include <unistd.h>
 
 #include "device/Device.h"
-#include "device/storage/FaultPoint.h"
+#include "tests/device/InjectedFault.h"
 #include "tests/support/TestDevice.h"
 
 namespace appsync::test {
@@ -23,7 +23,7 @@ namespace {
 
 namespace fs = std::filesystem;
 
-/// The error of an opening that must fail.
+/// Returns the error of an attempt to open a device, which must fail.
 Error refusal(const Result<std::unique_ptr<Device>>& opened) {
   EXPECT_FALSE(opened.ok());
   return opened ? Error{} : opened.error();
@@ -33,8 +33,8 @@ Error failure(DeviceFailure code, const std::string& text) {
   return device::deviceError(code, text);
 }
 
-/// Every file and folder below, each with what tells its content from others. Of the database's shared memory, in which
-/// processes that have it open speak with each other, only that it is there.
+/// Returns every file and directory below with a hash of its content, except that of the database's shared memory,
+/// which changes while the database is open.
 std::map<std::string, std::size_t> contents(const std::string& folder) {
   std::map<std::string, std::size_t> all;
   for (const auto& entry : fs::recursive_directory_iterator(folder)) {
@@ -52,15 +52,11 @@ void runSQL(const std::string& path, const char* sql) {
   ASSERT_TRUE(session.runScript(sql).ok());
 }
 
-int failWithNoSpace(const char*) {
-  return ENOSPC;
-}
-
 class DeviceAtPath : public testing::Test {
  protected:
   [[nodiscard]] std::string path() const { return folder_.path("device"); }
   Result<std::unique_ptr<Device>> open(Access access = Access::exclusive) { return Device::open(path(), access); }
-  /// A device that nobody holds.
+  /// Creates a device without keeping it open.
   void make() { ASSERT_TRUE(Device::create(path()).ok()); }
 
   TemporaryFolder folder_;
@@ -68,31 +64,31 @@ class DeviceAtPath : public testing::Test {
 
 }  // namespace
 
-TEST_F(DeviceAtPath, IsMadeOfAMissingFolder) {
+TEST_F(DeviceAtPath, CreatesMissingDirectory) {
   const auto device = Device::create(path());
   ASSERT_TRUE(device.ok()) << device.error().text;
   EXPECT_EQ((*device)->path(), path());
   EXPECT_TRUE((*device)->services().fileSystem().fileExists("/var/mobile/Media/PublicStaging"));
 }
 
-TEST_F(DeviceAtPath, IsMadeOfAnEmptyFolder) {
+TEST_F(DeviceAtPath, AcceptsEmptyDirectory) {
   fs::create_directory(path());
   EXPECT_TRUE(Device::create(path()).ok());
 }
 
-TEST_F(DeviceAtPath, ItsMakingLeavesNothingHalfDone) {
+TEST_F(DeviceAtPath, CreationLeavesNoIncompleteFiles) {
   make();
   for (const auto& [path, hash] : contents(path()))
     EXPECT_EQ(path.find("device.db.new"), path.npos) << path;
 }
 
-TEST_F(DeviceAtPath, IsNotMadeTwice) {
+TEST_F(DeviceAtPath, RejectsExistingDevice) {
   make();
   EXPECT_EQ(refusal(Device::create(path())),
-            failure(DeviceFailure::exists, path() + " is a device already; use it as it is, or choose another folder"));
+            failure(DeviceFailure::exists, path() + " is already a device; use it, or choose another folder"));
 }
 
-TEST_F(DeviceAtPath, IsNotMadeOfAFolderThatHoldsSomethingElse) {
+TEST_F(DeviceAtPath, RejectsDirectoryWithOtherFiles) {
   fs::create_directory(path());
   writeHostFile(path() + "/letter.txt", "Dear");
   EXPECT_EQ(
@@ -101,44 +97,42 @@ TEST_F(DeviceAtPath, IsNotMadeOfAFolderThatHoldsSomethingElse) {
   EXPECT_EQ(contents(path()).size(), 1U);
 }
 
-TEST_F(DeviceAtPath, IsNotMadeOfAFolderThatOnlyLooksLikeABeginning) {
+TEST_F(DeviceAtPath, RejectsIncompleteDeviceWithoutLockFile) {
   fs::create_directories(path() + "/root/important");
   EXPECT_EQ(refusal(Device::create(path())).code, static_cast<long>(DeviceFailure::exists));
 }
 
-TEST_F(DeviceAtPath, IsNotMadeWhereTheParentIsMissing) {
+TEST_F(DeviceAtPath, RejectsMissingParent) {
   const auto device = Device::create(folder_.path("missing/device"));
   EXPECT_EQ(refusal(device),
             failure(DeviceFailure::missing, folder_.path("missing/device") +
-                                                " cannot be made: the folder around it is missing; make that first"));
+                                                " cannot be created: its parent folder is missing; create that first"));
 }
 
-TEST_F(DeviceAtPath, IsNotMadeOfAFile) {
+TEST_F(DeviceAtPath, RejectsFile) {
   writeHostFile(path(), "x");
   EXPECT_EQ(refusal(Device::create(path())).code, static_cast<long>(DeviceFailure::notADevice));
 }
 
-TEST_F(DeviceAtPath, IsNotMadeOnAFullDisk) {
-  device::setFaultHook(failWithNoSpace);
-  const auto device = Device::create(path());
-  device::setFaultHook(nullptr);
+TEST_F(DeviceAtPath, CreationReportsFullDisk) {
+  const auto device = withFaultHook([](const char*) { return ENOSPC; }, [this] { return Device::create(path()); });
   EXPECT_EQ(refusal(device), failure(DeviceFailure::noSpace, path() + ": the disk is full; make room and try again"));
 }
 
-TEST_F(DeviceAtPath, IsMissed) {
+TEST_F(DeviceAtPath, OpenReportsMissingDirectory) {
   EXPECT_EQ(refusal(open()),
             failure(DeviceFailure::missing, path() + ": there is no such folder; make a device with \"appsync init\""));
   EXPECT_EQ(refusal(open(Access::readOnly)).code, static_cast<long>(DeviceFailure::missing));
 }
 
-TEST_F(DeviceAtPath, IsNoFile) {
+TEST_F(DeviceAtPath, OpenRejectsFile) {
   writeHostFile(path(), "x");
   EXPECT_EQ(refusal(open()),
             failure(DeviceFailure::notADevice,
                     path() + ": is no folder; name a device's folder, or make one with \"appsync init\""));
 }
 
-TEST_F(DeviceAtPath, IsNoOtherFolderAndLeavesItAsItIs) {
+TEST_F(DeviceAtPath, OpenRejectsOtherDirectoryUnchanged) {
   fs::create_directory(path());
   EXPECT_EQ(
       refusal(open()),
@@ -148,15 +142,15 @@ TEST_F(DeviceAtPath, IsNoOtherFolderAndLeavesItAsItIs) {
   EXPECT_TRUE(fs::is_empty(path()));
 }
 
-TEST_F(DeviceAtPath, HasADatabaseOfItsOwn) {
+TEST_F(DeviceAtPath, OpenRejectsDatabaseOfOtherProgram) {
   fs::create_directory(path());
   runSQL(path() + "/device.db", "create table recipes (name text)");
   EXPECT_EQ(refusal(open(Access::readOnly)),
             failure(DeviceFailure::notADevice,
-                    path() + " is not a device: its device.db is something else's; name a device's folder"));
+                    path() + " is not a device: its device.db belongs to another program; name a device's folder"));
 }
 
-TEST_F(DeviceAtPath, WithADatabaseThatIsNoneIsDamaged) {
+TEST_F(DeviceAtPath, OpenReportsInvalidDatabase) {
   make();
   writeHostFile(path() + "/device.db", std::string(8192, 'x'));
   const Error error = refusal(open());
@@ -166,7 +160,7 @@ TEST_F(DeviceAtPath, WithADatabaseThatIsNoneIsDamaged) {
                             "place, or make a new one with \"appsync init\"");
 }
 
-TEST_F(DeviceAtPath, WithABrokenDatabaseIsDamaged) {
+TEST_F(DeviceAtPath, OpenReportsCorruptDatabase) {
   make();
   const std::string database = path() + "/device.db";
   std::string bytes = readHostFile(database);
@@ -178,7 +172,7 @@ TEST_F(DeviceAtPath, WithABrokenDatabaseIsDamaged) {
   }
 }
 
-TEST_F(DeviceAtPath, OfANewerVersionSaysSo) {
+TEST_F(DeviceAtPath, OpenReportsNewerVersion) {
   make();
   runSQL(path() + "/device.db", "pragma user_version = 7");
   EXPECT_EQ(refusal(open()),
@@ -186,7 +180,7 @@ TEST_F(DeviceAtPath, OfANewerVersionSaysSo) {
                     path() + " was made by a newer version of appsync (layout 7, this one has 1); use that version"));
 }
 
-TEST_F(DeviceAtPath, OfAnOlderVersionSaysSo) {
+TEST_F(DeviceAtPath, OpenReportsOlderVersion) {
   make();
   runSQL(path() + "/device.db", "pragma user_version = 0");
   EXPECT_EQ(refusal(open()),
@@ -194,7 +188,7 @@ TEST_F(DeviceAtPath, OfAnOlderVersionSaysSo) {
                     path() + " was made by an older version of appsync (layout 0, this one has 1); use that version"));
 }
 
-TEST_F(DeviceAtPath, IsHeldByOneAtATime) {
+TEST_F(DeviceAtPath, OneProcessHasExclusiveAccess) {
   const auto first = Device::create(path());
   ASSERT_TRUE(first.ok());
   EXPECT_EQ(refusal(open()),
@@ -202,12 +196,12 @@ TEST_F(DeviceAtPath, IsHeldByOneAtATime) {
                                              "); wait until it has ended and try again"));
 }
 
-TEST_F(DeviceAtPath, IsFreeOnceItsHolderIsGone) {
+TEST_F(DeviceAtPath, LockEndsWithItsProcess) {
   make();
   EXPECT_TRUE(open().ok());
 }
 
-TEST_F(DeviceAtPath, IsReadBesideItsHolder) {
+TEST_F(DeviceAtPath, ReadersOpenHeldDevice) {
   TestDevice holder;
   holder.install("com.a", "1.5");
   const auto reader = Device::open(holder.path(), Access::readOnly);
@@ -218,7 +212,7 @@ TEST_F(DeviceAtPath, IsReadBesideItsHolder) {
   EXPECT_TRUE(registry.applicationIsInstalled("com.b"));
 }
 
-TEST_F(DeviceAtPath, ThatIsReadDoesNotChange) {
+TEST_F(DeviceAtPath, ReadOnlyDeviceDoesNotChange) {
   TestDevice device;
   device.install("com.a");
   device.placeholder("com.b");
@@ -239,7 +233,7 @@ TEST_F(DeviceAtPath, ThatIsReadDoesNotChange) {
   EXPECT_EQ(contents(device.path()), before);
 }
 
-TEST_F(DeviceAtPath, OpenedForWritingLosesFilesThatAKillLeftHalfWritten) {
+TEST_F(DeviceAtPath, OpenRemovesIncompleteHostFiles) {
   make();
   const std::string left = path() + "/host-state.plist.draft-0123456789abcdef";
   writeHostFile(left, "half");
@@ -249,7 +243,7 @@ TEST_F(DeviceAtPath, OpenedForWritingLosesFilesThatAKillLeftHalfWritten) {
   EXPECT_FALSE(fs::exists(left));
 }
 
-TEST_F(DeviceAtPath, ShowsStoredProgressToReaders) {
+TEST_F(DeviceAtPath, ReadersSeeStoredProgress) {
   TestDevice device;
   device.placeholder("com.a");
   const auto progress = device.record("com.a")->installProgress();
@@ -264,7 +258,7 @@ TEST_F(DeviceAtPath, ShowsStoredProgressToReaders) {
   EXPECT_EQ(seen->installProgress()->installState(), platform::TSInstallState::Active);
 }
 
-TEST_F(DeviceAtPath, WithoutItsRootOrContainersIsDamagedAndLosesNothing) {
+TEST_F(DeviceAtPath, MissingRootOrContainersAreNotRecreated) {
   TestDevice device;
   device.install("com.a", "1.5");
   device.close();
@@ -286,7 +280,7 @@ TEST_F(DeviceAtPath, WithoutItsRootOrContainersIsDamagedAndLosesNothing) {
   }
 }
 
-TEST_F(DeviceAtPath, WithoutItsRegisterIsRefusedAndLosesNothing) {
+TEST_F(DeviceAtPath, MissingAppTablesAreNotRecreated) {
   TestDevice device;
   device.install("com.a", "1.5");
   device.close();
@@ -305,7 +299,7 @@ TEST_F(DeviceAtPath, WithoutItsRegisterIsRefusedAndLosesNothing) {
   }
 }
 
-TEST_F(DeviceAtPath, IsWholeWithoutWhatCanBeMadeAnew) {
+TEST_F(DeviceAtPath, OpenRecreatesOptionalDirectories) {
   make();
   fs::remove(path() + "/work");
   fs::remove_all(path() + "/root/tmp");
@@ -316,7 +310,7 @@ TEST_F(DeviceAtPath, IsWholeWithoutWhatCanBeMadeAnew) {
   EXPECT_TRUE((*holder)->services().fileSystem().fileExists("/var/mobile/Media/PublicStaging"));
 }
 
-TEST_F(DeviceAtPath, ThatMayNotBeWrittenSaysSo) {
+TEST_F(DeviceAtPath, OpenReportsMissingWritePermission) {
   if (geteuid() == 0) GTEST_SKIP() << "nothing is forbidden to this user";
   make();
   fs::permissions(path(), fs::perms::owner_read | fs::perms::owner_exec);
@@ -325,7 +319,7 @@ TEST_F(DeviceAtPath, ThatMayNotBeWrittenSaysSo) {
   fs::permissions(path(), fs::perms::owner_all);
 }
 
-TEST(DeviceErrors, TellReadOnlyFoldersFromOtherTrouble) {
+TEST(DeviceErrors, ReadOnlyIsReportedForExclusiveAccessOnly) {
   const std::string path = "/d";
   EXPECT_EQ(device::deviceError(path, Access::exclusive, Error::fromErrno(EROFS)),
             failure(DeviceFailure::readOnly, "/d: may not be written; change its permissions, or use a copy"));

@@ -1,4 +1,4 @@
-// What opening a device puts in order, and that a kill at any step of any work leaves what it can put in order.
+// Recovery at the opening of a device, and crashes at every fault point of every operation.
 #include <filesystem>
 #include <string>
 
@@ -17,9 +17,9 @@ using platform::TSInstallType;
 
 namespace fs = std::filesystem;
 
-// What opening puts in order.
+// Recovery.
 
-TEST(Recovery, SweepsWhatIsHalfDone) {
+TEST(Recovery, RemovesIncompleteFiles) {
   TestDevice device;
   device.install("com.a");
   device.close();
@@ -36,7 +36,7 @@ TEST(Recovery, SweepsWhatIsHalfDone) {
   EXPECT_EQ(versionOf(device, "com.a"), "1.0");
 }
 
-TEST(Recovery, ForgetsAppsWhoseContainerIsGone) {
+TEST(Recovery, RemovesRecordsOfMissingContainers) {
   TestDevice device;
   device.install("com.a");
   device.install("com.b");
@@ -47,7 +47,7 @@ TEST(Recovery, ForgetsAppsWhoseContainerIsGone) {
   EXPECT_TRUE(device.services().uninstalledApps().lookupUninstalled()->empty());
 }
 
-TEST(Recovery, TakesAwayPlaceholdersOfASync) {
+TEST(Recovery, RemovesPlaceholdersOfSyncs) {
   TestDevice device;
   device.placeholder("com.a");
   device.reopen();
@@ -55,7 +55,7 @@ TEST(Recovery, TakesAwayPlaceholdersOfASync) {
   EXPECT_EQ(device.containers(), 0);
 }
 
-TEST(Recovery, LeavesTheAppUnderAPlaceholderOfASync) {
+TEST(Recovery, KeepsAppUnderPlaceholderOfSync) {
   TestDevice device;
   device.install("com.a", "1.5");
   device.placeholder("com.a");
@@ -66,7 +66,7 @@ TEST(Recovery, LeavesTheAppUnderAPlaceholderOfASync) {
   EXPECT_EQ(device.containers(), 1);
 }
 
-TEST(Recovery, KeepsOtherPlaceholdersAndLetsTheirInstallsWait) {
+TEST(Recovery, KeepsOtherPlaceholdersWithWaitingInstalls) {
   TestDevice device;
   device.placeholder("com.a", TSInstallType::Restore);
   const auto before = device.record("com.a")->installProgress();
@@ -85,7 +85,7 @@ TEST(Recovery, KeepsOtherPlaceholdersAndLetsTheirInstallsWait) {
   EXPECT_EQ(device.record("com.a")->installProgress()->installState(), TSInstallState::Active);
 }
 
-TEST(Recovery, LeavesAParkedRestoreAsItIs) {
+TEST(Recovery, KeepsPausedRestoreUnchanged) {
   TestDevice device;
   device.placeholder("com.a", TSInstallType::Restore);
   const auto before = device.record("com.a")->installProgress();
@@ -98,7 +98,7 @@ TEST(Recovery, LeavesAParkedRestoreAsItIs) {
   EXPECT_EQ(progress->completedUnitCount(), 400);
 }
 
-TEST(Recovery, ChangesNothingTheSecondTime) {
+TEST(Recovery, IsIdempotent) {
   TestDevice device;
   device.install("com.a");
   device.placeholder("com.b", TSInstallType::Restore);
@@ -109,9 +109,9 @@ TEST(Recovery, ChangesNothingTheSecondTime) {
   EXPECT_EQ(versionOf(device, "com.b"), "1.0 placeholder");
 }
 
-// Kills.
+// Crashes.
 
-TEST(KilledDevice, CanBeMadeAgainWhileItWasBeingMade) {
+TEST(KilledDevice, CreationCanBeRepeatedAfterCrash) {
   long step = 1;
   for (bool goOn = true; goOn; ++step) {
     TemporaryFolder folder;
@@ -126,7 +126,7 @@ TEST(KilledDevice, CanBeMadeAgainWhileItWasBeingMade) {
   EXPECT_GT(step, 10);
 }
 
-TEST(KilledDevice, HasTheNewAppOrNone) {
+TEST(KilledDevice, InstallIsAtomic) {
   killAtEveryStep(
       [](TestDevice& device) { device.stage("a.zip", appPackage("com.a", "2.0")); },
       [](TestDevice& device) {
@@ -142,7 +142,7 @@ TEST(KilledDevice, HasTheNewAppOrNone) {
       });
 }
 
-TEST(KilledDevice, HasTheOldVersionOrTheNew) {
+TEST(KilledDevice, UpdateIsAtomic) {
   killAtEveryStep(
       [](TestDevice& device) {
         device.install("com.a", "1.0");
@@ -161,7 +161,7 @@ TEST(KilledDevice, HasTheOldVersionOrTheNew) {
       });
 }
 
-TEST(KilledDevice, HasThePlaceholderOrNone) {
+TEST(KilledDevice, PlaceholderIsAtomic) {
   killAtEveryStep([](TestDevice&) {},
                   [](TestDevice& device) {
                     auto& services = device.services();
@@ -180,7 +180,7 @@ TEST(KilledDevice, HasThePlaceholderOrNone) {
                   });
 }
 
-TEST(KilledDevice, HasTheAppOrHasItOnTheListOfRemovedApps) {
+TEST(KilledDevice, RemovalIsAtomic) {
   killAtEveryStep([](TestDevice& device) { device.install("com.a"); },
                   [](TestDevice& device) {
                     if (!device.services().defaultRegistry().uninstallApplication("com.a")) _exit(2);
@@ -191,7 +191,7 @@ TEST(KilledDevice, HasTheAppOrHasItOnTheListOfRemovedApps) {
                   });
 }
 
-TEST(KilledDevice, RecoversFromAKillDuringRecovery) {
+TEST(KilledDevice, RecoveryIsCrashSafe) {
   killAtEveryStep(
       [](TestDevice& device) {
         device.install("com.a");
@@ -210,7 +210,7 @@ TEST(KilledDevice, RecoversFromAKillDuringRecovery) {
       });
 }
 
-TEST(KilledDevice, HasTheOldFileOrTheNew) {
+TEST(KilledDevice, FileReplacementIsAtomic) {
   killAtEveryStep([](TestDevice& device) { writeHostFile(device.host("/var/mobile/file"), "old"); },
                   [](TestDevice& device) {
                     auto& files = device.services().fileSystem();

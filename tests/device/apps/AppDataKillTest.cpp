@@ -1,4 +1,4 @@
-// Devices that are killed while data is kept, given back, or removed with its app.
+// Crashes while data is kept, restored, or removed with its app.
 #include <gtest/gtest.h>
 
 #include "device/apps/BackupManager.h"
@@ -21,7 +21,7 @@ class AppDataKill : public testing::Test {
     const std::string path = device.host(folder) + "/com.a/Documents/notes";
     return std::filesystem::exists(path) ? readHostFile(path) : "none";
   }
-  /// "kept", "the app's", or "gone"; never both, and never less than all.
+  /// Returns "kept", "the app's" or "gone", after checking that the data is complete and in one place only.
   [[nodiscard]] static std::string whereNotesAre(TestDevice& device) {
     const bool isKept = manager(device).restoreDataExists("com.a", nullptr);
     const std::string kept = notesIn(device, device::kRestoreDataPath);
@@ -35,7 +35,7 @@ class AppDataKill : public testing::Test {
   TemporaryFolder folder_;
 };
 
-TEST_F(AppDataKill, KeptDataIsWholeOrNotThere) {
+TEST_F(AppDataKill, KeepIsAtomic) {
   killAtEveryStep([](TestDevice&) {},
                   [&](TestDevice& device) { EXPECT_TRUE(manager(device).keepRestoreData("com.a", source())); },
                   [](TestDevice& device) {
@@ -44,21 +44,21 @@ TEST_F(AppDataKill, KeptDataIsWholeOrNotThere) {
                   });
 }
 
-TEST_F(AppDataKill, DataIsKeptUntilItIsTheAppsAndTheAppIsNotInWithoutIt) {
+TEST_F(AppDataKill, InstallMovesKeptDataAtomically) {
   killAtEveryStep([&](TestDevice& device) { EXPECT_TRUE(manager(device).keepRestoreData("com.a", source())); },
                   [](TestDevice& device) { device.install("com.a"); },
                   [](TestDevice& device) {
                     const std::string where = whereNotesAre(device);
                     const bool isIn = versionOf(device, "com.a") == "1.0";
                     EXPECT_TRUE(where == "the app's" || (where == "kept" && !isIn)) << where;
-                    // Whoever comes next finds everything.
+                    // The next process finds all of the data.
                     device.install("com.a");
                     EXPECT_EQ(whereNotesAre(device), "the app's");
                     EXPECT_FALSE(manager(device).restoreDataExists("com.a", nullptr));
                   });
 }
 
-TEST_F(AppDataKill, DataGoesWithItsApp) {
+TEST_F(AppDataKill, RemovalDeletesData) {
   killAtEveryStep(
       [&](TestDevice& device) {
         EXPECT_TRUE(manager(device).keepRestoreData("com.a", source()));

@@ -1,4 +1,4 @@
-// A registry on a device of its own.
+// Fixture with a registry on a new device.
 #pragma once
 
 #include <memory>

@@ -1,4 +1,4 @@
-// What the contract of registries leaves open about their reports.
+// Reports to observers that the registry contract leaves open.
 #include <atomic>
 #include <chrono>
 #include <condition_variable>
@@ -27,7 +27,7 @@ Identifiers identifiersOf(const AppRecords& records) {
   return identifiers;
 }
 
-/// Remembers the latest report.
+/// Records the latest report.
 class Listener final : public platform::AppRegistryObserver {
  public:
   void applicationInstallsArePrioritized(const AppRecords& prioritized, const AppRecords& paused) override {
@@ -41,7 +41,7 @@ class Listener final : public platform::AppRegistryObserver {
     cancelled_ = records;
     changed_.notify_all();
   }
-  /// Waits until a report says this.
+  /// Blocks until a report with this content arrives.
   [[nodiscard]] bool hears(const Identifiers& prioritized, const Identifiers& paused) {
     std::unique_lock lock(mutex_);
     return changed_.wait_for(lock, kPatience, [&] { return prioritized_ == prioritized && paused_ == paused; });
@@ -53,7 +53,7 @@ class Listener final : public platform::AppRegistryObserver {
   }
 
  private:
-  /// The end of a test that would hang, never a pace.
+  /// Time-out of failing tests only.
   static constexpr std::chrono::seconds kPatience{20};
 
   std::mutex mutex_;
@@ -63,7 +63,7 @@ class Listener final : public platform::AppRegistryObserver {
   AppRecords cancelled_;
 };
 
-/// Observes for as long as it lives.
+/// Observes during its lifetime.
 class Observation {
  public:
   Observation(device::AppRegistry& registry, platform::AppRegistryObserver& observer)
@@ -85,7 +85,7 @@ std::ptrdiff_t threadsOfThisProcess() {
 
 }  // namespace
 
-TEST_F(AppRegistryTest, ReportsInstallsInTheOrderOfTheirBeginning) {
+TEST_F(AppRegistryTest, ReportsInstallsInOrderOfStart) {
   for (const char* identifier : {"com.c", "com.a", "com.b"})
     device_.placeholder(identifier);
   Listener listener;
@@ -102,7 +102,7 @@ TEST_F(AppRegistryTest, ReportsInstallsInTheOrderOfTheirBeginning) {
   EXPECT_TRUE(listener.hears({}, {"com.c"}));
 }
 
-TEST_F(AppRegistryTest, ReportsRecordsWithTheirProgress) {
+TEST_F(AppRegistryTest, ReportsRecordsWithProgress) {
   class Checker final : public platform::AppRegistryObserver {
    public:
     void applicationInstallsArePrioritized(const AppRecords& prioritized, const AppRecords&) override {
@@ -121,7 +121,7 @@ TEST_F(AppRegistryTest, ReportsRecordsWithTheirProgress) {
   EXPECT_TRUE(checker.reports.waitFor(1));
 }
 
-TEST_F(AppRegistryTest, TellsWhatWasCancelled) {
+TEST_F(AppRegistryTest, ReportsCancelledInstall) {
   device_.placeholder("com.a");
   Listener listener;
   const Observation observation(registry(), listener);
@@ -130,7 +130,7 @@ TEST_F(AppRegistryTest, TellsWhatWasCancelled) {
   EXPECT_TRUE(listener.hears({}, {}));
 }
 
-TEST_F(AppRegistryTest, HasAThreadOnlyWhileSomebodyObserves) {
+TEST_F(AppRegistryTest, HasThreadOnlyWithObservers) {
   const std::ptrdiff_t before = threadsOfThisProcess();
   Listener listener;
   {
@@ -141,7 +141,7 @@ TEST_F(AppRegistryTest, HasAThreadOnlyWhileSomebodyObserves) {
   EXPECT_EQ(threadsOfThisProcess(), before);
 }
 
-TEST_F(AppRegistryTest, AnObserverMayRemoveAnotherFromItsCallback) {
+TEST_F(AppRegistryTest, CallbackMayRemoveOtherObserver) {
   class Remover final : public platform::AppRegistryObserver {
    public:
     Remover(device::AppRegistry& observed, platform::AppRegistryObserver& other) : registry_(observed), other_(other) {}

@@ -1,16 +1,17 @@
-// What the contract of registries leaves open.
+// Behaviour of the device that the registry contract leaves open.
 #include <algorithm>
 #include <cerrno>
 #include <filesystem>
 #include <functional>
+#include <optional>
 #include <string>
 #include <vector>
 
 #include <gtest/gtest.h>
 
 #include "device/packages/InstallerError.h"
-#include "device/storage/FaultPoint.h"
 #include "kit/fakes/Threads.h"
+#include "tests/device/InjectedFault.h"
 #include "tests/device/apps/AppRegistryFixture.h"
 
 namespace appsync::test {
@@ -26,38 +27,30 @@ namespace {
 
 namespace fs = std::filesystem;
 
-long stepsUntilFailure = 0;
-int failWhenDue(const char*) {
-  return --stepsUntilFailure == 0 ? ENOSPC : 0;
-}
-
-std::vector<std::string> stepsTaken;
-int noteStep(const char* name) {
-  stepsTaken.emplace_back(name);
+std::vector<std::string> passed;
+int recordFaultPoint(const char* name) {
+  passed.emplace_back(name);
   return 0;
 }
 
-/// The steps of `work` that move folders, once for several in a row, or make what went before safe from a loss of
-/// power.
-std::vector<std::string> lastingStepsOf(const std::function<void()>& work) {
-  stepsTaken.clear();
-  device::setFaultHook(noteStep);
-  work();
-  device::setFaultHook(nullptr);
-  std::erase_if(stepsTaken, [](const std::string& name) {
-    return name != "rename" && name != "sync" && name != "database to disk";
-  });
-  stepsTaken.erase(std::unique(stepsTaken.begin(), stepsTaken.end()), stepsTaken.end());
-  return stepsTaken;
+/// Returns the fault points of `work` that move directories, once for several in a row, or make earlier changes
+/// durable.
+std::vector<std::string> durableFaultPointsOf(const std::function<void()>& work) {
+  passed.clear();
+  withFaultHook(recordFaultPoint, work);
+  std::erase_if(
+      passed, [](const std::string& name) { return name != "rename" && name != "sync" && name != "database to disk"; });
+  passed.erase(std::unique(passed.begin(), passed.end()), passed.end());
+  return passed;
 }
 
-using Steps = std::vector<std::string>;
+using FaultPoints = std::vector<std::string>;
 
 }  // namespace
 
 // Options.
 
-TEST_F(AppRegistryTest, SaysWhichOptionIsWrong) {
+TEST_F(AppRegistryTest, NamesInvalidOption) {
   const auto package = device_.stage("a.zip", appPackage("com.a"));
   const auto install = [&](const plist::Dictionary& options) {
     return registry().installApplication(package, options);
@@ -70,7 +63,7 @@ TEST_F(AppRegistryTest, SaysWhichOptionIsWrong) {
                 "the install option \"BundleIdentifier\" must name the app");
   expectFailure(
       install(TestDevice::customer("com/a")), InstallerFailure::badIdentifier,
-      "\"com/a\" is no bundle identifier: it may have only letters, digits, '-', '.' and '_', at most 200 and no dot first");
+      "\"com/a\" is not a bundle identifier: it may have only letters, digits, '-', '.' and '_', at most 200 and no dot first");
   options = TestDevice::customer("com.a");
   options.set(platform::kInstallTypeKey, "4");
   expectFailure(install(options), InstallerFailure::badOptions,
@@ -81,12 +74,12 @@ TEST_F(AppRegistryTest, SaysWhichOptionIsWrong) {
   EXPECT_EQ(device_.record("com.a"), nullptr);
 }
 
-TEST_F(AppRegistryTest, SaysWhichAppThePackageIs) {
+TEST_F(AppRegistryTest, NamesAppOfOtherPackage) {
   expectFailure(device_.tryInstall("com.b", appPackage("com.a")), InstallerFailure::identifierMismatch,
                 "this is the app \"com.a\" and not \"com.b\"; ask for the one it is");
 }
 
-TEST_F(AppRegistryTest, InstallsNothingFromOutsideTheDevice) {
+TEST_F(AppRegistryTest, RejectsPackageOutsideDevice) {
   writeHostFile(device_.path() + "/../outside.zip", appPackage("com.a"));
   fs::create_symlink("../../outside.zip", device_.host("/link"));
   for (const char* path : {"/../outside.zip", "/link", "/../../outside.zip"}) {
@@ -94,7 +87,7 @@ TEST_F(AppRegistryTest, InstallsNothingFromOutsideTheDevice) {
   }
 }
 
-TEST_F(AppRegistryTest, WantsAFolderOfAnAppAsPlaceholder) {
+TEST_F(AppRegistryTest, RejectsPlaceholderThatIsNotAnAppFolder) {
   fs::create_directories(device_.host("/tmp/folder"));
   expectFailure(registry().installApplication({"/tmp/folder", true}, TestDevice::placeholderOptions("com.a")),
                 InstallerFailure::notAPackage, "a placeholder is a folder \"Name.app\", and \"folder\" is not");
@@ -107,7 +100,7 @@ TEST_F(AppRegistryTest, WantsAFolderOfAnAppAsPlaceholder) {
 
 // Records.
 
-TEST_F(AppRegistryTest, KnowsNameSizeAndDateOfAnApp) {
+TEST_F(AppRegistryTest, RecordHasNameSizeAndDate) {
   device_.install("com.a", "2.0");
   const auto apps = registry().apps();
   ASSERT_TRUE(apps.ok());
@@ -120,14 +113,14 @@ TEST_F(AppRegistryTest, KnowsNameSizeAndDateOfAnApp) {
   EXPECT_EQ(fs::path(*app.bundlePath()).filename(), "Notes.app");
 }
 
-TEST_F(AppRegistryTest, KeepsMetadataBesideTheBundle) {
+TEST_F(AppRegistryTest, StoresMetadataNextToBundle) {
   const std::vector<ZipEntry> more{{"HarvoMetadata.plist", "packed"}, {"HarvoArtwork", "art"}};
   ASSERT_TRUE(device_.tryInstall("com.a", appPackage("com.a", "1.0", more)).ok());
   EXPECT_EQ(inContainer("com.a", "HarvoMetadata.plist"), "packed");
   EXPECT_EQ(inContainer("com.a", "HarvoArtwork"), "art");
 }
 
-TEST_F(AppRegistryTest, KeepsMetadataAndLicenceOfTheOptions) {
+TEST_F(AppRegistryTest, StoresMetadataAndLicenceOfOptions) {
   plist::Dictionary options = TestDevice::placeholderOptions("com.a", TSInstallType::Restore);
   options.set(platform::kStoreMetadataKey, plist::Value::data(bytesOf("given")));
   options.set(platform::kLicenceDataKey, plist::Value::data(bytesOf("licence")));
@@ -141,7 +134,7 @@ TEST_F(AppRegistryTest, KeepsMetadataAndLicenceOfTheOptions) {
   EXPECT_EQ(device_.record("com.a")->installType(), TSInstallType::Restore);
 }
 
-TEST_F(AppRegistryTest, PrefersTheOptionsMetadataToThePackages) {
+TEST_F(AppRegistryTest, PrefersMetadataOfOptions) {
   plist::Dictionary options = TestDevice::customer("com.a");
   options.set(platform::kStoreMetadataKey, plist::Value::data(bytesOf("given")));
   const auto package = device_.stage("a.zip", appPackage("com.a", "1.0", {{"HarvoMetadata.plist", "packed"}}));
@@ -149,14 +142,14 @@ TEST_F(AppRegistryTest, PrefersTheOptionsMetadataToThePackages) {
   EXPECT_EQ(inContainer("com.a", "HarvoMetadata.plist"), "given");
 }
 
-TEST_F(AppRegistryTest, WalksInTheOrderInWhichAppsCame) {
+TEST_F(AppRegistryTest, EnumeratesInOrderOfInstallation) {
   for (const char* identifier : {"com.c", "com.a", "com.b"})
     device_.install(identifier);
   device_.install("com.c", "2.0");
   EXPECT_EQ(walk(BundleKind::all), (Identifiers{"com.c", "com.a", "com.b"}));
 }
 
-TEST_F(AppRegistryTest, KeepsAppsOfTheSystemApart) {
+TEST_F(AppRegistryTest, SeparatesSystemApps) {
   device_.install("com.user");
   ASSERT_TRUE(registry()
                   .installSystemApplication(device_.stagePlaceholder("com.system"),
@@ -171,7 +164,7 @@ TEST_F(AppRegistryTest, KeepsAppsOfTheSystemApart) {
 
 // Containers.
 
-TEST_F(AppRegistryTest, AnUpdateSwapsContainers) {
+TEST_F(AppRegistryTest, UpdateReplacesContainer) {
   device_.install("com.a", "1.0");
   const std::string before = *device_.record("com.a")->bundleContainerPath();
   device_.install("com.a", "2.0");
@@ -180,37 +173,37 @@ TEST_F(AppRegistryTest, AnUpdateSwapsContainers) {
   EXPECT_TRUE(device_.isTidy());
 }
 
-TEST_F(AppRegistryTest, AnUpdateIsOnTheDiskBeforeTheOldVersionGoes) {
+TEST_F(AppRegistryTest, UpdateIsDurableBeforeOldVersionIsRemoved) {
   plist::Dictionary options = TestDevice::customer("com.a");
   options.set(platform::kInstallTypeKey, static_cast<std::uint64_t>(TSInstallType::Sync));
   const auto install = [&](std::string_view version) {
     const auto package = device_.stage("package.zip", appPackage("com.a", version));
-    return lastingStepsOf([&] { EXPECT_TRUE(registry().installApplication(package, options).ok()); });
+    return durableFaultPointsOf([&] { EXPECT_TRUE(registry().installApplication(package, options).ok()); });
   };
-  EXPECT_EQ(install("1.0"), (Steps{"rename", "sync"}));
-  EXPECT_EQ(install("2.0"), (Steps{"rename", "sync", "database to disk", "rename"}));
+  EXPECT_EQ(install("1.0"), (FaultPoints{"rename", "sync"}));
+  EXPECT_EQ(install("2.0"), (FaultPoints{"rename", "sync", "database to disk", "rename"}));
 }
 
-TEST_F(AppRegistryTest, APlaceholderOfASyncGoesWithoutAWaitForTheDisk) {
+TEST_F(AppRegistryTest, SyncPlaceholderIsReplacedWithoutDiskSync) {
   device_.placeholder("com.a");
   const auto package = device_.stage("package.zip", appPackage("com.a"));
-  EXPECT_EQ(
-      lastingStepsOf([&] { EXPECT_TRUE(registry().installApplication(package, TestDevice::customer("com.a")).ok()); }),
-      (Steps{"rename", "sync", "rename"}));
+  EXPECT_EQ(durableFaultPointsOf(
+                [&] { EXPECT_TRUE(registry().installApplication(package, TestDevice::customer("com.a")).ok()); }),
+            (FaultPoints{"rename", "sync", "rename"}));
   device_.placeholder("com.b", TSInstallType::Restore);
   const auto restored = device_.stage("restored.zip", appPackage("com.b"));
-  EXPECT_EQ(
-      lastingStepsOf([&] { EXPECT_TRUE(registry().installApplication(restored, TestDevice::customer("com.b")).ok()); }),
-      (Steps{"rename", "sync", "database to disk", "rename"}));
+  EXPECT_EQ(durableFaultPointsOf(
+                [&] { EXPECT_TRUE(registry().installApplication(restored, TestDevice::customer("com.b")).ok()); }),
+            (FaultPoints{"rename", "sync", "database to disk", "rename"}));
 }
 
-TEST_F(AppRegistryTest, ARemovalIsOnTheDiskBeforeTheAppGoes) {
+TEST_F(AppRegistryTest, RemovalIsDurableBeforeFilesAreRemoved) {
   device_.install("com.a");
-  EXPECT_EQ(lastingStepsOf([&] { EXPECT_TRUE(registry().uninstallApplication("com.a").ok()); }),
-            (Steps{"database to disk", "rename"}));
+  EXPECT_EQ(durableFaultPointsOf([&] { EXPECT_TRUE(registry().uninstallApplication("com.a").ok()); }),
+            (FaultPoints{"database to disk", "rename"}));
 }
 
-TEST_F(AppRegistryTest, ARegistryThatCannotBeReadIsNotOneWithoutTheApp) {
+TEST_F(AppRegistryTest, UnreadableRegistryIsAnError) {
   device_.install("com.a");
   {
     device::Database::Session session(device_.services().database());
@@ -225,7 +218,7 @@ TEST_F(AppRegistryTest, ARegistryThatCannotBeReadIsNotOneWithoutTheApp) {
   EXPECT_EQ(device_.containers(), 1);
 }
 
-TEST_F(AppRegistryTest, APlaceholderHasAContainerOfItsOwn) {
+TEST_F(AppRegistryTest, PlaceholderHasItsOwnContainer) {
   device_.install("com.a", "1.0");
   const std::string before = *device_.record("com.a")->bundleContainerPath();
   device_.placeholder("com.a");
@@ -235,7 +228,7 @@ TEST_F(AppRegistryTest, APlaceholderHasAContainerOfItsOwn) {
   EXPECT_EQ(device_.containers(), 1);
 }
 
-TEST_F(AppRegistryTest, RemovalTakesContainersAway) {
+TEST_F(AppRegistryTest, RemovalRemovesContainers) {
   device_.install("com.a");
   device_.placeholder("com.a");
   ASSERT_TRUE(registry().uninstallApplication("com.a").ok());
@@ -247,22 +240,21 @@ TEST_F(AppRegistryTest, RemovalTakesContainersAway) {
                 "there is no app \"com.a\" to remove");
 }
 
-TEST_F(AppRegistryTest, LeavesNoTraceWhenAnyStepFails) {
+TEST_F(AppRegistryTest, LeavesNoTraceAfterAnyFault) {
   device_.install("com.a", "1.0");
   const auto package = device_.stage("b.zip", appPackage("com.a", "2.0"));
-  for (long step = 1;; ++step) {
-    stepsUntilFailure = step;
-    device::setFaultHook(failWhenDue);
+  for (long faultPoint = 1;; ++faultPoint) {
+    std::optional<InjectedFault> fault(faultPoint);
     const Status installed = registry().installApplication(package, TestDevice::customer("com.a"));
-    device::setFaultHook(nullptr);
+    fault.reset();
     if (installed) break;
     EXPECT_EQ(installed.error().domain, domains::kPOSIX) << installed.error().text;
     EXPECT_EQ(installed.error().code, ENOSPC) << installed.error().text;
     EXPECT_EQ(registry().lastInstallFailure("com.a"), installed.error());
-    EXPECT_EQ(device_.record("com.a")->bundleVersion(), "1.0") << "step " << step;
-    EXPECT_EQ(device_.record("com.a")->installProgress(), nullptr) << "step " << step;
-    EXPECT_EQ(device_.containers(), 1) << "step " << step;
-    EXPECT_TRUE(device_.isTidy()) << "step " << step;
+    EXPECT_EQ(device_.record("com.a")->bundleVersion(), "1.0") << faultPoint;
+    EXPECT_EQ(device_.record("com.a")->installProgress(), nullptr) << faultPoint;
+    EXPECT_EQ(device_.containers(), 1) << faultPoint;
+    EXPECT_TRUE(device_.isTidy()) << faultPoint;
     ASSERT_FALSE(HasFailure());
   }
   device_.install("com.a", "3.0");
@@ -272,7 +264,7 @@ TEST_F(AppRegistryTest, LeavesNoTraceWhenAnyStepFails) {
   EXPECT_EQ(device_.containers(), 1);
 }
 
-TEST_F(AppRegistryTest, TenInstallsAndRemovalsAtOnceLeaveWhatTheyShould) {
+TEST_F(AppRegistryTest, ConcurrentInstallsAndRemovalsAreSafe) {
   constexpr std::size_t kThreads = 10;
   for (std::size_t index = 0; index < kThreads; ++index) {
     device_.stage(std::to_string(index), appPackage("com.a" + std::to_string(index)));
@@ -295,7 +287,7 @@ TEST_F(AppRegistryTest, TenInstallsAndRemovalsAtOnceLeaveWhatTheyShould) {
 
 // Progress.
 
-TEST_F(AppRegistryTest, APlaceholdersInstallWaitsAtFirst) {
+TEST_F(AppRegistryTest, InstallOfPlaceholderWaitsInitially) {
   device_.placeholder("com.a");
   ASSERT_NE(progress("com.a"), nullptr);
   EXPECT_EQ(progress("com.a")->installState(), TSInstallState::Waiting);
@@ -304,7 +296,7 @@ TEST_F(AppRegistryTest, APlaceholdersInstallWaitsAtFirst) {
   EXPECT_EQ(progress("com.a")->description(), "com.a: TSInstallState 0, TSInstallPhase 0, 0 of 1000");
 }
 
-TEST_F(AppRegistryTest, AFinishedInstallEndsFinished) {
+TEST_F(AppRegistryTest, ProgressEndsFinished) {
   device_.placeholder("com.a");
   const auto watched = progress("com.a");
   device_.install("com.a");
@@ -312,21 +304,21 @@ TEST_F(AppRegistryTest, AFinishedInstallEndsFinished) {
   EXPECT_EQ(watched->installPhase(), TSInstallPhase::Installing);
 }
 
-TEST_F(AppRegistryTest, AFailedInstallOfAPlaceholdersPackageStaysAsFailed) {
+TEST_F(AppRegistryTest, FailedInstallOfPlaceholderStaysFailed) {
   device_.placeholder("com.a");
   EXPECT_FALSE(device_.tryInstall("com.a", "no package").ok());
   ASSERT_NE(progress("com.a"), nullptr);
   EXPECT_EQ(progress("com.a")->installState(), TSInstallState::Failed);
 }
 
-TEST_F(AppRegistryTest, ARemovedPlaceholdersInstallEndsCancelled) {
+TEST_F(AppRegistryTest, RemovedPlaceholderCancelsInstall) {
   device_.placeholder("com.a");
   const auto watched = progress("com.a");
   ASSERT_TRUE(registry().uninstallApplication("com.a").ok());
   EXPECT_EQ(watched->installState(), TSInstallState::Canceled);
 }
 
-TEST_F(AppRegistryTest, ACancelledInstallNoLongerRuns) {
+TEST_F(AppRegistryTest, CancelledInstallIsNotRunning) {
   device_.placeholder("com.a");
   const auto watched = progress("com.a");
   watched->cancel();
@@ -338,7 +330,7 @@ TEST_F(AppRegistryTest, ACancelledInstallNoLongerRuns) {
   EXPECT_TRUE(device_.record("com.a")->isInstalled());
 }
 
-TEST_F(AppRegistryTest, APhaseFinishedByAnOldProgressChangesNothing) {
+TEST_F(AppRegistryTest, IgnoresPhaseEndOfOldProgress) {
   device_.placeholder("com.a");
   const auto old = progress("com.a");
   ASSERT_TRUE(registry().uninstallApplication("com.a").ok());

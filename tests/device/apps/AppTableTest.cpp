@@ -1,4 +1,4 @@
-// Which licences are for one device alone.
+// Licences that are bound to a device.
 #include <string>
 
 #include <gtest/gtest.h>
@@ -14,12 +14,12 @@ plist::Value boundLicence() {
   return plist::Dictionary{{"DeviceIdentifier", "device-1"}, {"Key", plist::Value::data(bytesOf("secret"))}};
 }
 
-TEST(Licence, OneThatNamesADeviceIsBound) {
+TEST(Licence, LicenceWithDeviceIdentifierIsBound) {
   EXPECT_TRUE(device::isDeviceBound(*plist::writeXML(boundLicence())));
   EXPECT_TRUE(device::isDeviceBound(*plist::writeBinary(boundLicence())));
 }
 
-TEST(Licence, AnythingElseIsForAnyDevice) {
+TEST(Licence, OtherLicencesAreNotBound) {
   EXPECT_FALSE(device::isDeviceBound({}));
   EXPECT_FALSE(device::isDeviceBound(bytesOf("a licence")));
   EXPECT_FALSE(device::isDeviceBound(bytesOf("bplist00")));
@@ -37,14 +37,14 @@ class LicensedApp : public AppRegistryTest {
   [[nodiscard]] bool isBound() { return device_.record("com.a")->hasMIDBasedSINF(); }
 };
 
-TEST_F(LicensedApp, TheRecordTellsWhetherItsLicenceIsBound) {
+TEST_F(LicensedApp, RecordReportsBoundLicence) {
   install("1.0", *plist::writeXML(boundLicence()));
   EXPECT_TRUE(isBound());
   device_.reopen();
   EXPECT_TRUE(isBound());
 }
 
-TEST_F(LicensedApp, ANewLicenceReplacesTheOldOneAndNoneKeepsIt) {
+TEST_F(LicensedApp, InstallReplacesOrKeepsLicence) {
   install("1.0", *plist::writeXML(boundLicence()));
   install("1.1", nullptr);
   EXPECT_TRUE(isBound());

@@ -54,7 +54,7 @@ class Demotion : public testing::Test {
   TestDevice device_;
 };
 
-TEST_F(Demotion, LeavesIconNameVersionMetadataArtworkAndLicence) {
+TEST_F(Demotion, KeepsIconNameVersionMetadataAndLicence) {
   const std::string picture = readHostFile(appFile("Pictures/Face.png"));
   ASSERT_TRUE(demote("com.a").ok());
   const auto app = device_.record("com.a");
@@ -75,14 +75,14 @@ TEST_F(Demotion, LeavesIconNameVersionMetadataArtworkAndLicence) {
   EXPECT_EQ(device_.containers(), 1);
 }
 
-TEST_F(Demotion, LeavesNoIconThatLiesOutsideTheApp) {
+TEST_F(Demotion, IgnoresIconOutsideApp) {
   writeHostFile(appFile("Info.plist"), R"({BundleIdentifier = "com.a"; BundleIconFile = "../HarvoMetadata.plist";})");
   ASSERT_TRUE(demote("com.a").ok());
   EXPECT_TRUE(fs::exists(appFile("Info.plist")));
   EXPECT_FALSE(fs::exists(appFile("Icon.png")));
 }
 
-TEST_F(Demotion, WhatItLeavesCanBeRenamed) {
+TEST_F(Demotion, PlaceholderCanBeRenamed) {
   EXPECT_FALSE(device_.registry().renamePlaceholder("com.a", "Other").ok()) << "it is installed";
   ASSERT_TRUE(demote("com.a").ok());
   ASSERT_TRUE(device_.registry().renamePlaceholder("com.a", "Other").ok());
@@ -95,7 +95,7 @@ TEST_F(Demotion, WhatItLeavesCanBeRenamed) {
   EXPECT_FALSE(device_.registry().renamePlaceholder("com.none", "Other").ok());
 }
 
-TEST_F(Demotion, LeavesTheDataAndSurvivesARestart) {
+TEST_F(Demotion, KeepsDataAndSurvivesRestart) {
   std::filesystem::create_directories(device_.host(device::dataContainerOf("com.a")));
   ASSERT_TRUE(demote("com.a").ok());
   device_.reopen();
@@ -104,13 +104,13 @@ TEST_F(Demotion, LeavesTheDataAndSurvivesARestart) {
   EXPECT_EQ(device_.record("com.a")->installProgress(), nullptr);
 }
 
-TEST_F(Demotion, IsNoRemoval) {
+TEST_F(Demotion, IsNotARemoval) {
   ASSERT_TRUE(demote("com.a").ok());
   const auto uninstalled = device_.services().uninstalledApps().lookupUninstalled();
   EXPECT_TRUE(!uninstalled || uninstalled->empty());
 }
 
-TEST_F(Demotion, TheListSaysWhoWasDemotedAndHow) {
+TEST_F(Demotion, ListContainsDemotedAppsByType) {
   device_.install("com.b");
   device_.install("com.c");
   ASSERT_TRUE(demote("com.a").ok());
@@ -122,7 +122,7 @@ TEST_F(Demotion, TheListSaysWhoWasDemotedAndHow) {
   EXPECT_THAT(listed("IntentionalDowngrades"), ElementsAre("com.c"));
 }
 
-TEST_F(Demotion, APackageMakesItAnAppAgainWithItsDataAndLicence) {
+TEST_F(Demotion, InstallKeepsDataAndLicence) {
   std::filesystem::create_directories(device_.host(device::dataContainerOf("com.a")));
   ASSERT_TRUE(demote("com.a").ok());
   device_.install("com.a", "3.2");
@@ -132,7 +132,7 @@ TEST_F(Demotion, APackageMakesItAnAppAgainWithItsDataAndLicence) {
   EXPECT_EQ(device_.registry().licenceData("com.a").value(), kLicence);
 }
 
-TEST_F(Demotion, OfWhatIsNotInstalledIsRefused) {
+TEST_F(Demotion, RejectsAppThatIsNotInstalled) {
   EXPECT_THAT(demote("com.none").error().text, HasSubstr("there is no app \"com.none\" to demote"));
   device_.placeholder("com.b");
   EXPECT_THAT(demote("com.b").error().text, HasSubstr("there is no app \"com.b\" to demote"));
@@ -140,13 +140,13 @@ TEST_F(Demotion, OfWhatIsNotInstalledIsRefused) {
   EXPECT_FALSE(demote("com.a").ok());
 }
 
-TEST_F(Demotion, OfAnAppThatIsBeingUpdatedIsRefused) {
+TEST_F(Demotion, RejectsAppBeingUpdated) {
   device_.placeholder("com.a");
   EXPECT_THAT(demote("com.a").error().text, HasSubstr("is being updated"));
   EXPECT_TRUE(device_.record("com.a")->isInstalled());
 }
 
-TEST_F(Demotion, CanBeTakenBackBeforeThePackageComes) {
+TEST_F(Demotion, CanBeRevertedBeforePackageArrives) {
   ASSERT_TRUE(demote("com.a").ok());
   ASSERT_TRUE(device_.registry().setPlaceholderType("com.a", TSInstallType::Restore).ok());
   EXPECT_EQ(device_.record("com.a")->installType(), TSInstallType::Restore);
@@ -156,13 +156,13 @@ TEST_F(Demotion, CanBeTakenBackBeforeThePackageComes) {
   EXPECT_EQ(device_.record("com.a")->installProgress(), nullptr);
 }
 
-TEST_F(Demotion, OnlyAPlaceholderAloneChangesItsType) {
+TEST_F(Demotion, OnlyPlaceholderWithoutAppChangesType) {
   EXPECT_FALSE(device_.registry().setPlaceholderType("com.a", TSInstallType::Downgrade).ok());
   EXPECT_FALSE(device_.registry().setPlaceholderType("com.none", TSInstallType::Downgrade).ok());
   EXPECT_EQ(device_.record("com.a")->installType(), TSInstallType::None);
 }
 
-TEST(DemotionKill, TheAppIsWholeOrDemoted) {
+TEST(DemotionKill, IsAtomic) {
   killAtEveryStep(
       [](TestDevice& device) { device.install("com.a"); },
       [](TestDevice& device) {

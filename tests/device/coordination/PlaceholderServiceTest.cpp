@@ -1,11 +1,11 @@
-// The placeholder that a coordinator puts on the home screen.
+// Coordinators' placeholders on the home screen.
 #include <filesystem>
 #include <set>
 
 #include <gmock/gmock.h>
 
 #include "device/screen/ScreenPicture.h"
-#include "device/storage/FaultPoint.h"
+#include "tests/device/InjectedFault.h"
 #include "tests/device/coordination/ServiceFixture.h"
 #include "tests/device/screen/Pictures.h"
 
@@ -26,7 +26,7 @@ class CoordinatedPlaceholder : public CoordinationTest {};
 
 }  // namespace
 
-TEST_F(CoordinatedPlaceholder, PutsAnAppFolderOnTheDeviceForThePlaceholder) {
+TEST_F(CoordinatedPlaceholder, CreatesAppFolder) {
   const auto icon = device_.stage("Icon.png", textOf(makePNG(60, 60, kGreen)));
   auto placeholder = service().initAppPlaceholder("My Notes", "com.a", TSInstallType::Sync, kSync);
   auto attributes = platform::PlaceholderAttributes::initWithInfoPlistDictionary(
@@ -56,7 +56,7 @@ TEST_F(CoordinatedPlaceholder, PutsAnAppFolderOnTheDeviceForThePlaceholder) {
   EXPECT_EQ(*device_.services().homeScreen().iconOrder(), std::vector<std::string>{"com.a"});
 }
 
-TEST_F(CoordinatedPlaceholder, ShowsAPlaceholderOnceItIsConfigured) {
+TEST_F(CoordinatedPlaceholder, ShowsConfiguredPlaceholder) {
   const auto coordinator = client_.make("com.a");
   const auto connection = listen(delegate_);
   const auto placeholder = service().initAppPlaceholder("", "com.a", TSInstallType::Sync, kSync);
@@ -66,10 +66,10 @@ TEST_F(CoordinatedPlaceholder, ShowsAPlaceholderOnceItIsConfigured) {
   EXPECT_EQ(state("com.a"), "no version placeholder");
   EXPECT_EQ(info("com.a").find("BundleDisplayName")->string(), "com.a");
   client_.settle();
-  EXPECT_THAT(delegate_.told(), ElementsAre("placeholder com.a"));
+  EXPECT_THAT(delegate_.reports(), ElementsAre("placeholder com.a"));
 }
 
-TEST_F(CoordinatedPlaceholder, AddsAnIconThatComesLate) {
+TEST_F(CoordinatedPlaceholder, AddsLateIcon) {
   const auto icon = device_.stage("Icon.png", "a picture");
   const auto coordinator = client_.make("com.a");
   ASSERT_TRUE(coordinator->setAppAssetPromise(client_.promise("p")).ok());
@@ -87,7 +87,7 @@ TEST_F(CoordinatedPlaceholder, AddsAnIconThatComesLate) {
   EXPECT_EQ(device_.containers(), 1);
 }
 
-TEST_F(CoordinatedPlaceholder, DoesWithoutAnIconThatCannotBeRead) {
+TEST_F(CoordinatedPlaceholder, OmitsUnreadableIcon) {
   for (const auto& path : {"/var/mobile/missing.png", "/var/mobile", "/../../etc/passwd", "relative.png"}) {
     auto placeholder = service().initAppPlaceholder("N", "com.a", TSInstallType::Sync, kSync);
     auto promise = service().makePromisedTransferToPath("icon", kSync, platform::FileLocation{path}, 10);
@@ -101,12 +101,12 @@ TEST_F(CoordinatedPlaceholder, DoesWithoutAnIconThatCannotBeRead) {
   }
 }
 
-TEST_F(CoordinatedPlaceholder, ChangesNothingWhenThePlaceholderCannotBeMade) {
+TEST_F(CoordinatedPlaceholder, FailureChangesNothing) {
   const auto coordinator = client_.make("com.a");
   const auto placeholder = client_.placeholder("com.a");
-  device::setFaultHook([](const char* name) { return std::string_view(name) == "create file" ? ENOSPC : 0; });
-  const Status refused = coordinator->setPlaceholderPromise(placeholder);
-  device::setFaultHook(nullptr);
+  const Status refused =
+      withFaultHook([](const char* name) { return std::string_view(name) == "create file" ? ENOSPC : 0; },
+                    [&] { return coordinator->setPlaceholderPromise(placeholder); });
   ASSERT_FALSE(refused.ok());
   EXPECT_EQ(refused.error().code, ENOSPC);
   EXPECT_FALSE(coordinator->hasPlaceholderPromise());
@@ -115,14 +115,14 @@ TEST_F(CoordinatedPlaceholder, ChangesNothingWhenThePlaceholderCannotBeMade) {
   EXPECT_TRUE(coordinator->setPlaceholderPromise(placeholder).ok());
 }
 
-TEST_F(CoordinatedPlaceholder, RefusesANameThatNoPropertyListHolds) {
+TEST_F(CoordinatedPlaceholder, RejectsNameThatCannotBeEncoded) {
   const auto placeholder = service().initAppPlaceholder("\xFF\xFE", "com.a", TSInstallType::Sync, kSync);
   ASSERT_TRUE(placeholder->setConfigurationComplete().ok());
   EXPECT_FALSE(client_.make("com.a")->setPlaceholderPromise(placeholder).ok());
   EXPECT_EQ(state("com.a"), "none");
 }
 
-TEST_F(CoordinatedPlaceholder, ShowsAVeryLongName) {
+TEST_F(CoordinatedPlaceholder, AcceptsVeryLongName) {
   const std::string name(65536, 'n');
   ASSERT_TRUE(client_.make("com.a")->setPlaceholderPromise(client_.placeholder("com.a", name)).ok());
   EXPECT_EQ(info("com.a").find("BundleDisplayName")->string(), name);

@@ -1,4 +1,4 @@
-// A device that installs through coordinators.
+// Fixture with a device that installs through coordinators.
 #pragma once
 
 #include <chrono>
@@ -20,12 +20,12 @@ namespace appsync::test {
 inline constexpr platform::ClientIdentity kSync = platform::ClientIdentity::CXClientSync;
 inline constexpr platform::ClientIdentity kStore = platform::ClientIdentity::CXClientBazaarly;
 
-/// A reason to cancel for.
+/// A reason for cancellations.
 inline const Error kEnough{"Test", 7, "enough of it", nullptr};
 
-/// Notes what it is told as "placeholder com.a", "completed com.a", "completed com.a: why", "prioritize com.a",
+/// Records reports as "placeholder com.a", "completed com.a", "completed com.a: why", "prioritize com.a",
 /// "cancelled com.a by 2: why".
-class NotingDelegate final : public platform::InstallObserverDelegate {
+class RecordingDelegate final : public platform::InstallObserverDelegate {
  public:
   void coordinatorDidInstallPlaceholder(platform::InstallCoordinator& coordinator) override {
     note("placeholder", coordinator);
@@ -43,9 +43,9 @@ class NotingDelegate final : public platform::InstallObserverDelegate {
         reason.text);
   }
 
-  [[nodiscard]] std::vector<std::string> told() const {
+  [[nodiscard]] std::vector<std::string> reports() const {
     const std::lock_guard lock(mutex_);
-    return told_;
+    return reports_;
   }
 
  private:
@@ -55,14 +55,14 @@ class NotingDelegate final : public platform::InstallObserverDelegate {
   }
   void add(std::string line) {
     const std::lock_guard lock(mutex_);
-    told_.push_back(std::move(line));
+    reports_.push_back(std::move(line));
   }
 
   mutable std::mutex mutex_;
-  std::vector<std::string> told_;
+  std::vector<std::string> reports_;
 };
 
-/// What clients do with coordinators, step by step.
+/// The operations of a client on coordinators.
 class CoordinationClient {
  public:
   using Coordinator = std::shared_ptr<platform::InstallCoordinator>;
@@ -83,7 +83,7 @@ class CoordinationClient {
   [[nodiscard]] std::shared_ptr<platform::PromisedTransferToPath> promise(std::string_view name) {
     return service().makePromisedTransferToPath(name, identity_, std::nullopt, 0);
   }
-  /// One whose configuration is complete.
+  /// Makes a placeholder with a complete configuration.
   [[nodiscard]] std::shared_ptr<platform::Placeholder> placeholder(
       std::string_view identifier, std::string_view name = "Notes",
       platform::TSInstallType type = platform::TSInstallType::Sync) {
@@ -102,7 +102,7 @@ class CoordinationClient {
     return options;
   }
 
-  /// A coordinator that lacks its package only; what it has already it keeps.
+  /// Returns a coordinator that lacks only its package, keeping what an existing one has.
   [[nodiscard]] Coordinator prepare(std::string_view identifier, Kind kind = Kind::initiating) {
     auto coordinator = make(identifier, kind);
     if (!coordinator->hasInstallOptions()) {
@@ -127,7 +127,7 @@ class CoordinationClient {
     promise->setComplete(true);
   }
 
-  /// Returns when nothing is under way any more.
+  /// Blocks until the service is idle.
   void settle() { ASSERT_TRUE(service().waitUntilIdle(std::chrono::minutes(5))); }
 
  private:
@@ -141,14 +141,14 @@ class CoordinationTest : public testing::Test {
 
   [[nodiscard]] device::InstallCoordination& service() { return client_.service(); }
 
-  /// A package in the staging folder, named after the app.
+  /// Writes a package to the staging folder.
   platform::FileLocation stage(std::string_view identifier, std::string_view version = "1.0") {
     return device_.stage(std::string(identifier) + ".zip", appPackage(identifier, version));
   }
   [[nodiscard]] bool exists(const platform::FileLocation& location) {
     return device_.files().fileExists(location.path);
   }
-  /// "1.0", "1.0 placeholder" for an app with a placeholder, "none".
+  /// Returns "1.0", "1.0 placeholder" for an app with a placeholder, or "none".
   [[nodiscard]] std::string state(std::string_view identifier) {
     const auto app = device_.record(identifier);
     if (app == nullptr) return "none";
@@ -158,7 +158,7 @@ class CoordinationTest : public testing::Test {
     return service().initWithMachServiceName("com.example.observer", {kSync}, delegate);
   }
 
-  /// Where the app's bundle, or placeholder, lies on this machine.
+  /// Returns the host path of the container of the app's bundle or placeholder.
   [[nodiscard]] std::string container(std::string_view identifier) {
     return device_.host(*device_.record(identifier)->bundleContainerPath());
   }
@@ -174,10 +174,10 @@ class CoordinationTest : public testing::Test {
 
   TestDevice device_{device::InstallMode::coordinated};
   CoordinationClient client_{device_};
-  NotingDelegate delegate_;
+  RecordingDelegate delegate_;
 };
 
-/// Why something was refused.
+/// Returns the code of a failed operation.
 [[nodiscard]] inline device::CoordinationFailure failureOf(const Status& status) {
   EXPECT_FALSE(status.ok());
   if (status.ok()) return {};

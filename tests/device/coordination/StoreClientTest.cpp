@@ -15,7 +15,7 @@ using testing::ElementsAre;
 using testing::HasSubstr;
 using Kind = platform::CoordinatorKind;
 
-/// A folder of packages, by identifier.
+/// A directory of packages, named after their identifiers.
 class StoreFolder {
  public:
   void publish(const std::string& identifier, const std::string& version = "1.0") {
@@ -39,7 +39,7 @@ class StoreFolder {
   std::map<std::string, std::string, std::less<>> packages_;
 };
 
-/// What a restore asks for: everything but the package, which is the store's to bring.
+/// Sets everything that a restore does, except the package, which the store delivers.
 void prepareRestore(CoordinationClient& client, std::string_view identifier, Kind kind = Kind::restoring,
                     TSInstallType type = TSInstallType::Restore) {
   const auto coordinator = client.make(identifier, kind);
@@ -53,7 +53,7 @@ void prepareRestore(CoordinationClient& client, std::string_view identifier, Kin
 
 class StoreClientTest : public CoordinationTest {
  protected:
-  /// "com.a delivered", "com.b: why", once all was tried and installed.
+  /// Returns "com.a delivered" or "com.b: reason" for each app, after all deliveries and installs.
   std::vector<std::string> deliver() {
     std::vector<std::string> told;
     {
@@ -75,7 +75,7 @@ class StoreClientTest : public CoordinationTest {
   StoreFolder store_;
 };
 
-TEST_F(StoreClientTest, BringsThePackagesOfRestoredApps) {
+TEST_F(StoreClientTest, DeliversPackagesOfRestoredApps) {
   store_.publish("com.a", "2.0");
   store_.publish("com.b");
   prepareRestore(client_, "com.a");
@@ -87,22 +87,22 @@ TEST_F(StoreClientTest, BringsThePackagesOfRestoredApps) {
   EXPECT_EQ(packagesLying(), 0);
 }
 
-TEST_F(StoreClientTest, ObserversOfTheClientThatAskedHearOfTheEnd) {
+TEST_F(StoreClientTest, NotifiesObserversOfCreator) {
   store_.publish("com.a");
   const auto observer = listen(delegate_);
   prepareRestore(client_, "com.a");
   deliver();
-  EXPECT_THAT(delegate_.told(), ElementsAre("placeholder com.a", "completed com.a"));
+  EXPECT_THAT(delegate_.reports(), ElementsAre("placeholder com.a", "completed com.a"));
 }
 
-TEST_F(StoreClientTest, LeavesAloneWhatOthersBring) {
+TEST_F(StoreClientTest, IgnoresAppsOfOtherClients) {
   store_.publish("com.a");
   const auto coordinator = client_.prepare("com.a");
   EXPECT_THAT(deliver(), ElementsAre());
   EXPECT_EQ(coordinator->appAssetPromise()->percentComplete(), 0);
 }
 
-TEST_F(StoreClientTest, AMissingPackageLeavesTheCoordinatorForTheNextOne) {
+TEST_F(StoreClientTest, MissingPackageLeavesCoordinatorWaiting) {
   prepareRestore(client_, "com.a");
   EXPECT_THAT(deliver(), ElementsAre(HasSubstr("com.a: the store has no package of this app")));
   EXPECT_EQ(state("com.a"), "0.9 placeholder");
@@ -112,7 +112,7 @@ TEST_F(StoreClientTest, AMissingPackageLeavesTheCoordinatorForTheNextOne) {
   EXPECT_EQ(state("com.a"), "1.0");
 }
 
-TEST_F(StoreClientTest, APackageThatCannotBeReadIsToldAndTriedAgain) {
+TEST_F(StoreClientTest, ReportsAndRetriesUnreadablePackage) {
   store_.publish("com.a");
   store_.loseFile("com.a");
   prepareRestore(client_, "com.a");
@@ -123,17 +123,17 @@ TEST_F(StoreClientTest, APackageThatCannotBeReadIsToldAndTriedAgain) {
   EXPECT_EQ(state("com.a"), "1.0");
 }
 
-TEST_F(StoreClientTest, ABadPackageEndsTheInstallBadly) {
+TEST_F(StoreClientTest, InvalidPackageFailsInstall) {
   store_.publishNonsense("com.a");
   const auto observer = listen(delegate_);
   prepareRestore(client_, "com.a");
   EXPECT_THAT(deliver(), ElementsAre("com.a delivered"));
-  // Who hears late of the placeholder hears of the error, too.
-  EXPECT_THAT(delegate_.told(), ElementsAre(HasSubstr("placeholder com.a"), HasSubstr("completed com.a: ")));
+  // The placeholder may be reported after the failure.
+  EXPECT_THAT(delegate_.reports(), ElementsAre(HasSubstr("placeholder com.a"), HasSubstr("completed com.a: ")));
   EXPECT_EQ(packagesLying(), 0);
 }
 
-TEST_F(StoreClientTest, OneAppThatFailsDoesNotStopTheOthers) {
+TEST_F(StoreClientTest, FailureDoesNotStopOtherDeliveries) {
   store_.publish("com.b");
   prepareRestore(client_, "com.a");
   prepareRestore(client_, "com.b");
@@ -141,7 +141,7 @@ TEST_F(StoreClientTest, OneAppThatFailsDoesNotStopTheOthers) {
   EXPECT_EQ(state("com.b"), "1.0");
 }
 
-TEST_F(StoreClientTest, RemovesWhatAnEarlierOneLeftHalfDone) {
+TEST_F(StoreClientTest, RemovesIncompletePackages) {
   std::filesystem::create_directories(device_.host(StoreClient::kPackagesPath));
   writeHostFile(device_.host(StoreClient::kPackagesPath) + "/com.gone.zip", "half");
   writeHostFile(device_.host(StoreClient::kPackagesPath) + "/com.a.zip", "half");
@@ -152,7 +152,7 @@ TEST_F(StoreClientTest, RemovesWhatAnEarlierOneLeftHalfDone) {
   EXPECT_EQ(packagesLying(), 0);
 }
 
-TEST_F(StoreClientTest, RestoredAppsKeepTheirInstallTypeAndLicence) {
+TEST_F(StoreClientTest, KeepsInstallTypeAndLicence) {
   store_.publish("com.a");
   const auto coordinator = client_.make("com.a", Kind::restoring);
   const auto placeholder = service().initAppPlaceholder("Notes", "com.a", TSInstallType::Restore, kSync);
@@ -169,7 +169,7 @@ TEST_F(StoreClientTest, RestoredAppsKeepTheirInstallTypeAndLicence) {
   EXPECT_TRUE(device_.record("com.a")->isInstalled());
 }
 
-TEST_F(StoreClientTest, AppsOfDemotedCoordinatorsAreNotBrought) {
+TEST_F(StoreClientTest, IgnoresDemotedApps) {
   store_.publish("com.a");
   prepareRestore(client_, "com.a", Kind::restoringDemoted, TSInstallType::IntentionalDowngrade);
   EXPECT_THAT(deliver(), ElementsAre());
@@ -178,12 +178,12 @@ TEST_F(StoreClientTest, AppsOfDemotedCoordinatorsAreNotBrought) {
 
 class DemotedCoordinator : public CoordinationTest {};
 
-TEST_F(DemotedCoordinator, EndsOnceItsPlaceholderIsShownAndThePlaceholderStays) {
+TEST_F(DemotedCoordinator, EndsOncePlaceholderIsShown) {
   const auto observer = listen(delegate_);
   prepareRestore(client_, "com.a", Kind::restoringDemoted, TSInstallType::IntentionalDowngrade);
   prepareRestore(client_, "com.b", Kind::restoringDemoted, TSInstallType::Downgrade);
   client_.settle();
-  EXPECT_THAT(delegate_.told(), ElementsAre("placeholder com.a", "placeholder com.b"));
+  EXPECT_THAT(delegate_.reports(), ElementsAre("placeholder com.a", "placeholder com.b"));
   EXPECT_EQ(client_.find("com.a"), nullptr);
   for (int opening = 0; opening < 2; ++opening) {
     EXPECT_EQ(device_.record("com.a")->installType(), TSInstallType::IntentionalDowngrade);
@@ -193,7 +193,7 @@ TEST_F(DemotedCoordinator, EndsOnceItsPlaceholderIsShownAndThePlaceholderStays) 
   }
 }
 
-TEST_F(DemotedCoordinator, WaitsForAnIconThatIsPromised) {
+TEST_F(DemotedCoordinator, WaitsForPromisedIcon) {
   const auto coordinator = client_.make("com.a", Kind::restoringDemoted);
   const auto placeholder = service().initAppPlaceholder("Notes", "com.a", TSInstallType::Downgrade, kSync);
   const auto icon = client_.promise("com.a-Icon");
@@ -206,7 +206,7 @@ TEST_F(DemotedCoordinator, WaitsForAnIconThatIsPromised) {
   EXPECT_EQ(device_.record("com.a")->installType(), TSInstallType::Downgrade);
 }
 
-TEST_F(DemotedCoordinator, WithAPackagePromisedInstallsTheApp) {
+TEST_F(DemotedCoordinator, InstallsPromisedPackage) {
   const auto coordinator = client_.prepare("com.a", Kind::restoringDemoted);
   EXPECT_NE(client_.find("com.a"), nullptr);
   CoordinationClient::deliver(coordinator, stage("com.a"));
@@ -214,21 +214,21 @@ TEST_F(DemotedCoordinator, WithAPackagePromisedInstallsTheApp) {
   EXPECT_EQ(state("com.a"), "1.0");
 }
 
-TEST_F(DemotedCoordinator, CanBeMadeAgain) {
+TEST_F(DemotedCoordinator, CanBeCreatedAgain) {
   prepareRestore(client_, "com.a", Kind::restoringDemoted, TSInstallType::Downgrade);
   prepareRestore(client_, "com.a", Kind::restoringDemoted, TSInstallType::IntentionalDowngrade);
   EXPECT_EQ(device_.record("com.a")->installType(), TSInstallType::IntentionalDowngrade);
   EXPECT_EQ(device_.containers(), 1);
 }
 
-TEST_F(DemotedCoordinator, TheAppIsInstalledWhenTheHostSendsIt) {
+TEST_F(DemotedCoordinator, InstallsPackageSentByHost) {
   prepareRestore(client_, "com.a", Kind::restoringDemoted, TSInstallType::Downgrade);
   CoordinationClient::deliver(client_.prepare("com.a"), stage("com.a", "2.0"));
   client_.settle();
   EXPECT_EQ(state("com.a"), "2.0");
 }
 
-class DemotedAppThatIsSent : public DemotedCoordinator {
+class ReturningDemotedApp : public DemotedCoordinator {
  protected:
   void SetUp() override {
     DemotedCoordinator::SetUp();
@@ -245,32 +245,32 @@ class DemotedAppThatIsSent : public DemotedCoordinator {
   std::shared_ptr<platform::InstallCoordinator> coordinator_;
 };
 
-TEST_F(DemotedAppThatIsSent, IsDemotedStillWhenThatIsCancelled) {
+TEST_F(ReturningDemotedApp, StaysDemotedAfterCancellation) {
   ASSERT_TRUE(service().cancelByUser("com.a").ok());
   expectDemoted();
 }
 
-TEST_F(DemotedAppThatIsSent, IsDemotedStillWhenItIsCancelledAfterARestart) {
+TEST_F(ReturningDemotedApp, StaysDemotedAfterRestartAndCancellation) {
   coordinator_.reset();
   device_.reopen();
   ASSERT_TRUE(service().cancelByUser("com.a").ok());
   expectDemoted();
 }
 
-TEST_F(DemotedAppThatIsSent, IsDemotedStillWhenCoordinationIsSwitchedOff) {
+TEST_F(ReturningDemotedApp, StaysDemotedWhenCoordinationIsTurnedOff) {
   coordinator_.reset();
   ASSERT_TRUE(device_.services().settings().assign("coordination=off").ok());
   device_.reopen();
   expectDemoted();
 }
 
-TEST_F(DemotedAppThatIsSent, IsDemotedStillWhenItsPackageCannotBeInstalled) {
+TEST_F(ReturningDemotedApp, StaysDemotedAfterFailedInstall) {
   CoordinationClient::deliver(coordinator_, stage("com.b", "2.0"));
   client_.settle();
   expectDemoted();
 }
 
-TEST(StoreClientKill, WhatWasNotDeliveredComesNextTime) {
+TEST(StoreClientKill, NextStoreClientDeliversTheRest) {
   StoreFolder store;
   store.publish("com.a");
   const auto deliver = [&store](TestDevice& device) {

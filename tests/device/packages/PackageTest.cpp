@@ -20,7 +20,7 @@ using device::PackageLimits;
 
 namespace {
 
-/// A package that is not one, by name.
+/// An invalid package.
 struct Refusal {
   std::string name;
   std::string bytes;
@@ -44,7 +44,7 @@ std::vector<Refusal> refusals() {
   const std::string again = "; make the package again";
   const auto unsafe = [&](const std::string& name, const std::string& entry) {
     return Refusal{name, with({entry, "x"}), InstallerFailure::unsafeEntry,
-                   "the package holds \"" + entry + "\", a name that may lead out of it" + again};
+                   "the package holds \"" + entry + "\", a name that may lead outside it" + again};
   };
   return {
       {"Text", "hello", InstallerFailure::notAPackage,
@@ -53,14 +53,14 @@ std::vector<Refusal> refusals() {
        "this is not a package; a package is a zip archive of an app folder"},
       {"EmptyArchive", zipArchive({}), InstallerFailure::noApp, "the package is empty; pack an app folder"},
       {"CutShort", cut(appPackage("com.a"), 200), InstallerFailure::damaged,
-       "the package is cut short or damaged; copy it again"},
+       "the package is truncated or damaged; copy it again"},
       {"CutShortByOne", cut(appPackage("com.a"), 1), InstallerFailure::damaged,
-       "the package is cut short or damaged; copy it again"},
+       "the package is truncated or damaged; copy it again"},
       unsafe("AbsoluteName", "/Notes.app/x"),
       unsafe("WayUp", "Notes.app/../../x"),
       unsafe("WayUpInside", "Notes.app/../Notes.app/x"),
       {"Backslashes", with({"Notes.app\\..\\x", "x"}), InstallerFailure::unsafeEntry,
-       "the package holds \"Notes.app/../x\", a name that may lead out of it" + again},
+       "the package holds \"Notes.app/../x\", a name that may lead outside it" + again},
       unsafe("BackslashInside", "Notes.app/a\\b"),
       unsafe("DotComponent", "Notes.app/./x"),
       unsafe("EmptyComponent", "Notes.app//x"),
@@ -115,7 +115,7 @@ constexpr auto nameOfRefusal = [](const auto& refusal) { return refusal.param.na
 
 INSTANTIATE_TEST_SUITE_P(Package, RefusedPackage, testing::ValuesIn(refusals()), nameOfRefusal);
 
-/// Unpacks into a folder of its own.
+/// Unpacks a package into a new directory.
 Result<device::UnpackedPackage> unpack(const std::string& package, const std::string& folder, PackageLimits limits) {
   std::filesystem::create_directories(folder);
   device::FileDescriptor file(::open(package.c_str(), O_RDONLY));
@@ -141,7 +141,7 @@ class Package : public testing::Test {
 
 }  // namespace
 
-TEST_P(RefusedPackage, IsNotInstalledAndLeavesNoTrace) {
+TEST_P(RefusedPackage, LeavesNoTrace) {
   TestDevice device;
   const Status installed = device.tryInstall("com.a", GetParam().bytes);
   ASSERT_FALSE(installed.ok());
@@ -155,7 +155,7 @@ TEST_P(RefusedPackage, IsNotInstalledAndLeavesNoTrace) {
   EXPECT_TRUE(device.isTidy());
 }
 
-TEST_F(Package, IsUnpackedWithItsFoldersAndModes) {
+TEST_F(Package, UnpacksFoldersAndModes) {
   const auto package = unpackHere(appPackage("com.a", "2.5", {{"HarvoArtwork", "art"}}));
   ASSERT_TRUE(package.ok()) << package.error().text;
   EXPECT_EQ(package->appFolder, "Notes.app");
@@ -171,7 +171,7 @@ TEST_F(Package, IsUnpackedWithItsFoldersAndModes) {
   EXPECT_EQ(plain & perms::owner_exec, perms::none);
 }
 
-TEST_F(Package, MayHoldNamesOfAnyScript) {
+TEST_F(Package, AcceptsNamesOfAnyScript) {
   const std::vector<ZipEntry> entries{{"Café 日本.app/Info.plist", infoPlist("com.a")}, {"Café 日本.app/ü", "x"}};
   const auto package = unpackHere(zipArchive(entries));
   ASSERT_TRUE(package.ok()) << package.error().text;
@@ -179,7 +179,7 @@ TEST_F(Package, MayHoldNamesOfAnyScript) {
   EXPECT_EQ(unpacked("Café 日本.app/ü"), "x");
 }
 
-TEST_F(Package, MayHaveItsInfoLast) {
+TEST_F(Package, AcceptsInfoAsLastEntry) {
   const auto package =
       unpackHere(zipArchive({{"A.app/a/b/c", "1"}, {"A.app/a/d", "2"}, {"A.app/Info.plist", infoPlist("com.a")}}));
   ASSERT_TRUE(package.ok()) << package.error().text;
@@ -187,7 +187,7 @@ TEST_F(Package, MayHaveItsInfoLast) {
   EXPECT_EQ(unpacked("A.app/a/d"), "2");
 }
 
-TEST_F(Package, MayHaveItsInfoInAnyForm) {
+TEST_F(Package, AcceptsInfoInAnyFormat) {
   const plist::Value info = plist::Dictionary{{platform::BundleIdentifierKey, "com.a"}};
   const auto binary = plist::writeBinary(info);
   EXPECT_TRUE(unpackHere(zipArchive({{"A.app/Info.plist", std::string(textOf(*binary))}})).ok());
@@ -195,14 +195,14 @@ TEST_F(Package, MayHaveItsInfoInAnyForm) {
   EXPECT_TRUE(unpackHere(zipArchive({{"A.app/Info.plist", "{ BundleIdentifier = \"com.a\"; }"}})).ok());
 }
 
-TEST_F(Package, WithTooManyEntriesIsRefused) {
+TEST_F(Package, RejectsTooManyEntries) {
   const auto package = unpackHere(appPackage("com.a"), {.entries = 3});
   ASSERT_FALSE(package.ok());
   EXPECT_EQ(package.error().text,
             "the package has more than 3 entries, the most that are allowed; make the app smaller");
 }
 
-TEST_F(Package, WithTooManyBytesIsRefusedBeforeTheyAreUnpacked) {
+TEST_F(Package, RejectsTooManyBytesBeforeUnpacking) {
   const auto package = unpackHere(zipArchive({{"A.app/big", std::string(2000, 'x')}}), {.unpackedBytes = 1999});
   ASSERT_FALSE(package.ok());
   EXPECT_EQ(package.error().text,
@@ -210,7 +210,7 @@ TEST_F(Package, WithTooManyBytesIsRefusedBeforeTheyAreUnpacked) {
   EXPECT_FALSE(std::filesystem::exists(folder_.path("container/A.app")));
 }
 
-TEST_F(Package, PackedTighterThanAnyAppIsRefused) {
+TEST_F(Package, RejectsExcessiveCompressionRatio) {
   const std::string app = folder_.path("Bomb.app");
   std::filesystem::create_directories(app);
   writeHostFile(app + "/Info.plist", infoPlist("com.a"));
@@ -224,7 +224,7 @@ TEST_F(Package, PackedTighterThanAnyAppIsRefused) {
             "the package unpacks to more than 200 times its size, the most that is allowed; no app does that");
 }
 
-TEST_F(Package, IsGivenUpWhenItsProgressSaysSo) {
+TEST_F(Package, StopsWhenCancelled) {
   device::FileDescriptor file(::open(write(appPackage("com.a")).c_str(), O_RDONLY));
   const device::FileDescriptor container(::open(folder_.path().c_str(), O_RDONLY | O_DIRECTORY));
   auto reader = device::PackageReader::open(std::move(file));
@@ -243,13 +243,13 @@ TEST_F(Package, IsGivenUpWhenItsProgressSaysSo) {
   }
 }
 
-TEST_F(Package, ThatIsAFolderIsRefused) {
+TEST_F(Package, RejectsFolder) {
   const auto info = device::readPackageInfo(folder_.path());
   ASSERT_FALSE(info.ok());
   EXPECT_EQ(info.error().text, folder_.path() + ": this is not a package; a package is a file");
 }
 
-TEST_F(Package, IsLookedAtWithoutUnpacking) {
+TEST_F(Package, ReadsDescriptionWithoutUnpacking) {
   const std::string bytes = appPackage("com.a", "3.1", {{"HarvoMetadata.plist", "meta"}, {"HarvoArtwork", "art"}});
   const Result<PackageInfo> info = device::readPackageInfo(write(bytes));
   ASSERT_TRUE(info.ok()) << info.error().text;
@@ -263,7 +263,7 @@ TEST_F(Package, IsLookedAtWithoutUnpacking) {
   EXPECT_NE(info->info.find(platform::kBundleIconFileKey), nullptr);
 }
 
-TEST_F(Package, WithoutExtrasHasNoneOfThem) {
+TEST_F(Package, OptionalFilesMayBeMissing) {
   const auto info = device::readPackageInfo(
       write(zipArchive({{"Plain.app/Info.plist", "{ BundleIdentifier = \"com.a\"; BundleIconFile = missing; }"}})));
   ASSERT_TRUE(info.ok()) << info.error().text;
@@ -271,7 +271,7 @@ TEST_F(Package, WithoutExtrasHasNoneOfThem) {
   EXPECT_FALSE(info->version || info->storeMetadata || info->artwork || info->icon);
 }
 
-TEST_F(Package, ThatIsMissingSaysWhich) {
+TEST_F(Package, NamesMissingFile) {
   const auto info = device::readPackageInfo(folder_.path("missing.zip"));
   ASSERT_FALSE(info.ok());
   EXPECT_EQ(info.error(), Error::fromErrno(ENOENT).in(folder_.path("missing.zip")));

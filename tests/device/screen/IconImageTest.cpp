@@ -55,7 +55,7 @@ Bytes file(std::string_view chunks) {
   return bytes;
 }
 
-/// A whole file with more chunks behind its header.
+/// Returns a complete file with additional chunks after its header.
 Bytes withChunks(const Bytes& png, std::string_view chunks) {
   constexpr std::ptrdiff_t kHeaderEnd = 8 + 25;
   Bytes bytes(png.begin(), png.begin() + kHeaderEnd);
@@ -70,7 +70,7 @@ long peakMemoryKilobytes() {
   return usage.ru_maxrss;
 }
 
-TEST(DecodePNG, GivesThePictureThatWasEncoded) {
+TEST(DecodePNG, ReturnsEncodedImage) {
   const auto original = makePicture(31, 17, kRed, kBlue);
   const auto decoded = decodePNG(pngOf(original.get()));
   ASSERT_NE(decoded, nullptr);
@@ -95,21 +95,21 @@ TEST(DecodePNG, KeepsTransparency) {
   EXPECT_EQ(pixelAt(decoded.get(), 1, 0), kNothing);
 }
 
-TEST(DecodePNG, RefusesWhatIsNoPNG) {
+TEST(DecodePNG, RejectsOtherFormats) {
   EXPECT_EQ(decodePNG({}), nullptr);
   EXPECT_EQ(decodePNG(bytesOf("GIF89a")), nullptr);
   EXPECT_EQ(decodePNG(bytesOf(kSignature)), nullptr);
   EXPECT_EQ(decodePNG(file(chunk("IEND", ""))), nullptr);
 }
 
-TEST(DecodePNG, RefusesAFileThatEndsEarlyAtWhicheverByte) {
+TEST(DecodePNG, RejectsTruncationAtAnyByte) {
   const Bytes png = makePNG(8, 8, kRed);
   for (std::size_t length = 0; length < png.size(); ++length) {
     ASSERT_EQ(decodePNG(ByteView(png).first(length)), nullptr) << length;
   }
 }
 
-TEST(DecodePNG, SurvivesEveryDamagedByte) {
+TEST(DecodePNG, SurvivesDamageOfAnyByte) {
   const Bytes png = makePNG(8, 8, kRed);
   for (std::size_t at = 0; at < png.size(); ++at) {
     Bytes damaged = png;
@@ -121,7 +121,7 @@ TEST(DecodePNG, SurvivesEveryDamagedByte) {
   }
 }
 
-TEST(DecodePNG, RefusesSizesThatWouldTakeTooMuchMemory) {
+TEST(DecodePNG, RejectsTooManyPixels) {
   const long before = peakMemoryKilobytes();
   constexpr std::array<std::pair<std::uint32_t, std::uint32_t>, 6> kSizes{
       {{30'000, 30'000}, {2049, 2048}, {1, 0x7FFFFFFF}, {0x7FFFFFFF, 1}, {0xFFFFFFFF, 0xFFFFFFFF}, {0x10000, 0x10000}}};
@@ -131,31 +131,31 @@ TEST(DecodePNG, RefusesSizesThatWouldTakeTooMuchMemory) {
   EXPECT_LT(peakMemoryKilobytes() - before, 20'000);
 }
 
-TEST(DecodePNG, RefusesEmptyPictures) {
+TEST(DecodePNG, RejectsEmptyImages) {
   EXPECT_EQ(decodePNG(file(header(0, 5) + chunk("IDAT", "x") + chunk("IEND", ""))), nullptr);
   EXPECT_EQ(decodePNG(file(header(5, 0) + chunk("IDAT", "x") + chunk("IEND", ""))), nullptr);
 }
 
-TEST(DecodePNG, RefusesASecondHeaderAndOneThatComesLate) {
+TEST(DecodePNG, RejectsRepeatedAndLateHeader) {
   const Bytes png = makePNG(8, 8, kRed);
   EXPECT_EQ(decodePNG(withChunks(png, header(30'000, 30'000))), nullptr);
   EXPECT_EQ(decodePNG(file(chunk("tEXt", "a") + header(8, 8) + chunk("IEND", ""))), nullptr);
 }
 
-TEST(DecodePNG, RefusesAChunkThatIsLongerThanTheFile) {
+TEST(DecodePNG, RejectsChunkLongerThanFile) {
   Bytes bytes = makePNG(8, 8, kRed);
   bytes = withChunks(bytes, bigEndian(0xFFFFFFF0) + "IDAT");
   EXPECT_EQ(decodePNG(bytes), nullptr);
 }
 
-TEST(DecodePNG, TextAndProfilesAreNotLookedAt) {
+TEST(DecodePNG, IgnoresTextAndProfiles) {
   const Bytes png = makePNG(8, 8, kGreen);
   const auto decoded = decodePNG(withChunks(png, chunk("zTXt", "broken") + chunk("iCCP", "broken too")));
   ASSERT_NE(decoded, nullptr);
   EXPECT_EQ(pixelAt(decoded.get(), 4, 4), kGreen);
 }
 
-TEST(DecodePNG, WhatFollowsTheEndIsNotLookedAt) {
+TEST(DecodePNG, IgnoresBytesAfterEnd) {
   Bytes png = makePNG(8, 8, kGreen);
   append(png, "anything");
   EXPECT_NE(decodePNG(png), nullptr);

@@ -1,4 +1,4 @@
-// Pictures that tests make and look at.
+// Creates and inspects images.
 #pragma once
 
 #include <cstdint>
@@ -26,7 +26,7 @@ inline Pixel pixelAt(cairo_surface_t* picture, int x, int y) {
          static_cast<Pixel>(bytes[3]) << 24U;
 }
 
-/// An opaque picture whose left half has one colour and its right half the other.
+/// Returns an opaque image with a left half of one colour and a right half of another.
 inline device::Surface makePicture(int width, int height, Pixel left, Pixel right) {
   device::Surface picture(cairo_image_surface_create(CAIRO_FORMAT_ARGB32, width, height));
   const device::Context context(cairo_create(picture.get()));
@@ -48,7 +48,7 @@ inline Bytes pngOf(cairo_surface_t* picture) {
   return png;
 }
 
-/// Opaque and of one colour.
+/// Returns an opaque image of one colour.
 inline Bytes makePNG(int width, int height, Pixel color) {
   return pngOf(makePicture(width, height, color, color).get());
 }

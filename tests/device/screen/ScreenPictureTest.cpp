@@ -16,7 +16,7 @@ namespace {
 using platform::TSInstallPhase;
 using platform::TSInstallState;
 
-// Of a picture of one row of pages.
+// Sizes of a picture with one row of pages.
 constexpr int kPagePitch = 810;
 constexpr int kLeft = 60 + 54;
 constexpr int kTop = 60 + 92;
@@ -39,7 +39,7 @@ class ScreenPictureTest : public testing::Test {
     EXPECT_EQ(cairo_surface_status(picture.get()), CAIRO_STATUS_SUCCESS);
     return picture;
   }
-  /// The pixel a quarter down the icon that stands in that column, row and page.
+  /// Returns the pixel a quarter down the icon at a column, row and page.
   static Pixel iconPixel(const device::Surface& picture, int column, int row, int page = 0) {
     return pixelAt(picture.get(), kLeft + page * kPagePitch + column * kColumn + 60, kTop + row * kRow + 12) |
            0xFF000000;
@@ -65,13 +65,13 @@ class ScreenPictureTest : public testing::Test {
   const std::string path = folder.path("screen.png");
 };
 
-TEST_F(ScreenPictureTest, AnEmptyScreenIsOnePage) {
+TEST_F(ScreenPictureTest, EmptyScreenHasOnePage) {
   const auto picture = draw();
   EXPECT_EQ(cairo_image_surface_get_width(picture.get()), 870);
   EXPECT_EQ(cairo_image_surface_get_height(picture.get()), 1454);
 }
 
-TEST_F(ScreenPictureTest, IconsStandInOnScreenOrder) {
+TEST_F(ScreenPictureTest, DrawsIconsInOrder) {
   addApp(FakeApp::installed("com.a"), "A", kRed);
   addApp(FakeApp::installed("com.b"), "B", kGreen);
   addApp(FakeApp::installed("com.c"), "C", kBlue);
@@ -82,7 +82,7 @@ TEST_F(ScreenPictureTest, IconsStandInOnScreenOrder) {
   EXPECT_EQ(iconPixel(picture, 2, 0), kGreen);
 }
 
-TEST_F(ScreenPictureTest, AFullPageContinuesOnTheNext) {
+TEST_F(ScreenPictureTest, ContinuesOnNextPage) {
   for (int number = 10; number < 36; ++number) {
     addApp(FakeApp::installed("com." + std::to_string(number)), "App", number < 34 ? kRed : kGreen);
   }
@@ -95,7 +95,7 @@ TEST_F(ScreenPictureTest, AFullPageContinuesOnTheNext) {
   EXPECT_EQ(iconPixel(picture, 1, 0, 1), kGreen);
 }
 
-TEST_F(ScreenPictureTest, PlaceholdersAreDimmed) {
+TEST_F(ScreenPictureTest, DimsPlaceholders) {
   addApp(FakeApp::placeholder("com.a"), "A", kRed);
   addApp(FakeApp::updating("com.b").withProgress(TSInstallState::Active, TSInstallPhase::Loading), "B", kGreen);
   addApp(FakeApp::placeholder("com.c").withoutProgress(), "C", kBlue);
@@ -105,7 +105,7 @@ TEST_F(ScreenPictureTest, PlaceholdersAreDimmed) {
   EXPECT_TRUE(isDimmed(iconPixel(picture, 2, 0), kBlue));
 }
 
-TEST_F(ScreenPictureTest, TheRingFillsWithTheProgress) {
+TEST_F(ScreenPictureTest, RingShowsProgress) {
   const auto app = FakeApp::placeholder("com.a").withProgress(TSInstallState::Active, TSInstallPhase::Loading);
   addApp(app, "A", kRed);
   const auto ringAt = [&](int dx, int dy) { return pixelAt(draw().get(), kLeft + 60 + dx, kTop + 60 + dy) & 0xFFU; };
@@ -117,7 +117,7 @@ TEST_F(ScreenPictureTest, TheRingFillsWithTheProgress) {
   EXPECT_GT(ringAt(-32, 0), 200U);
 }
 
-TEST_F(ScreenPictureTest, ProgressWithoutSenseIsDrawnAsNoneOrAll) {
+TEST_F(ScreenPictureTest, ClampsInvalidProgress) {
   const auto app = FakeApp::placeholder("com.a").withProgress(TSInstallState::Active, TSInstallPhase::Loading);
   addApp(app, "A", kRed);
   for (const auto& [completed, total] : {std::pair(5, 0), std::pair(-5, 10), std::pair(50, 10), std::pair(5, -10)}) {
@@ -127,7 +127,7 @@ TEST_F(ScreenPictureTest, ProgressWithoutSenseIsDrawnAsNoneOrAll) {
   }
 }
 
-TEST_F(ScreenPictureTest, AnAppWithoutAnIconGetsAColourThatStaysTheSame) {
+TEST_F(ScreenPictureTest, AppWithoutIconHasStableColour) {
   addApp(FakeApp::installed("com.a"), "A", std::nullopt);
   registry.add(FakeApp::installed("com.b").withBundlePath(std::nullopt));
   const auto picture = draw();
@@ -137,12 +137,12 @@ TEST_F(ScreenPictureTest, AnAppWithoutAnIconGetsAColourThatStaysTheSame) {
   EXPECT_NE(iconPixel(picture, 0, 0), iconPixel(picture, 2, 0)) << "not the wallpaper";
 }
 
-TEST_F(ScreenPictureTest, EveryNameCanBeDrawn) {
+TEST_F(ScreenPictureTest, DrawsEveryName) {
   std::vector<std::string> names{"", "\xF0\x9F\x8E\xAE game", "line\nbreak", "\xD7\xA9\xD7\x9C\xD7\x95\xD7\x9D",
                                  "e\xCC\x81"};
   names.emplace_back(100'000, 'W');
   names.emplace_back(200, ' ');
-  // Characters across the length at which long names are cut.
+  // Characters across the length at which names are truncated.
   names.emplace_back(255, 'x');
   names.back().append("\xC3\xA9");
   names.emplace_back(254, 'x');

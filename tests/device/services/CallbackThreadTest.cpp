@@ -25,7 +25,7 @@ class CallbackThreadTest : public testing::Test {
   CallbackThread thread;
 };
 
-TEST_F(CallbackThreadTest, CallsBackInTheOrderOfThePostsOnOneOtherThread) {
+TEST_F(CallbackThreadTest, RunsCallbacksInOrderOnOneOtherThread) {
   std::vector<int> order;
   std::vector<std::thread::id> threads;
   for (int number = 0; number < 100; ++number) {
@@ -42,7 +42,7 @@ TEST_F(CallbackThreadTest, CallsBackInTheOrderOfThePostsOnOneOtherThread) {
   EXPECT_NE(threads.front(), std::this_thread::get_id());
 }
 
-TEST_F(CallbackThreadTest, DropsWhatIsQueuedForAForgottenReceiverOnly) {
+TEST_F(CallbackThreadTest, ForgetDropsOnlyCallbacksOfReceiver) {
   Gate gate;
   gate.close();
   std::string called;
@@ -59,7 +59,7 @@ TEST_F(CallbackThreadTest, DropsWhatIsQueuedForAForgottenReceiverOnly) {
   EXPECT_EQ(called, "second");
 }
 
-TEST_F(CallbackThreadTest, ForgettingWaitsForTheRunningCallback) {
+TEST_F(CallbackThreadTest, ForgetWaitsForRunningCallback) {
   Gate gate;
   gate.close();
   std::atomic<bool> ended = false;
@@ -74,7 +74,7 @@ TEST_F(CallbackThreadTest, ForgettingWaitsForTheRunningCallback) {
   opener.join();
 }
 
-TEST_F(CallbackThreadTest, ForgettingDoesNotWaitForTheCallbackOfAnotherReceiver) {
+TEST_F(CallbackThreadTest, ForgetDoesNotWaitForOtherReceivers) {
   Gate gate;
   gate.close();
   thread.post(&second, [&] { gate.pass(); });
@@ -85,7 +85,7 @@ TEST_F(CallbackThreadTest, ForgettingDoesNotWaitForTheCallbackOfAnotherReceiver)
   thread.forget(&second);  // The callback is done with the gate before it goes.
 }
 
-TEST_F(CallbackThreadTest, ACallbackMayForgetItsOwnReceiverAndPost) {
+TEST_F(CallbackThreadTest, CallbackMayForgetItsReceiverAndPost) {
   thread.post(&first, [&] {
     thread.forget(&first);
     thread.post(&first, [&] { done.signal(); });
@@ -93,7 +93,7 @@ TEST_F(CallbackThreadTest, ACallbackMayForgetItsOwnReceiverAndPost) {
   done.wait();
 }
 
-TEST_F(CallbackThreadTest, WhatACallbackCapturedGoesRightAfterItRan) {
+TEST_F(CallbackThreadTest, CapturesAreDestroyedAfterEachCallback) {
   auto captured = std::make_shared<int>();
   const std::weak_ptr<int> watched = captured;
   thread.post(&first, [captured = std::move(captured)] {});
@@ -104,7 +104,7 @@ TEST_F(CallbackThreadTest, WhatACallbackCapturedGoesRightAfterItRan) {
   done.wait();
 }
 
-TEST_F(CallbackThreadTest, DestructionWaitsForTheRunningCallback) {
+TEST_F(CallbackThreadTest, DestructionWaitsForRunningCallback) {
   Gate gate;
   gate.close();
   std::atomic<bool> ended = false;
@@ -120,7 +120,7 @@ TEST_F(CallbackThreadTest, DestructionWaitsForTheRunningCallback) {
   opener.join();
 }
 
-TEST_F(CallbackThreadTest, DestructionFreesWhatWasQueued) {
+TEST_F(CallbackThreadTest, DestructionDestroysQueuedCallbacks) {
   auto captured = std::make_shared<int>();
   const std::weak_ptr<int> watched = captured;
   {

@@ -24,7 +24,7 @@ Error refusal(SettingsFailure failure, std::string text) {
 
 class SettingsTest : public testing::Test {
  protected:
-  /// What is kept: "key value", of assertions "key app value".
+  /// Returns the stored rows: "key value", or "key app value" for assertions.
   Lines rows() {
     device::Database::Session session(database);
     device::Statement table =
@@ -45,7 +45,7 @@ class SettingsTest : public testing::Test {
   Settings settings{database};
 };
 
-TEST_F(SettingsTest, NothingIsSetAtFirst) {
+TEST_F(SettingsTest, IsUnsetInitially) {
   EXPECT_EQ(rows(), Lines{});
   EXPECT_EQ(settings.restriction(RestrictionSetting::appInstallationAllowed), RestrictionValue::unset);
   EXPECT_EQ(settings.restriction(RestrictionSetting::appRemovalAllowed), RestrictionValue::unset);
@@ -53,7 +53,7 @@ TEST_F(SettingsTest, NothingIsSetAtFirst) {
   EXPECT_EQ(settings.assertionAnswer("com.a"), std::nullopt);
 }
 
-TEST_F(SettingsTest, KeepsWhatIsSetByKeyAndAssertionsByIdentifier) {
+TEST_F(SettingsTest, StoresValuesByKeyAndAssertionsByApp) {
   EXPECT_TRUE(settings.assign("coordination=off"));
   EXPECT_TRUE(settings.assign("assertion=com.b:failing"));
   EXPECT_TRUE(settings.assign("assertion=com.a:denied"));
@@ -63,13 +63,13 @@ TEST_F(SettingsTest, KeepsWhatIsSetByKeyAndAssertionsByIdentifier) {
                            "assertion com.b failing", "coordination off"}));
 }
 
-TEST_F(SettingsTest, AnotherValueReplacesTheFirst) {
+TEST_F(SettingsTest, ReplacesEarlierValue) {
   EXPECT_TRUE(settings.set("app-removal", "no"));
   EXPECT_TRUE(settings.set("app-removal", "yes"));
   EXPECT_EQ(rows(), Lines{"app-removal yes"});
 }
 
-TEST_F(SettingsTest, UnsetTakesASettingAway) {
+TEST_F(SettingsTest, UnsetRemovesSetting) {
   EXPECT_TRUE(settings.set("app-removal", "no"));
   EXPECT_TRUE(settings.set("assertion", "com.a:denied"));
   EXPECT_TRUE(settings.set("coordination", "off"));
@@ -79,13 +79,13 @@ TEST_F(SettingsTest, UnsetTakesASettingAway) {
   EXPECT_EQ(rows(), Lines{});
 }
 
-TEST_F(SettingsTest, OutliveTheProcess) {
+TEST_F(SettingsTest, SurvivesRestart) {
   EXPECT_TRUE(settings.set("app-installation", "no"));
   database.reopen();
   EXPECT_EQ(Settings(database).restriction(RestrictionSetting::appInstallationAllowed), RestrictionValue::no);
 }
 
-TEST_F(SettingsTest, AreReadBesideTheProcessThatHoldsTheDevice) {
+TEST_F(SettingsTest, ReadersSeeSettings) {
   EXPECT_TRUE(settings.set("app-installation", "no"));
   const auto other = database.openReadOnly();
   Settings reader(*other);
@@ -95,14 +95,15 @@ TEST_F(SettingsTest, AreReadBesideTheProcessThatHoldsTheDevice) {
   EXPECT_EQ(reader.restriction(RestrictionSetting::appInstallationAllowed), RestrictionValue::yes);
 }
 
-TEST_F(SettingsTest, AnUnknownKeyIsRefusedWithTheKeysThatThereAre) {
-  EXPECT_EQ(refusalOf("colour=blue"),
-            refusal(SettingsFailure::unknownKey,
-                    "there is no setting \"colour\"; there are app-installation, app-removal, assertion, coordination, "
-                    "store"));
+TEST_F(SettingsTest, RejectsUnknownKeyAndListsKeys) {
+  EXPECT_EQ(
+      refusalOf("colour=blue"),
+      refusal(SettingsFailure::unknownKey,
+              "unknown setting \"colour\"; the settings are app-installation, app-removal, assertion, coordination, "
+              "store"));
 }
 
-TEST_F(SettingsTest, AnUnknownValueIsRefusedWithTheValuesThatThereAre) {
+TEST_F(SettingsTest, RejectsUnknownValueAndListsValues) {
   EXPECT_EQ(
       refusalOf("app-removal=maybe"),
       refusal(SettingsFailure::unknownValue, "setting app-removal cannot be \"maybe\": it takes yes, no or unset"));
@@ -115,7 +116,7 @@ TEST_F(SettingsTest, AnUnknownValueIsRefusedWithTheValuesThatThereAre) {
   EXPECT_EQ(rows(), Lines{});
 }
 
-TEST_F(SettingsTest, AnAssertionNamesAnAppAndAnAnswer) {
+TEST_F(SettingsTest, AssertionNeedsAppAndAnswer) {
   for (const char* value : {"com.a", "com.a:", "com.a:no", ":denied", "", ":"}) {
     EXPECT_EQ(refusalOf(std::string("assertion=") + value),
               refusal(SettingsFailure::unknownValue,
@@ -124,7 +125,7 @@ TEST_F(SettingsTest, AnAssertionNamesAnAppAndAnAnswer) {
   }
 }
 
-TEST_F(SettingsTest, CoordinationIsOffUntilItIsTurnedOn) {
+TEST_F(SettingsTest, CoordinationIsOffByDefault) {
   EXPECT_FALSE(settings.coordinationIsOn());
   EXPECT_TRUE(settings.assign("coordination=on"));
   EXPECT_TRUE(settings.coordinationIsOn());
@@ -136,19 +137,19 @@ TEST_F(SettingsTest, CoordinationIsOffUntilItIsTurnedOn) {
   EXPECT_FALSE(settings.coordinationIsOn());
 }
 
-TEST_F(SettingsTest, ATextWithoutAnEqualsSignIsNoAssignment) {
+TEST_F(SettingsTest, RejectsAssignmentWithoutEqualsSign) {
   EXPECT_EQ(refusalOf("app-removal"),
             refusal(SettingsFailure::noAssignment, "\"app-removal\" is not of the form KEY=VALUE"));
 }
 
-TEST_F(SettingsTest, TheStoreIsKeptAsAnAbsolutePath) {
+TEST_F(SettingsTest, StoresAbsolutePathOfStore) {
   const TemporaryFolder folder;
   std::filesystem::create_directory(folder.path("store"));
   EXPECT_TRUE(settings.set("store", folder.path("./store/../store")));
   EXPECT_EQ(settings.storeFolder(), std::filesystem::canonical(folder.path("store")).string());
 }
 
-TEST_F(SettingsTest, TheStoreMustBeAFolder) {
+TEST_F(SettingsTest, RejectsStoreThatIsNotAFolder) {
   EXPECT_EQ(refusalOf("store=/does/not/exist"),
             refusal(SettingsFailure::unknownValue,
                     "setting store cannot be \"/does/not/exist\": it takes an existing folder or unset"));
@@ -156,7 +157,7 @@ TEST_F(SettingsTest, TheStoreMustBeAFolder) {
   EXPECT_FALSE(settings.set("store", ""));
 }
 
-TEST_F(SettingsTest, AssertionAnswersAreKeptPerApp) {
+TEST_F(SettingsTest, StoresAssertionAnswersPerApp) {
   for (const auto answer :
        {AssertionAnswer::granted, AssertionAnswer::denied, AssertionAnswer::unknown, AssertionAnswer::failing}) {
     EXPECT_TRUE(settings.setAssertionAnswer("com.a", answer));
@@ -165,14 +166,14 @@ TEST_F(SettingsTest, AssertionAnswersAreKeptPerApp) {
   EXPECT_EQ(settings.assertionAnswer("com.A"), std::nullopt);
 }
 
-TEST_F(SettingsTest, WhatCannotBeReadCountsAsUnset) {
+TEST_F(SettingsTest, UnreadableSettingsAreUnset) {
   EXPECT_TRUE(settings.set("app-removal", "no"));
   database.drop("settings");
   EXPECT_EQ(settings.restriction(RestrictionSetting::appRemovalAllowed), RestrictionValue::unset);
   EXPECT_FALSE(settings.set("app-removal", "no"));
 }
 
-TEST_F(SettingsTest, RestrictionsAnswerAsTheSettingsSay) {
+TEST_F(SettingsTest, RestrictionsFollowSettings) {
   device::Restrictions restrictions(settings);
   EXPECT_EQ(restrictions.effectiveBoolValueForSetting(RestrictionSetting::appRemovalAllowed), RestrictionValue::unset);
   EXPECT_TRUE(settings.set("app-removal", "no"));

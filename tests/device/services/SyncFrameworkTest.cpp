@@ -36,13 +36,13 @@ class MemorySink final : public LogSink {
   std::vector<Written>& written_;
 };
 
-/// Fails the test when it is formatted.
+/// Fails the test if it is formatted.
 struct Unprintable {};
 void appendDescription(std::string&, const Unprintable&) {
   ADD_FAILURE() << "formatted for a disabled log";
 }
 
-TEST(SyncFrameworkLog, IsDisabledUntilThereIsASink) {
+TEST(SyncFrameworkLog, IsDisabledWithoutSink) {
   SyncFramework framework;
   LogCategory& category = framework.ZTGetLogCategory(8);
   EXPECT_FALSE(category.isEnabled(LogLevel::standard));
@@ -51,7 +51,7 @@ TEST(SyncFrameworkLog, IsDisabledUntilThereIsASink) {
   category.write(LogLevel::error, "lost");
 }
 
-TEST(SyncFrameworkLog, MessagesGoToTheSinkWithTimeCategoryAndLevel) {
+TEST(SyncFrameworkLog, SinkReceivesTimeCategoryLevelAndMessage) {
   std::vector<Written> written;
   SyncFramework framework;
   LogCategory& category = framework.ZTGetLogCategory(8);
@@ -72,7 +72,7 @@ TEST(SyncFrameworkLog, MessagesGoToTheSinkWithTimeCategoryAndLevel) {
   EXPECT_EQ(written[1].message, "second");
 }
 
-TEST(SyncFrameworkLog, ALaterSinkReplacesTheEarlierOne) {
+TEST(SyncFrameworkLog, ReplacesSink) {
   std::vector<Written> first;
   std::vector<Written> second;
   SyncFramework framework;
@@ -83,7 +83,7 @@ TEST(SyncFrameworkLog, ALaterSinkReplacesTheEarlierOne) {
   EXPECT_EQ(second.size(), 1U);
 }
 
-TEST(SyncFrameworkLog, ANumbersCategoryIsAlwaysTheSame) {
+TEST(SyncFrameworkLog, ReturnsSameCategoryForNumber) {
   SyncFramework framework;
   EXPECT_EQ(&framework.ZTGetLogCategory(8), &framework.ZTGetLogCategory(8));
   EXPECT_NE(&framework.ZTGetLogCategory(8), &framework.ZTGetLogCategory(14));
@@ -138,7 +138,7 @@ INSTANTIATE_TEST_SUITE_P(
                     Error{"Other", 1, "text", std::make_shared<const Error>(errorOf("POSIX", EAGAIN))}),
     [](const auto& test) { return "Number" + std::to_string(test.index); });
 
-TEST(SyncFramework, MakesAssetsThatAreDownloads) {
+TEST(SyncFramework, CreatesDownloads) {
   const auto asset = SyncFramework().downloadAssetWithIdentifier("com.a", "Application", "Name");
   EXPECT_EQ(asset->identifier(), "com.a");
   EXPECT_EQ(asset->dataclass(), "Application");

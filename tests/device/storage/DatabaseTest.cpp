@@ -50,7 +50,7 @@ int failTheBeginning(const char*) {
 
 }  // namespace
 
-TEST_F(DatabaseTest, KeepsValuesOfEveryKind) {
+TEST_F(DatabaseTest, StoresValuesOfEveryType) {
   const std::string bytes("a\0b", 3);
   {
     Database::Session session(database_);
@@ -82,7 +82,7 @@ TEST_F(DatabaseTest, KeepsValuesOfEveryKind) {
   EXPECT_TRUE(query.status().ok());
 }
 
-TEST_F(DatabaseTest, SaysWhatIsWrongWithAStatement) {
+TEST_F(DatabaseTest, ReportsInvalidStatements) {
   Database::Session session(database_);
   const Status status = session.run("insert into missing values (1)");
   ASSERT_FALSE(status.ok());
@@ -92,7 +92,7 @@ TEST_F(DatabaseTest, SaysWhatIsWrongWithAStatement) {
   EXPECT_FALSE(query.status().ok());
 }
 
-TEST_F(DatabaseTest, RunsOneStatementInsideItself) {
+TEST_F(DatabaseTest, NestsOneStatement) {
   {
     Database::Session session(database_);
     for (int size = 0; size < 3; ++size)
@@ -120,7 +120,7 @@ TEST_F(DatabaseTest, CommitsATransaction) {
   EXPECT_EQ(count(), 4);
 }
 
-TEST_F(DatabaseTest, TakesBackWhatIsNotCommitted) {
+TEST_F(DatabaseTest, RollsBackWithoutCommit) {
   {
     Database::Transaction transaction(database_);
     transaction.run("insert into things (size) values (1)").ignore();
@@ -128,7 +128,7 @@ TEST_F(DatabaseTest, TakesBackWhatIsNotCommitted) {
   EXPECT_EQ(count(), 0);
 }
 
-TEST_F(DatabaseTest, TakesBackATransactionWithAFailure) {
+TEST_F(DatabaseTest, RollsBackAfterFailedStatement) {
   {
     Database::Transaction transaction(database_);
     transaction.run("insert into things (size) values (1)").ignore();
@@ -141,7 +141,7 @@ TEST_F(DatabaseTest, TakesBackATransactionWithAFailure) {
   EXPECT_EQ(count(), 0);
 }
 
-TEST_F(DatabaseTest, DoesNothingInATransactionThatCouldNotBegin) {
+TEST_F(DatabaseTest, SkipsStatementsAfterFailedBegin) {
   device::setFaultHook(failTheBeginning);
   {
     Database::Transaction transaction(database_);
@@ -151,7 +151,7 @@ TEST_F(DatabaseTest, DoesNothingInATransactionThatCouldNotBegin) {
   EXPECT_EQ(count(), 0);
 }
 
-TEST_F(DatabaseTest, TakesBackATransactionWhoseCommitFails) {
+TEST_F(DatabaseTest, RollsBackAfterFailedCommit) {
   device::setFaultHook(failTheCommit);
   {
     Database::Transaction transaction(database_);
@@ -162,7 +162,7 @@ TEST_F(DatabaseTest, TakesBackATransactionWhoseCommitFails) {
   EXPECT_EQ(count(), 0);
 }
 
-TEST_F(DatabaseTest, IsUsedByManyThreads) {
+TEST_F(DatabaseTest, IsThreadSafe) {
   runOnThreads(8, [&](std::size_t index) {
     for (int round = 0; round < 50; ++round) {
       Database::Transaction transaction(database_);
@@ -173,7 +173,7 @@ TEST_F(DatabaseTest, IsUsedByManyThreads) {
   EXPECT_EQ(count(), 400);
 }
 
-TEST_F(DatabaseTest, SurvivesAKilledProcess) {
+TEST_F(DatabaseTest, CommitSurvivesCrash) {
   const pid_t child = fork();
   if (child == 0) {
     {
@@ -191,7 +191,7 @@ TEST_F(DatabaseTest, SurvivesAKilledProcess) {
   EXPECT_EQ(count(), 1);
 }
 
-TEST_F(DatabaseTest, ShowsReadersWhatIsCommitted) {
+TEST_F(DatabaseTest, ReadersSeeCommittedRows) {
   const auto reader = database_.openReadOnly();
   {
     Database::Session session(database_);
@@ -205,7 +205,7 @@ TEST_F(DatabaseTest, ShowsReadersWhatIsCommitted) {
   EXPECT_EQ(device::systemErrorOf(written.error()), EROFS);
 }
 
-TEST(DatabaseErrors, MeanWhatTheSystemWouldSay) {
+TEST(DatabaseErrors, MapToSystemErrors) {
   const auto meaning = [](long code) { return device::systemErrorOf(Error{"SQLite", code, "text", nullptr}); };
   EXPECT_EQ(meaning(SQLITE_FULL), ENOSPC);
   EXPECT_EQ(meaning(SQLITE_READONLY_DBMOVED), EROFS);

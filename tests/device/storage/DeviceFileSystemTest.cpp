@@ -1,6 +1,7 @@
-// What the contract of file systems leaves open.
+// Behaviour of the device that the file-system contract leaves open.
 #include <cerrno>
 #include <filesystem>
+#include <optional>
 #include <string>
 
 #include <gtest/gtest.h>
@@ -8,7 +9,7 @@
 #include <unistd.h>
 
 #include "device/storage/DeviceFileSystem.h"
-#include "device/storage/FaultPoint.h"
+#include "tests/device/InjectedFault.h"
 #include "tests/support/TestDevice.h"
 
 namespace appsync::test {
@@ -19,12 +20,6 @@ using platform::OwnerAttributes;
 namespace {
 
 namespace fs = std::filesystem;
-
-/// Steps until one fails, and the number that it fails with.
-long stepsUntilFailure = 0;
-int failWhenDue(const char*) {
-  return --stepsUntilFailure == 0 ? ENOSPC : 0;
-}
 
 class DeviceFileSystemTest : public testing::Test {
  protected:
@@ -38,13 +33,13 @@ class DeviceFileSystemTest : public testing::Test {
 
 }  // namespace
 
-TEST_F(DeviceFileSystemTest, LaysTheDevicesRootIntoAFolder) {
+TEST_F(DeviceFileSystemTest, MapsDevicePathsToRoot) {
   write("/var/mobile/file", "x");
   EXPECT_EQ(readHostFile(device_.path() + "/root/var/mobile/file"), "x");
   EXPECT_TRUE(files().fileExists("/"));
 }
 
-TEST_F(DeviceFileSystemTest, KeepsOwnersOfFilesAndFolders) {
+TEST_F(DeviceFileSystemTest, StoresOwners) {
   const OwnerAttributes owners{"mobile", "staff"};
   ASSERT_TRUE(files().createDirectory("/var/a/b", IntermediateDirectories::create, owners).ok());
   ASSERT_TRUE(files().createFile("/var/a/b/c", {}, {"mobile", std::nullopt}).ok());
@@ -55,7 +50,7 @@ TEST_F(DeviceFileSystemTest, KeepsOwnersOfFilesAndFolders) {
   EXPECT_EQ(*files().ownersOfItem("/var"), OwnerAttributes());
 }
 
-TEST_F(DeviceFileSystemTest, LeavesNoDraftBehind) {
+TEST_F(DeviceFileSystemTest, LeavesNoIncompleteFiles) {
   ASSERT_TRUE(files().createDirectory("/var/folder/deep/deeper", IntermediateDirectories::create, {}).ok());
   write("/var/folder/deep/file", "x");
   EXPECT_FALSE(files().writeFileAtomically("/var/folder", bytesOf("x")).ok());
@@ -71,14 +66,14 @@ TEST_F(DeviceFileSystemTest, CopiesLinksAsLinks) {
   EXPECT_EQ(fs::read_symlink(device_.host("/var/to/link")), "../secret");
 }
 
-TEST_F(DeviceFileSystemTest, CopiesAndReadsNoPipe) {
+TEST_F(DeviceFileSystemTest, RejectsPipes) {
   ASSERT_EQ(mkfifo(device_.host("/var/pipe").c_str(), 0644), 0);
   EXPECT_EQ(files().copyItem("/var/pipe", "/var/copy").error().code, EINVAL);
   EXPECT_EQ(files().readFile("/var/pipe").error().code, EINVAL);
   EXPECT_FALSE(files().fileExists("/var/copy"));
 }
 
-TEST_F(DeviceFileSystemTest, ReplacesALinkAndNotWhatItLeadsTo) {
+TEST_F(DeviceFileSystemTest, ReplacesLinkItself) {
   write("/var/target", "kept");
   fs::create_symlink("target", device_.host("/var/link"));
   write("/var/link", "new");
@@ -86,8 +81,8 @@ TEST_F(DeviceFileSystemTest, ReplacesALinkAndNotWhatItLeadsTo) {
   EXPECT_FALSE(fs::is_symlink(device_.host("/var/link")));
 }
 
-TEST_F(DeviceFileSystemTest, RemovesFoldersOfAnyDepth) {
-  // Deeper than a process may have folders open.
+TEST_F(DeviceFileSystemTest, RemovesDeepTrees) {
+  // Deeper than the limit of open files.
   fs::path deep = device_.host("/var/deep");
   fs::create_directory(deep);
   const fs::path before = fs::current_path();
@@ -101,23 +96,22 @@ TEST_F(DeviceFileSystemTest, RemovesFoldersOfAnyDepth) {
   EXPECT_TRUE(device_.isTidy());
 }
 
-TEST_F(DeviceFileSystemTest, LeavesEverythingAsItWasWhenAStepFails) {
+TEST_F(DeviceFileSystemTest, FailedOperationsChangeNothing) {
   ASSERT_TRUE(files().createDirectory("/var/from/deep", IntermediateDirectories::create, {}).ok());
   write("/var/from/deep/file", std::string(100'000, 'x'));
-  for (long step = 1;; ++step) {
+  for (long faultPoint = 1;; ++faultPoint) {
     write("/var/file", "old");
-    stepsUntilFailure = step;
-    device::setFaultHook(failWhenDue);
+    std::optional<InjectedFault> fault(faultPoint);
     const Status written = files().writeFileAtomically("/var/file", bytesOf("new"));
     const Status copied = files().copyItem("/var/from", "/var/to");
     const Status moved = files().moveItem("/var/to", "/var/moved");
-    device::setFaultHook(nullptr);
+    fault.reset();
     EXPECT_EQ(readHostFile(device_.host("/var/file")), written ? "new" : "old");
-    EXPECT_EQ(files().fileExists("/var/moved/deep/file"), copied.ok() && moved.ok()) << step;
-    EXPECT_EQ(files().fileExists("/var/to"), copied.ok() && !moved.ok()) << step;
+    EXPECT_EQ(files().fileExists("/var/moved/deep/file"), copied.ok() && moved.ok()) << faultPoint;
+    EXPECT_EQ(files().fileExists("/var/to"), copied.ok() && !moved.ok()) << faultPoint;
     static_cast<void>(files().removeItem("/var/to"));
     static_cast<void>(files().removeItem("/var/moved"));
-    EXPECT_TRUE(device_.isTidy()) << "step " << step;
+    EXPECT_TRUE(device_.isTidy()) << faultPoint;
     if (written && copied && moved) break;
   }
 }

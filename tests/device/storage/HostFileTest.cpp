@@ -7,11 +7,11 @@
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
-#include "device/storage/FaultPoint.h"
 #include "device/storage/FileDescriptor.h"
 #include "device/storage/HostFile.h"
 #include "device/storage/SystemCalls.h"
 #include "kit/fakes/TemporaryFolder.h"
+#include "tests/device/InjectedFault.h"
 #include "tests/support/NamedPipe.h"
 #include "tests/support/TestDevice.h"
 
@@ -34,7 +34,7 @@ Error badFile(int number, const std::string& text) {
   return {std::string(domains::kPOSIX), number, text, nullptr};
 }
 
-TEST(ReplaceHostFile, MakesAndReplacesAFileAndLeavesNothingElse) {
+TEST(ReplaceHostFile, CreatesAndReplacesFiles) {
   const TemporaryFolder folder;
   EXPECT_TRUE(device::replaceHostFile(folder.path("file"), bytesOf("first")));
   EXPECT_EQ(readHostFile(folder.path("file")), "first");
@@ -43,7 +43,7 @@ TEST(ReplaceHostFile, MakesAndReplacesAFileAndLeavesNothingElse) {
   EXPECT_EQ(filesIn(folder.path()), 1);
 }
 
-TEST(ReplaceHostFile, AFailureNamesThePathAndLeavesNothing) {
+TEST(ReplaceHostFile, FailureNamesPathAndLeavesNothing) {
   const TemporaryFolder folder;
   const Status missing = device::replaceHostFile(folder.path("missing/file"), bytesOf("x"));
   ASSERT_FALSE(missing);
@@ -55,7 +55,7 @@ TEST(ReplaceHostFile, AFailureNamesThePathAndLeavesNothing) {
   EXPECT_EQ(filesIn(folder.path()), 1);
 }
 
-TEST(ReplaceHostFile, TheNewFileHasTheModeOfTheOld) {
+TEST(ReplaceHostFile, KeepsModeOfReplacedFile) {
   const TemporaryFolder folder;
   for (const mode_t mode : {0600U, 0444U, 0755U}) {
     writeHostFile(folder.path("file"), "secret");
@@ -66,26 +66,25 @@ TEST(ReplaceHostFile, TheNewFileHasTheModeOfTheOld) {
   }
 }
 
-TEST(ReplaceHostFile, ANameThatIsTakenIsDrawnAgain) {
+TEST(ReplaceHostFile, RetriesIfTemporaryNameExists) {
   static int takenTimes;
   takenTimes = 2;
   const TemporaryFolder folder;
-  device::setFaultHook(
-      [](const char* name) { return std::string_view(name) == "create file" && takenTimes-- > 0 ? EEXIST : 0; });
-  const Status replaced = device::replaceHostFile(folder.path("file"), bytesOf("x"));
-  device::setFaultHook(nullptr);
+  const Status replaced = withFaultHook(
+      [](const char* name) { return std::string_view(name) == "create file" && takenTimes-- > 0 ? EEXIST : 0; },
+      [&] { return device::replaceHostFile(folder.path("file"), bytesOf("x")); });
   EXPECT_TRUE(replaced) << replaced.error().text;
   EXPECT_EQ(readHostFile(folder.path("file")), "x");
 }
 
-TEST(ReplaceHostFile, WhatAKillLeavesIsSweptAndNothingElse) {
+TEST(ReplaceHostFile, RemovesOnlyIncompleteFilesAfterCrash) {
   const TemporaryFolder folder;
-  device::setFaultHook([](const char* name) {
-    const std::string_view step = name;
-    return step == "rename" || step == "remove file" ? EIO : 0;
-  });
-  EXPECT_FALSE(device::replaceHostFile(folder.path("file"), bytesOf("x")));
-  device::setFaultHook(nullptr);
+  EXPECT_FALSE(withFaultHook(
+      [](const char* name) {
+        const std::string_view faultPoint = name;
+        return faultPoint == "rename" || faultPoint == "remove file" ? EIO : 0;
+      },
+      [&] { return device::replaceHostFile(folder.path("file"), bytesOf("x")); }));
   ASSERT_EQ(filesIn(folder.path()), 1);
   for (const char* name : {".draft-0123456789abcdef", "file.draft-0123456789abcdeg", "file.draft-0123456789abcde",
                            "file.0123456789abcdef", "file.draft-0123456789abcdef.plist"}) {
@@ -96,7 +95,7 @@ TEST(ReplaceHostFile, WhatAKillLeavesIsSweptAndNothingElse) {
   EXPECT_EQ(filesIn(folder.path()), 5);
 }
 
-TEST(WriteHostFile, ALinkStaysAndWhatItLeadsToIsReplaced) {
+TEST(WriteHostFile, ReplacesTargetOfLink) {
   const TemporaryFolder folder;
   fs::create_directory(folder.path("there"));
   fs::create_symlink("there/link", folder.path("link"));
@@ -110,7 +109,7 @@ TEST(WriteHostFile, ALinkStaysAndWhatItLeadsToIsReplaced) {
   EXPECT_EQ(filesIn(folder.path("there")), 2);
 }
 
-TEST(WriteHostFile, LinksInACircleAreAnErrorAndStay) {
+TEST(WriteHostFile, RejectsLinkCycles) {
   const TemporaryFolder folder;
   fs::create_symlink("two", folder.path("one"));
   fs::create_symlink("one", folder.path("two"));
@@ -120,7 +119,7 @@ TEST(WriteHostFile, LinksInACircleAreAnErrorAndStay) {
   EXPECT_TRUE(fs::is_symlink(folder.path("one")));
 }
 
-TEST(WriteHostFile, APipeIsWrittenIntoAndStays) {
+TEST(WriteHostFile, WritesToPipe) {
   const TemporaryFolder folder;
   const NamedPipe pipe(folder.path("pipe"));
   EXPECT_TRUE(device::writeHostFile(folder.path("pipe"), bytesOf("all at once")));
@@ -135,7 +134,7 @@ TEST(WriteHostFile, APipeIsWrittenIntoAndStays) {
   EXPECT_EQ(filesIn(folder.path()), 1);
 }
 
-TEST(WriteHostFile, AFillThatFailsChangesNothing) {
+TEST(WriteHostFile, FailedFillChangesNothing) {
   const TemporaryFolder folder;
   const Error reason = badFile(EIO, "it broke");
   const auto fill = [&](int file) -> Status {
@@ -154,7 +153,7 @@ TEST(WriteHostFile, AFillThatFailsChangesNothing) {
   EXPECT_EQ(filesIn(folder.path()), 2);
 }
 
-TEST(ReadHostFile, WhatIsNoFileIsRefusedAndNotWaitedFor) {
+TEST(ReadHostFile, RejectsPipesWithoutWaiting) {
   const TemporaryFolder folder;
   makePipe(folder.path("pipe"));
   EXPECT_EQ(device::readHostFile(folder.path("pipe")).error(),
@@ -163,7 +162,7 @@ TEST(ReadHostFile, WhatIsNoFileIsRefusedAndNotWaitedFor) {
   EXPECT_EQ(device::readHostFile(folder.path()).error(), Error::fromErrno(EISDIR, folder.path() + " cannot be read"));
 }
 
-TEST(ReadHostFile, AFileOfMoreBytesThanAreWantedIsRefused) {
+TEST(ReadHostFile, RejectsFileAboveLimit) {
   const TemporaryFolder folder;
   writeHostFile(folder.path("file"), "");
   fs::resize_file(folder.path("file"), 2'000'000);
@@ -172,7 +171,7 @@ TEST(ReadHostFile, AFileOfMoreBytesThanAreWantedIsRefused) {
             badFile(EFBIG, folder.path("file") + " cannot be read: it has more than 1 MB"));
 }
 
-TEST(ReadHostStream, WhatNeverEndsIsRefused) {
+TEST(ReadHostStream, RejectsEndlessStream) {
   EXPECT_EQ(device::readHostStream("/dev/zero", 3'000'000).error(),
             badFile(EFBIG, "/dev/zero cannot be read: it has more than 3 MB"));
 }

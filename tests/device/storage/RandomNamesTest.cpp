@@ -7,7 +7,7 @@
 namespace appsync::test {
 namespace {
 
-TEST(UUID, IsOfVersionFourAndNewEachTime) {
+TEST(UUID, IsVersionFourAndUnique) {
   const std::string first = device::newUUID();
   const std::string second = device::newUUID();
   const std::regex form("[0-9A-F]{8}-[0-9A-F]{4}-4[0-9A-F]{3}-[89AB][0-9A-F]{3}-[0-9A-F]{12}");

@@ -1,4 +1,4 @@
-// That nothing leads out of a device, however its files are laid and whatever changes meanwhile.
+// Paths never lead outside a device, whatever links it contains and whatever changes concurrently.
 #include <atomic>
 #include <cerrno>
 #include <filesystem>
@@ -39,7 +39,7 @@ class RootDirectoryTest : public testing::TestWithParam<Resolution> {
     EXPECT_TRUE(opened.ok());
     return std::move(opened).value();
   }
-  /// What a path leads to: the file's text, or the error's number.
+  /// Returns the content of the file at a path, or the errno value of the failure.
   [[nodiscard]] std::string at(const std::string& path) const {
     const Result<FileDescriptor> file = root().open(path, O_RDONLY);
     if (!file) return std::to_string(file.error().code);
@@ -62,7 +62,7 @@ INSTANTIATE_TEST_SUITE_P(EachWay, RootDirectoryTest, testing::Values(Resolution:
 
 }  // namespace
 
-TEST_P(RootDirectoryTest, PathsLeadInside) {
+TEST_P(RootDirectoryTest, OpensPathsInside) {
   EXPECT_EQ(at("/var/mobile/file"), "inside");
   EXPECT_EQ(at("//var///mobile/./file"), "inside");
   EXPECT_EQ(at("/var/mobile/../mobile/file"), "inside");
@@ -71,22 +71,22 @@ TEST_P(RootDirectoryTest, PathsLeadInside) {
   EXPECT_EQ(at("/var/mobile/file/below"), number(ENOTDIR));
 }
 
-TEST_P(RootDirectoryTest, PathsDoNotLeadOut) {
+TEST_P(RootDirectoryTest, RejectsPathsLeadingOutside) {
   for (const char* path :
        {"/../secret", "/..", "/var/../../secret", "/var/mobile/../../../secret", "/../root/var/mobile/file"}) {
     EXPECT_EQ(at(path), number(EXDEV)) << path;
   }
   const auto opened = root().open("/../secret", O_RDONLY);
-  EXPECT_EQ(opened.error().text, "/../secret: leads out of the device");
+  EXPECT_EQ(opened.error().text, "/../secret: leads outside the device");
 }
 
-TEST_P(RootDirectoryTest, PathsThatAreNoneFail) {
+TEST_P(RootDirectoryTest, RejectsInvalidPaths) {
   EXPECT_EQ(at(""), number(ENOENT));
   EXPECT_EQ(at("var/mobile/file"), number(EINVAL));
   EXPECT_EQ(at(std::string("/var\0/x", 7)), number(EINVAL));
 }
 
-TEST_P(RootDirectoryTest, LinksLeadInside) {
+TEST_P(RootDirectoryTest, FollowsLinksInside) {
   link("var/file", "mobile/file");
   link("var/folder", "mobile");
   link("var/mobile/up", "../mobile/file");
@@ -98,7 +98,7 @@ TEST_P(RootDirectoryTest, LinksLeadInside) {
   EXPECT_EQ(at("/var/folder/../mobile/file"), "inside");
 }
 
-TEST_P(RootDirectoryTest, LinksDoNotLeadOut) {
+TEST_P(RootDirectoryTest, RejectsLinksLeadingOutside) {
   link("relative", "../secret");
   link("absolute", folder_.path("secret"));
   link("home", "/var/mobile/file");
@@ -111,7 +111,7 @@ TEST_P(RootDirectoryTest, LinksDoNotLeadOut) {
   }
 }
 
-TEST_P(RootDirectoryTest, LinksInACircleFail) {
+TEST_P(RootDirectoryTest, RejectsLinkCycles) {
   link("a", "b");
   link("b", "a");
   link("c", "c/x");
@@ -120,12 +120,12 @@ TEST_P(RootDirectoryTest, LinksInACircleFail) {
   EXPECT_EQ(at("/a/file"), number(ELOOP));
 }
 
-TEST_P(RootDirectoryTest, DanglingLinksLeadNowhere) {
+TEST_P(RootDirectoryTest, DanglingLinksFail) {
   link("dangling", "missing/file");
   EXPECT_EQ(at("/dangling"), number(ENOENT));
 }
 
-TEST_P(RootDirectoryTest, PlacesAreNamesInFolders) {
+TEST_P(RootDirectoryTest, PlaceIsNameInDirectory) {
   const auto place = root().place("/var/mobile/new/");
   ASSERT_TRUE(place.ok());
   EXPECT_EQ(place->name, "new");
@@ -139,13 +139,13 @@ TEST_P(RootDirectoryTest, PlacesAreNamesInFolders) {
   EXPECT_EQ(root().place("/missing/new").error().code, ENOENT);
 }
 
-TEST_P(RootDirectoryTest, APlaceMayBeALinkWhoseTargetDoesNotMatter) {
+TEST_P(RootDirectoryTest, PlaceMayBeDanglingLink) {
   link("out", "../secret");
   EXPECT_EQ(root().place("/out")->name, "out");
 }
 
-TEST_P(RootDirectoryTest, WhatChangesOnTheWayDoesNotLeadOut) {
-  // One thread keeps exchanging a folder for a link that leads out; the other must never come out where that leads.
+TEST_P(RootDirectoryTest, ConcurrentRenamesNeverLeadOutside) {
+  // One thread keeps exchanging a directory for a link that leads outside; the other must never open its target.
   fs::create_directory(host("swap"));
   writeHostFile(host("swap/file"), "inside");
   link("way", folder_.path("elsewhere"));
