@@ -12,7 +12,7 @@ using device::BackupManager;
 
 class BackupManagerTest : public testing::Test {
  protected:
-  /// A folder of this machine with so many bytes in a file.
+  /// Creates a host directory with a file of `bytes` bytes.
   [[nodiscard]] std::string data(std::size_t bytes) {
     const std::string folder = folder_.path("data" + std::to_string(bytes));
     std::filesystem::create_directories(folder + "/Documents");
@@ -32,12 +32,12 @@ class BackupManagerTest : public testing::Test {
   std::uint64_t size = 7;
 };
 
-TEST_F(BackupManagerTest, AnAppWithoutDataHasNoneAndLeavesTheSizeAlone) {
+TEST_F(BackupManagerTest, MissingDataLeavesSizeUnchanged) {
   EXPECT_FALSE(manager.restoreDataExists("com.a", &size));
   EXPECT_EQ(size, 7U);
 }
 
-TEST_F(BackupManagerTest, KeptDataExistsWithItsSize) {
+TEST_F(BackupManagerTest, ReportsSizeOfKeptData) {
   EXPECT_TRUE(manager.keepRestoreData("com.a", data(123)));
   EXPECT_TRUE(manager.restoreDataExists("com.a", &size));
   EXPECT_EQ(size, 123U);
@@ -45,12 +45,7 @@ TEST_F(BackupManagerTest, KeptDataExistsWithItsSize) {
   EXPECT_FALSE(manager.restoreDataExists("com.b", &size));
 }
 
-TEST_F(BackupManagerTest, TheSizeNeedNotBeAskedFor) {
-  EXPECT_TRUE(manager.keepRestoreData("com.a", data(1)));
-  EXPECT_TRUE(manager.restoreDataExists("com.a", nullptr));
-}
-
-TEST_F(BackupManagerTest, KeepingAgainReplacesWhatWasKept) {
+TEST_F(BackupManagerTest, ReplacesKeptData) {
   EXPECT_TRUE(manager.keepRestoreData("com.a", data(5)));
   EXPECT_TRUE(manager.keepRestoreData("com.a", data(6)));
   EXPECT_TRUE(manager.restoreDataExists("com.a", &size));
@@ -58,7 +53,7 @@ TEST_F(BackupManagerTest, KeepingAgainReplacesWhatWasKept) {
   EXPECT_EQ(readHostFile(keptFile("com.a")), std::string(6, 'n'));
 }
 
-TEST_F(BackupManagerTest, AllConnectionsSeeTheSameAndItOutlivesTheProcess) {
+TEST_F(BackupManagerTest, KeptDataSurvivesRestart) {
   EXPECT_TRUE(manager.keepRestoreData("com.a", data(5)));
   EXPECT_TRUE(device_.services().makeBackupManager()->restoreDataExists("com.a", nullptr));
   device_.reopen();
@@ -67,7 +62,7 @@ TEST_F(BackupManagerTest, AllConnectionsSeeTheSameAndItOutlivesTheProcess) {
   EXPECT_EQ(readHostFile(keptFile("com.a")), std::string(5, 'n'));
 }
 
-TEST_F(BackupManagerTest, CancellingDropsThatAppsData) {
+TEST_F(BackupManagerTest, CancellationDeletesDataOfApp) {
   EXPECT_TRUE(manager.keepRestoreData("com.a", data(5)));
   EXPECT_TRUE(manager.keepRestoreData("com.b", data(6)));
   std::optional<Error> error;
@@ -79,7 +74,7 @@ TEST_F(BackupManagerTest, CancellingDropsThatAppsData) {
   EXPECT_TRUE(device_.isTidy());
 }
 
-TEST_F(BackupManagerTest, NoIdentifierLeadsOutOfTheFolder) {
+TEST_F(BackupManagerTest, RejectsInvalidIdentifiers) {
   for (const char* identifier : {"..", "../x", "a/b", ""}) {
     EXPECT_FALSE(manager.keepRestoreData(identifier, data(5))) << identifier;
     EXPECT_TRUE(manager.cancelApplicationRestore(identifier, nullptr)) << identifier;
@@ -87,7 +82,7 @@ TEST_F(BackupManagerTest, NoIdentifierLeadsOutOfTheFolder) {
   EXPECT_TRUE(std::filesystem::exists(device_.host("/var/mobile/Library")));
 }
 
-TEST_F(BackupManagerTest, WhatIsNoFolderIsNotKept) {
+TEST_F(BackupManagerTest, RejectsFilesAndMissingDirectories) {
   EXPECT_FALSE(manager.keepRestoreData("com.a", folder_.path("missing")));
   writeHostFile(folder_.path("file"), "x");
   EXPECT_FALSE(manager.keepRestoreData("com.a", folder_.path("file")));
@@ -95,7 +90,7 @@ TEST_F(BackupManagerTest, WhatIsNoFolderIsNotKept) {
   EXPECT_TRUE(device_.isTidy());
 }
 
-TEST_F(BackupManagerTest, AnInstalledAppHasItsDataBackInPlaceOfWhatItHad) {
+TEST_F(BackupManagerTest, InstallReplacesDataByKeptData) {
   device_.install("com.a");
   std::filesystem::create_directories(device_.host(device::dataContainerOf("com.a")));
   writeHostFile(device_.host(device::dataContainerOf("com.a")) + "/old", "old");
@@ -107,14 +102,14 @@ TEST_F(BackupManagerTest, AnInstalledAppHasItsDataBackInPlaceOfWhatItHad) {
   EXPECT_EQ(TestDevice::entriesIn(device_.host(device::kRestoreDataPath)), 0);
 }
 
-TEST_F(BackupManagerTest, APlaceholderDoesNotTakeTheData) {
+TEST_F(BackupManagerTest, PlaceholderLeavesDataKept) {
   EXPECT_TRUE(manager.keepRestoreData("com.a", data(9)));
   device_.placeholder("com.a", platform::TSInstallType::Restore);
   EXPECT_TRUE(manager.restoreDataExists("com.a", nullptr));
   EXPECT_FALSE(std::filesystem::exists(dataFile("com.a")));
 }
 
-TEST_F(BackupManagerTest, ADemotedAppCanHaveItsDataAtOnce) {
+TEST_F(BackupManagerTest, RestoresDataOfDemotedAppNow) {
   EXPECT_TRUE(manager.keepRestoreData("com.a", data(9)));
   EXPECT_TRUE(manager.restoreDataNow("com.a"));
   EXPECT_EQ(readHostFile(dataFile("com.a")), std::string(9, 'n'));
@@ -123,7 +118,7 @@ TEST_F(BackupManagerTest, ADemotedAppCanHaveItsDataAtOnce) {
   EXPECT_EQ(readHostFile(dataFile("com.a")), std::string(9, 'n'));
 }
 
-TEST_F(BackupManagerTest, AnUpdateKeepsTheDataAndARemovalTakesAllOfIt) {
+TEST_F(BackupManagerTest, UpdateKeepsAndRemovalDeletesData) {
   device_.install("com.a");
   std::filesystem::create_directories(device_.host(device::dataContainerOf("com.a")));
   device_.install("com.a", "2.0");
@@ -135,14 +130,14 @@ TEST_F(BackupManagerTest, AnUpdateKeepsTheDataAndARemovalTakesAllOfIt) {
   EXPECT_FALSE(manager.restoreDataExists("com.a", nullptr));
 }
 
-TEST_F(BackupManagerTest, RemovingAPlaceholderOnlyLeavesTheData) {
+TEST_F(BackupManagerTest, PlaceholderRemovalKeepsData) {
   EXPECT_TRUE(manager.keepRestoreData("com.a", data(9)));
   device_.placeholder("com.a", platform::TSInstallType::Restore);
   EXPECT_TRUE(device_.registry().uninstallApplication("com.a", {{platform::kUninstallPlaceholdersOnlyKey, true}}));
   EXPECT_TRUE(manager.restoreDataExists("com.a", nullptr));
 }
 
-TEST_F(BackupManagerTest, RemovalUnderAPlaceholderKeepsTheData) {
+TEST_F(BackupManagerTest, RemovalOfPlaceholderOverAppKeepsData) {
   device_.install("com.a");
   const std::string container = device_.host(device::dataContainerOf("com.a"));
   std::filesystem::create_directories(container);
@@ -153,11 +148,7 @@ TEST_F(BackupManagerTest, RemovalUnderAPlaceholderKeepsTheData) {
   EXPECT_TRUE(manager.restoreDataExists("com.a", nullptr));
 }
 
-TEST_F(BackupManagerTest, CancellingWithoutDataIsASuccess) {
-  EXPECT_TRUE(manager.cancelApplicationRestore("com.a", nullptr));
-}
-
-TEST_F(BackupManagerTest, AFailedCancellationSaysWhy) {
+TEST_F(BackupManagerTest, FailedCancellationReportsError) {
   {
     device::Database::Session session(device_.services().database());
     EXPECT_TRUE(session.runScript("drop table restore_data"));

@@ -16,7 +16,7 @@ using device::SoftwareLibrary;
 
 class SoftwareLibraryTest : public testing::Test {
  protected:
-  /// The errors of all completions of one refresh.
+  /// Returns the errors of all completions of a refresh.
   std::vector<std::optional<Error>> refresh() {
     std::vector<std::optional<Error>> completions;
     library.refreshReceipts([&](const std::optional<Error>& error) { completions.push_back(error); });
@@ -36,7 +36,7 @@ class SoftwareLibraryTest : public testing::Test {
   SoftwareLibrary library{database, registry};
 };
 
-TEST_F(SoftwareLibraryTest, KeepsAReceiptForEveryInstalledUserApp) {
+TEST_F(SoftwareLibraryTest, StoresReceiptOfEachInstalledUserApp) {
   registry.add(FakeApp::installed("com.b").withVersion("2.1"));
   registry.add(FakeApp::installed("com.a").withVersion(std::nullopt));
   registry.add(FakeApp::updating("com.c").withVersion("3"));
@@ -47,7 +47,7 @@ TEST_F(SoftwareLibraryTest, KeepsAReceiptForEveryInstalledUserApp) {
   EXPECT_EQ(receipts(), (std::vector<Receipt>{{"com.a", std::nullopt}, {"com.b", "2.1"}, {"com.c", "3"}}));
 }
 
-TEST_F(SoftwareLibraryTest, ARefreshReplacesTheReceiptsOfTheLastOne) {
+TEST_F(SoftwareLibraryTest, RefreshReplacesReceipts) {
   registry.add(FakeApp::installed("com.a"));
   refresh();
   EXPECT_TRUE(registry.uninstallApplication("com.a"));
@@ -56,14 +56,14 @@ TEST_F(SoftwareLibraryTest, ARefreshReplacesTheReceiptsOfTheLastOne) {
   EXPECT_EQ(receipts(), (std::vector<Receipt>{{"com.b", "1"}}));
 }
 
-TEST_F(SoftwareLibraryTest, ReceiptsOutliveTheProcess) {
+TEST_F(SoftwareLibraryTest, ReceiptsSurviveRestart) {
   registry.add(FakeApp::installed("com.a").withVersion("1"));
   refresh();
   database.reopen();
   EXPECT_EQ(*SoftwareLibrary(database, registry).receipts(), (std::vector<Receipt>{{"com.a", "1"}}));
 }
 
-TEST_F(SoftwareLibraryTest, AFailedRefreshCompletesOnceWithTheErrorAndKeepsTheReceipts) {
+TEST_F(SoftwareLibraryTest, FailedRefreshReportsErrorAndKeepsReceipts) {
   registry.add(FakeApp::installed("com.a").withVersion("1"));
   refresh();
   const auto reader = database.openReadOnly();
@@ -74,12 +74,6 @@ TEST_F(SoftwareLibraryTest, AFailedRefreshCompletesOnceWithTheErrorAndKeepsTheRe
   ASSERT_TRUE(completions.front());
   EXPECT_EQ(completions.front()->domain, device::kSQLiteDomain);
   EXPECT_EQ(receipts(), (std::vector<Receipt>{{"com.a", "1"}}));
-}
-
-TEST_F(SoftwareLibraryTest, MayBeDestroyedByItsCompletion) {
-  auto other = std::make_unique<SoftwareLibrary>(database, registry);
-  other->refreshReceipts([&](const std::optional<Error>&) { other.reset(); });
-  EXPECT_EQ(other, nullptr);
 }
 
 }  // namespace

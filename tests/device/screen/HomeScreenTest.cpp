@@ -56,11 +56,11 @@ class HomeScreenTest : public testing::Test {
   const HomeScreen::Port port = homeScreen.blockableServerPort();
 };
 
-TEST_F(HomeScreenTest, AnEmptyDeviceHasAnEmptyOrder) {
+TEST_F(HomeScreenTest, OrderOfEmptyDeviceIsEmpty) {
   EXPECT_EQ(order(), Identifiers{});
 }
 
-TEST_F(HomeScreenTest, WithoutALayoutAppsStandInTheRegistrysOrder) {
+TEST_F(HomeScreenTest, UsesRegistryOrderWithoutLayout) {
   registry.add(FakeApp::installed("com.a"));
   registry.add(FakeApp::placeholder("com.b"));
   registry.add(FakeApp::installed("com.c").ofType(platform::kApplicationTypeSystem));
@@ -68,43 +68,43 @@ TEST_F(HomeScreenTest, WithoutALayoutAppsStandInTheRegistrysOrder) {
   EXPECT_EQ(order(), (Identifiers{"com.a", "com.b", "com.c"}));
 }
 
-TEST_F(HomeScreenTest, LaidOutIconsComeFirstWhetherTheirAppsExistOrNot) {
+TEST_F(HomeScreenTest, LayoutComesFirstEvenForMissingApps) {
   for (const char* identifier : {"com.a", "com.b", "com.c"})
     registry.add(FakeApp::installed(identifier));
   setLayout("(com.c, com.new, com.a)");
   EXPECT_EQ(order(), (Identifiers{"com.c", "com.new", "com.a", "com.b"}));
 }
 
-TEST_F(HomeScreenTest, PagesAndFoldersAreFlattenedInTheirPlace) {
+TEST_F(HomeScreenTest, FlattensPagesAndFolders) {
   setLayout(R"(((com.a, com.b), (com.c, {displayName = Games; iconLists = ((com.d), (com.e, com.f));}, com.g)))");
   EXPECT_EQ(order(), (Identifiers{"com.a", "com.b", "com.c", "com.d", "com.e", "com.f", "com.g"}));
 }
 
-TEST_F(HomeScreenTest, ADictionaryHoldsItsPagesUnderIconLists) {
+TEST_F(HomeScreenTest, AcceptsDictionaryWithIconLists) {
   setLayout("{iconLists = ((com.b), (com.a)); other = (com.x);}");
   EXPECT_EQ(order(), (Identifiers{"com.b", "com.a"}));
 }
 
-TEST_F(HomeScreenTest, EveryFormOfPropertyListIsAccepted) {
+TEST_F(HomeScreenTest, AcceptsEveryPropertyListFormat) {
   setLayout("<?xml version=\"1.0\"?><plist version=\"1.0\"><array><string>com.x</string></array></plist>");
   EXPECT_EQ(order(), Identifiers{"com.x"});
   layOut(plist::Array{"com.y"});
   EXPECT_EQ(order(), Identifiers{"com.y"});
 }
 
-TEST_F(HomeScreenTest, ARepeatedIdentifierKeepsItsFirstPlace) {
+TEST_F(HomeScreenTest, IgnoresRepeatedIdentifiers) {
   setLayout("(com.a, com.b, (com.a), com.c, com.b)");
   EXPECT_EQ(order(), (Identifiers{"com.a", "com.b", "com.c"}));
 }
 
-TEST_F(HomeScreenTest, WhatIsNoBundleIdentifierIsPassedOver) {
+TEST_F(HomeScreenTest, IgnoresInvalidIdentifiers) {
   layOut(plist::Array{"com.a", "", "../evil", "com/b", "a b", ".hidden", std::string(201, 'x'), "\xc3\xa9", 5, true,
                       plist::Value::data(bytesOf("com.c")), plist::Dictionary{{"iconLists", "com.d"}},
                       plist::Dictionary{{"name", "com.e"}}, plist::Array{}, "com.b_-2"});
   EXPECT_EQ(order(), (Identifiers{"com.a", "com.b_-2"}));
 }
 
-TEST_F(HomeScreenTest, ALayoutThatCannotBeUsedChangesNothing) {
+TEST_F(HomeScreenTest, UnusableLayoutChangesNothing) {
   setLayout("(com.a)");
   for (const std::string_view useless :
        {"", "garbage \x01", "com.b", "()", "((), ({iconLists = ();}))", "{other = (com.b);}", "bplist00", "(com.b"}) {
@@ -113,7 +113,7 @@ TEST_F(HomeScreenTest, ALayoutThatCannotBeUsedChangesNothing) {
   }
 }
 
-TEST_F(HomeScreenTest, ALayoutOfTheGreatestDepthIsRead) {
+TEST_F(HomeScreenTest, AcceptsDeepestLayout) {
   plist::Value layout = plist::Array{"com.deep"};
   for (int depth = 2; depth < plist::kMaximumDepth; ++depth)
     layout = plist::Array{layout};
@@ -121,13 +121,13 @@ TEST_F(HomeScreenTest, ALayoutOfTheGreatestDepthIsRead) {
   EXPECT_EQ(order(), Identifiers{"com.deep"});
 }
 
-TEST_F(HomeScreenTest, ALaterLayoutReplacesTheEarlierOne) {
+TEST_F(HomeScreenTest, ReplacesLayout) {
   setLayout("(com.a, com.b, com.c)");
   setLayout("(com.b)");
   EXPECT_EQ(order(), Identifiers{"com.b"});
 }
 
-TEST_F(HomeScreenTest, TheLayoutOutlivesTheProcessAndIsReadBesideIt) {
+TEST_F(HomeScreenTest, LayoutSurvivesRestartAndIsReadable) {
   setLayout("(com.b, com.a)");
   const auto reader = database.openReadOnly();
   Settings readersSettings(*reader);
@@ -139,19 +139,19 @@ TEST_F(HomeScreenTest, TheLayoutOutlivesTheProcessAndIsReadBesideIt) {
   EXPECT_EQ(orderOf(reopened), (Identifiers{"com.b", "com.a"}));
 }
 
-TEST_F(HomeScreenTest, OtherFormatsHaveNoAnswer) {
+TEST_F(HomeScreenTest, ReturnsNulloptForOtherFormats) {
   EXPECT_EQ(homeScreen.getFlattenedIconState(port, 0), std::nullopt);
   EXPECT_EQ(homeScreen.getFlattenedIconState(port, 2), std::nullopt);
 }
 
-TEST_F(HomeScreenTest, ADatabaseThatCannotBeReadHasNoAnswer) {
+TEST_F(HomeScreenTest, ReturnsNulloptIfDatabaseIsUnreadable) {
   database.drop("icon_layout");
   EXPECT_EQ(homeScreen.getFlattenedIconState(port, 1), std::nullopt);
   EXPECT_FALSE(homeScreen.iconOrder());
   setLayout("(com.a)");
 }
 
-TEST_F(HomeScreenTest, TenThousandIconsAndAsManyAppsKeepTheirOrder) {
+TEST_F(HomeScreenTest, OrdersTenThousandIconsAndApps) {
   plist::Array layout;
   Identifiers expected;
   for (int number = 0; number < 10'000; ++number)
@@ -166,19 +166,14 @@ TEST_F(HomeScreenTest, TenThousandIconsAndAsManyAppsKeepTheirOrder) {
   EXPECT_EQ(order(), expected);
 }
 
-TEST_F(HomeScreenTest, AnAppThatExistsIsHeld) {
+TEST_F(HomeScreenTest, GrantsAssertionForAppAndPlaceholder) {
   registry.add(FakeApp::installed("com.a"));
   registry.add(FakeApp::placeholder("com.b"));
   EXPECT_EQ(ask("com.a", true), TerminationAssertionOutcome::granted);
   EXPECT_EQ(ask("com.b", true), TerminationAssertionOutcome::granted);
 }
 
-TEST_F(HomeScreenTest, AnUnknownAppIsNotFound) {
-  setLayout("(com.a)");
-  EXPECT_EQ(ask("com.a", false), TerminationAssertionOutcome::notFound);
-}
-
-TEST_F(HomeScreenTest, TheSettingsAnswerForAnApp) {
+TEST_F(HomeScreenTest, SettingOverridesAnswer) {
   registry.add(FakeApp::installed("com.a"));
   registry.add(FakeApp::installed("com.b"));
   const auto answer = [&](AssertionAnswer given) { EXPECT_TRUE(settings.setAssertionAnswer("com.a", given)); };
@@ -195,12 +190,12 @@ TEST_F(HomeScreenTest, TheSettingsAnswerForAnApp) {
   EXPECT_EQ(ask("com.a", true), TerminationAssertionOutcome::granted);
 }
 
-TEST_F(HomeScreenTest, AnUnknownAppIsHeldWhenTheSettingsSaySo) {
+TEST_F(HomeScreenTest, SettingGrantsAssertionForUnknownApp) {
   EXPECT_TRUE(settings.setAssertionAnswer("com.x", AssertionAnswer::granted));
   EXPECT_EQ(ask("com.x", true), TerminationAssertionOutcome::granted);
 }
 
-TEST_F(HomeScreenTest, OneAppMayBeHeldTwice) {
+TEST_F(HomeScreenTest, GrantsSeveralAssertionsForApp) {
   registry.add(FakeApp::installed("com.a"));
   auto outcome = TerminationAssertionOutcome::denied;
   const auto first = homeScreen.terminationAssertionCreate("com.a", 0, outcome);

@@ -39,7 +39,7 @@ class IconRendererTest : public testing::Test {
   std::unique_ptr<platform::Image> image;
 };
 
-TEST_F(IconRendererTest, AnIconHasTheSizeOfTheHomeScreensAndRoundedCorners) {
+TEST_F(IconRendererTest, IconHasHomeScreenSizeAndRoundedCorners) {
   putIcon(makePNG(kSize, kSize, kRed));
   cairo_surface_t* icon = renderedSurface();
   ASSERT_NE(icon, nullptr);
@@ -56,7 +56,7 @@ TEST_F(IconRendererTest, AnIconHasTheSizeOfTheHomeScreensAndRoundedCorners) {
 
 class IconRendererSizes : public IconRendererTest, public testing::WithParamInterface<int> {};
 
-TEST_P(IconRendererSizes, PicturesAreScaledToFill) {
+TEST_P(IconRendererSizes, ScalesImageToFill) {
   putIcon(pngOf(makePicture(GetParam(), GetParam(), kRed, kBlue).get()));
   cairo_surface_t* icon = renderedSurface();
   ASSERT_NE(icon, nullptr);
@@ -68,7 +68,7 @@ TEST_P(IconRendererSizes, PicturesAreScaledToFill) {
 
 INSTANTIATE_TEST_SUITE_P(IconRenderer, IconRendererSizes, testing::Values(8, 60, 120, 180, 512, 1024, 2048));
 
-TEST_F(IconRendererTest, WhatStandsOverOnTheLongerSideIsCutOff) {
+TEST_F(IconRendererTest, CropsLongerSide) {
   const auto wide = makePicture(400, 100, kRed, kRed);
   const device::Context context(cairo_create(wide.get()));
   cairo_set_source_rgb(context.get(), 0, 0, 1);
@@ -82,7 +82,7 @@ TEST_F(IconRendererTest, WhatStandsOverOnTheLongerSideIsCutOff) {
   EXPECT_EQ(pixelAt(icon, kSize - 4, kSize / 2), kBlue);
 }
 
-TEST_F(IconRendererTest, ABundleWithoutAUsableIconHasNone) {
+TEST_F(IconRendererTest, ReturnsNullWithoutUsableIcon) {
   const Bytes png = makePNG(8, 8, kRed);
   files.put("/A.app/Icon.png", png);
   files.put("/Icon.png", png);
@@ -99,13 +99,13 @@ TEST_F(IconRendererTest, ABundleWithoutAUsableIconHasNone) {
   }
 }
 
-TEST_F(IconRendererTest, AnIconMayStandInAFolderOfTheBundle) {
+TEST_F(IconRendererTest, ReadsIconFromSubdirectory) {
   putInfo("{BundleIconFile = \"Resources/Icon.png\";}");
   files.put("/A.app/Resources/Icon.png", makePNG(8, 8, kRed));
   EXPECT_NE(render(), nullptr);
 }
 
-TEST_F(IconRendererTest, AHugeFileIsNotRead) {
+TEST_F(IconRendererTest, DoesNotReadHugeFile) {
   Bytes png = makePNG(8, 8, kRed);
   png.resize(IconRenderer::kMaximumFileSize + 1);
   putIcon(png);
@@ -121,7 +121,7 @@ class PNGEncodersTest : public IconRendererTest {
   Bytes destination;
 };
 
-TEST_F(PNGEncodersTest, AnEncodedIconDecodesToTheSamePicture) {
+TEST_F(PNGEncodersTest, EncodedIconDecodesToSameImage) {
   putIcon(pngOf(makePicture(64, 64, kGreen, kBlue).get()));
   cairo_surface_t* icon = renderedSurface();
   const auto encoder = encoders.createEncoder(destination, 1);
@@ -133,7 +133,7 @@ TEST_F(PNGEncodersTest, AnEncodedIconDecodesToTheSamePicture) {
   ASSERT_NE(decoded, nullptr);
   for (int y = 0; y < kSize; ++y) {
     for (int x = 0; x < kSize; ++x) {
-      // Where the picture is half transparent its colours are kept as those of an opaque one, which rounds them.
+      // Half-transparent pixels are rounded, because PNG files do not premultiply colours.
       const Pixel expected = pixelAt(icon, x, y);
       const Pixel found = pixelAt(decoded.get(), x, y);
       for (unsigned shift = 0; shift < 32; shift += 8) {
@@ -144,17 +144,7 @@ TEST_F(PNGEncodersTest, AnEncodedIconDecodesToTheSamePicture) {
   }
 }
 
-TEST_F(PNGEncodersTest, TheImageIsNeededOnlyWhileItIsAdded) {
-  putIcon(makePNG(8, 8, kRed));
-  image = render();
-  const auto encoder = encoders.createEncoder(destination, 1);
-  encoder->addImage(*image);
-  image.reset();
-  EXPECT_TRUE(encoder->finalize());
-  EXPECT_NE(device::decodePNG(destination), nullptr);
-}
-
-TEST_F(PNGEncodersTest, TheDestinationsEarlierContentIsReplaced) {
+TEST_F(PNGEncodersTest, ReplacesContentOfDestination) {
   putIcon(makePNG(8, 8, kRed));
   image = render();
   destination.resize(100);
@@ -164,12 +154,12 @@ TEST_F(PNGEncodersTest, TheDestinationsEarlierContentIsReplaced) {
   EXPECT_NE(device::decodePNG(destination), nullptr);
 }
 
-TEST_F(PNGEncodersTest, APNGHoldsOneImage) {
+TEST_F(PNGEncodersTest, AcceptsOneImageOnly) {
   EXPECT_EQ(encoders.createEncoder(destination, 0), nullptr);
   EXPECT_EQ(encoders.createEncoder(destination, 2), nullptr);
 }
 
-TEST_F(PNGEncodersTest, TooFewOrTooManyImagesOrAForeignOneCannotBeFinished) {
+TEST_F(PNGEncodersTest, RejectsWrongNumberOfImagesAndForeignImages) {
   putIcon(makePNG(8, 8, kRed));
   image = render();
   EXPECT_FALSE(encoders.createEncoder(destination, 1)->finalize());
