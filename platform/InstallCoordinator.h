@@ -77,7 +77,8 @@ class InstallCoordinator {
   [[nodiscard]] virtual Status setUserDataPromise(std::shared_ptr<PromisedOutOfBandTransfer> promise) = 0;
 
   /// The placeholder, which belongs to the coordinator once set and is shown when its configuration is complete.
-  /// Setting null fails.
+  /// Setting null fails. `setPlaceholderPromise` sends no report on the calling thread, because
+  /// clients hold the queue on which they process reports.
   [[nodiscard]] virtual bool hasPlaceholderPromise() const = 0;
   [[nodiscard]] virtual Status setPlaceholderPromise(std::shared_ptr<Placeholder> placeholder) = 0;
 

@@ -1,4 +1,11 @@
 // CoordinatedInstallContract: placeholders.
+#include <atomic>
+#include <memory>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include "kit/contracts/CoordinationListener.h"
 #include "kit/contracts/InstallCoordinationContract.h"
 
 namespace appsync::test {
@@ -133,6 +140,34 @@ TEST_P(CoordinatedInstallContract, ShowsAConfiguredPlaceholder) {
   const auto record = subject().registry().recordForIdentifier("com.a", PlaceholderLookup::on);
   ASSERT_NE(record, nullptr);
   EXPECT_EQ(record->installType(), TSInstallType::IntentionalDowngrade);
+}
+
+/// Clients hold a queue during the call, and process reports on that queue: a report within the call would deadlock.
+TEST_P(CoordinatedInstallContract, ReportsNoPlaceholderOnCallingThread) {
+  const auto caller = std::this_thread::get_id();
+  std::atomic<int> reportsOnCaller = 0;
+  const auto noteThread = [&](platform::InstallCoordinator&) {
+    if (std::this_thread::get_id() == caller) ++reportsOnCaller;
+  };
+  CoordinationListener connected(noteThread);
+  const auto connection = service().initWithMachServiceName("com.corvel.contract.observer", {kSync}, connected);
+  const auto attached = std::make_shared<CoordinationListener>(noteThread);
+  for (const Kind kind : {Kind::restoring, Kind::initiating}) {
+    const std::string identifier = kind == Kind::restoring ? "com.a" : "com.b";
+    const Coordinator made = coordinator(identifier, kind);
+    made->setObserver(attached);
+    EXPECT_TRUE(made->setPlaceholderPromise(makeConfiguredPlaceholder(identifier)));
+  }
+  const Coordinator later = coordinator("com.c");
+  later->setObserver(attached);
+  const AppPlaceholder unconfigured = makePlaceholder("com.c");
+  EXPECT_TRUE(later->setPlaceholderPromise(unconfigured));
+  EXPECT_TRUE(unconfigured->setConfigurationComplete());
+  subject().waitUntilIdle();
+  const std::vector<std::string> reports{"placeholder com.a", "placeholder com.b", "placeholder com.c"};
+  EXPECT_EQ(connected.events(), reports);
+  EXPECT_EQ(attached->events(), reports);
+  EXPECT_EQ(reportsOnCaller, 0);
 }
 
 TEST_P(CoordinatedInstallContract, DoesNotShowAnUnconfiguredPlaceholder) {
