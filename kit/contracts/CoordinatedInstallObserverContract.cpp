@@ -8,6 +8,7 @@
 #include "kit/contracts/CoordinationListener.h"
 #include "kit/contracts/EventCounter.h"
 #include "kit/contracts/InstallCoordinationContract.h"
+#include "kit/fakes/Patience.h"
 
 namespace appsync::test {
 
@@ -57,7 +58,7 @@ TEST_P(CoordinatedInstallContract, ReportsFailedInstallAsCompleteWithError) {
 TEST_P(CoordinatedInstallContract, NoOperationWaitsForACallback) {
   std::promise<void> done;
   const std::shared_future<void> end = done.get_future().share();
-  CoordinationListener listener([&end](InstallCoordinator&) { end.wait(); });
+  CoordinationListener listener([&end](InstallCoordinator&) { awaitReady(end, "an operation waits for a callback"); });
   const Connection connection = connect(service(), listener);
   const Asset asset = prepare(*coordinator("com.a"));
   done.set_value();

@@ -1,10 +1,11 @@
 // A counter of events on other threads.
 #pragma once
 
-#include <chrono>
 #include <condition_variable>
 #include <cstddef>
 #include <mutex>
+
+#include "kit/fakes/Patience.h"
 
 namespace appsync::test {
 
@@ -29,9 +30,6 @@ class EventCounter {
   }
 
  private:
-  /// Only a failing test waits this long.
-  static constexpr std::chrono::seconds kTimeout{20};
-
   std::mutex mutex_;
   std::condition_variable changed_;
   std::size_t count_ = 0;

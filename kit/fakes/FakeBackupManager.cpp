@@ -1,17 +1,9 @@
 #include "kit/fakes/FakeBackupManager.h"
 
-#include <chrono>
-
 #include "kit/fakes/CallJournal.h"
+#include "kit/fakes/Patience.h"
 
 namespace appsync::test {
-
-namespace {
-
-/// Only a failing test waits this long.
-constexpr std::chrono::seconds kTimeout(20);
-
-}  // namespace
 
 class FakeBackups::Connection final : public platform::BackupManager {
  public:

@@ -2,6 +2,8 @@
 
 #include <utility>
 
+#include "kit/fakes/Patience.h"
+
 namespace appsync::test {
 
 FakeCallbackThread::Subscription FakeCallbackThread::subscribe() {
@@ -14,7 +16,8 @@ void FakeCallbackThread::unsubscribe(Subscription subscription) {
   std::unique_lock lock(mutex_);
   subscriptions_.erase(subscription);
   if (running_ == subscription && runner_ == std::this_thread::get_id()) return;
-  changed_.wait(lock, [&] { return running_ != subscription; });
+  awaitReady(
+      changed_, lock, [&] { return running_ != subscription; }, "a callback does not return");
 }
 
 void FakeCallbackThread::post(Subscription subscription, std::function<void()> callback) {
@@ -41,7 +44,8 @@ void FakeCallbackThread::run(Subscription subscription, const std::function<void
 
 void FakeCallbackThread::waitUntilIdle() {
   std::unique_lock lock(mutex_);
-  changed_.wait(lock, [this] { return pending_ == 0; });
+  awaitReady(
+      changed_, lock, [this] { return pending_ == 0; }, "a callback thread stays busy");
 }
 
 std::size_t FakeCallbackThread::subscriptions() const {

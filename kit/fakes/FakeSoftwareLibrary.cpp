@@ -4,6 +4,8 @@
 #include <utility>
 
 #include "kit/fakes/CallJournal.h"
+#include "kit/fakes/CallJournal.h"
+#include "kit/fakes/Patience.h"
 
 namespace appsync::test {
 
@@ -42,7 +44,8 @@ void FakeStore::complete() {
 
 void FakeStore::waitUntilPending(std::size_t count) {
   std::unique_lock lock(mutex_);
-  changed_.wait(lock, [&] { return pending_.size() >= count; });
+  awaitReady(
+      changed_, lock, [&] { return pending_.size() >= count; }, "too few refreshes are asked for");
 }
 
 std::unique_ptr<platform::SoftwareLibrary> FakeStore::connect() {

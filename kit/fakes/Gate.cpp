@@ -1,5 +1,7 @@
 #include "kit/fakes/Gate.h"
 
+#include "kit/fakes/Patience.h"
+
 namespace appsync::test {
 
 void Gate::close() {
@@ -18,13 +20,15 @@ void Gate::pass() {
   if (!closed_) return;
   ++stopped_;
   changed_.notify_all();
-  changed_.wait(lock, [this] { return !closed_; });
+  awaitReady(
+      changed_, lock, [this] { return !closed_; }, "a gate stays closed");
   --stopped_;
 }
 
 void Gate::waitUntilStopped(std::size_t count) {
   std::unique_lock lock(mutex_);
-  changed_.wait(lock, [&] { return stopped_ >= count; });
+  awaitReady(
+      changed_, lock, [&] { return stopped_ >= count; }, "too few threads come to a gate");
 }
 
 std::size_t Gate::stopped() const {

@@ -1,22 +1,18 @@
 #include "tests/faults/Faults.h"
 
-#include <chrono>
-#include <cstdlib>
 #include <future>
-#include <iostream>
 #include <optional>
+#include <string>
 
 #include <gtest/gtest.h>
 
+#include "kit/fakes/Patience.h"
 #include "kit/fakes/SyncFileBuilder.h"
 #include "platform/ZTClient.h"
 
 namespace appsync::test {
 
 namespace {
-
-/// Only a failing test waits this long.
-constexpr std::chrono::seconds kTimeout(60);
 
 const Error kInjected{"POSIX", 5, "Input/output error", nullptr};
 
@@ -62,9 +58,7 @@ void expectNothingPending(FakePlatform& platform) {
 
 void runWithTimeout(std::size_t number, const std::function<void()>& run) {
   const auto done = std::async(std::launch::async, run);
-  if (done.wait_for(kTimeout) == std::future_status::ready) return;
-  std::cerr << "the test hangs if call " << number << " fails\n";
-  std::abort();
+  awaitReady(done, "call " + std::to_string(number) + " fails");
 }
 
 }  // namespace appsync::test

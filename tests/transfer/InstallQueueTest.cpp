@@ -14,6 +14,7 @@
 
 #include "core/AppsClient.h"
 #include "kit/fakes/FakePackages.h"
+#include "kit/fakes/Patience.h"
 #include "kit/fakes/SyncFileBuilder.h"
 #include "tests/support/NoMoreThreads.h"
 #include "tests/transfer/InstallQueueFixture.h"
@@ -155,6 +156,7 @@ TEST_F(InstallQueue, ADeniedAssertionLeavesThePackageCleansTheRestoreStateAndCou
   EXPECT_EQ(client._getAndResetNumAppInstallsAttempted(), 0);
 
   platform.time.advance(30s);
+  awaitReady(ended, "the transfer does not end");
   ended.get();
   EXPECT_FALSE(platform.files.has(kRestoreStatePath));
   EXPECT_TRUE(platform.log.contains(loggedError("Re-enqueue installation request for com.a")));
@@ -171,7 +173,7 @@ TEST_F(InstallQueue, ADeniedAttemptCleansTheRestoreStateWithoutWaitingForTheNext
   });
   AppsClient& client = makeClient();
   client._enqueueAssetInstall(receive("com.a"));
-  cleaned.get_future().get();
+  awaitReady(cleaned.get_future(), "the restore state is not cleaned");
   EXPECT_EQ(platform.time.pendingTasks(), 1U) << "the next attempt is scheduled before the state is cleaned";
   EXPECT_TRUE(platform.files.has(pathOf("com.a")));
 
@@ -197,6 +199,7 @@ TEST_F(InstallQueue, ADeniedInstallIsTriedAgainAfterExactlyThirtySecondsForAsLon
     if (denial == kDenials) platform.screen.answerAlways("com.a", AssertionAnswer::granted());
     platform.time.advance(1ns);
   }
+  awaitReady(ended, "the transfer does not end");
   ended.get();
   EXPECT_EQ(platform.registry.installs().size(), 1U);
   EXPECT_EQ(platform.journal.count("homeScreen.terminationAssertionCreate"), std::size_t{kDenials + 1});

@@ -1,6 +1,5 @@
 // Reports to observers that the registry contract leaves open.
 #include <atomic>
-#include <chrono>
 #include <condition_variable>
 #include <mutex>
 #include <string>
@@ -9,6 +8,7 @@
 #include <gtest/gtest.h>
 
 #include "kit/contracts/EventCounter.h"
+#include "kit/fakes/Patience.h"
 #include "tests/device/apps/AppRegistryFixture.h"
 
 namespace appsync::test {
@@ -53,9 +53,6 @@ class Listener final : public platform::AppRegistryObserver {
   }
 
  private:
-  /// Time-out of failing tests only.
-  static constexpr std::chrono::seconds kPatience{20};
-
   std::mutex mutex_;
   std::condition_variable changed_;
   Identifiers prioritized_{"nothing heard yet"};
