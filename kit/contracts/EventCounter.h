@@ -21,7 +21,7 @@ class EventCounter {
   /// Blocks until there were `count` events. Returns false on a time-out.
   [[nodiscard]] bool waitFor(std::size_t count) {
     std::unique_lock lock(mutex_);
-    return changed_.wait_for(lock, kTimeout, [&] { return count_ >= count; });
+    return changed_.wait_for(lock, kPatience, [&] { return count_ >= count; });
   }
 
   [[nodiscard]] std::size_t count() {

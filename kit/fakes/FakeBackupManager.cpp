@@ -67,7 +67,7 @@ std::unique_ptr<platform::BackupManager> FakeBackups::connect() {
 void FakeBackups::waitUntilReleased() {
   std::unique_lock lock(mutex_);
   const auto isReleased = [this] { return connections_ == 0; };
-  if (!released_.wait_for(lock, kTimeout, isReleased)) misuse("a connection to the backup service stays open");
+  if (!released_.wait_for(lock, kPatience, isReleased)) misuse("a connection to the backup service stays open");
 }
 
 std::size_t FakeBackups::connections() const {
