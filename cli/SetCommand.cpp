@@ -108,7 +108,7 @@ ExitStatus run(const SetOptions& options, device::Device& device) {
 void addSetCommand(CLI::App& line, Invocation& invocation) {
   const CommandText text = {"set", "Change a device's settings.", kExamples};
   const auto added = addDeviceCommand(line, invocation, text, device::Access::exclusive, run);
-  added.command.add_option("KEY=VALUE", added.options->assignments, "what to set")->required();
+  added.command.add_option("KEY=VALUE", added.options->assignments, "the setting to change")->required();
 }
 
 }  // namespace appsync::cli

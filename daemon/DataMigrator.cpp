@@ -47,7 +47,8 @@ Status DataMigrator::finishApp(const host::BackedUpApp& app) {
   const auto record = recordOf(device_, app);
   if (record == nullptr) {
     return Error{std::string(domains::kPOSIX), ENOENT,
-                 "the device created no placeholder for it; restore again with --log FILE and read the log", nullptr};
+                 "the device created no placeholder for it; restore to a new device with --log FILE and read the log",
+                 nullptr};
   }
   return app.isDemoted() ? demote(app, *record) : Status();
 }
