@@ -1,4 +1,4 @@
-// The old text form, which people still write by hand.
+// Reads the ASCII format, which people still write by hand.
 #include <array>
 
 #include "base/UTF8.h"
@@ -24,9 +24,9 @@ int digitOf(char c) noexcept {
   return -1;
 }
 
-class TextReader {
+class ASCIIReader {
  public:
-  explicit TextReader(std::string_view text) noexcept : text_(text) {}
+  explicit ASCIIReader(std::string_view text) noexcept : text_(text) {}
 
   Result<Value> read() {
     Value root = readRoot();
@@ -47,7 +47,7 @@ class TextReader {
   Value readValue(int depth);
   Value readArray(int depth);
   Value readDictionary(int depth);
-  /// `key = value;` again and again, until something else follows.
+  /// Reads `key = value;` repeatedly, until something else follows.
   Dictionary readEntries(int depth);
   Value readData();
   std::string readString();
@@ -75,7 +75,7 @@ class TextReader {
   std::optional<Error> failure_;
 };
 
-void TextReader::skipSpace() {
+void ASCIIReader::skipSpace() {
   while (!atEnd()) {
     if (kSpace.find(text_[at_]) != std::string_view::npos) {
       ++at_;
@@ -94,7 +94,7 @@ void TextReader::skipSpace() {
   }
 }
 
-Value TextReader::readRoot() {
+Value ASCIIReader::readRoot() {
   skipSpace();
   if (!isStringNext()) return readValue(0);
   const std::size_t start = at_;
@@ -105,16 +105,16 @@ Value TextReader::readRoot() {
   return readEntries(1);
 }
 
-Value TextReader::readValue(int depth) {
+Value ASCIIReader::readValue(int depth) {
   if (take('{')) return readDictionary(depth + 1);
   if (take('(')) return readArray(depth + 1);
   if (take('<')) return readData();
   if (isStringNext()) return readString();
   return atEnd() ? fail(Failure::truncated, "The document ends too early")
-                 : fail(Failure::malformed, "A character that begins no value");
+                 : fail(Failure::malformed, "An unexpected character in place of a value");
 }
 
-Value TextReader::readArray(int depth) {
+Value ASCIIReader::readArray(int depth) {
   if (depth > kMaximumDepth) return fail(Failure::tooDeep, "Containers nested too deep");
   Array elements;
   while (!take(')')) {
@@ -127,19 +127,19 @@ Value TextReader::readArray(int depth) {
   return elements;
 }
 
-Value TextReader::readDictionary(int depth) {
+Value ASCIIReader::readDictionary(int depth) {
   if (depth > kMaximumDepth) return fail(Failure::tooDeep, "Containers nested too deep");
   Dictionary entries = readEntries(depth);
   if (!take('}')) return fail(atEnd() ? Failure::truncated : Failure::malformed, "No end of a dictionary");
   return entries;
 }
 
-Dictionary TextReader::readEntries(int depth) {
+Dictionary ASCIIReader::readEntries(int depth) {
   std::vector<Value> keys;
   std::vector<Value> values;
   for (skipSpace(); isStringNext(); skipSpace()) {
     keys.emplace_back(readString());
-    // A key alone stands for itself.
+    // A key without a value is its own value.
     values.push_back(take('=') ? readValue(depth) : keys.back());
     if (failure_) return {};
     if (take(';')) continue;
@@ -150,13 +150,13 @@ Dictionary TextReader::readEntries(int depth) {
   return makeDictionary(keys, values);
 }
 
-Value TextReader::readData() {
+Value ASCIIReader::readData() {
   Bytes bytes;
   while (!take('>')) {
     const int high = atEnd() ? -1 : digitOf(text_[at_]);
     const int low = at_ + 1 < text_.size() ? digitOf(text_[at_ + 1]) : -1;
     if (high < 0 || low < 0) {
-      return fail(atEnd() ? Failure::truncated : Failure::malformed, "Data that is no pair of digits");
+      return fail(atEnd() ? Failure::truncated : Failure::malformed, "Data that is not a pair of digits");
     }
     bytes.push_back(static_cast<std::byte>(high << 4 | low));
     at_ += 2;
@@ -164,18 +164,18 @@ Value TextReader::readData() {
   return bytes;
 }
 
-std::string TextReader::readString() {
+std::string ASCIIReader::readString() {
   return text_[at_] == '"' || text_[at_] == '\'' ? readQuoted() : readBare();
 }
 
-std::string TextReader::readBare() {
+std::string ASCIIReader::readBare() {
   const std::size_t start = at_;
   while (!atEnd() && isBareCharacter(text_[at_]))
     ++at_;
   return std::string(text_.substr(start, at_ - start));
 }
 
-std::string TextReader::readQuoted() {
+std::string ASCIIReader::readQuoted() {
   const std::array<char, 2> stops = {text_[at_++], '\\'};
   std::string out;
   for (;;) {
@@ -192,7 +192,7 @@ std::string TextReader::readQuoted() {
   }
 }
 
-void TextReader::appendEscape(std::string& out) {
+void ASCIIReader::appendEscape(std::string& out) {
   constexpr std::string_view kLetters = "abfnrtv";
   constexpr std::string_view kMeanings = "\a\b\f\n\r\t\v";
   if (atEnd()) {
@@ -207,7 +207,7 @@ void TextReader::appendEscape(std::string& out) {
   ++at_;
 }
 
-char32_t TextReader::readDigits(int base, std::size_t most) {
+char32_t ASCIIReader::readDigits(int base, std::size_t most) {
   char32_t number = 0;
   for (; most > 0 && !atEnd(); --most, ++at_) {
     const int digit = digitOf(text_[at_]);
@@ -217,8 +217,8 @@ char32_t TextReader::readDigits(int base, std::size_t most) {
   return number;
 }
 
-/// `\U` and up to four digits: a UTF-16 unit, so that characters beyond the first plane take two of these.
-void TextReader::appendUnicodeEscape(std::string& out) {
+/// Decodes `\U` and up to four digits: a UTF-16 unit. Characters beyond the first plane take two of these.
+void ASCIIReader::appendUnicodeEscape(std::string& out) {
   ++at_;
   char32_t c = readDigits(16, 4);
   if (isHighSurrogate(c) && (rest().starts_with("\\U") || rest().starts_with("\\u"))) {
@@ -239,7 +239,7 @@ Result<Value> readText(ByteView document) {
   std::string converted;
   const auto text = decodeText(document, converted);
   if (!text) return text.error();
-  return TextReader(*text).read();
+  return ASCIIReader(*text).read();
 }
 
 }  // namespace appsync::plist

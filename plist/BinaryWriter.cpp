@@ -294,7 +294,7 @@ std::byte* BinaryWriter::encode(const Value& value, std::byte* at) {
     case Type::real:
       return writeDouble(Marker::real, *value.number(), at);
     case Type::date:
-      if (!isInCalendar(*value.date())) return fail(Failure::notRepresentable, "A date lies outside the calendar");
+      if (!isInCalendar(*value.date())) return fail(Failure::notRepresentable, "A date outside the calendar");
       return writeDouble(Marker::date, value.date()->seconds, at);
     case Type::uid:
       return writeUid(*value.uid(), at);

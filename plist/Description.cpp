@@ -1,4 +1,4 @@
-// Values in log lines.
+// Descriptions of values for logs.
 #include <array>
 #include <charconv>
 
@@ -10,10 +10,10 @@ namespace appsync::plist {
 namespace {
 
 constexpr std::string_view kCut = "…";
-/// Data up to this length is shown whole, of longer data as much.
+/// Longer data is truncated to this length.
 constexpr std::size_t kShownData = 24;
 constexpr int kShownDepth = 32;
-/// No description grows much longer.
+/// The approximate maximum length of a description.
 constexpr std::size_t kLongest = std::size_t{1} << 20;
 
 bool isBareWord(std::string_view text) noexcept {

@@ -1,4 +1,4 @@
-// The dictionary: a shape of sorted keys, and the values parallel to it.
+// The dictionary: a shape of sorted keys, and values parallel to it.
 #include <algorithm>
 #include <memory>
 #include <numeric>
@@ -10,7 +10,7 @@ namespace appsync::plist {
 
 namespace {
 
-/// No dictionary keeps more than about twice this alive beside itself.
+/// A dictionary keeps at most about twice this alive in addition to itself.
 constexpr std::size_t kLargestSlab = 8192;
 
 }  // namespace
@@ -62,7 +62,7 @@ Dictionary DictionaryPool::make() {
   return Internals::adopt(payload);
 }
 
-/// The first dictionary may be the only one of its shape; each time there turn out to be more, twice as many follow.
+/// Doubles the number of dictionaries with each slab, because the first may be the only one of its shape.
 void DictionaryPool::refill(std::size_t bytesEach) {
   slab_ = Slab::make(bytesEach * atOnce_, atOnce_);
   next_ = slab_->memory();
@@ -87,10 +87,10 @@ bool holdsAt(const Shape& shape, std::size_t position, std::string_view key) noe
   return position < shape.keys.size() && keyText(shape.keys[position]) == key;
 }
 
-/// In few keys one after another is faster than halves: most differ in length.
+/// For up to this many keys linear search is faster than binary search, because most differ in length.
 constexpr std::size_t kFewKeys = 8;
 
-/// None when the shape has no such key.
+/// Returns nullopt if the shape has no such key.
 std::optional<std::size_t> positionIn(const Shape& shape, std::string_view key) noexcept {
   if (shape.keys.size() > kFewKeys) {
     const std::size_t position = positionOf(shape, key);
@@ -102,8 +102,8 @@ std::optional<std::size_t> positionIn(const Shape& shape, std::string_view key) 
   return std::nullopt;
 }
 
-/// A payload with nobody else's values in it and room for one more, in place of `payload`.
-DictionaryPayload* withRoom(DictionaryPayload* payload) {
+/// Returns a payload with one owner and capacity for one more value, in place of `payload`.
+DictionaryPayload* withCapacity(DictionaryPayload* payload) {
   const std::size_t count = payload->count;
   if (!payload->isShared() && count < payload->capacity) return payload;
   DictionaryPayload* roomy = DictionaryPayload::make(payload->shape, count < 4 ? 4 : count * 2);
@@ -118,7 +118,7 @@ DictionaryPayload* withRoom(DictionaryPayload* payload) {
   return roomy;
 }
 
-/// Makes `payload` the only user of its keys.
+/// Makes `payload` the only owner of its shape.
 Shape& ownShape(DictionaryPayload& payload) {
   if (payload.shape->isShared()) {
     auto copy = std::make_unique<Shape>();
@@ -208,7 +208,7 @@ const Value* Dictionary::find(std::string_view key) const noexcept {
 
 Value* Dictionary::find(std::string_view key) {
   if (std::as_const(*this).find(key) == nullptr) return nullptr;
-  if (payload_->isShared()) payload_ = withRoom(payload_);
+  if (payload_->isShared()) payload_ = withCapacity(payload_);
   return payload_->values() + positionOf(*payload_->shape, key);
 }
 
@@ -218,8 +218,8 @@ void Dictionary::set(std::string_view key, Value value) {
     return;
   }
   if (payload_ == nullptr) payload_ = DictionaryPayload::make(new Shape, 4);
-  Value name(key);  // First: `key` may lie in a value that now moves.
-  payload_ = withRoom(payload_);
+  Value name(key);  // First: `key` may be part of a value that is moved below.
+  payload_ = withCapacity(payload_);
   Shape& shape = ownShape(*payload_);
   const std::size_t position = positionOf(shape, keyText(name));
   shape.keys.insert(shape.keys.begin() + static_cast<std::ptrdiff_t>(position), std::move(name));
@@ -231,7 +231,7 @@ void Dictionary::set(std::string_view key, Value value) {
 
 bool Dictionary::erase(std::string_view key) {
   if (std::as_const(*this).find(key) == nullptr) return false;
-  if (payload_->isShared()) payload_ = withRoom(payload_);
+  if (payload_->isShared()) payload_ = withCapacity(payload_);
   Shape& shape = ownShape(*payload_);
   const std::size_t position = positionOf(shape, key);
   shape.keys.erase(shape.keys.begin() + static_cast<std::ptrdiff_t>(position));

@@ -1,4 +1,4 @@
-// What may be asked of a value.
+// Accessors of values.
 #include "plist/PropertyList.h"
 #include "plist/internal/Storage.h"
 

@@ -1,4 +1,4 @@
-// Counted content: made, shared, compared and freed.
+// Ownership, comparison and destruction of values.
 #include <algorithm>
 #include <cmath>
 #include <set>
@@ -22,7 +22,7 @@ void TextPayload::destroy(TextPayload* text) noexcept {
 
 namespace {
 
-/// Below this many containers inside one another, freeing goes on in a loop instead of recursion.
+/// Containers nested deeper than this are destroyed in a loop instead of by recursion.
 constexpr int kMaximumDestructionDepth = 64;
 
 struct Destruction {
@@ -121,9 +121,9 @@ Array* Value::array() {
 namespace {
 
 struct Pairs {
-  /// Pairs of values that are still to be compared; a list, because recursion would be as deep as the containers.
+  /// Pairs of values to be compared. A list instead of recursion, which would be as deep as the nesting.
   std::vector<std::pair<const Value*, const Value*>> waiting;
-  /// Pairs of long content known to be equal. Documents refer to the same content many times.
+  /// Pairs of long content known to be equal. Documents often refer to the same content repeatedly.
   std::set<std::pair<const char*, const char*>> equal;
 };
 
@@ -131,7 +131,7 @@ bool sameReal(double one, double other) noexcept {
   return one == other || (std::isnan(one) && std::isnan(other));
 }
 
-/// Compares long content once, however often it is repeated.
+/// Compares repeated long content once.
 bool sameText(std::string_view one, std::string_view other, Pairs& pairs) {
   constexpr std::size_t kLong = 4096;
   if (one.size() < kLong || one.size() != other.size()) return one == other;

@@ -1,4 +1,4 @@
-// The XML form: elements become values.
+// Reads the XML format.
 #include <algorithm>
 #include <array>
 #include <charconv>
@@ -34,7 +34,7 @@ NumberOutcome parseWhole(std::string_view text, T& number, Base... base) noexcep
   return error == std::errc{} ? NumberOutcome::parsed : NumberOutcome::outOfRange;
 }
 
-/// Without the white space at both ends.
+/// Returns `text` without leading and trailing white space.
 std::string_view trimmed(std::string_view text) noexcept {
   const std::size_t first = text.find_first_not_of(kSpace);
   if (first == std::string_view::npos) return {};
@@ -66,7 +66,7 @@ NumberOutcome parseReal(std::string_view text, double& number) noexcept {
   if (text.starts_with('-') || text.find('(') != std::string_view::npos) return NumberOutcome::malformed;
   NumberOutcome outcome = parseWhole(text, number);
   if (outcome == NumberOutcome::outOfRange) {
-    // Too large or too small for a double: a wider type tells which.
+    // Too large or too small for a double: a wider type distinguishes the two.
     long double wide = 0;
     outcome = parseWhole(text, wide);
     number = static_cast<double>(wide);
@@ -88,10 +88,10 @@ class XMLReader {
   }
 
  private:
-  /// The keys of the latest dictionary at one depth. The next one there most likely has the same.
+  /// The keys of the previous dictionary at one depth. The next one there most likely has the same keys.
   struct Level {
     DictionaryPool pool;
-    /// As they were written.
+    /// In document order.
     std::vector<Value> keys;
     std::vector<std::uint32_t> places;
   };
@@ -116,7 +116,7 @@ class XMLReader {
 
   XMLScanner scanner_;
   std::array<std::unique_ptr<Level>, kMaximumDepth + 1> levels_;
-  /// Keys and values of the containers that are still open, innermost last.
+  /// Keys and values of the open containers, innermost last.
   std::vector<Value> keys_;
   std::vector<Value> values_;
 };
@@ -148,7 +148,7 @@ Value XMLReader::readValue(const Tag& tag, int depth) {
     case Element::key:
     case Element::plist:
     case Element::unknown:
-      return fail(Failure::malformed, "An element that is no value");
+      return fail(Failure::malformed, "An element that is not a value");
     default:
       return readScalar(tag);
   }
@@ -180,7 +180,7 @@ Value XMLReader::readInteger(std::string_view text) {
     case NumberOutcome::outOfRange:
       return fail(Failure::outOfRange, "An integer that does not fit in 64 bits before");
     default:
-      return fail(Failure::malformed, "An integer that is none before");
+      return fail(Failure::malformed, "An invalid integer before");
   }
 }
 
@@ -192,7 +192,7 @@ Value XMLReader::readReal(std::string_view text) {
     case NumberOutcome::outOfRange:
       return fail(Failure::outOfRange, "A real too large before");
     default:
-      return fail(Failure::malformed, "A real that is none before");
+      return fail(Failure::malformed, "An invalid real before");
   }
 }
 
@@ -209,7 +209,7 @@ Value XMLReader::readData(const Tag& tag) {
   }
   const std::string_view text = scanner_.readCharacters(tag);
   if (scanner_.failed()) return {};
-  if (decodeBase64(text, bytes)) return fail(Failure::malformed, "Data that is no Base64 before");
+  if (decodeBase64(text, bytes)) return fail(Failure::malformed, "Invalid Base64 before");
   return bytes;
 }
 
@@ -247,7 +247,7 @@ Value XMLReader::readDictionary(const Tag& tag, int depth) {
   return finishDictionary(level, matched, firstKey, firstValue);
 }
 
-/// `matched` counts the leading keys that are the level's; from the first other one on, all are in `keys_`.
+/// `matched` counts the leading keys that equal the level's. After the first different key, all keys are in `keys_`.
 bool XMLReader::readEntry(const Tag& tag, Level& level, std::size_t& matched, std::size_t firstKey, int depth) {
   if (tag.element != Element::key || tag.kind == Tag::Kind::close) {
     scanner_.fail(Failure::malformed, "No key before a value in a dictionary");
@@ -268,7 +268,7 @@ bool XMLReader::readEntry(const Tag& tag, Level& level, std::size_t& matched, st
   return !scanner_.failed();
 }
 
-/// Puts the matched keys into `keys_` unless some are there already.
+/// Copies the matched keys into `keys_`, unless it already has keys of this dictionary.
 void XMLReader::materializeKeys(const Level& level, std::size_t matched, std::size_t firstKey) {
   if (keys_.size() != firstKey) return;
   keys_.insert(keys_.end(), level.keys.begin(), level.keys.begin() + static_cast<std::ptrdiff_t>(matched));

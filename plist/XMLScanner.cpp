@@ -21,8 +21,8 @@ constexpr bool isNameEnd(char c) noexcept {
   return isSpace(c) || c == '>' || c == '/' || c == '<';
 }
 
-/// Text that means itself: everything but markup, line ends to be unified, and what XML forbids. 0xEF may begin U+FFFE
-/// or U+FFFF, which it forbids too.
+/// Bytes of plain text: everything except markup, line ends to be normalised, and characters that XML forbids. 0xEF may
+/// begin U+FFFE or U+FFFF, which XML forbids too.
 constexpr auto kIsPlain = [] {
   std::array<bool, 256> plain{};
   for (std::size_t i = 0x20; i < plain.size(); ++i)
@@ -61,17 +61,17 @@ struct Entity {
 };
 constexpr std::array<Entity, 5> kEntities = {{{"lt", '<'}, {"gt", '>'}, {"amp", '&'}, {"quot", '"'}, {"apos", '\''}}};
 
-/// No reference is longer; leading zeros have their limit, too.
+/// The maximum length of a reference, which also limits leading zeros.
 constexpr std::size_t kLongestReference = 32;
 
-/// The encodings that the text can be in by now, in capital letters.
+/// The encodings that the decoded text can be declared in, in capital letters.
 constexpr std::array<std::string_view, 5> kEncodings = {"UTF-8", "UTF8", "US-ASCII", "ASCII", "UTF-16"};
 
 char capital(char c) noexcept {
   return c >= 'a' && c <= 'z' ? static_cast<char>(c - 'a' + 'A') : c;
 }
 
-/// Whether an XML declaration names an encoding that the text is not in.
+/// Whether an XML declaration names an unsupported encoding.
 bool namesForeignEncoding(std::string_view declaration) noexcept {
   const std::size_t start = declaration.find("encoding");
   if (start == std::string_view::npos) return false;
@@ -209,7 +209,7 @@ const char* XMLScanner::endOfPlain(const char* from) const noexcept {
   return from;
 }
 
-/// Steps over the closing tag of `name` when it is next.
+/// Skips the closing tag of `name` if it is next, else returns false.
 bool XMLScanner::takeClose(std::string_view name) {
   std::string_view left = rest();
   if (!left.starts_with("</") || !left.substr(2).starts_with(name)) return false;
@@ -242,7 +242,7 @@ std::string_view XMLScanner::readCharacters(const Tag& tag) {
   return text_;
 }
 
-/// Appends what the markup or special character stands for; false when it is a tag.
+/// Appends the text of a reference, section or special character. Returns false if a tag is next.
 bool XMLScanner::appendMarkup() {
   const std::string_view left = rest();
   if (left.front() == '&') {
@@ -300,7 +300,7 @@ void XMLScanner::appendSection() {
   if (!failed()) at_ += close + kClose.size();
 }
 
-/// Appends text without markup, its line ends unified.
+/// Appends text without markup, with normalised line ends.
 void XMLScanner::appendPlain(std::string_view text) {
   for (std::size_t at = 0; at < text.size();) {
     const std::size_t length = sequenceLength(text.substr(at));

@@ -1,4 +1,4 @@
-// Writes the XML form: one element a line, indented by tabs.
+// Writes the XML format: one element per line, indented by tabs.
 #include <array>
 #include <charconv>
 #include <cmath>
@@ -21,13 +21,13 @@ constexpr std::size_t kDataLine = 57;
 
 constexpr std::size_t kDeepest = static_cast<std::size_t>(kMaximumDepth);
 
-/// An output buffer that is written through a bare pointer after room has been made.
+/// An output buffer that is written through a pointer into reserved space.
 class Output {
  public:
   explicit Output(std::size_t expected) : bytes_(expected) {}
 
-  /// Room for `size` more characters; `advanceTo` says how many were used.
-  [[nodiscard]] char* room(std::size_t size) {
+  /// Reserves space for `size` more characters; `advanceTo` sets how many were written.
+  [[nodiscard]] char* reserve(std::size_t size) {
     if (size > bytes_.size() - used_) bytes_.resize((bytes_.size() + size) * 2);
     return reinterpret_cast<char*>(bytes_.data()) + used_;
   }
@@ -35,7 +35,7 @@ class Output {
     used_ = static_cast<std::size_t>(end - reinterpret_cast<const char*>(bytes_.data()));
   }
   void append(std::string_view text) {
-    std::memcpy(room(text.size()), text.data(), text.size());
+    std::memcpy(reserve(text.size()), text.data(), text.size());
     used_ += text.size();
   }
   [[nodiscard]] Bytes take() {
@@ -48,7 +48,7 @@ class Output {
   std::size_t used_ = 0;
 };
 
-/// What a byte of text becomes.
+/// How a byte of text is written.
 enum class Treatment : std::uint8_t { plain, escaped, sequence, forbidden };
 
 constexpr auto kTreatments = [] {
@@ -75,7 +75,7 @@ constexpr std::string_view escapeOf(char c) noexcept {
   }
 }
 
-/// Exact except for escapes and numbers, so that the buffer hardly ever moves.
+/// Exact except for escapes and numbers, so that the buffer is rarely reallocated.
 void addExpandedSize(const Value& value, std::size_t depth, std::size_t& size) {
   constexpr std::size_t kTags = 40;
   size += 2 * depth + kTags;
@@ -125,7 +125,7 @@ class XMLWriter {
   void writeArray(const Array& array, std::size_t depth);
   void writeDictionary(const Dictionary& dictionary, std::size_t depth);
   void indent(std::size_t depth) {
-    char* at = out_->room(depth);
+    char* at = out_->reserve(depth);
     std::memset(at, '\t', depth);
     out_->advanceTo(at + depth);
   }
@@ -155,7 +155,7 @@ void XMLWriter::writeValue(const Value& value, std::size_t depth) {
     case Type::date:
       return writeDate(*value.date(), depth);
     case Type::uid:
-      return fail(Failure::notRepresentable, "The XML form has no uid");
+      return fail(Failure::notRepresentable, "The XML format has no uid");
     case Type::array:
       return writeArray(*value.array(), depth);
     case Type::dictionary:
@@ -182,7 +182,7 @@ void XMLWriter::writeReal(double number, std::size_t depth) {
 }
 
 void XMLWriter::writeDate(Date date, std::size_t depth) {
-  if (!isInCalendar(date)) return fail(Failure::notRepresentable, "A date lies outside the calendar");
+  if (!isInCalendar(date)) return fail(Failure::notRepresentable, "A date outside the calendar");
   std::string text;
   appendDate(text, date);
   writeLine("<date>", depth);
@@ -195,7 +195,7 @@ void XMLWriter::writeData(ByteView data, std::size_t depth) {
   while (!data.empty()) {
     const ByteView line = data.first(std::min(data.size(), kDataLine));
     data = data.subspan(line.size());
-    char* at = out_->room(depth + base64Length(line.size()) + 1);
+    char* at = out_->reserve(depth + base64Length(line.size()) + 1);
     std::memset(at, '\t', depth);
     at = writeBase64(line, at + depth);
     *at++ = '\n';
@@ -227,7 +227,7 @@ void XMLWriter::writeCharacters(std::string_view text) {
         text.remove_prefix(writeSequence(text));
         break;
       default:
-        return fail(Failure::badText, "A string holds a character that XML cannot");
+        return fail(Failure::badText, "A string has a character that XML forbids");
     }
     if (failure_) return;
   }
@@ -239,7 +239,7 @@ std::size_t XMLWriter::writeSequence(std::string_view text) {
   if (length == 0) {
     fail(Failure::badText, "A string is not well-formed UTF-8");
   } else if (!isXMLCharacter(decodeSequence(text.data(), length))) {
-    fail(Failure::badText, "A string holds a character that XML cannot");
+    fail(Failure::badText, "A string has a character that XML forbids");
   } else {
     out_->append(text.substr(0, length));
   }

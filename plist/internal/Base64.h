@@ -1,4 +1,4 @@
-// Base64, as the XML form writes data.
+// Base64, the encoding of data in the XML format.
 #pragma once
 
 #include <cstddef>
@@ -9,16 +9,16 @@
 
 namespace appsync::plist {
 
-/// How many characters `size` bytes take.
+/// Returns the number of characters that encode `size` bytes.
 [[nodiscard]] constexpr std::size_t base64Length(std::size_t size) noexcept {
   return (size + 2) / 3 * 4;
 }
 
-/// Writes `bytes` as Base64 with padding. Returns the end of what was written.
+/// Writes `bytes` as Base64 with padding. Returns the end of the written characters.
 char* writeBase64(ByteView bytes, char* out) noexcept;
 
-/// Decodes Base64 with any white space between, into `bytes`. Yields the offset of the first character that does not
-/// belong there, or the text's length when it ends within a group; none on success.
+/// Decodes Base64, ignoring white space, into `bytes`. Returns nullopt on success, else the offset of the first invalid
+/// character, or the length of the text if it ends within a group.
 [[nodiscard]] std::optional<std::size_t> decodeBase64(std::string_view text, Bytes& bytes);
 
 }  // namespace appsync::plist

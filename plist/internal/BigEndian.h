@@ -1,4 +1,4 @@
-// Big-endian numbers of the binary form.
+// Big-endian numbers of the binary format.
 #pragma once
 
 #include <bit>
@@ -21,7 +21,7 @@ namespace appsync::plist {
   return swapToBigEndian(word) >> (64 - 8 * size);
 }
 
-/// Writes the low `size` bytes, 1 to 8, of `number`. Returns the end of what was written.
+/// Writes the low `size` bytes, 1 to 8, of `number`. Returns the end of the written bytes.
 inline std::byte* storeBigEndian(std::uint64_t number, unsigned size, std::byte* to) noexcept {
   const std::uint64_t word = swapToBigEndian(number << (64 - 8 * size));
   switch (size) {

@@ -1,4 +1,4 @@
-// Dates as the XML form writes them, and the calendar behind them.
+// Dates in the XML format, and the range of their calendar.
 #pragma once
 
 #include <optional>
@@ -9,13 +9,13 @@
 
 namespace appsync::plist {
 
-/// Whether the moment lies in the years 1 to 9999, the only ones that documents hold.
+/// Whether the date is in the years 1 to 9999, the only ones that documents can represent.
 [[nodiscard]] bool isInCalendar(Date date) noexcept;
 
-/// "2001-01-01T00:00:00Z", with fractions of a second cut off. Only for a moment in the calendar.
+/// Appends "2001-01-01T00:00:00Z" without fractions of a second. The date must be in the calendar.
 void appendDate(std::string& out, Date date);
 
-/// The inverse. None for another layout or a day or time that does not exist.
+/// Parses the text of appendDate. Returns nullopt for another layout or a day or time that does not exist.
 [[nodiscard]] std::optional<Date> parseDate(std::string_view text) noexcept;
 
 }  // namespace appsync::plist

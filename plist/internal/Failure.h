@@ -1,4 +1,4 @@
-// How property-list readers and writers word their errors.
+// Errors of property-list readers and writers.
 #pragma once
 
 #include <string>

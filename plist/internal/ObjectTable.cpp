@@ -9,9 +9,9 @@ namespace appsync::plist {
 namespace {
 
 constexpr std::size_t kFewestSlots = 256;
-/// A table begins with no more: most of a large document may turn out to be the same scalars.
+/// The largest initial table: most values of a large document may be equal scalars.
 constexpr std::size_t kMostFirstSlots = 65536;
-/// A thread keeps no more memory than this, about one megabyte in all, for its next document.
+/// The most memory, about one megabyte, that a thread keeps for its next document.
 constexpr std::size_t kMostSpareSlots = 90000;
 
 }  // namespace

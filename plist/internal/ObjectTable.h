@@ -1,4 +1,4 @@
-// The numbered objects of a binary document that is being written.
+// The numbered objects of a binary document during writing.
 #pragma once
 
 #include <cstddef>
@@ -12,29 +12,26 @@
 
 namespace appsync::plist {
 
-/// Where each object of a document begins, and which scalars are among them already, so that equal ones are stored
-/// once. Reals and dates are equal when their bits are. The values must stay where they are as long as the table is
-/// used.
+/// The offset of each object, and an index of the scalars, so that equal ones are stored once. Reals and dates are
+/// equal if their bits are. The values must not be moved while the table is in use.
 class ObjectTable {
  public:
-  /// Takes over what the thread's last table left: memory that need not be asked for and mapped again.
-  /// Empty until `clear` prepares it.
+  /// Reuses the memory of the thread's previous table. `clear` must be called first.
   ObjectTable();
   ~ObjectTable();
   ObjectTable(const ObjectTable&) = delete;
   ObjectTable& operator=(const ObjectTable&) = delete;
 
-  /// Forgets all objects, and prepares for about as many.
+  /// Removes all objects, and reserves memory for about `expected`.
   void clear(std::size_t expected);
 
-  /// The next number, for an object at `offset`.
+  /// Adds an object at `offset` and returns its number.
   std::uint32_t add(std::size_t offset) {
     if (count_ == memory_.offsets.size()) makeRoom(count_ + 1);
     memory_.offsets[count_] = static_cast<std::uint32_t>(offset);
     return count_++;
   }
-  /// The number of an equal scalar that was added before; else the next one, and the scalar counts as added at
-  /// `offset`.
+  /// Returns the number of an equal scalar, or adds the scalar at `offset` and returns its number.
   std::uint32_t findOrAdd(const Value& scalar, std::size_t offset) {
     const std::uint32_t tag = tagOf(scalar);
     for (std::size_t at = tag & mask_;; at = (at + 1) & mask_) {
@@ -50,16 +47,16 @@ class ObjectTable {
 
  private:
   struct Slot {
-    /// The object's number and one; 0 in an empty slot.
+    /// The object's number plus 1, or 0 in an empty slot.
     std::uint32_t next;
     std::uint32_t tag;
   };
   struct Memory {
-    /// Of the objects; longer than they are many.
+    /// Offsets of the objects; its size is the capacity.
     std::vector<std::uint32_t> offsets;
-    /// As long; unset for containers.
+    /// Parallel to `offsets`; unset for containers.
     std::vector<const Value*> scalars;
-    /// Hash tables of growing size one after another; the last one that was begun counts.
+    /// Hash tables of growing size one after another; the last one is in use.
     std::vector<Slot> slots;
   };
 

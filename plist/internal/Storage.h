@@ -1,4 +1,4 @@
-// What property-list values share behind the scenes. Only base/PropertyList*.cpp include this.
+// The storage of values: counted payloads, shapes of dictionaries, and the access that readers and writers need.
 #pragma once
 
 #include <array>
@@ -15,21 +15,21 @@
 
 namespace appsync::plist {
 
-/// Counted content; the last owner frees it. Content with more than one owner never changes.
+/// Reference-counted content, freed by its last owner. Immutable while it has more than one owner.
 struct Payload {
   std::atomic<std::uint32_t> owners{1};
 
   void retain(std::uint32_t times = 1) noexcept { owners.fetch_add(times, std::memory_order_relaxed); }
-  /// True for the last owner.
+  /// Returns true for the last owner.
   [[nodiscard]] bool release(std::uint32_t times = 1) noexcept {
-    // Most payloads never had a second owner, and no other thread can become one meanwhile.
+    // Most payloads have one owner only; no other thread can become an owner concurrently.
     return owners.load(std::memory_order_acquire) == times ||
            owners.fetch_sub(times, std::memory_order_acq_rel) == times;
   }
   [[nodiscard]] bool isShared() const noexcept { return owners.load(std::memory_order_acquire) != 1; }
 };
 
-/// A long string; its bytes follow it in memory.
+/// A long string, directly followed by its bytes in memory.
 struct TextPayload : Payload {
   std::size_t size = 0;
 
@@ -38,7 +38,7 @@ struct TextPayload : Payload {
   static void destroy(TextPayload* text) noexcept;
 };
 
-/// Bytes of its own, or a part of a document that it keeps alive.
+/// Owned bytes, or a part of a document that it keeps alive.
 struct DataPayload : Payload {
   explicit DataPayload(Bytes content) noexcept : own(std::move(content)), bytes(own) {}
   DataPayload(std::shared_ptr<const Bytes> whole, ByteView part) noexcept : document(std::move(whole)), bytes(part) {}
@@ -48,7 +48,7 @@ struct DataPayload : Payload {
   const ByteView bytes;
 };
 
-/// Content that holds values. Freed through `destroyLater`, so that deep nesting does not take deep recursion.
+/// Content that contains values. `destroyLater` bounds the recursion of the destruction of nested containers.
 struct Container : Payload {
   enum class Kind : std::uint8_t { array, dictionary };
   explicit Container(Kind which) noexcept : kind(which) {}
@@ -56,7 +56,7 @@ struct Container : Payload {
   Kind kind;
   Container* nextToDestroy = nullptr;
 
-  /// Gives up one ownership.
+  /// Releases one ownership.
   static void drop(Container* container) noexcept {
     if (container->release()) destroyLater(container);
   }
@@ -71,8 +71,8 @@ struct ArrayPayload : Container {
   Array elements;
 };
 
-/// The keys of one or many dictionaries, as strings in order. Documents hold thousands of dictionaries with the same
-/// keys: they share one of these, so that each costs its values alone and a writer can recognise it.
+/// The sorted keys of one or more dictionaries. A document often has thousands of dictionaries with the same keys: they
+/// share one shape, so that each stores values only, and writers recognise repeated keys.
 struct Shape : Payload {
   std::vector<Value> keys;
 
@@ -81,7 +81,7 @@ struct Shape : Payload {
   }
 };
 
-/// Memory for several dictionaries, which follows it. Goes with the last of them.
+/// Memory for several dictionaries, which directly follows it. Freed with the last of them.
 struct alignas(std::max_align_t) Slab : Payload {
   [[nodiscard]] std::byte* memory() noexcept { return reinterpret_cast<std::byte*>(this + 1); }
   /// With `owners` owners.
@@ -89,7 +89,7 @@ struct alignas(std::max_align_t) Slab : Payload {
   static void drop(Slab* slab, std::uint32_t times = 1) noexcept;
 };
 
-/// The values of a dictionary, parallel to the keys of its shape; they follow it in memory.
+/// A dictionary, directly followed in memory by its values, which are parallel to the keys of its shape.
 struct DictionaryPayload : Container {
   DictionaryPayload(Shape* keys, std::uint32_t room) noexcept
       : Container(Kind::dictionary), capacity(room), shape(keys) {}
@@ -97,17 +97,17 @@ struct DictionaryPayload : Container {
   std::uint32_t capacity;
   std::uint32_t count = 0;
   Shape* shape;
-  /// What its memory is part of; null when it has its own.
+  /// The slab that its memory belongs to, or null if it was allocated separately.
   Slab* slab = nullptr;
 
   [[nodiscard]] Value* values() noexcept { return std::launder(reinterpret_cast<Value*>(this + 1)); }
-  /// Room for `capacity` values, none made yet. Takes over one ownership of `shape`.
+  /// Allocates memory for `capacity` values and constructs none. Takes over one ownership of `shape`.
   [[nodiscard]] static DictionaryPayload* make(Shape* shape, std::size_t capacity);
   static void destroy(DictionaryPayload* dictionary) noexcept;
 };
 
-/// Makes the dictionaries of one shape, or none. Documents that hold one such dictionary tend to hold thousands: their
-/// memory is asked for, and the ownerships of the shape are taken, several at a time.
+/// Allocates dictionaries of one shape. A document with one such dictionary often has thousands: memory and ownerships
+/// of the shape are acquired for several at a time. A default-constructed pool allocates none.
 class DictionaryPool {
  public:
   DictionaryPool() noexcept = default;
@@ -123,7 +123,7 @@ class DictionaryPool {
   }
   ~DictionaryPool();
 
-  /// A dictionary of nulls, which are then to be replaced in its payload.
+  /// Returns a dictionary of nulls, which the caller replaces in its payload.
   [[nodiscard]] Dictionary make();
   [[nodiscard]] Shape& operator*() const noexcept { return *shape_; }
   [[nodiscard]] Shape* operator->() const noexcept { return shape_; }
@@ -138,7 +138,7 @@ class DictionaryPool {
   std::uint32_t atOnce_ = 1;
 };
 
-/// The way into values for readers and writers.
+/// Access to the representation of values, for readers and writers.
 struct Internals {
   using Words = std::array<std::uint64_t, sizeof(Value) / sizeof(std::uint64_t)>;
 
@@ -149,19 +149,19 @@ struct Internals {
     dictionary.payload_ = payload;
     return dictionary;
   }
-  /// A string's or data's bytes.
+  /// The bytes of a string or data.
   [[nodiscard]] static std::string_view text(const Value& value) noexcept { return value.text(); }
   [[nodiscard]] static bool isInline(const Value& value) noexcept { return value.bits_.length != Value::kShared; }
-  /// How many bytes a string or data takes that is held inline.
+  /// The size of a string or data that is stored inline.
   [[nodiscard]] static std::size_t inlineSize(const Value& value) noexcept { return value.bits_.length; }
   [[nodiscard]] static bool isContainer(const Value& value) noexcept { return value.bits_.type >= Type::array; }
-  /// Puts a string that fits into the value itself, its unused bytes zero, in place of a null.
+  /// Sets a null to a string that is stored inline. Unused bytes of `words` must be zero.
   static void setShortString(Value& null, const Words& words, std::size_t size) noexcept {
     std::memcpy(static_cast<void*>(&null.bits_), words.data(), sizeof null.bits_);
     null.bits_.length = static_cast<std::uint8_t>(size);
     null.bits_.type = Type::string;
   }
-  /// Data that stays where it is, in `document`, and keeps it alive.
+  /// Returns data that refers to `part` of `document` and keeps the document alive.
   [[nodiscard]] static Value dataIn(std::shared_ptr<const Bytes> document, ByteView part) {
     Value data;
     data.store<Payload*>(Type::data, new DataPayload(std::move(document), part), Value::kShared);
@@ -169,7 +169,7 @@ struct Internals {
   }
   static constexpr std::size_t kInlineCapacity = Value::kInlineCapacity;
   [[nodiscard]] static const void* bits(const Value& value) noexcept { return &value.bits_; }
-  /// A value as numbers; one by one, because a copy of the whole would go through memory.
+  /// Returns the representation as numbers, loaded one at a time to avoid a copy through memory.
   [[nodiscard]] static Words words(const Value& value) noexcept {
     const auto word = [&value](std::size_t i) {
       std::uint64_t number;
@@ -181,14 +181,14 @@ struct Internals {
   [[nodiscard]] static Payload* shared(const Value& value) noexcept { return value.load<Payload*>(); }
 };
 
-/// Makes a dictionary of keys and values in any order; of equal keys the last one counts. The values are moved away.
+/// Builds a dictionary of keys and values in any order; of equal keys the last one wins. Moves from the values.
 [[nodiscard]] Dictionary makeDictionary(std::span<const Value> keys, std::span<Value> values);
 
-/// Makes a dictionary of values in the order that `places` was made for.
+/// Builds a dictionary of values in the order of the keys that `places` was computed for. Moves from the values.
 [[nodiscard]] Dictionary makeDictionary(DictionaryPool& pool, std::span<const std::uint32_t> places,
                                         std::span<Value> values);
 
-/// For each key its place in the shape. Empty when they are all in order.
+/// Returns for each key its index in the shape, or an empty list if the keys are sorted.
 [[nodiscard]] std::vector<std::uint32_t> placesOf(std::span<const Value> keys, const Shape& shape);
 
 }  // namespace appsync::plist

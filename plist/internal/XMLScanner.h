@@ -34,27 +34,27 @@ struct Tag {
   std::string_view name;
 };
 
-/// Walks a document of well-formed UTF-8. After a failure every step fails and the first error stays.
+/// Scans a document of well-formed UTF-8. After a failure all further steps fail, and the first error is kept.
 class XMLScanner {
  public:
   explicit XMLScanner(std::string_view text) noexcept : begin_(text.data()), at_(begin_), end_(begin_ + text.size()) {}
 
   [[nodiscard]] bool failed() const noexcept { return failure_.has_value(); }
   [[nodiscard]] Error takeFailure() { return *std::move(failure_); }
-  /// Names the current byte.
+  /// Records an error at the current byte.
   void fail(Failure kind, std::string_view what);
 
   /// Skips the declaration, comments and any document type declaration without entities.
   void readProlog();
-  /// Reads the next tag, which nothing but white space, comments and processing instructions may precede.
+  /// Reads the next tag. Fails if anything other than white space, comments and processing instructions precedes it.
   Tag readTag();
   /// Reads the text in the element that `tag` opened, and its closing tag. Valid until the next call.
   std::string_view readCharacters(const Tag& tag);
-  /// The same text without a step forward, when it runs to the closing tag without any other markup.
+  /// Returns the text up to the closing tag without advancing, or nullopt if it contains other markup.
   [[nodiscard]] std::optional<std::string_view> rawCharacters(const Tag& tag) const noexcept;
-  /// Steps over `raw`, which rawCharacters gave, and the closing tag.
+  /// Skips `raw`, a result of rawCharacters, and the closing tag.
   void skipRawCharacters(const Tag& tag, std::string_view raw) noexcept;
-  /// Fails when anything but comments follows.
+  /// Fails if anything other than comments follows.
   void expectEnd();
 
  private:
@@ -75,7 +75,7 @@ class XMLScanner {
   const char* begin_;
   const char* at_;
   const char* end_;
-  /// Text that had to be put together.
+  /// Buffer for text that is not contiguous in the document.
   std::string text_;
   std::optional<Error> failure_;
 };

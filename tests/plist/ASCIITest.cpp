@@ -23,7 +23,7 @@ std::string described(const Value& value) {
 TEST(PropertyListText, ReadsContainersStringsAndData) {
   const auto value =
       plist::read(bytesOf("// first\n{ a = b; \"c d\" = ( 1, 'x y', ); e = <0f A0\n1>; f = {}; g = () }"));
-  EXPECT_EQ(outcome(value), "Data that is no pair of digits at byte 52");
+  EXPECT_EQ(outcome(value), "Data that is not a pair of digits at byte 52");
   const auto good = plist::read(bytesOf("/* c */ { a = b; \"c d\" = ( 1, 'x y', ); e = <0f A0\n11>; f = {}; g = () }"));
   ASSERT_TRUE(good.ok()) << outcome(good);
   EXPECT_EQ(*good, Value(Dictionary{{"a", "b"},
