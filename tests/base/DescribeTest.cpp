@@ -60,7 +60,7 @@ void appendDescription(std::string& out, Phase) {
 
 namespace {
 
-TEST(Describe, TextPrintsItself) {
+TEST(Describe, PrintsTextUnchanged) {
   EXPECT_EQ(description("literal"), "literal");
   EXPECT_EQ(description(std::string("with\0zero", 9)), std::string("with\0zero", 9));
   EXPECT_EQ(description(std::string_view("view")), "view");
@@ -69,19 +69,19 @@ TEST(Describe, TextPrintsItself) {
   EXPECT_EQ(description(""), "");
 }
 
-TEST(Describe, ANullCStringIsAbsent) {
+TEST(Describe, PrintsNullCStringAsNull) {
   const char* none = nullptr;
   char* noneToChange = nullptr;
   EXPECT_EQ(description(none), "(null)");
   EXPECT_EQ(description(noneToChange), "(null)");
 }
 
-TEST(Describe, TruthValuesAreOneAndZero) {
+TEST(Describe, PrintsBooleansAsOneAndZero) {
   EXPECT_EQ(description(true), "1");
   EXPECT_EQ(description(false), "0");
 }
 
-TEST(Describe, ACharacterPrintsItself) {
+TEST(Describe, PrintsCharactersUnchanged) {
   EXPECT_EQ(description('y'), "y");
 }
 
@@ -93,14 +93,14 @@ TEST(Describe, IntegersPrintOverTheirWholeRange) {
   EXPECT_EQ(description(std::uint8_t{200}), "200");
 }
 
-TEST(Describe, RealsPrintAsShortAsTheyReadBack) {
+TEST(Describe, PrintsShortestRealThatReadsBack) {
   EXPECT_EQ(description(0.1), "0.1");
   EXPECT_EQ(description(1.0), "1");
   EXPECT_EQ(description(-std::numeric_limits<double>::denorm_min()), "-5e-324");
   EXPECT_EQ(description(std::numeric_limits<double>::infinity()), "inf");
 }
 
-TEST(Describe, AbsenceIsNull) {
+TEST(Describe, PrintsAbsenceAsNull) {
   EXPECT_EQ(description(nullptr), "(null)");
   EXPECT_EQ(description(std::nullopt), "(null)");
   EXPECT_EQ(description(std::optional<std::string>()), "(null)");
@@ -109,7 +109,7 @@ TEST(Describe, AbsenceIsNull) {
   EXPECT_EQ(description(static_cast<const Version*>(nullptr)), "(null)");
 }
 
-TEST(Describe, WhatIsPresentPrintsInPlaceOfItsHandle) {
+TEST(Describe, PrintsTheValueOfAHandle) {
   EXPECT_EQ(description(std::optional<std::string>("text")), "text");
   EXPECT_EQ(description(std::optional<bool>(false)), "0");
   const Version version{2, 1};
@@ -123,20 +123,20 @@ TEST(Describe, HandlesMayBeNested) {
   EXPECT_EQ(description(std::optional<std::shared_ptr<int>>(nullptr)), "(null)");
 }
 
-TEST(Describe, ATypesOwnFunctionIsFoundInItsNamespace) {
+TEST(Describe, FindsFunctionInTheNamespaceOfTheType) {
   EXPECT_EQ(description(Version{10, 3}), "10.3");
   EXPECT_EQ(description(Release{{4, 5}}), "4.5");
   EXPECT_EQ(description(Phase::loading), "loading");
   EXPECT_EQ(description(Error{"A", 1, "first", nullptr}), "A 1 \"first\"");
 }
 
-TEST(Describe, AMemberIsUsedThroughTheBase) {
+TEST(Describe, UsesMemberThroughTheBase) {
   const Circle circle;
   const Shape& shape = circle;
   EXPECT_EQ(description(shape), "<Circle>");
 }
 
-TEST(Describe, ATypesOwnFunctionPrecedesItsMemberAndItsElements) {
+TEST(Describe, PrefersFunctionToMemberAndElements) {
   EXPECT_EQ(description(Layout{}), "function");
 }
 
@@ -153,7 +153,7 @@ TEST(Describe, AnEmptyRangeIsAPairOfParentheses) {
   EXPECT_EQ(description(std::vector<int>()), "()");
 }
 
-TEST(Describe, RangesMayBeNestedAndHoldAbsentElements) {
+TEST(Describe, PrintsNestedRangesAndAbsentElements) {
   const std::vector<std::optional<std::vector<int>>> ranges{std::vector{1, 2}, std::nullopt};
   EXPECT_EQ(description(ranges), "((1, 2), (null))");
 }

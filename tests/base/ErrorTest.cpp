@@ -16,7 +16,7 @@ std::string described(const Error& error) {
   return out;
 }
 
-TEST(Error, SystemErrorHasThePosixDomainItsNumberAndTheSystemsWords) {
+TEST(Error, SystemErrorHasDomainNumberAndDescription) {
   const Error error = Error::fromErrno(ENOENT);
   EXPECT_EQ(error.domain, "POSIX");
   EXPECT_EQ(error.code, ENOENT);
@@ -65,7 +65,7 @@ TEST(Error, DescriptionIsAppended) {
   EXPECT_EQ(out, "err=A 1 \"first\"");
 }
 
-TEST(Error, SlotTakesTheErrorUnlessTheCallerWantsNone) {
+TEST(Error, SlotTakesErrorUnlessNull) {
   std::optional<Error> slot;
   setError(&slot, Error{"A", 1, "first", nullptr});
   EXPECT_EQ(slot, (Error{"A", 1, "first", nullptr}));

@@ -22,7 +22,7 @@ class GroupTest : public testing::Test {
   Group group{time};
 };
 
-TEST_F(GroupTest, CountsEntersThatAreNotTakenBack) {
+TEST_F(GroupTest, CountsEntersWithoutLeave) {
   EXPECT_EQ(group.count(), 0);
   group.enter();
   group.enter();
@@ -32,7 +32,7 @@ TEST_F(GroupTest, CountsEntersThatAreNotTakenBack) {
   group.leave();
 }
 
-TEST_F(GroupTest, ReportsALeaveWithoutAnEnter) {
+TEST_F(GroupTest, ThrowsOnLeaveWithoutEnter) {
   EXPECT_THROW(group.leave(), std::logic_error);
   EXPECT_EQ(group.count(), 0);
   group.enter();
@@ -60,7 +60,7 @@ TEST_F(GroupTest, WaitsForTheLastLeave) {
   other.join();
 }
 
-TEST_F(GroupTest, GivesUpAtTheDeadlineAndKeepsItsCount) {
+TEST_F(GroupTest, WaitEndsAtDeadlineAndKeepsCount) {
   group.enter();
   EXPECT_FALSE(group.wait(time.now()));
   std::thread waiter([&] { EXPECT_FALSE(group.wait(time.now() + 5s)); });
@@ -90,7 +90,7 @@ TEST_F(GroupTest, WakesAllWaiters) {
     waiter.join();
 }
 
-TEST_F(GroupTest, AWaiterSeesThatTheGroupWasEmptyEvenIfItIsEnteredAnewAtOnce) {
+TEST_F(GroupTest, WaiterSeesEmptyGroupDespiteImmediateEnter) {
   group.enter();
   std::thread waiter([&] { EXPECT_TRUE(group.wait(time.now() + 5s)); });
   time.waitUntilWaiting(1);
@@ -133,7 +133,7 @@ TEST_F(GroupEntryTest, EntersNowAndLeavesWhenDestroyed) {
   EXPECT_EQ(group->count(), 0);
 }
 
-TEST_F(GroupEntryTest, MovingHandsTheLeaveOn) {
+TEST_F(GroupEntryTest, MoveTransfersTheLeave) {
   std::unique_ptr<GroupEntry> moved;
   {
     GroupEntry entry(group);
@@ -144,7 +144,7 @@ TEST_F(GroupEntryTest, MovingHandsTheLeaveOn) {
   EXPECT_EQ(group->count(), 0);
 }
 
-TEST_F(GroupEntryTest, AssigningLeavesTheGroupThatItStoodFor) {
+TEST_F(GroupEntryTest, AssignmentLeavesThePreviousGroup) {
   const auto other = std::make_shared<Group>(time);
   GroupEntry entry(group);
   entry = GroupEntry(other);

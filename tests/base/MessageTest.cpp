@@ -18,7 +18,7 @@
 namespace appsync::test {
 namespace {
 
-TEST(Message, WithoutConversionsIsItsFormat) {
+TEST(Message, PrintsFormatWithoutConversions) {
   EXPECT_EQ(formatMessage("todo list is not an array"), "todo list is not an array");
   EXPECT_EQ(formatMessage(""), "");
 }
@@ -58,12 +58,12 @@ TEST(Message, NarrowerIntegersFitWiderConversions) {
   EXPECT_EQ(formatMessage("%d %lld %lu", std::int8_t{-1}, 7, std::uint8_t{255}), "-1 7 255");
 }
 
-TEST(Message, TruthValuesAreNumbersInNumberConversionsAndLettersInCharacterOnes) {
+TEST(Message, PrintsBooleansAsNumbersOrLetters) {
   EXPECT_EQ(formatMessage("(found=%d pi=%d) isRestore=%c %c", true, false, true, false),
             "(found=1 pi=0) isRestore=y n");
 }
 
-TEST(Message, CharactersPrintThemselves) {
+TEST(Message, PrintsCharactersUnchanged) {
   EXPECT_EQ(formatMessage("%c%c", 'y', '%'), "y%");
 }
 
@@ -90,14 +90,14 @@ TEST(Message, TwoPercentSignsPrintOne) {
   EXPECT_EQ(formatMessage("%d%% of %%s", 50), "50% of %s");
 }
 
-TEST(Message, AnythingDescribableGoesWithTheObjectConversion) {
+TEST(Message, ObjectConversionPrintsAnyDescribable) {
   const std::optional<Error> error = Error{"ZTError", 29, "given up", nullptr};
   const std::unique_ptr<std::string> none;
   EXPECT_EQ(formatMessage("[%{public}@] [%{public}@] [%{public}@]", std::vector{1, 2}, error, none),
             "[(1, 2)] [ZTError 29 \"given up\"] [(null)]");
 }
 
-TEST(Message, TheObjectConversionMayLeaveOutThatItIsPublic) {
+TEST(Message, ObjectConversionNeedsNoPublic) {
   EXPECT_EQ(formatMessage("%s/%@.png", "/Icons", std::string("com.a")), "/Icons/com.a.png");
 }
 

@@ -33,11 +33,11 @@ std::ptrdiff_t threadsOfThisProcess() {
   return std::distance(std::filesystem::directory_iterator("/proc/self/task"), std::filesystem::directory_iterator());
 }
 
-TEST_F(OperationQueueTest, TellsItsMaximum) {
+TEST_F(OperationQueueTest, ReturnsItsMaximum) {
   EXPECT_EQ(OperationQueue(10).maxConcurrentOperations(), 10u);
 }
 
-TEST_F(OperationQueueTest, RefusesAMaximumOfNone) {
+TEST_F(OperationQueueTest, RefusesMaximumOfZero) {
   EXPECT_THROW(OperationQueue(0), std::invalid_argument);
 }
 
@@ -67,7 +67,7 @@ TEST_F(OperationQueueTest, StartsOperationsInTheOrderOfAdding) {
     EXPECT_EQ(order[static_cast<std::size_t>(i)], i);
 }
 
-TEST_F(OperationQueueTest, RunsAsManyOperationsAtOnceAsItsMaximumAndNoMore) {
+TEST_F(OperationQueueTest, RunsAtMostItsMaximumAtOnce) {
   Gate gate;
   gate.close();
   std::atomic<int> begun = 0;
@@ -99,7 +99,7 @@ TEST_F(OperationQueueTest, StartsThreadsOnDemand) {
   gate.open();
 }
 
-TEST_F(OperationQueueTest, WithoutAnotherThreadThoseThatRunTakeEveryOperation) {
+TEST_F(OperationQueueTest, ContinuesIfNoFurtherThreadStarts) {
   if (!NoMoreThreads::arePossible()) GTEST_SKIP() << "this build starts threads in its own way";
   std::atomic<int> ran = 0;
   Gate gate;
@@ -116,7 +116,7 @@ TEST_F(OperationQueueTest, WithoutAnotherThreadThoseThatRunTakeEveryOperation) {
   EXPECT_EQ(ran, 5);
 }
 
-TEST_F(OperationQueueTest, WithoutAnyThreadNothingIsAdded) {
+TEST_F(OperationQueueTest, AddThrowsIfNoThreadStarts) {
   if (!NoMoreThreads::arePossible()) GTEST_SKIP() << "this build starts threads in its own way";
   bool ran = false;
   {
@@ -130,7 +130,7 @@ TEST_F(OperationQueueTest, WithoutAnyThreadNothingIsAdded) {
   EXPECT_FALSE(ran);
 }
 
-TEST_F(OperationQueueTest, UsesIdleThreadsAgain) {
+TEST_F(OperationQueueTest, ReusesIdleThreads) {
   constexpr int kOperations = 100;
   OperationQueue queue(kOperations);
   std::set<std::thread::id> runners;
@@ -144,7 +144,7 @@ TEST_F(OperationQueueTest, UsesIdleThreadsAgain) {
   EXPECT_LT(runners.size(), kOperations / 2u);
 }
 
-TEST_F(OperationQueueTest, ARunningOperationDoesNotHoldUpOthers) {
+TEST_F(OperationQueueTest, RunningOperationDoesNotDelayOthers) {
   Gate gate;
   gate.close();
   Semaphore ran(clock, 0);
@@ -174,7 +174,7 @@ TEST_F(OperationQueueTest, OperationsMayAddOperations) {
   EXPECT_EQ(ran, 2);
 }
 
-TEST_F(OperationQueueTest, OperationsMayAddOperationsWhileTheQueueIsDestroyed) {
+TEST_F(OperationQueueTest, OperationsMayAddDuringDestruction) {
   std::atomic<int> ran = 0;
   {
     OperationQueue queue(1);
@@ -186,7 +186,7 @@ TEST_F(OperationQueueTest, OperationsMayAddOperationsWhileTheQueueIsDestroyed) {
   EXPECT_EQ(ran, 5);
 }
 
-TEST_F(OperationQueueTest, AnOperationIsDestroyedRightAfterItRanAndBeforeTheNext) {
+TEST_F(OperationQueueTest, DestroysOperationBeforeTheNextRuns) {
   auto captured = std::make_shared<int>();
   const std::weak_ptr<int> watch = captured;
   bool aliveInside = false;
@@ -200,14 +200,14 @@ TEST_F(OperationQueueTest, AnOperationIsDestroyedRightAfterItRanAndBeforeTheNext
   EXPECT_TRUE(goneBeforeNext);
 }
 
-TEST_F(OperationQueueTest, WhatAnOperationCapturedMayAddOperationsAsItGoes) {
+TEST_F(OperationQueueTest, DestructorOfCaptureMayAddOperations) {
   Semaphore ran(clock, 0);
   OperationQueue queue(1);
   queue.add([last = std::make_shared<AtEnd>([&] { queue.add([&] { ran.signal(); }); })] {});
   EXPECT_TRUE(ran.wait());
 }
 
-TEST_F(OperationQueueTest, DestroyedFromOutsideItWaitsForRunningAndQueuedOperations) {
+TEST_F(OperationQueueTest, DestructorWaitsForAllOperations) {
   Gate gate;
   gate.close();
   std::atomic<int> ran = 0;
@@ -237,7 +237,7 @@ struct Owner {
   }
 };
 
-TEST_F(OperationQueueTest, TheLastOwnerOfTheQueueMayBeAnOperation) {
+TEST_F(OperationQueueTest, LastOwnerMayBeAnOperation) {
   for (int round = 0; round < 100; ++round) {
     auto owner = std::make_shared<Owner>();
     const auto destroyed = owner->destroyed = std::make_shared<Semaphore>(clock, 0);
@@ -252,7 +252,7 @@ TEST_F(OperationQueueTest, TheLastOwnerOfTheQueueMayBeAnOperation) {
   }
 }
 
-TEST_F(OperationQueueTest, TheLastOwnerMayBeAnyOfSeveralOperations) {
+TEST_F(OperationQueueTest, LastOwnerMayBeAnyOfSeveralOperations) {
   for (int round = 0; round < 100; ++round) {
     auto owner = std::make_shared<Owner>();
     const auto destroyed = owner->destroyed = std::make_shared<Semaphore>(clock, 0);
@@ -264,7 +264,7 @@ TEST_F(OperationQueueTest, TheLastOwnerMayBeAnyOfSeveralOperations) {
   }
 }
 
-TEST_F(OperationQueueTest, AnOperationMayLetGoOfTheLastOwnerWhileItRuns) {
+TEST_F(OperationQueueTest, RunningOperationMayReleaseLastOwner) {
   Semaphore done(clock, 0);
   auto queue = std::make_shared<OperationQueue>(1);
   OperationQueue& reference = *queue;
@@ -275,7 +275,7 @@ TEST_F(OperationQueueTest, AnOperationMayLetGoOfTheLastOwnerWhileItRuns) {
   EXPECT_TRUE(done.wait());
 }
 
-TEST_F(OperationQueueTest, DestroyedOnItsOwnThreadItStillRunsWhatIsQueued) {
+TEST_F(OperationQueueTest, DestroyedOnOwnThreadRunsQueuedOperations) {
   Gate gate;
   gate.close();
   const auto ran = std::make_shared<Semaphore>(clock, 0);
@@ -289,7 +289,7 @@ TEST_F(OperationQueueTest, DestroyedOnItsOwnThreadItStillRunsWhatIsQueued) {
     EXPECT_TRUE(ran->wait());
 }
 
-TEST_F(OperationQueueTest, DestroyedOnItsOwnThreadItDoesNotWaitForItsOtherThreads) {
+TEST_F(OperationQueueTest, DestroyedOnOwnThreadDoesNotWait) {
   Gate gate;
   gate.close();
   const auto done = std::make_shared<Semaphore>(clock, 0);
@@ -310,7 +310,7 @@ TEST_F(OperationQueueTest, DestroyedOnItsOwnThreadItDoesNotWaitForItsOtherThread
 
 using OperationQueueDeathTest = OperationQueueTest;
 
-TEST_F(OperationQueueDeathTest, AnOperationThatThrowsEndsTheProgram) {
+TEST_F(OperationQueueDeathTest, ThrowingOperationEndsTheProgram) {
   GTEST_FLAG_SET(death_test_style, "threadsafe");
   EXPECT_DEATH(OperationQueue(1).add([] { throw std::runtime_error("operation"); }), "operation");
 }

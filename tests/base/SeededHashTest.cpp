@@ -31,7 +31,7 @@ TEST(SeededHash, LengthContentAndSecretDecide) {
 }
 
 /// Content that turns one factor of a product into zero for whoever knows the factors but not the secret.
-TEST(SeededHash, NoPartOfABlockTakesAnothersWeight) {
+TEST(SeededHash, EachPartOfABlockDecides) {
   for (const std::size_t fixed : {0U, 1U, 2U, 3U}) {
     std::set<std::uint64_t> hashes;
     for (std::uint64_t i = 0; i < kMany; ++i) {

@@ -14,7 +14,7 @@ namespace {
 
 using namespace std::chrono_literals;
 
-TEST(Semaphore, GivesItsInitialCountWithoutASignal) {
+TEST(Semaphore, InitialCountNeedsNoSignal) {
   VirtualTime time;
   Semaphore semaphore(time, 2);
   EXPECT_TRUE(semaphore.wait());
@@ -41,7 +41,7 @@ TEST(Semaphore, WaitsForASignalOfAnotherThread) {
   waiter.join();
 }
 
-TEST(Semaphore, GivesUpAtTheDeadlineAndLosesNoSignal) {
+TEST(Semaphore, WaitEndsAtDeadlineAndLosesNoSignal) {
   VirtualTime time;
   Semaphore semaphore(time, 0);
   std::thread waiter([&] { EXPECT_FALSE(semaphore.wait(time.now() + 60s)); });
@@ -52,7 +52,7 @@ TEST(Semaphore, GivesUpAtTheDeadlineAndLosesNoSignal) {
   EXPECT_TRUE(semaphore.wait(time.now()));
 }
 
-TEST(Semaphore, OneSignalLetsOneOfSeveralWaitersGo) {
+TEST(Semaphore, OneSignalWakesOneOfSeveralWaiters) {
   VirtualTime time;
   Semaphore semaphore(time, 0);
   std::atomic<int> let = 0;

@@ -60,7 +60,7 @@ TEST(SerialQueue, IsCurrentInsideItsWorkOnly) {
   EXPECT_FALSE(queue.isCurrent());
 }
 
-TEST(SerialQueue, ReportsReentryWithItsLabelInsteadOfHanging) {
+TEST(SerialQueue, ThrowsOnReentryWithItsLabel) {
   SerialQueue queue("com.corvel.qor.Zephtra.AppRestore");
   bool inner = false;
   try {
@@ -73,7 +73,7 @@ TEST(SerialQueue, ReportsReentryWithItsLabelInsteadOfHanging) {
   EXPECT_EQ(queue.sync([] { return 1; }), 1);
 }
 
-TEST(SerialQueue, ReportsReentryThroughAnotherQueue) {
+TEST(SerialQueue, ThrowsOnReentryThroughAnotherQueue) {
   SerialQueue queue("outer");
   SerialQueue other("inner");
   EXPECT_THROW(queue.sync([&] { other.sync([&] { queue.sync([] {}); }); }), std::logic_error);
@@ -81,7 +81,7 @@ TEST(SerialQueue, ReportsReentryThroughAnotherQueue) {
   EXPECT_FALSE(other.isCurrent());
 }
 
-TEST(SerialQueue, KeepsWorkOfSeveralThreadsApart) {
+TEST(SerialQueue, RunsWorkOfSeveralThreadsOneAtATime) {
   SerialQueue queue("q");
   constexpr int kRounds = 500;
   int unguarded = 0;
@@ -97,7 +97,7 @@ TEST(SerialQueue, KeepsWorkOfSeveralThreadsApart) {
   EXPECT_EQ(unguarded, 4 * kRounds);
 }
 
-TEST(SerialQueue, TakesThreadsInTheOrderOfAsking) {
+TEST(SerialQueue, RunsThreadsInTheOrderOfSubmission) {
   SerialQueue queue("q");
   Gate gate;
   gate.close();
@@ -117,7 +117,7 @@ TEST(SerialQueue, TakesThreadsInTheOrderOfAsking) {
   EXPECT_EQ(queue.waiting(), 0u);
 }
 
-TEST(SerialQueue, AThreadThatSubmitsAgainGoesBehindThoseThatWait) {
+TEST(SerialQueue, ResubmittingThreadQueuesBehindWaiters) {
   SerialQueue queue("q");
   std::vector<std::string> order;
   std::thread other;

@@ -40,7 +40,7 @@ TEST_F(ThreadSchedulerTest, MayBeDestroyedUnused) {
   scheduler.reset();
 }
 
-TEST_F(ThreadSchedulerTest, RunsTasksOnOneThreadOfItsOwn) {
+TEST_F(ThreadSchedulerTest, RunsTasksOnOneDedicatedThread) {
   std::vector<std::thread::id> runners;
   for (int i = 0; i < 3; ++i) {
     scheduler->after(0s, [&] {
@@ -55,7 +55,7 @@ TEST_F(ThreadSchedulerTest, RunsTasksOnOneThreadOfItsOwn) {
   EXPECT_EQ(runners[1], runners[2]);
 }
 
-TEST_F(ThreadSchedulerTest, RunsATaskWhenItsDelayIsOverAndNotBefore) {
+TEST_F(ThreadSchedulerTest, RunsTaskExactlyAfterItsDelay) {
   scheduler->after(30s, record(1));
   time.waitUntilWaiting(1);
   time.advance(30s - 1ns);
@@ -65,7 +65,7 @@ TEST_F(ThreadSchedulerTest, RunsATaskWhenItsDelayIsOverAndNotBefore) {
   EXPECT_TRUE(ran.wait());
 }
 
-TEST_F(ThreadSchedulerTest, RunsTasksInOrderOfDueTimeAndThenOfScheduling) {
+TEST_F(ThreadSchedulerTest, RunsTasksByDueTimeThenBySchedulingOrder) {
   Gate gate;
   gate.close();
   scheduler->after(0s, [&] { gate.pass(); });
@@ -83,7 +83,7 @@ TEST_F(ThreadSchedulerTest, RunsTasksInOrderOfDueTimeAndThenOfScheduling) {
   EXPECT_EQ(order, (std::vector{0, 1, 2, 2, 3, 4}));
 }
 
-TEST_F(ThreadSchedulerTest, ATaskThatIsDueSoonerOvertakesTheOneWaitedFor) {
+TEST_F(ThreadSchedulerTest, EarlierTaskOvertakesAwaitedOne) {
   scheduler->after(1h, record(2));
   time.waitUntilWaiting(1);
   scheduler->after(1s, record(1));
@@ -92,7 +92,7 @@ TEST_F(ThreadSchedulerTest, ATaskThatIsDueSoonerOvertakesTheOneWaitedFor) {
   EXPECT_EQ(order, (std::vector{1}));
 }
 
-TEST_F(ThreadSchedulerTest, TakesADelayBeyondTheEndOfTime) {
+TEST_F(ThreadSchedulerTest, AcceptsDelayBeyondTheEndOfTime) {
   scheduler->after(Duration::max(), record(1));
   scheduler->after(0s, record(2));
   EXPECT_TRUE(ran.wait());
@@ -121,7 +121,7 @@ TEST_F(ThreadSchedulerTest, DestroysATaskRightAfterItRan) {
   EXPECT_TRUE(gone);
 }
 
-TEST_F(ThreadSchedulerTest, DropsWhatIsNotYetDueWhenDestroyed) {
+TEST_F(ThreadSchedulerTest, DestructorDropsTasksNotDue) {
   auto captured = std::make_shared<int>();
   const std::weak_ptr<int> watch = captured;
   scheduler->after(1s, [captured = std::move(captured)] { ADD_FAILURE() << "ran"; });
@@ -129,7 +129,7 @@ TEST_F(ThreadSchedulerTest, DropsWhatIsNotYetDueWhenDestroyed) {
   EXPECT_TRUE(watch.expired());
 }
 
-TEST_F(ThreadSchedulerTest, ClosedItDropsWhatIsNotYetDueAndWhatComesLater) {
+TEST_F(ThreadSchedulerTest, CloseDropsTasksNotDueAndLaterOnes) {
   auto captured = std::make_shared<int>();
   const std::weak_ptr<int> watch = captured;
   scheduler->after(1s, [captured = std::move(captured)] { ADD_FAILURE() << "ran"; });
@@ -142,7 +142,7 @@ TEST_F(ThreadSchedulerTest, ClosedItDropsWhatIsNotYetDueAndWhatComesLater) {
   scheduler->close();
 }
 
-TEST_F(ThreadSchedulerTest, DestroyedFromOutsideItWaitsForTheRunningTaskAndThoseThatAreDue) {
+TEST_F(ThreadSchedulerTest, DestructorWaitsForRunningAndDueTasks) {
   Gate gate;
   gate.close();
   scheduler->after(0s, [&] {
@@ -158,7 +158,7 @@ TEST_F(ThreadSchedulerTest, DestroyedFromOutsideItWaitsForTheRunningTaskAndThose
   opener.join();
 }
 
-TEST_F(ThreadSchedulerTest, WhatTasksScheduleWhileItIsDestroyedIsDropped) {
+TEST_F(ThreadSchedulerTest, DropsTasksScheduledDuringDestruction) {
   Gate gate;
   gate.close();
   scheduler->after(0s, [&] {
@@ -171,7 +171,7 @@ TEST_F(ThreadSchedulerTest, WhatTasksScheduleWhileItIsDestroyedIsDropped) {
   EXPECT_TRUE(order.empty());
 }
 
-TEST_F(ThreadSchedulerTest, WhatADroppedTaskCapturedMayScheduleAsItGoes) {
+TEST_F(ThreadSchedulerTest, DestructorOfDroppedCaptureMaySchedule) {
   scheduler->after(1s, [last = std::make_shared<AtEnd>([this] { scheduler->after(0s, record(1)); })] {});
   scheduler.reset();
   EXPECT_TRUE(order.empty());
@@ -192,7 +192,7 @@ TEST_F(ThreadSchedulerTest, MayBeDestroyedByItsOwnTask) {
   EXPECT_TRUE(done->wait());
 }
 
-TEST_F(ThreadSchedulerTest, MayBeDestroyedWithWhatItsOwnTaskCaptured) {
+TEST_F(ThreadSchedulerTest, MayBeDestroyedWithACaptureOfItsTask) {
   for (int round = 0; round < 100; ++round) {
     const auto done = std::make_shared<Semaphore>(clock, 0);
     Gate gate;
@@ -208,7 +208,7 @@ TEST_F(ThreadSchedulerTest, MayBeDestroyedWithWhatItsOwnTaskCaptured) {
   }
 }
 
-TEST_F(ThreadSchedulerTest, DestroyedOnItsOwnThreadItStillRunsWhatIsDue) {
+TEST_F(ThreadSchedulerTest, DestroyedOnOwnThreadRunsDueTasks) {
   const auto done = std::make_shared<Semaphore>(clock, 0);
   Gate gate;
   gate.close();
@@ -227,7 +227,7 @@ TEST_F(ThreadSchedulerTest, DestroyedOnItsOwnThreadItStillRunsWhatIsDue) {
   EXPECT_EQ(order, (std::vector{1, 2}));
 }
 
-TEST_F(ThreadSchedulerTest, RunsOnTheMachinesClockToo) {
+TEST_F(ThreadSchedulerTest, WorksWithTheSystemClock) {
   ThreadScheduler real(clock);
   real.after(1h, record(2));
   real.after(1ms, record(1));

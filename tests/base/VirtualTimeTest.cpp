@@ -34,7 +34,7 @@ class VirtualTimeTest : public testing::Test {
   const TimePoint start = time.now();
 };
 
-TEST_F(VirtualTimeTest, MovesByAdvanceOnly) {
+TEST_F(VirtualTimeTest, AdvancesOnRequestOnly) {
   EXPECT_EQ(time.now(), start);
   time.advance(3s);
   EXPECT_EQ(time.now(), start + 3s);
@@ -42,19 +42,19 @@ TEST_F(VirtualTimeTest, MovesByAdvanceOnly) {
   EXPECT_EQ(time.now(), start + 3s);
 }
 
-TEST_F(VirtualTimeTest, NeverGoesBack) {
+TEST_F(VirtualTimeTest, IsMonotonic) {
   time.advance(-5s);
   EXPECT_EQ(time.now(), start);
 }
 
-TEST_F(VirtualTimeTest, NeverRunsATaskInsideTheCallThatSchedulesIt) {
+TEST_F(VirtualTimeTest, NeverRunsTaskDuringAfter) {
   time.after(0s, record("now"));
   EXPECT_TRUE(ran.empty());
   time.advance(0s);
   EXPECT_EQ(ran, (Runs{{"now", 0s}}));
 }
 
-TEST_F(VirtualTimeTest, RunsTasksInOrderOfDueTimeEachAtItsOwnTime) {
+TEST_F(VirtualTimeTest, RunsTasksInOrderAtTheirDueTimes) {
   time.after(30s, record("third"));
   time.after(10s, record("first"));
   time.after(20s, record("second"));
@@ -63,7 +63,7 @@ TEST_F(VirtualTimeTest, RunsTasksInOrderOfDueTimeEachAtItsOwnTime) {
   EXPECT_EQ(time.now(), start + 1min);
 }
 
-TEST_F(VirtualTimeTest, RunsTasksThatAreDueTogetherInOrderOfScheduling) {
+TEST_F(VirtualTimeTest, RunsSimultaneousTasksInSchedulingOrder) {
   time.after(10s, record("a"));
   time.after(10s, record("b"));
   time.advance(5s);
@@ -72,7 +72,7 @@ TEST_F(VirtualTimeTest, RunsTasksThatAreDueTogetherInOrderOfScheduling) {
   EXPECT_EQ(ran, (Runs{{"a", 10s}, {"b", 10s}, {"c", 10s}}));
 }
 
-TEST_F(VirtualTimeTest, RunsATaskWhenItsTimeIsReachedAndNotBefore) {
+TEST_F(VirtualTimeTest, RunsTaskExactlyAtItsDueTime) {
   time.after(30s, record("retry"));
   time.advance(30s - 1ns);
   EXPECT_TRUE(ran.empty());
@@ -87,7 +87,7 @@ TEST_F(VirtualTimeTest, RunsATaskOnce) {
   EXPECT_EQ(ran.size(), 1u);
 }
 
-TEST_F(VirtualTimeTest, TakesADelayThatIsNotPositiveAsNone) {
+TEST_F(VirtualTimeTest, TreatsNonPositiveDelayAsZero) {
   time.advance(10s);
   time.after(0s, record("at once"));
   time.after(-5s, record("late"));
@@ -95,7 +95,7 @@ TEST_F(VirtualTimeTest, TakesADelayThatIsNotPositiveAsNone) {
   EXPECT_EQ(ran, (Runs{{"at once", 10s}, {"late", 10s}}));
 }
 
-TEST_F(VirtualTimeTest, TakesDelaysBeyondTheEndOfTime) {
+TEST_F(VirtualTimeTest, AcceptsDelaysBeyondTheEndOfTime) {
   time.advance(10s);
   time.after(Duration::max(), record("never"));
   EXPECT_EQ(time.nextDue(), kForever);
@@ -103,7 +103,7 @@ TEST_F(VirtualTimeTest, TakesDelaysBeyondTheEndOfTime) {
   EXPECT_TRUE(ran.empty());
 }
 
-TEST_F(VirtualTimeTest, RunsWhatTasksScheduleInTheSameAdvance) {
+TEST_F(VirtualTimeTest, RunsTasksOfTasksInTheSameAdvance) {
   time.after(10s, [this] {
     record("outer")();
     time.after(0s, record("at once"));
@@ -126,7 +126,7 @@ TEST_F(VirtualTimeTest, DestroysATaskRightAfterItRan) {
   EXPECT_TRUE(gone);
 }
 
-TEST_F(VirtualTimeTest, DropsWhatIsPendingWhenDestroyed) {
+TEST_F(VirtualTimeTest, DestructorDropsPendingTasks) {
   auto captured = std::make_shared<int>();
   const std::weak_ptr<int> watch = captured;
   {
@@ -149,7 +149,7 @@ TEST_F(VirtualTimeTest, RefusesToAdvanceInsideATask) {
   EXPECT_TRUE(refused);
 }
 
-TEST_F(VirtualTimeTest, EndsAnAdvanceWithWhatATaskThrows) {
+TEST_F(VirtualTimeTest, AdvancePassesExceptionsOn) {
   time.after(1s, [] { throw std::runtime_error("task"); });
   time.after(2s, record("next"));
   EXPECT_THROW(time.advance(1min), std::runtime_error);
@@ -159,7 +159,7 @@ TEST_F(VirtualTimeTest, EndsAnAdvanceWithWhatATaskThrows) {
   EXPECT_EQ(ran, (Runs{{"next", 2s}}));
 }
 
-TEST_F(VirtualTimeTest, TellsWhatIsPending) {
+TEST_F(VirtualTimeTest, ReportsPendingTasks) {
   EXPECT_EQ(time.pendingTasks(), 0u);
   EXPECT_EQ(time.nextDue(), std::nullopt);
   time.after(30s, record("b"));
@@ -183,7 +183,7 @@ TEST_F(VirtualTimeTest, WaitsUntilOtherThreadsHaveScheduled) {
   other.join();
 }
 
-TEST_F(VirtualTimeTest, WakesAWaiterWhenItsDeadlineIsReachedAndNotBefore) {
+TEST_F(VirtualTimeTest, WakesWaiterExactlyAtItsDeadline) {
   Semaphore semaphore(time, 0);
   std::optional<TimePoint> woken;
   std::thread waiter([&] {
@@ -198,7 +198,7 @@ TEST_F(VirtualTimeTest, WakesAWaiterWhenItsDeadlineIsReachedAndNotBefore) {
   EXPECT_EQ(woken, start + 60s);
 }
 
-TEST_F(VirtualTimeTest, WakesAWaiterAtItsDeadlineBeforeATaskThatIsDueLater) {
+TEST_F(VirtualTimeTest, WakesWaiterBeforeLaterTask) {
   Semaphore semaphore(time, 0);
   std::thread waiter([&] { EXPECT_FALSE(semaphore.wait(start + 1s)); });
   time.waitUntilWaiting(1);
@@ -210,7 +210,7 @@ TEST_F(VirtualTimeTest, WakesAWaiterAtItsDeadlineBeforeATaskThatIsDueLater) {
   EXPECT_EQ(ran, (Runs{{"joined", 2s}}));
 }
 
-TEST_F(VirtualTimeTest, LeavesAWaiterAloneThatIsNotifiedBeforeItIsReady) {
+TEST_F(VirtualTimeTest, IgnoresNotificationBeforeReady) {
   std::mutex mutex;
   std::condition_variable condition;
   bool ready = false;
@@ -262,7 +262,7 @@ TEST_F(VirtualTimeTest, DoesNotCountWaitersWithoutADeadline) {
   forever.join();
 }
 
-TEST_F(VirtualTimeTest, DoesNotCountAWaiterThatIsPastItsDeadlineButHasNotLeftYet) {
+TEST_F(VirtualTimeTest, DoesNotCountWaiterPastItsDeadline) {
   Gate gate;
   gate.close();
   std::mutex mutex;
@@ -293,7 +293,7 @@ TEST_F(VirtualTimeTest, DoesNotCountAWaiterThatIsPastItsDeadlineButHasNotLeftYet
   leaving.join();
 }
 
-TEST_F(VirtualTimeTest, AWaiterMayDestroyWhatItWaitedOnWhileTimeMoves) {
+TEST_F(VirtualTimeTest, WaiterMayDestroyItsConditionDuringAdvance) {
   for (int round = 0; round < 200; ++round) {
     const TimePoint deadline = time.now() + 1s;
     std::thread waiter([&] {
@@ -306,7 +306,7 @@ TEST_F(VirtualTimeTest, AWaiterMayDestroyWhatItWaitedOnWhileTimeMoves) {
   }
 }
 
-TEST_F(VirtualTimeTest, SignalsRacingWithDeadlinesAreNeitherLostNorDoubled) {
+TEST_F(VirtualTimeTest, SignalsRacingDeadlinesAreDeliveredOnce) {
   constexpr int kRounds = 200;
   Semaphore semaphore(time, 0);
   int taken = 0;
@@ -329,7 +329,7 @@ TEST_F(VirtualTimeTest, SignalsRacingWithDeadlinesAreNeitherLostNorDoubled) {
   EXPECT_EQ(taken, kRounds);
 }
 
-TEST_F(VirtualTimeTest, AdvancesOnSeveralThreadsFollowOneAnother) {
+TEST_F(VirtualTimeTest, SerialisesConcurrentAdvances) {
   for (int i = 1; i <= 100; ++i)
     time.after(i * 1s, [this, i] { EXPECT_EQ(time.now(), start + i * 1s); });
   std::thread other([this] { time.advance(50s); });

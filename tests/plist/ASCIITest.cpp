@@ -20,7 +20,7 @@ std::string described(const Value& value) {
   return text;
 }
 
-TEST(PropertyListText, ReadsContainersStringsAndData) {
+TEST(PropertyListASCII, ReadsContainersStringsAndData) {
   const auto value =
       plist::read(bytesOf("// first\n{ a = b; \"c d\" = ( 1, 'x y', ); e = <0f A0\n1>; f = {}; g = () }"));
   EXPECT_EQ(outcome(value), "Data that is not a pair of digits at byte 52");
@@ -33,25 +33,25 @@ TEST(PropertyListText, ReadsContainersStringsAndData) {
                                     {"g", Array{}}}));
 }
 
-TEST(PropertyListText, DecodesEscapes) {
+TEST(PropertyListASCII, DecodesEscapes) {
   EXPECT_EQ(*plist::readText(bytesOf(R"("\"\\\n\t\101\U00e9\UD83D\UDE00\q")")), Value("\"\\\n\tAé😀q"));
   EXPECT_EQ(failureOf(plist::readText(bytesOf(R"("\UD83D x")"))), Failure::badText);
   EXPECT_EQ(failureOf(plist::readText(bytesOf(R"("\UDE00")"))), Failure::badText);
 }
 
-TEST(PropertyListText, ReadsAStringsFile) {
+TEST(PropertyListASCII, ReadsAStringsFile) {
   EXPECT_EQ(*plist::read(bytesOf("/* Title */\n\"a b\" = \"c\";\nd = e;\nf;\n")),
             Value(Dictionary{{"a b", "c"}, {"d", "e"}, {"f", "f"}}));
 }
 
-TEST(PropertyListText, ReadsBareRoots) {
+TEST(PropertyListASCII, ReadsBareRoots) {
   EXPECT_EQ(*plist::read(bytesOf(" word ")), Value("word"));
   EXPECT_EQ(*plist::read(bytesOf("<00 ff>")), Value::data({Bytes{std::byte{0}, std::byte{0xFF}}}));
   EXPECT_EQ(*plist::read(bytesOf("<>")), Value::data({}));
   EXPECT_EQ(*plist::read(bytesOf("\xFF\xFE\"\0x\0\"\0"s)), Value("x"));
 }
 
-TEST(PropertyListText, RefusesWhatIsNoPropertyList) {
+TEST(PropertyListASCII, RefusesOtherDocuments) {
   for (const char* text :
        {"",      " ",    "{",          "{a",   "{a =", "{a = b",         "{a = b;",   "(",   "(a", "(a b)",
         "<0",    "<0>",  "\"a",        "\"\\", "'",    "{a = b c = d;}", "two words", "/* ", "//", "}",
@@ -60,7 +60,7 @@ TEST(PropertyListText, RefusesWhatIsNoPropertyList) {
   }
 }
 
-TEST(PropertyListText, ReadsNoDeeperThanItsLimit) {
+TEST(PropertyListASCII, RefusesTooDeepNesting) {
   EXPECT_TRUE(plist::read(bytesOf(std::string(512, '(') + std::string(512, ')'))).ok());
   EXPECT_EQ(failureOf(plist::read(bytesOf(std::string(513, '(') + std::string(513, ')')))), Failure::tooDeep);
   EXPECT_EQ(failureOf(plist::read(bytesOf(std::string(100000, '(')))), Failure::tooDeep);
@@ -87,7 +87,7 @@ TEST(PropertyListDescription, TakesOneLineInMessages) {
   EXPECT_EQ(formatMessage("%{public}@", Value(Array{"a\nb\"\\"})), R"(("a\nb\"\\"))");
 }
 
-TEST(PropertyListDescription, CutsLongDataAndDeepNesting) {
+TEST(PropertyListDescription, TruncatesLongDataAndDeepNesting) {
   EXPECT_EQ(described(Bytes(24, std::byte{0xAB})), "<abababababababababababababababababababababababab>");
   EXPECT_EQ(described(Bytes(25, std::byte{0xAB})), "<abababababababababababababababababababababababab… 25 bytes>");
   Value deep;
@@ -96,7 +96,7 @@ TEST(PropertyListDescription, CutsLongDataAndDeepNesting) {
   EXPECT_EQ(described(deep), std::string(32, '(') + "…" + std::string(32, ')'));
 }
 
-TEST(PropertyListDescription, OfAnArrayIsThatOfItsValue) {
+TEST(PropertyListDescription, DescribesArraysLikeTheirValues) {
   for (const Array& array :
        {Array{}, Array{1, "two words", Array{"x"}, Dictionary{{"a", "b"}}}, Array(1'000'000, "text")}) {
     std::string text;
@@ -105,7 +105,7 @@ TEST(PropertyListDescription, OfAnArrayIsThatOfItsValue) {
   }
 }
 
-TEST(PropertyListDescription, OfSharedContentStaysShort) {
+TEST(PropertyListDescription, TruncatesExpandedSharedContent) {
   Value value = "text";
   for (int i = 0; i < 60; ++i)
     value = Array{value, value};

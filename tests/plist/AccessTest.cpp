@@ -12,13 +12,13 @@ using plist::booleanIn;
 using plist::entryHas;
 using plist::keysOf;
 
-TEST(PropertyListAccess, BooleansNumbersAndTrueWordsAreTrue) {
+TEST(PropertyListAccess, ConvertsBooleansNumbersAndWordsToTrue) {
   for (const plist::Value& value : {plist::Value(true), plist::Value(1), plist::Value(-0.5), plist::Value("yes"),
                                     plist::Value("True"), plist::Value("12")})
     EXPECT_TRUE(booleanIn(&value));
 }
 
-TEST(PropertyListAccess, EverythingElseIsFalse) {
+TEST(PropertyListAccess, ConvertsOtherValuesToFalse) {
   EXPECT_FALSE(booleanIn(nullptr));
   for (const plist::Value& value :
        {plist::Value(), plist::Value(false), plist::Value(0), plist::Value("no"), plist::Value(""),
@@ -26,7 +26,7 @@ TEST(PropertyListAccess, EverythingElseIsFalse) {
     EXPECT_FALSE(booleanIn(&value));
 }
 
-TEST(PropertyListAccess, AnEntryHasExactlyTheTextItHas) {
+TEST(PropertyListAccess, ComparesTextOfEntriesExactly) {
   const plist::Value entry(plist::Dictionary{{"operation", "remove"}, {"number", 7}});
   EXPECT_TRUE(entryHas(entry, "operation", "remove"));
   EXPECT_FALSE(entryHas(entry, "operation", "Remove"));
@@ -35,7 +35,7 @@ TEST(PropertyListAccess, AnEntryHasExactlyTheTextItHas) {
   EXPECT_FALSE(entryHas("operation", "operation", "remove"));
 }
 
-TEST(PropertyListAccess, KeysComeInTheirOrder) {
+TEST(PropertyListAccess, ReturnsKeysInOrder) {
   EXPECT_EQ(keysOf({{"b", 1}, {"a", 2}, {"", 3}}), (std::vector<std::string>{"", "a", "b"}));
   EXPECT_TRUE(keysOf({}).empty());
 }

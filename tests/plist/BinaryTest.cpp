@@ -23,7 +23,7 @@ Result<Value> readObjects(const std::vector<std::string>& objects) {
   return plist::readBinary(bytesOf(binaryDocument(objects)));
 }
 
-TEST(PropertyListBinary, ReadsBackWhatItWrote) {
+TEST(PropertyListBinary, ReadsWrittenDocuments) {
   const auto document = plist::writeBinary(sampleValue());
   ASSERT_TRUE(document.ok());
   const auto value = plist::readBinary(*document);
@@ -38,7 +38,7 @@ TEST(PropertyListBinary, KeepsUidsRealsAndFractionsOfSeconds) {
   EXPECT_EQ(*read, value);
 }
 
-TEST(PropertyListBinary, LongDataStaysInADocumentThatIsGivenAway) {
+TEST(PropertyListBinary, LongDataRefersToMovedDocument) {
   const Bytes data(5'000, std::byte{7});
   const Dictionary value{{"long", data}, {"again", data}, {"short", Value::data(bytesOf("short"))}, {"text", "text"}};
   Bytes document = *plist::writeBinary(value);
@@ -60,7 +60,7 @@ TEST(PropertyListBinary, LongDataStaysInADocumentThatIsGivenAway) {
   EXPECT_EQ(*kept, Value(data)) << "data keeps the document";
 }
 
-TEST(PropertyListBinary, ADocumentThatIsGivenAwayIsReadWhateverItsForm) {
+TEST(PropertyListBinary, ReadsMovedDocumentsOfEveryFormat) {
   const Value value = Dictionary{{"data", Bytes(5'000, std::byte{7})}};
   auto xml = plist::read(std::move(plist::writeXML(value)).value());
   ASSERT_TRUE(xml.ok()) << outcome(xml);
@@ -80,7 +80,7 @@ TEST(PropertyListBinary, EqualValuesGiveEqualBytes) {
   EXPECT_EQ(textOf(plist::writeBinary(built)), textOf(plist::writeBinary(listed)));
 }
 
-TEST(PropertyListBinary, WritesTheKnownBytes) {
+TEST(PropertyListBinary, WritesKnownBytes) {
   const auto document = plist::writeBinary(Dictionary{{"a", Array{1, true, "a"}}});
   const std::string objects =
       "bplist00"
@@ -103,7 +103,7 @@ TEST(PropertyListBinary, StoresEqualScalarsOnce) {
   EXPECT_LT(document->size(), 3200U);
 }
 
-TEST(PropertyListBinary, ManyObjectsTakeWiderReferences) {
+TEST(PropertyListBinary, WidensReferencesForManyObjects) {
   for (const int count : {254, 255, 256, 65534, 65535, 65536, 70000}) {
     Array numbers;
     for (int i = 0; i < count; ++i)
@@ -130,7 +130,7 @@ TEST(PropertyListBinary, DictionariesOfManyShapesKeepTheirKeys) {
   EXPECT_EQ(textOf(plist::writeBinary(*read)), textOf(plist::writeBinary(value)));
 }
 
-TEST(PropertyListBinary, RefusesNullWhereverItIs) {
+TEST(PropertyListBinary, RefusesToWriteNull) {
   for (const Value& value : {Value(), Value(Array{1, Value()}), Value(Dictionary{{"a", Value()}})}) {
     const auto document = plist::writeBinary(value);
     ASSERT_FALSE(document.ok());
@@ -151,7 +151,7 @@ TEST(PropertyListBinary, RefusesToWriteDatesOutsideTheCalendar) {
   EXPECT_FALSE(plist::writeBinary(Value(Date{std::numeric_limits<double>::quiet_NaN()})).ok());
 }
 
-TEST(PropertyListBinary, WritesAndReadsNoDeeperThanItsLimit) {
+TEST(PropertyListBinary, RefusesTooDeepNesting) {
   Value value = Array{};
   for (int depth = 1; depth < plist::kMaximumDepth; ++depth)
     value = Array{std::move(value)};
@@ -191,7 +191,7 @@ TEST(PropertyListBinary, ReadsUidsOfOneToEightBytes) {
   EXPECT_EQ(failureOf(readObjects({"\x88"s + std::string(9, '\0')})), Failure::outOfRange);
 }
 
-TEST(PropertyListBinary, OfEqualKeysTheLastOneCounts) {
+TEST(PropertyListBinary, LastOfEqualKeysWins) {
   EXPECT_EQ(*readObjects({"\xD2\x01\x01\x02\x03"s, "\x51k", "\x10\x01", "\x10\x02"}), Value(Dictionary{{"k", 2}}));
   EXPECT_EQ(*readObjects({"\xD2\x01\x02\x03\x04"s, "\x51k", "\x51k", "\x10\x01", "\x10\x02"}),
             Value(Dictionary{{"k", 2}}));
@@ -211,7 +211,7 @@ TEST(PropertyListBinary, AcceptsKeysInAnyOrder) {
   EXPECT_EQ(*value, Value(Array{entry, entry}));
 }
 
-TEST(PropertyListBinary, RefusesKeysThatAreNoStrings) {
+TEST(PropertyListBinary, RefusesNonStringKeys) {
   EXPECT_EQ(failureOf(readObjects({"\xD1\x01\x01"s, "\x10\x01"})), Failure::malformed);
 }
 

@@ -64,7 +64,7 @@ std::string dictionaryOf(std::string_view references) {
   return std::string(1, static_cast<char>(0xD0 + references.size() / 2)).append(references);
 }
 
-TEST(PropertyListEntries, ComeInTheOrderOfTheKeysInEveryForm) {
+TEST(DictionaryStream, VisitsEntriesInKeyOrderInEveryFormat) {
   for (const std::string& document : documents()) {
     auto entries = DictionaryStream::open(bytesOfText(document));
     ASSERT_TRUE(entries) << failureOf(entries);
@@ -72,14 +72,14 @@ TEST(PropertyListEntries, ComeInTheOrderOfTheKeysInEveryForm) {
   }
 }
 
-TEST(PropertyListEntries, CanBeVisitedAgain) {
+TEST(DictionaryStream, CanBeVisitedAgain) {
   auto entries = DictionaryStream::open(bytesOfText(documents().front()));
   ASSERT_TRUE(entries);
   const Entries first = entriesOf(*entries);
   EXPECT_EQ(entriesOf(*entries), first);
 }
 
-TEST(PropertyListEntries, WrittenInAnyOrderComeInTheOrderOfTheKeys) {
+TEST(DictionaryStream, SortsEntriesOfUnsortedDocuments) {
   const std::string document =
       binaryDocument({dictionaryOf("\1\2\3\4\5\6"), "Qc", "Qa", "Qb", "\x10\3", "\x10\1", "\x10\2"});
   auto entries = DictionaryStream::open(bytesOfText(document));
@@ -87,7 +87,7 @@ TEST(PropertyListEntries, WrittenInAnyOrderComeInTheOrderOfTheKeys) {
   EXPECT_EQ(entriesOf(*entries), (Entries{{"a", 1}, {"b", 2}, {"c", 3}}));
 }
 
-TEST(PropertyListEntries, OfEqualKeysTheLastOneCounts) {
+TEST(DictionaryStream, LastOfEqualKeysWins) {
   const std::string document =
       binaryDocument({dictionaryOf("\1\2\3\4\5\6"), "Qb", "Qa", "Qb", "\x10\1", "\x10\2", "\x10\3"});
   auto entries = DictionaryStream::open(bytesOfText(document));
@@ -95,38 +95,38 @@ TEST(PropertyListEntries, OfEqualKeysTheLastOneCounts) {
   EXPECT_EQ(entriesOf(*entries), (Entries{{"a", 2}, {"b", 3}}));
 }
 
-TEST(PropertyListEntries, OfAnEmptyDictionaryThereAreNone) {
+TEST(DictionaryStream, EmptyDictionaryHasNoEntries) {
   auto entries = DictionaryStream::open(bytesOfText(textOf(plist::writeBinary(Dictionary()))));
   ASSERT_TRUE(entries) << failureOf(entries);
   EXPECT_EQ(entriesOf(*entries), Entries{});
 }
 
-TEST(PropertyListEntries, AnotherRootHasNone) {
+TEST(DictionaryStream, RefusesRootThatIsNotADictionary) {
   for (const Value& root : {Value(plist::Array{"a"}), Value("text"), Value(7)}) {
     const auto entries = DictionaryStream::open(bytesOfText(textOf(plist::writeBinary(root))));
     EXPECT_EQ(failureOf(entries), "The root is not a dictionary");
   }
 }
 
-TEST(PropertyListEntries, AnEntryThatCannotBeReadIsFoundBeforeAnyIsHandedOut) {
+TEST(DictionaryStream, OpenFailsForAnyInvalidEntry) {
   const std::string document = binaryDocument({dictionaryOf("\1\2\3\4"), "Qa", "Qb", "\x10\1", "\x07"});
   expectAsWhole(document);
   EXPECT_FALSE(DictionaryStream::open(bytesOfText(document)));
 }
 
-TEST(PropertyListEntries, AKeyThatIsNoStringIsRefused) {
+TEST(DictionaryStream, RefusesNonStringKey) {
   const std::string document = binaryDocument({dictionaryOf("\1\2"), "\x10\1", "\x10\1"});
   expectAsWhole(document);
   EXPECT_FALSE(DictionaryStream::open(bytesOfText(document)));
 }
 
-TEST(PropertyListEntries, ARootInsideItselfIsRefused) {
+TEST(DictionaryStream, RefusesRootThatContainsItself) {
   const std::string document = binaryDocument({dictionaryOf(std::string_view("\1\0", 2)), "Qa"});
   expectAsWhole(document);
   EXPECT_FALSE(DictionaryStream::open(bytesOfText(document)));
 }
 
-TEST(PropertyListEntries, WhatUnfoldsTooFarIsRefused) {
+TEST(DictionaryStream, RefusesTooLargeExpansion) {
   // Each array holds the next one fourteen times.
   std::vector<std::string> objects{dictionaryOf("\1\2"), "Qa"};
   for (char next = 3; next <= 8; ++next)
@@ -139,7 +139,7 @@ TEST(PropertyListEntries, WhatUnfoldsTooFarIsRefused) {
   EXPECT_EQ(entries.error().code, static_cast<long>(Failure::tooLarge)) << failureOf(entries);
 }
 
-TEST(PropertyListEntries, WhatEntriesShareIsInEachOfThem) {
+TEST(DictionaryStream, ReadsSharedContentInEachEntry) {
   const std::string document = binaryDocument({dictionaryOf("\1\2\3\3"), "Qa", "Qb", "\xA2\4\4", "\xA2\5\5", "\x10\1"});
   expectAsWhole(document);
   auto entries = DictionaryStream::open(bytesOfText(document));
@@ -149,7 +149,7 @@ TEST(PropertyListEntries, WhatEntriesShareIsInEachOfThem) {
   EXPECT_EQ(entriesOf(*entries), (Entries{{"a", both}, {"b", both}}));
 }
 
-TEST(PropertyListEntries, OfDamagedDocumentsTheyAreWhatTheWholeIs) {
+TEST(DictionaryStream, ReadsDamagedDocumentsLikeTheWhole) {
   for (std::string document : documents()) {
     for (std::size_t size = 0; size < document.size(); ++size)
       expectAsWhole(std::string_view(document).substr(0, size));

@@ -1,4 +1,4 @@
-// Documents by somebody who means harm, or by a disk that forgets.
+// Damaged and malicious documents.
 #include <gtest/gtest.h>
 
 #include "tests/plist/Samples.h"
@@ -36,7 +36,7 @@ std::vector<std::string> documents() {
           "{ a = \"b\\U00e9\"; c = (1, <0f a0>, { d = e; }); /* f */ }"};
 }
 
-TEST(PropertyListHostile, CutOffAtEveryByte) {
+TEST(PropertyListHostile, ReadsDocumentsTruncatedAtEveryByte) {
   for (const std::string& document : documents()) {
     const std::size_t complete = document.find_last_not_of('\n') + 1;
     for (std::size_t size = 0; size < complete; ++size) {
@@ -49,7 +49,7 @@ TEST(PropertyListHostile, CutOffAtEveryByte) {
   }
 }
 
-TEST(PropertyListHostile, EverySingleBitFlipped) {
+TEST(PropertyListHostile, ReadsDocumentsWithEachBitFlipped) {
   for (std::string document : documents()) {
     for (std::size_t bit = 0; bit < document.size() * 8; ++bit) {
       const auto flip = static_cast<char>(1U << bit % 8);
@@ -60,7 +60,7 @@ TEST(PropertyListHostile, EverySingleBitFlipped) {
   }
 }
 
-TEST(PropertyListHostile, EveryByteOfTheTrailerAtItsExtremes) {
+TEST(PropertyListHostile, ReadsExtremeTrailers) {
   const std::string document = documents().front();
   for (std::size_t at = document.size() - 32; at < document.size(); ++at) {
     for (const char byte : {'\0', '\x7F', '\x80', '\xFF'}) {
@@ -71,7 +71,7 @@ TEST(PropertyListHostile, EveryByteOfTheTrailerAtItsExtremes) {
   }
 }
 
-TEST(PropertyListHostile, LengthsBeyondTheDocument) {
+TEST(PropertyListHostile, RefusesLengthsBeyondTheDocument) {
   for (const char* marker : {"\x4F", "\x5F", "\x6F", "\xAF", "\xDF"}) {
     for (const char fill : {'\x7F', '\xFF'}) {
       const std::string object = marker + std::string("\x13") + std::string(8, fill);
@@ -83,7 +83,7 @@ TEST(PropertyListHostile, LengthsBeyondTheDocument) {
   }
 }
 
-TEST(PropertyListHostile, AContainerThatHoldsItself) {
+TEST(PropertyListHostile, RefusesContainerThatContainsItself) {
   EXPECT_EQ(failureOf(readExactly(binaryDocument({std::string("\xA1\0", 2)}))), Failure::tooDeep);
   EXPECT_EQ(failureOf(readExactly(binaryDocument({std::string("\xA3\0\0\0", 4)}))), Failure::tooDeep);
   EXPECT_EQ(failureOf(readExactly(binaryDocument({std::string("\xD1\x01\0", 3), "\x51k"}))), Failure::tooDeep);
@@ -91,11 +91,11 @@ TEST(PropertyListHostile, AContainerThatHoldsItself) {
             Failure::tooDeep);
 }
 
-TEST(PropertyListHostile, AKeyThatHoldsItsDictionary) {
+TEST(PropertyListHostile, RefusesKeyThatContainsItsDictionary) {
   EXPECT_FALSE(readExactly(binaryDocument({std::string("\xD1\0\x01", 3), "\x51k"})).ok());
 }
 
-TEST(PropertyListHostile, ASmallFileThatUnfoldsIntoCountlessValues) {
+TEST(PropertyListHostile, RefusesExpansionToTooManyValues) {
   std::vector<std::string> objects;
   for (char i = 1; i <= 60; ++i)
     objects.push_back(std::string("\xA2") + i + i);
@@ -109,7 +109,7 @@ TEST(PropertyListHostile, ASmallFileThatUnfoldsIntoCountlessValues) {
   EXPECT_EQ(failureOf(readExactly(binaryDocument(objects))), Failure::tooLarge);
 }
 
-TEST(PropertyListHostile, LongTextReferredToCountlessTimes) {
+TEST(PropertyListHostile, RefusesExpansionToTooMuchText) {
   // One string of 60 KB and lists of lists of it.
   std::string text = std::string("\x5F\x11\xEA\x60", 4) + std::string(60000, 'x');
   std::string document = "bplist00";
@@ -123,13 +123,13 @@ TEST(PropertyListHostile, LongTextReferredToCountlessTimes) {
   EXPECT_EQ(failureOf(readExactly(withTable(document, offsets))), Failure::tooLarge);
 }
 
-TEST(PropertyListHostile, ObjectsThatLieInEachOther) {
+TEST(PropertyListHostile, RefusesOverlappingObjects) {
   for (const OverlappingObjects what :
        {OverlappingObjects::arrays, OverlappingObjects::texts, OverlappingObjects::same})
     EXPECT_EQ(failureOf(readExactly(overlappingDocument(what))), Failure::malformed);
 }
 
-TEST(PropertyListHostile, SharedContentThatIsNotTooMuchIsFine) {
+TEST(PropertyListHostile, ReadsModeratelySharedContent) {
   std::vector<std::string> objects = {"\xAF\x10\x64" + std::string(100, '\x01'), "\xA4\x02\x02\x03\x03", "\x51x",
                                       "\x5F\x10\x40" + std::string(64, 'y')};
   const auto value = readExactly(binaryDocument(objects));
@@ -138,7 +138,7 @@ TEST(PropertyListHostile, SharedContentThatIsNotTooMuchIsFine) {
   EXPECT_EQ(*value, Value(Array(100, inner)));
 }
 
-TEST(PropertyListHostile, WritersRefuseCountlessAndEndlessValues) {
+TEST(PropertyListHostile, WritersRefuseTooLargeAndTooDeepValues) {
   Value value = "text";
   for (int i = 0; i < 60; ++i)
     value = Array{value, value};
@@ -151,7 +151,7 @@ TEST(PropertyListHostile, WritersRefuseCountlessAndEndlessValues) {
   EXPECT_EQ(plist::writeXML(deep).error().code, static_cast<long>(Failure::tooDeep));
 }
 
-TEST(PropertyListHostile, TextThatLooksLikeAllForms) {
+TEST(PropertyListHostile, RefusesPrefixesOfAllFormats) {
   for (const char* text :
        {"bplist", "bplist00", "bplist15", "bplist00<plist>", "<", "<?", "<!", "</", "<a", "\xFE\xFF", "\xFF\xFE",
         "\xEF\xBB\xBF", "\xFE\xFF\0", "<plist><dict><key>", "<!DOCTYPE", "<!DOCTYPE [", "&", "<![CDATA["}) {

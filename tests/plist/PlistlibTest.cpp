@@ -69,7 +69,7 @@ std::string rewritten(std::string_view documents) {
 
 class PropertyListPlistlib : public testing::TestWithParam<int> {};
 
-TEST_P(PropertyListPlistlib, ReadsWhatWeWriteAndWritesWhatWeRead) {
+TEST_P(PropertyListPlistlib, AgreesWithPlistlib) {
   const TemporaryFolder folder;
   const auto theirs = std::filesystem::path(folder.path("theirs"));
   const auto ours = std::filesystem::path(folder.path("ours"));

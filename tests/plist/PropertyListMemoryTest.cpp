@@ -21,7 +21,7 @@ std::size_t mostHeldReading(const std::string& document) {
   return memory::mostHeldDuring([&] { static_cast<void>(plist::readBinary(bytesOf(document))); });
 }
 
-TEST(PropertyListMemory, IsInProportionToTheDocument) {
+TEST(PropertyListMemory, IsProportionalToTheDocument) {
   constexpr std::size_t kElements = 0x6060;
   std::string list = "bplist00\xAF\x11\x60\x60" + std::string(kElements, '\x01') + '\x09';
   const std::string document = withTable(list, {8, list.size() - 1});
@@ -30,7 +30,7 @@ TEST(PropertyListMemory, IsInProportionToTheDocument) {
   EXPECT_LE(mostHeldReading(document), document.size() * kMostPerByte);
 }
 
-TEST(PropertyListMemory, IsInProportionToADocumentWhoseObjectsLieInEachOther) {
+TEST(PropertyListMemory, IsProportionalDespiteOverlappingObjects) {
   for (const OverlappingObjects what :
        {OverlappingObjects::arrays, OverlappingObjects::texts, OverlappingObjects::same}) {
     const std::string document = overlappingDocument(what);

@@ -13,7 +13,7 @@
 
 namespace appsync::test {
 
-/// One of everything that both forms can hold.
+/// One value of each kind that both formats can represent.
 inline plist::Value sampleValue() {
   using plist::Array;
   using plist::Dictionary;
@@ -85,7 +85,7 @@ inline std::string overlappingDocument(OverlappingObjects what) {
   return withTable(std::move(document), offsets);
 }
 
-/// What became of reading a document, for messages of tests: "value" or the error's text.
+/// Returns "value" or the text of the error, for test messages.
 inline std::string outcome(const Result<plist::Value>& result) {
   return result ? "value" : result.error().text;
 }

@@ -25,7 +25,7 @@ TEST(PropertyListValue, IsNullWithoutContent) {
   EXPECT_EQ(Value().type(), Type::null);
 }
 
-TEST(PropertyListValue, ACharacterPointerBecomesAStringAndNotABoolean) {
+TEST(PropertyListValue, ConvertsCharacterPointerToString) {
   EXPECT_EQ(Value("x").type(), Type::string);
   EXPECT_EQ(Value(true).type(), Type::boolean);
   EXPECT_EQ(Value(1).type(), Type::integer);
@@ -43,7 +43,7 @@ TEST(PropertyListValue, HoldsTheWholeSignedAndUnsignedRange) {
   EXPECT_EQ(Value(std::uint64_t{7}).int64(), 7);
 }
 
-TEST(PropertyListValue, AnswersNothingForAnotherType) {
+TEST(PropertyListValue, ReturnsNulloptForAnotherType) {
   const Value text("1");
   EXPECT_EQ(text.boolean(), std::nullopt);
   EXPECT_EQ(text.int64(), std::nullopt);
@@ -70,7 +70,7 @@ TEST(PropertyListValue, KeepsTextAndDataOfEveryLength) {
   }
 }
 
-TEST(PropertyListValue, ACopyDoesNotSeeChangesOfTheOther) {
+TEST(PropertyListValue, CopiesAreIndependent) {
   Value first = Dictionary{{"list", Array{1, 2}}, {"name", "a"}};
   const Value copy = first;
   first.dictionary()->find("list")->array()->push_back(3);
@@ -80,7 +80,7 @@ TEST(PropertyListValue, ACopyDoesNotSeeChangesOfTheOther) {
   EXPECT_EQ(first, Value(Dictionary{{"list", Array{1, 2, 3}}, {"name", "b"}, {"more", true}}));
 }
 
-TEST(PropertyListValue, AValueMayBeAssignedAPartOfItself) {
+TEST(PropertyListValue, AcceptsAssignmentOfItsOwnPart) {
   Value value = Dictionary{{"inner", Dictionary{{"text", "a text that does not fit into thirty bytes"}}}};
   value = *value.find("inner");
   value = *value.find("text");
@@ -99,7 +99,7 @@ TEST(PropertyListValue, ThreadsMayUseAndChangeCopiesOfOneValue) {
   EXPECT_EQ(shared.find("list")->array()->size(), 2U);
 }
 
-TEST(PropertyListValue, EqualityTellsTypesApart) {
+TEST(PropertyListValue, ValuesOfDifferentTypesAreNotEqual) {
   EXPECT_NE(Value(1), Value(1.0));
   EXPECT_NE(Value(1), Value(true));
   EXPECT_NE(Value(Uid{1}), Value(1));
@@ -108,7 +108,7 @@ TEST(PropertyListValue, EqualityTellsTypesApart) {
   EXPECT_NE(Value(), Value(false));
 }
 
-TEST(PropertyListValue, ANaNEqualsANaN) {
+TEST(PropertyListValue, NaNEqualsNaN) {
   const double nan = std::numeric_limits<double>::quiet_NaN();
   EXPECT_EQ(Value(nan), Value(-nan));
   EXPECT_EQ(Value(Array{nan}), Value(Array{nan}));
@@ -116,7 +116,7 @@ TEST(PropertyListValue, ANaNEqualsANaN) {
   EXPECT_EQ(Value(0.0), Value(-0.0));
 }
 
-TEST(PropertyListValue, NestingOfAnyDepthIsComparedCopiedAndDestroyed) {
+TEST(PropertyListValue, HandlesNestingOfAnyDepth) {
   Value arrays;
   Value same;
   Value dictionaries;
@@ -140,7 +140,7 @@ TEST(PropertyListDictionary, KeepsItsKeysInTheOrderOfTheirBytes) {
   EXPECT_EQ(keys, ",B,aa,b,\xC3\xA9,");
 }
 
-TEST(PropertyListDictionary, OfEqualKeysTheLastOneCounts) {
+TEST(PropertyListDictionary, LastOfEqualKeysWins) {
   const Dictionary dictionary{{"a", 1}, {"b", 2}, {"a", 3}};
   EXPECT_EQ(dictionary.size(), 2U);
   EXPECT_EQ(*dictionary.find("a"), Value(3));
@@ -163,7 +163,7 @@ TEST(PropertyListDictionary, SetsFindsAndErases) {
   EXPECT_EQ(*std::as_const(dictionary).find("1"), Value("changed"));
 }
 
-TEST(PropertyListDictionary, ACopyKeepsWhatTheOtherErases) {
+TEST(PropertyListDictionary, EraseDoesNotChangeCopies) {
   Dictionary dictionary{{"a", 1}, {"b", 2}};
   const Dictionary copy = dictionary;
   EXPECT_TRUE(dictionary.erase("a"));
@@ -172,20 +172,20 @@ TEST(PropertyListDictionary, ACopyKeepsWhatTheOtherErases) {
   EXPECT_EQ(dictionary, (Dictionary{{"b", 2}, {"c", 3}}));
 }
 
-TEST(PropertyListDictionary, AKeyMayBeATextWithinTheDictionary) {
+TEST(PropertyListDictionary, AcceptsKeyFromItsOwnContent) {
   Dictionary dictionary{{"a", "z"}, {"m", 1}};
   dictionary.set(*std::as_const(dictionary).find("a")->string(), 2);
   EXPECT_EQ(dictionary, (Dictionary{{"a", "z"}, {"m", 1}, {"z", 2}}));
 }
 
-TEST(PropertyListFind, ToleratesNothing) {
+TEST(PropertyListFind, ReturnsNullForNull) {
   const Value value = Dictionary{{"a", Dictionary{{"b", 1}}}};
   EXPECT_EQ(*plist::find(plist::find(&value, "a"), "b"), Value(1));
   EXPECT_EQ(plist::find(plist::find(&value, "x"), "b"), nullptr);
   EXPECT_EQ(plist::find(nullptr, "b"), nullptr);
 }
 
-TEST(PropertyListStringIn, OnlyAStringGivesText) {
+TEST(PropertyListStringIn, ReturnsNulloptForOtherTypes) {
   const Value text("com.a");
   EXPECT_EQ(plist::stringIn(&text), "com.a");
   EXPECT_EQ(plist::ownedStringIn(&text), "com.a");
@@ -204,7 +204,7 @@ struct TruthCase {
 
 class PropertyListTruth : public testing::TestWithParam<TruthCase> {};
 
-TEST_P(PropertyListTruth, IsAsTabled) {
+TEST_P(PropertyListTruth, ConvertsAsTabled) {
   EXPECT_EQ(plist::truth(GetParam().value), GetParam().truth);
 }
 

@@ -20,7 +20,7 @@ Result<Value> readElement(std::string_view element) {
   return plist::readXML(bytesOf("<plist version=\"1.0\">" + std::string(element) + "</plist>"));
 }
 
-TEST(PropertyListXML, ReadsBackWhatItWrote) {
+TEST(PropertyListXML, ReadsWrittenDocuments) {
   const auto document = plist::writeXML(sampleValue());
   ASSERT_TRUE(document.ok());
   const auto value = plist::readXML(*document);
@@ -28,7 +28,7 @@ TEST(PropertyListXML, ReadsBackWhatItWrote) {
   EXPECT_EQ(*value, sampleValue());
 }
 
-TEST(PropertyListXML, WritesTheKnownText) {
+TEST(PropertyListXML, WritesKnownText) {
   const auto document =
       plist::writeXML(Dictionary{{"a&b", Array{true, -1, 0.5, "<x>"}}, {"d", Bytes(58, std::byte{0})}, {"e", Array{}}});
   EXPECT_EQ(textOf(document), R"(<?xml version="1.0" encoding="UTF-8"?>
@@ -53,14 +53,14 @@ TEST(PropertyListXML, WritesTheKnownText) {
 )");
 }
 
-TEST(PropertyListXML, RefusesWhatItCannotHold) {
+TEST(PropertyListXML, RefusesValuesThatXMLCannotRepresent) {
   for (const Value& value : {Value(), Value(Array{Value()}), Value(plist::Uid{1}), Value("\x01"), Value("\xFF"),
                              Value("\xEF\xBF\xBF"), Value(Date{1e300}), Value(Dictionary{{"\x02", 1}})}) {
     EXPECT_FALSE(plist::writeXML(value).ok());
   }
 }
 
-TEST(PropertyListXML, KeepsCarriageReturnsAndCutsFractionsOfSeconds) {
+TEST(PropertyListXML, KeepsCarriageReturnsDropsFractionsOfSeconds) {
   EXPECT_EQ(*plist::readXML(*plist::writeXML(Value("a\r\nb\r"))), Value("a\r\nb\r"));
   EXPECT_EQ(*plist::readXML(*plist::writeXML(Value(Date{1.75}))), Value(Date{1}));
   EXPECT_EQ(*plist::readXML(*plist::writeXML(Value(Date{-0.25}))), Value(Date{-1}));
@@ -74,7 +74,7 @@ TEST(PropertyListXML, ReadsIntegersDecimalAndHexadecimal) {
   EXPECT_EQ(*readElement("<integer>-0x10</integer>"), Value(-16));
 }
 
-TEST(PropertyListXML, RefusesIntegersThatAreNoneOrTooLarge) {
+TEST(PropertyListXML, RefusesInvalidAndTooLargeIntegers) {
   EXPECT_EQ(failureOf(readElement("<integer>18446744073709551616</integer>")), Failure::outOfRange);
   EXPECT_EQ(failureOf(readElement("<integer>-9223372036854775809</integer>")), Failure::outOfRange);
   for (const char* text : {"", "1.5", "0x", "--1", "1 2", "x"}) {
@@ -95,7 +95,7 @@ TEST(PropertyListXML, ReadsReals) {
   }
 }
 
-TEST(PropertyListXML, ReadsDatesOfTheCalendarOnly) {
+TEST(PropertyListXML, RefusesDatesOutsideTheCalendar) {
   EXPECT_EQ(*readElement("<date>2001-01-01T00:00:00Z</date>"), Value(Date{0}));
   EXPECT_EQ(*readElement("<date>2000-02-29T23:59:59Z</date>"), Value(Date{-26438401}));
   EXPECT_EQ(*readElement("<date>0001-01-01T00:00:00Z</date>"), Value(Date{-63113904000}));
@@ -107,7 +107,7 @@ TEST(PropertyListXML, ReadsDatesOfTheCalendarOnly) {
   }
 }
 
-TEST(PropertyListXML, ReadsDataWithSpaceAnywhereInIt) {
+TEST(PropertyListXML, IgnoresWhiteSpaceInData) {
   EXPECT_EQ(*readElement("<data>\n\tYW\r\nJ j\n</data>"), Value::data(bytesOf("abc")));
   EXPECT_EQ(*readElement("<data>YQ==</data>"), Value::data(bytesOf("a")));
   EXPECT_EQ(*readElement("<data>YWI=\n</data>"), Value::data(bytesOf("ab")));
@@ -124,7 +124,7 @@ TEST(PropertyListXML, DecodesReferences) {
   EXPECT_EQ(*readElement("<dict><key>&amp;</key><true/></dict>"), Value(Dictionary{{"&", true}}));
 }
 
-TEST(PropertyListXML, RefusesReferencesToForbiddenCharactersAndUnknownEntities) {
+TEST(PropertyListXML, RefusesInvalidReferences) {
   for (const char* text : {"&#0;", "&#xD800;", "&#xDFFF;", "&#x1;", "&#xFFFE;", "&#x110000;", "&#99999999999;"}) {
     EXPECT_EQ(failureOf(readElement("<string>" + std::string(text) + "</string>")), Failure::badText) << text;
   }
@@ -133,12 +133,12 @@ TEST(PropertyListXML, RefusesReferencesToForbiddenCharactersAndUnknownEntities) 
   }
 }
 
-TEST(PropertyListXML, ReadsSectionsCommentsAndInstructionsWithinText) {
+TEST(PropertyListXML, ReadsSectionsAndCommentsWithinText) {
   EXPECT_EQ(*readElement("<string>a<![CDATA[<&]]]>b<!-- no -->c<?no?>d</string>"), Value("a<&]bcd"));
   EXPECT_EQ(*readElement("<!-- --><?x?><true/><!---->"), Value(true));
 }
 
-TEST(PropertyListXML, UnifiesLineEnds) {
+TEST(PropertyListXML, NormalisesLineEnds) {
   EXPECT_EQ(*readElement("<string>a\r\nb\rc\n<![CDATA[\r\n\r]]></string>"), Value("a\nb\nc\n\n\n"));
 }
 
@@ -164,7 +164,7 @@ std::string asUTF16(std::string_view ascii, bool isBig) {
   return out;
 }
 
-TEST(PropertyListXML, ReadsUTF16WithAndWithoutAByteOrderMark) {
+TEST(PropertyListXML, ReadsUTF16WithAndWithoutByteOrderMark) {
   const std::string_view text = "<?xml version=\"1.0\" encoding=\"UTF-16\"?><string>x</string>";
   EXPECT_EQ(*plist::read(bytesOf("\xFE\xFF" + asUTF16(text, true))), Value("x"));
   EXPECT_EQ(*plist::read(bytesOf("\xFF\xFE" + asUTF16(text, false))), Value("x"));
@@ -175,7 +175,7 @@ TEST(PropertyListXML, ReadsUTF16WithAndWithoutAByteOrderMark) {
             Failure::badText);
 }
 
-TEST(PropertyListXML, SkipsAByteOrderMarkAndRefusesOtherEncodings) {
+TEST(PropertyListXML, SkipsByteOrderMarkRefusesOtherEncodings) {
   EXPECT_EQ(*plist::read(bytesOf("\xEF\xBB\xBF<true/>")), Value(true));
   EXPECT_EQ(*plist::read(bytesOf("<?xml version='1.0' encoding='utf-8'?><true/>")), Value(true));
   EXPECT_EQ(failureOf(plist::read(bytesOf("<?xml version='1.0' encoding='latin-1'?><true/>"))), Failure::unsupported);
@@ -201,14 +201,14 @@ TEST(PropertyListXML, AcceptsAttributesAndSpaceInTags) {
   EXPECT_FALSE(readElement("<array><true/><false / ></array>").ok());
 }
 
-TEST(PropertyListXML, OfEqualKeysTheLastOneCounts) {
+TEST(PropertyListXML, LastOfEqualKeysWins) {
   const std::string twice = "<dict><key>a</key><true/><key>b</key><true/><key>a</key><false/></dict>";
   const Value once = Dictionary{{"a", false}, {"b", true}};
   EXPECT_EQ(*readElement(twice), once);
   EXPECT_EQ(*readElement("<array>" + twice + twice + "</array>"), Value(Array{once, once}));
 }
 
-TEST(PropertyListXML, DictionariesWithLikeAndUnlikeKeysKeepTheirOwn) {
+TEST(PropertyListXML, ReadsDictionariesOfSameAndOtherKeys) {
   const auto value = readElement(
       "<array><dict><key>b</key><true/><key>a</key><false/></dict><dict><key>b</key><false/><key>a</key><true/></dict>"
       "<dict><key>b</key><true/></dict><dict/><dict><key>b</key><true/><key>c</key><false/><key>a</key><true/></dict>"
@@ -219,7 +219,7 @@ TEST(PropertyListXML, DictionariesWithLikeAndUnlikeKeysKeepTheirOwn) {
                         Dictionary{{"b", true}}, Dictionary{}, Dictionary{{"a", true}, {"b", true}, {"c", false}}}));
 }
 
-TEST(PropertyListXML, RefusesWhatIsNoPropertyList) {
+TEST(PropertyListXML, RefusesOtherDocuments) {
   for (const char* text : {"",
                            "<plist/>",
                            "<plist></plist>",
@@ -252,7 +252,7 @@ TEST(PropertyListXML, RefusesWhatIsNoPropertyList) {
   }
 }
 
-TEST(PropertyListXML, ReadsNoDeeperThanItsLimit) {
+TEST(PropertyListXML, RefusesTooDeepNesting) {
   const auto nested = [](int depth) {
     std::string text;
     for (int i = 0; i < depth; ++i)
