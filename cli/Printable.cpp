@@ -9,7 +9,6 @@
 namespace appsync::cli {
 namespace {
 
-
 /// Returns the character's number of columns, or a negative number if it is unsafe for a terminal.
 int columnsOf(const Character& character) {
   if (!character.valid || isUnsafeForDisplay(character.code)) return -1;

@@ -1,11 +1,12 @@
 #include "common/Identifiers.h"
 
+#include "plist/Access.h"
 #include "plist/PropertyList.h"
 
 namespace appsync {
 
 bool isValidBundleIdentifier(const plist::Value* value) {
-  const auto text = stringIn(value);
+  const auto text = plist::stringIn(value);
   return text && isValidBundleIdentifier(*text);
 }
 

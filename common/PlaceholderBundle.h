@@ -9,8 +9,8 @@
 #include "common/PlugInLog.h"
 #include "platform/FileSystem.h"
 #include "platform/InstallTypes.h"
-#include "platform/SyncFiles.h"
 #include "platform/Platform.h"
+#include "platform/SyncFiles.h"
 #include "plist/PropertyList.h"
 
 namespace appsync {

@@ -37,7 +37,7 @@ plist::Dictionary AppsClient::installedAssets() {
 
   // Each identifier once, in order. Refer to the two lists.
   std::vector<std::string_view> candidates;
-  std::unordered_set<std::string_view, SecretHash> seen;
+  std::unordered_set<std::string_view, SeededHash> seen;
   const auto addCandidate = [&](std::string_view identifier) {
     if (seen.insert(identifier).second) candidates.push_back(identifier);
   };

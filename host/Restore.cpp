@@ -13,6 +13,7 @@
 #include "device/storage/SystemCalls.h"
 #include "host/DeviceApps.h"
 #include "host/RestoreInfo.h"
+#include "plist/Access.h"
 
 namespace appsync::host {
 namespace {

@@ -52,8 +52,8 @@ void check(const Result<plist::Value>& value) {
   require(formatMessage("%{public}@", *value).find('\n') == std::string::npos);
 }
 
-/// Requires the stream to have the content of the whole document. Shared content counts for each entry, so that only one
-/// of the two may exceed the expansion limits.
+/// Requires the stream to have the content of the whole document. Shared content counts for each entry, so that only
+/// one of the two may exceed the expansion limits.
 void checkEntries(ByteView document, const Result<plist::Value>& whole) {
   auto entries = plist::DictionaryStream::open(Bytes(document.begin(), document.end()));
   if (isTooMuch(whole) || isTooMuch(entries)) return;

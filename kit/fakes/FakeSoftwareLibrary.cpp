@@ -4,7 +4,6 @@
 #include <utility>
 
 #include "kit/fakes/CallJournal.h"
-#include "kit/fakes/CallJournal.h"
 #include "kit/fakes/Patience.h"
 
 namespace appsync::test {

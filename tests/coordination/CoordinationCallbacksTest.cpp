@@ -232,8 +232,8 @@ TEST_F(CoordinationCallbacks, ACoordinatorWithoutAnIdentifierIsIgnored) {
   EXPECT_TRUE(platform.log.lines().empty());
   nameless();
   platform.coordination.complete("com.x", std::nullopt, CallbackOn::callingThread);
-  EXPECT_TRUE(sameLines({logged("coordinatorDidCompleteSuccessfully for (null) with error (null)")},
-                        platform.log.lines()));
+  EXPECT_TRUE(
+      sameLines({logged("coordinatorDidCompleteSuccessfully for (null) with error (null)")}, platform.log.lines()));
   EXPECT_TRUE(asked().empty());
   EXPECT_EQ(platform.journal.count("fileSystem."), 0U);
 }
