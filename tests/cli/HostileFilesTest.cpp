@@ -45,7 +45,7 @@ TEST_F(HostileFiles, DoesNotWaitForPipeAsManifest) {
   expectUnusable(runTool({"restore", device(), path("backup")}),
                  path("backup") + " is not a usable backup: " + path("backup/Manifest.plist") +
                      " cannot be read: it is a pipe or a device, not a file; name a folder that "
-                     "`appsync backup` made");
+                     "`appsync backup` created");
 }
 
 TEST_F(HostileFiles, ReportsLogPipeWithoutReader) {

@@ -212,7 +212,7 @@ TEST_F(Plist, RefusesInvalidPropertyList) {
   write(path("in"), "bplist00");
   const Finished run = runTool({"plist", path("in")});
   EXPECT_EQ(run.status, 3);
-  EXPECT_THAT(run.err, HasSubstr("is not a property list that can be read"));
+  EXPECT_THAT(run.err, HasSubstr("cannot be read as a property list"));
 }
 
 TEST_F(Plist, FailureKeepsTheOutput) {

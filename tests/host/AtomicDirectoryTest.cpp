@@ -67,7 +67,7 @@ TEST_F(AtomicDirectoryTest, ReplacesLeftoversOfACrash) {
   for (const std::string left : {"", "content/deep/file", "half-removed/file"}) {
     fs::create_directory(path(".backup.partial"));
     if (!left.empty()) {
-      write(".backup.partial/.appsync-directory");
+      write(".backup.partial/.appsync-draft");
       write(".backup.partial/" + left);
     }
     {

@@ -25,7 +25,7 @@ TEST(HostState, InvalidFileIsAnError) {
     ASSERT_FALSE(state.ok()) << document;
     EXPECT_TRUE(state.error().text.starts_with(folder.path("host-state.plist") + " is damaged (")) << document;
     EXPECT_TRUE(state.error().text.ends_with(
-        "); put a good copy in its place, or remove it: then apps that were deleted are sent again"))
+        "); replace it with a good copy, or remove it: apps that were deleted are then sent again"))
         << document;
   }
 }
@@ -36,7 +36,7 @@ TEST(HostState, UnreadableFileIsAnError) {
   EXPECT_EQ(loadHostState(folder.path()).error(),
             (Error{std::string(domains::kPOSIX), EISDIR,
                    Error::fromErrno(EISDIR, folder.path("host-state.plist") + " cannot be read").text +
-                       "; put a good copy in its place, or remove it: then apps that were deleted are sent again",
+                       "; replace it with a good copy, or remove it: apps that were deleted are then sent again",
                    nullptr}));
 }
 

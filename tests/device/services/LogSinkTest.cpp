@@ -98,10 +98,9 @@ TEST_F(FileLogSinkTest, APipeThatNobodyReadsIsAClearError) {
   makePipe(path);
   const auto opened = FileLogSink::open(path);
   ASSERT_FALSE(opened);
-  EXPECT_EQ(
-      opened.error(),
-      (Error{std::string(domains::kPOSIX), ENXIO,
-             "cannot open log file \"" + path + "\": nobody reads from this pipe; start its reader first", nullptr}));
+  EXPECT_EQ(opened.error(),
+            (Error{std::string(domains::kPOSIX), ENXIO,
+                   "cannot open log file \"" + path + "\": the pipe has no reader; start its reader first", nullptr}));
 }
 
 TEST_F(FileLogSinkTest, AFileThatCannotBeOpenedIsAClearError) {
