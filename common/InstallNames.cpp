@@ -7,7 +7,7 @@
 
 #include "base/Message.h"
 
-namespace appsync::platform {
+namespace appsync {
 
 namespace {
 
@@ -33,16 +33,16 @@ std::string nameIn(const std::array<std::string_view, kCount>& names, Enumeratio
 
 }  // namespace
 
-void appendDescription(std::string& out, TSInstallType type) {
-  out += nameIn(kTypeNames, type, "Unknown Install Type: %lu");
+std::string installTypeName(platform::TSInstallType type) {
+  return nameIn(kTypeNames, type, "Unknown Install Type: %lu");
 }
 
-void appendDescription(std::string& out, TSInstallState state) {
-  out += nameIn(kStateNames, state, "Unknown Install State: %lu");
+std::string installStateName(platform::TSInstallState state) {
+  return nameIn(kStateNames, state, "Unknown Install State: %lu");
 }
 
-void appendDescription(std::string& out, TSInstallPhase phase) {
-  out += nameIn(kPhaseNames, phase, "Unknown Install Phase: %lu");
+std::string installPhaseName(platform::TSInstallPhase phase) {
+  return nameIn(kPhaseNames, phase, "Unknown Install Phase: %lu");
 }
 
-}  // namespace appsync::platform
+}  // namespace appsync

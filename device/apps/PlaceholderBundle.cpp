@@ -22,30 +22,30 @@ namespace appsync::device {
 
 namespace {
 
-std::optional<Bytes> readIcon(DeviceFileSystem& files, const PlaceholderContents& placeholder) {
-  if (!placeholder.iconPath) return std::nullopt;
-  const Result<FileDescriptor> file = files.root().open(*placeholder.iconPath, O_RDONLY | O_NONBLOCK);
+std::optional<Bytes> readIcon(DeviceFileSystem& files, const PlaceholderContents& contents) {
+  if (!contents.iconPath) return std::nullopt;
+  const Result<FileDescriptor> file = files.root().open(*contents.iconPath, O_RDONLY | O_NONBLOCK);
   Bytes bytes;
   if (!file || tree::read(file->get(), kMaximumMetadataBytes, bytes) != 0) return std::nullopt;
   return bytes;
 }
 
-const std::string& shownName(const PlaceholderContents& placeholder) {
-  return placeholder.bundleName.empty() ? placeholder.identifier : placeholder.bundleName;
+const std::string& shownName(const PlaceholderContents& contents) {
+  return contents.bundleName.empty() ? contents.identifier : contents.bundleName;
 }
 
-std::optional<std::string> versionOf(const PlaceholderContents& placeholder) {
-  if (placeholder.attributes.bundleVersion()) return placeholder.attributes.bundleVersion();
-  return ownedStringIn(placeholder.attributes.infoDictionary().find(platform::kBundleVersionKey));
+std::optional<std::string> versionOf(const PlaceholderContents& contents) {
+  if (contents.attributes.bundleVersion()) return contents.attributes.bundleVersion();
+  return ownedStringIn(contents.attributes.infoDictionary().find(platform::kBundleVersionKey));
 }
 
 /// Returns the app's info dictionary with the placeholder's values.
-Result<Bytes> infoDocument(const PlaceholderContents& placeholder, const StoredBundle& bundle, bool hasIcon) {
-  plist::Dictionary info = placeholder.attributes.infoDictionary();
-  info.set(platform::BundleIdentifierKey, placeholder.identifier);
+Result<Bytes> infoDocument(const PlaceholderContents& contents, const StoredBundle& bundle, bool hasIcon) {
+  plist::Dictionary info = contents.attributes.infoDictionary();
+  info.set(platform::BundleIdentifierKey, contents.identifier);
   info.set(platform::kBundleDisplayNameKey, bundle.name);
   info.set(platform::kBundleExecutableKey, bundle.name);
-  info.set(kLaunchProhibitedKey, placeholder.attributes.launchProhibited());
+  info.set(kLaunchProhibitedKey, contents.attributes.launchProhibited());
   if (bundle.version) info.set(platform::kBundleVersionKey, *bundle.version);
   if (hasIcon) {
     info.set(platform::kBundleIconFileKey, kPlaceholderIconName);
@@ -69,22 +69,22 @@ Status writeApp(const PendingContainer& container, const std::string& folder, By
 
 }  // namespace
 
-Result<PlaceholderContainer> makePlaceholder(DeviceFileSystem& files, const PlaceholderContents& placeholder) {
-  const std::optional<Bytes> icon = readIcon(files, placeholder);
+Result<PlaceholderContainer> makePlaceholder(DeviceFileSystem& files, const PlaceholderContents& contents) {
+  const std::optional<Bytes> icon = readIcon(files, contents);
   StoredBundle bundle;
-  bundle.folder = placeholder.identifier + ".app";
-  bundle.name = shownName(placeholder);
-  bundle.version = versionOf(placeholder);
-  bundle.installType = placeholder.installType;
+  bundle.folder = contents.identifier + ".app";
+  bundle.name = shownName(contents);
+  bundle.version = versionOf(contents);
+  bundle.installType = contents.installType;
   bundle.installedAt = std::chrono::duration<double>(std::chrono::system_clock::now().time_since_epoch()).count();
-  const Result<Bytes> info = infoDocument(placeholder, bundle, icon.has_value());
+  const Result<Bytes> info = infoDocument(contents, bundle, icon.has_value());
   if (!info) return info.error().in("the placeholder's Info.plist");
   bundle.bytes = info->size() + (icon ? icon->size() : 0);
   Result<PendingContainer> container = PendingContainer::make(files);
   if (!container) return container.error();
   RETURN_IF_ERROR(writeApp(*container, bundle.folder, *info, icon));
-  if (placeholder.storeMetadata) {
-    RETURN_IF_ERROR(container->writeFile(kStoreMetadataName, *placeholder.storeMetadata));
+  if (contents.storeMetadata) {
+    RETURN_IF_ERROR(container->writeFile(kStoreMetadataName, *contents.storeMetadata));
   }
   return PlaceholderContainer{std::move(container).value(), std::move(bundle)};
 }
