@@ -49,7 +49,7 @@ bool isForbidden(device::Device& device, RestrictionSetting setting) {
 
 host::IdentifierSet deletedIn(const plist::Dictionary& report) {
   host::IdentifierSet identifiers;
-  const plist::Value* deleted = report.find("_Deleted");
+  const plist::Value* deleted = report.find(kDeletedKey);
   if (deleted == nullptr || deleted->array() == nullptr) return identifiers;
   for (const plist::Value& app : *deleted->array()) {
     if (const auto identifier = stringIn(app.find(platform::BundleIdentifierKey))) identifiers.emplace(*identifier);

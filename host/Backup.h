@@ -21,8 +21,8 @@ namespace backup_files {
 inline constexpr std::string_view kManifest = "Manifest.plist";
 inline constexpr std::string_view kApps = "Apps";
 inline constexpr std::string_view kStoreMetadata = kStoreMetadataName;
-inline constexpr std::string_view kLicence = "ApplicationSINF";
-inline constexpr std::string_view kIcon = "PlaceholderIcon";
+inline constexpr std::string_view kLicence = restore_file::kLicenceKey;
+inline constexpr std::string_view kIcon = restore_file::kIconKey;
 inline constexpr std::string_view kData = "Data";
 }  // namespace backup_files
 

@@ -13,6 +13,7 @@
 #include "device/storage/SystemCalls.h"
 #include "host/DeviceApps.h"
 #include "host/RestoreInfo.h"
+#include "platform/SyncFiles.h"
 #include "plist/Access.h"
 
 namespace appsync::host {
@@ -21,7 +22,6 @@ namespace {
 using platform::TSInstallType;
 
 constexpr std::string_view kHostRestoreFolder = "/var/mobile/Media/HarvoRestore";
-constexpr std::string_view kHostRestorePath = "/var/mobile/Media/HarvoRestore/RestoreApplications.plist";
 constexpr std::string_view kBackupKey = "Backup";
 
 Error refusal(std::string text) {
@@ -103,12 +103,12 @@ Status Restore::putFilesInPlace() {
     if (!app.isDemoted()) continue;
     (app.demotion == TSInstallType::Downgrade ? automatic : intentional).push_back(app.name.identifier);
   }
-  const plist::Dictionary demoted = {{device::kAutomaticDowngradesKey, std::move(automatic)},
-                                     {device::kIntentionalDowngradesKey, std::move(intentional)}};
-  RETURN_IF_ERROR(writeList(device_, device::kDemotedAppsPath, demoted));
+  const plist::Dictionary demoted = {{demoted_apps::kAutomaticKey, std::move(automatic)},
+                                     {demoted_apps::kIntentionalKey, std::move(intentional)}};
+  RETURN_IF_ERROR(writeList(device_, kDemotedAppsPath, demoted));
   RETURN_IF_ERROR(device_.platform().fileSystem().createDirectory(kHostRestoreFolder,
                                                                   platform::IntermediateDirectories::create, {}));
-  return writeList(device_, kHostRestorePath, entries);
+  return writeList(device_, kRestoreApplicationsPath, entries);
 }
 
 Status Restore::prepare(const BackedUpApp& app, plist::Dictionary& entries) {

@@ -7,6 +7,8 @@
 #include <string_view>
 #include <utility>
 
+#include "platform/SyncFiles.h"
+
 namespace appsync::host {
 namespace {
 
@@ -52,7 +54,7 @@ Result<plist::Dictionary> restoreInfoOf(const Backup& backup, const BackedUpApp&
   if (!done) return done.error();
   Result<Bytes> document = completed(app, metadata);
   if (!document) return document.error();
-  entry.set("HarvoMetadata", std::move(document).value());
+  entry.set(restore_file::kMetadataKey, std::move(document).value());
   return entry;
 }
 

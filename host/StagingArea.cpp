@@ -13,8 +13,6 @@ namespace {
 using platform::FileSystem;
 using platform::IntermediateDirectories;
 
-constexpr std::string_view kIconName = "Icon.png";
-
 std::string stagedPath(std::string_view name) {
   return std::string(kStagingFolder) + "/" + std::string(name);
 }
@@ -71,7 +69,7 @@ Status writeList(FileSystem& files, const std::string& path, const plist::Value&
 
 /// Sets the icon's staged name in the staged info dictionary: its name in the package may be any path.
 Status stageAppFiles(FileSystem& files, const std::string& folder, device::PackageInfo package) {
-  if (package.icon) package.info.set(platform::kBundleIconFileKey, kIconName);
+  if (package.icon) package.info.set(platform::kBundleIconFileKey, kPlaceholderIconName);
   const Result<Bytes> info = plist::writeBinary(package.info);
   if (!info) return info.error();
   Status made = files.createDirectory(folder, IntermediateDirectories::create, {});
@@ -79,7 +77,7 @@ Status stageAppFiles(FileSystem& files, const std::string& folder, device::Packa
     if (made && bytes) made = files.createFile(folder + "/" + std::string(name), *bytes, {});
   };
   add(kInfoPlistName, *info);
-  add(kIconName, package.icon);
+  add(kPlaceholderIconName, package.icon);
   add(kStoreMetadataName, package.storeMetadata);
   add(kArtworkName, package.artwork);
   return made;

@@ -161,7 +161,7 @@ Result<plist::Dictionary> demotedApps(AppRegistry& registry) {
     if (!app->isPlaceholder() || app->isInstalled() || !isDemotion(app->installType())) continue;
     (app->installType() == TSInstallType::Downgrade ? automatic : intentional).push_back(app->applicationIdentifier());
   }
-  return plist::Dictionary{{kAutomaticDowngradesKey, automatic}, {kIntentionalDowngradesKey, intentional}};
+  return plist::Dictionary{{demoted_apps::kAutomaticKey, automatic}, {demoted_apps::kIntentionalKey, intentional}};
 }
 
 Status recordDemotedApps(AppRegistry& registry, DeviceFileSystem& files) {

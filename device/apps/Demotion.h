@@ -8,19 +8,14 @@
 
 namespace appsync::device {
 
-/// The backup service's list of demoted apps: a dictionary of two arrays of bundle identifiers.
-inline constexpr std::string_view kDemotedAppsPath =
-    "/var/mobile/Library/Preferences/com.corvel.Vaultory.DemotedApps.plist";
-inline constexpr std::string_view kAutomaticDowngradesKey = "AutomaticDowngrades";
-inline constexpr std::string_view kIntentionalDowngradesKey = "IntentionalDowngrades";
-
-/// Returns the content of the list, from the placeholders of demoted apps in the registry.
+/// Returns the content of the demoted-apps file (platform/SyncFiles.h), from the placeholders of demoted apps in the
+/// registry.
 [[nodiscard]] Result<plist::Dictionary> demotedApps(AppRegistry& registry);
 
-/// Writes the list from the registry.
+/// Writes that file from the registry.
 [[nodiscard]] Status recordDemotedApps(AppRegistry& registry, DeviceFileSystem& files);
 
-/// Demotes an app as `AppRegistry::demote` does and updates the list.
+/// Demotes an app as `AppRegistry::demote` does and updates the file.
 [[nodiscard]] Status demote(AppRegistry& registry, DeviceFileSystem& files, std::string_view bundleIdentifier,
                             platform::TSInstallType type);
 

@@ -250,7 +250,7 @@ Error asSystemError(Error error) {
 }
 
 Status asSystemError(Status status) {
-  return status ? status : asSystemError(std::move(status).error());
+  return status ? std::move(status) : Status(asSystemError(status.error()));
 }
 
 bool isDatabaseDamage(const Error& error) {

@@ -3,6 +3,7 @@
 #include <gmock/gmock.h>
 
 #include "device/apps/Demotion.h"
+#include "platform/SyncFiles.h"
 #include "tests/device/screen/Pictures.h"
 #include "tests/support/KilledDevice.h"
 
@@ -39,7 +40,7 @@ class Demotion : public testing::Test {
     return device::demote(device_.registry(), device_.files(), identifier, type);
   }
   [[nodiscard]] std::vector<std::string> listed(std::string_view key) {
-    const Result<Bytes> bytes = device_.files().readFile(device::kDemotedAppsPath);
+    const Result<Bytes> bytes = device_.files().readFile(kDemotedAppsPath);
     EXPECT_TRUE(bytes.ok());
     std::vector<std::string> identifiers;
     const Result<plist::Value> root = plist::read(*bytes);
