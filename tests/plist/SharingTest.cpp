@@ -119,16 +119,16 @@ class RandomValues {
 };
 
 TEST(PropertyListSharing, RestoresRandomDocumentsFromBinary) {
-  for (std::uint32_t seed = 1; seed <= 40; ++seed) {
+  for (std::uint32_t seed = 1; seed <= 10; ++seed) {
     SCOPED_TRACE(seed);
-    expectSameInBinary(RandomValues(seed, 60'000).dictionary(0));
+    expectSameInBinary(RandomValues(seed, 10'000).dictionary(0));
   }
 }
 
 TEST(PropertyListSharing, RestoresRandomDocumentsFromXML) {
-  for (std::uint32_t seed = 1; seed <= 20; ++seed) {
+  for (std::uint32_t seed = 1; seed <= 6; ++seed) {
     SCOPED_TRACE(seed);
-    expectSameInXML(RandomValues(seed, 2'000).dictionary(0));
+    expectSameInXML(RandomValues(seed, 1'000).dictionary(0));
   }
 }
 
