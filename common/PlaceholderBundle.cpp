@@ -9,8 +9,6 @@ namespace appsync {
 
 namespace {
 
-/// The name of the icon file.
-
 std::string pathIn(std::string_view folder, std::string_view name) {
   return std::string(folder).append("/").append(name);
 }
